@@ -1,0 +1,42 @@
+# What every target of the project is built with, and the few ways in which targets are made.
+
+add_library(orv_options INTERFACE)
+# Files and inodes are as large on 32-bit machines.
+target_compile_definitions(orv_options INTERFACE _FILE_OFFSET_BITS=64)
+target_compile_options(orv_options INTERFACE
+  -Wall -Wextra -Wpedantic -Wshadow -Wundef -Wformat=2 -Wimplicit-fallthrough
+  $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor -Woverloaded-virtual>
+  # GCC 12 sees overlapping copies where there are none, in the concatenation of strings.
+  $<$<COMPILE_LANG_AND_ID:CXX,GNU>:-Wno-restrict>
+  $<$<BOOL:${ORV_WERROR}>:-Werror>
+  # Source names in log records are relative to the project, wherever it is built.
+  "-fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=")
+target_link_options(orv_options INTERFACE
+  -Wl,-z,relro,-z,now,-z,noexecstack -Wl,--as-needed -Wl,--no-undefined)
+if(ORV_SANITIZE)
+  target_compile_options(orv_options INTERFACE -fsanitize=${ORV_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
+  target_link_options(orv_options INTERFACE -fsanitize=${ORV_SANITIZE})
+endif()
+
+# orv_shared_library(TARGET sources...): a library lib<TARGET>.so.1 that exports what the version script <TARGET>.map of
+# its folder names, and nothing else.
+function(orv_shared_library target)
+  add_library(${target} SHARED ${ARGN})
+  set(map "${CMAKE_CURRENT_SOURCE_DIR}/${target}.map")
+  set_target_properties(${target} PROPERTIES
+    VERSION ${PROJECT_VERSION} SOVERSION 1
+    CXX_VISIBILITY_PRESET default VISIBILITY_INLINES_HIDDEN ON
+    LINK_DEPENDS "${map}")
+  target_link_options(${target} PRIVATE "-Wl,--version-script=${map}")
+  target_link_libraries(${target} PRIVATE orv_options)
+  install(TARGETS ${target} LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}" NAMELINK_SKIP)
+endfunction()
+
+# orv_add_test(NAME SOURCES... LIBRARIES...): a GoogleTest program that ctest runs.
+function(orv_add_test name)
+  cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;LIBRARIES")
+  add_executable(${name} ${arg_SOURCES})
+  target_link_libraries(${name} PRIVATE orv_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
+  add_test(NAME ${name} COMMAND ${name})
+  set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
+endfunction()

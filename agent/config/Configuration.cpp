@@ -1,0 +1,178 @@
+#include "Configuration.h"
+
+#include "TableReader.h"
+
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <fstream>
+#include <limits>
+#include <sstream>
+#include <system_error>
+#include <unordered_set>
+
+namespace Norv::Agent {
+
+namespace {
+
+constexpr const char* defaultFile = "/etc/orv/agent.toml";
+
+using Destination = LogSettings::Destination;
+constexpr std::array<std::pair<std::string_view, Destination>, 3> destinations{{
+    {"stderr", Destination::standardError},
+    {"file", Destination::file},
+    {"syslog", Destination::syslog},
+}};
+
+using Backend = InstrumentationSettings::Backend;
+constexpr std::array<std::pair<std::string_view, Backend>, 1> backends{{
+    {"simulated", Backend::simulated},
+}};
+
+constexpr Integer<int> level{0, alwaysWrittenLevel};
+constexpr Integer<unsigned int> powerState{0, std::numeric_limits<std::uint16_t>::max()};
+constexpr Integer<std::uint64_t> fileSize{0, std::numeric_limits<std::int64_t>::max()};
+constexpr Integer<unsigned int> fileCount{0, 1000};
+constexpr Seconds transitionTime{std::chrono::hours{24}};
+
+// Nothing where the variable is not set or empty.
+std::optional<std::string> environment(const char* name) {
+    const char* value = std::getenv(name);
+    return value == nullptr || *value == '\0' ? std::nullopt : std::optional<std::string>(value);
+}
+
+void readLog(TableReader& table, LogSettings& log) {
+    table.read("destination", Choice<Destination>{destinations}, log.destination);
+    if (!table.read("file", AbsolutePath{}, log.file) && log.destination == Destination::file) {
+        table.reject("file", AbsolutePath::expected() + " where the destination is a file");
+    }
+    table.read("rotate-size", fileSize, log.rotateSize);
+    table.read("rotate-count", fileCount, log.rotateCount);
+    table.read("level", level, log.logLevel);
+    table.read("trace-level", level, log.traceLevel);
+
+    std::unordered_set<std::string> prefixes;
+    table.readTables("category", [&](TableReader& category) {
+        CategoryThreshold threshold;
+        category.require("prefix", Text{}, threshold.prefix);
+        if (!prefixes.insert(threshold.prefix).second) {
+            category.reject("prefix", "a prefix that stands here once");
+        }
+        category.read("level", level, threshold.logLevel);
+        category.read("trace-level", level, threshold.traceLevel);
+        log.categories.push_back(std::move(threshold));
+    });
+}
+
+void readSimulated(TableReader& table, SimulatedSettings& simulated) {
+    table.read("state-file", AbsolutePath{}, simulated.stateFile);
+    table.read("reboot-time", transitionTime, simulated.rebootTime);
+    table.read("shutdown-time", transitionTime, simulated.shutdownTime);
+
+    std::unordered_set<std::string> paths;
+    std::vector<SimulatedNode> nodes;
+    const bool configured = table.readTables("node", [&](TableReader& element) {
+        SimulatedNode node;
+        element.require("path", NodePath{}, node.path);
+        if (!paths.insert(node.path).second) {
+            element.reject("path", "a path that no other node has");
+        }
+        element.read("power-state", powerState, node.powerState);
+        element.readList("power-states", powerState, node.powerStates);
+        nodes.push_back(std::move(node));
+    });
+    if (configured) {
+        simulated.nodes = std::move(nodes);
+    }
+}
+
+void readInstrumentation(TableReader& table, InstrumentationSettings& instrumentation) {
+    table.read("backend", Choice<Backend>{backends}, instrumentation.backend);
+    table.readTable("simulated", [&](TableReader& simulated) { readSimulated(simulated, instrumentation.simulated); });
+}
+
+void readConfiguration(TableReader& file, Configuration& configuration) {
+    file.readTable("system", [&](TableReader& system) { system.read("name", Text{}, configuration.systemName); });
+    file.readTable("log", [&](TableReader& log) { readLog(log, configuration.log); });
+    file.readTable("instrumentation", [&](TableReader& instrumentation) {
+        readInstrumentation(instrumentation, configuration.instrumentation);
+    });
+    file.finish();
+}
+
+[[noreturn]] void rejectFile(const std::string& file, const std::string& reason) {
+    throw ConfigurationError(file + ": " + reason + ": expected a file that can be read");
+}
+
+std::string contentOf(const std::string& file) {
+    std::error_code error;
+    const auto status = std::filesystem::status(file, error);
+    if (std::filesystem::exists(status) && !std::filesystem::is_regular_file(status)) {
+        rejectFile(file, "not a regular file");
+    }
+    errno = 0;
+    std::ifstream stream(file, std::ios::binary);
+    std::ostringstream content;
+    // An empty file makes the insertion fail, which is no failure to read it.
+    if (!stream || (!(content << stream.rdbuf()) && errno != 0)) {
+        rejectFile(file, std::generic_category().message(errno));
+    }
+    return std::move(content).str();
+}
+
+Configuration configurationFrom(const std::string& file) {
+    Configuration configuration;
+    configuration.source = file;
+    try {
+        const toml::table table = toml::parse(contentOf(file), file);
+        TableReader reader(table, file);
+        readConfiguration(reader, configuration);
+    } catch (const toml::parse_error& error) {
+        throw ConfigurationError(file + ':' + std::to_string(error.source().begin.line) +
+                                 ": not TOML: " + std::string(error.description()));
+    }
+    return configuration;
+}
+
+// The file to read; nothing where the built-in defaults hold. A file that is there but cannot be reached counts as
+// there: it is an error, not a reason to go on without it.
+std::optional<std::string> configurationFile() {
+    if (auto named = environment("ORV_AGENT_CONFIG")) {
+        return named;
+    }
+    std::error_code error;
+    const auto status = std::filesystem::symlink_status(defaultFile, error);
+    return status.type() == std::filesystem::file_type::not_found ? std::nullopt
+                                                                  : std::optional<std::string>(defaultFile);
+}
+
+std::filesystem::path defaultStateFile() {
+    constexpr const char* name = "orv/simulated-machine.json";
+    if (geteuid() == 0) {
+        return std::filesystem::path("/var/lib") / name;
+    }
+    // The XDG base directory specification has relative paths ignored.
+    if (const auto state = environment("XDG_STATE_HOME"); state && state->starts_with('/')) {
+        return std::filesystem::path(*state) / name;
+    }
+    if (const auto home = environment("HOME")) {
+        return std::filesystem::path(*home) / ".local/state" / name;
+    }
+    throw ConfigurationError("instrumentation.simulated.state-file: missing: expected an absolute path, or the "
+                             "environment variable XDG_STATE_HOME or HOME to say where state is kept");
+}
+
+} // namespace
+
+Configuration loadConfiguration() {
+    const auto file = configurationFile();
+    Configuration configuration = file ? configurationFrom(*file) : Configuration{};
+    if (configuration.instrumentation.simulated.stateFile.empty()) {
+        configuration.instrumentation.simulated.stateFile = defaultStateFile();
+    }
+    return configuration;
+}
+
+} // namespace Norv::Agent

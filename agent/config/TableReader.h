@@ -1,0 +1,176 @@
+/**
+ * Reading a table of a TOML file strictly: a value has the type and range that is expected of it, and a key that nobody
+ * asked for is an error.
+ */
+#ifndef AGENT_TABLEREADER_H
+#define AGENT_TABLEREADER_H
+
+#include <toml++/toml.h>
+
+#include <chrono>
+#include <concepts>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <span>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace Norv::Agent {
+
+// What a value can be asked to be. Each kind has
+//   expected()      its description, as it completes "expected ..."
+//   accept(node)    the value, or nothing where the node is something else.
+
+template <std::integral T>
+struct Integer {
+    T low;
+    T high;
+
+    std::string expected() const { return "an integer from " + std::to_string(low) + " to " + std::to_string(high); }
+    std::optional<T> accept(const toml::node& node) const {
+        const auto value = node.value_exact<std::int64_t>();
+        if (!value || std::cmp_less(*value, low) || std::cmp_greater(*value, high)) {
+            return std::nullopt;
+        }
+        return static_cast<T>(*value);
+    }
+};
+
+/** Seconds, whole or with decimals. */
+struct Seconds {
+    std::chrono::seconds high;
+
+    std::string expected() const { return "a number of seconds from 0 to " + std::to_string(high.count()); }
+    std::optional<std::chrono::milliseconds> accept(const toml::node& node) const;
+};
+
+/** Text that is not empty. */
+struct Text {
+    static std::string expected() { return "a text that is not empty"; }
+    static std::optional<std::string> accept(const toml::node& node);
+};
+
+/** A path that means the same in every process, whatever its working directory. */
+struct AbsolutePath {
+    static std::string expected() { return "an absolute path"; }
+    static std::optional<std::filesystem::path> accept(const toml::node& node);
+};
+
+/** Names without control characters, separated by single slashes. */
+struct NodePath {
+    static std::string expected() { return "names separated by single slashes"; }
+    static std::optional<std::string> accept(const toml::node& node);
+};
+
+/** One of a few names, each of which stands for a value. */
+template <typename T>
+struct Choice {
+    std::span<const std::pair<std::string_view, T>> names;
+
+    std::string expected() const {
+        std::string text;
+        for (const auto& name : names) {
+            text += (text.empty() ? "\"" : " or \"") + std::string(name.first) + '"';
+        }
+        return text;
+    }
+    std::optional<T> accept(const toml::node& node) const {
+        for (const auto& [name, value] : names) {
+            if (node.value_exact<std::string_view>() == name) {
+                return value;
+            }
+        }
+        return std::nullopt;
+    }
+};
+
+class TableReader {
+public:
+    /** The table and `file`, the file's name for messages, must outlive the reader. */
+    TableReader(const toml::table& table, const std::string& file, std::string name = "")
+        : _table(table), _file(file), _name(std::move(name)) {}
+
+    /**
+     * Sets `target` to the key's value; leaves it alone where the table has no such key.
+     *
+     * @return whether the table has the key.
+     * @throws ConfigurationError, as every other member, where the value is not of that kind.
+     */
+    template <typename Kind, typename Target>
+    bool read(const char* key, const Kind& kind, Target& target) {
+        const toml::node* node = find(key);
+        if (node != nullptr) {
+            target = accepted(*node, kind, key);
+        }
+        return node != nullptr;
+    }
+
+    /** The same for a key that must be there. */
+    template <typename Kind, typename Target>
+    void require(const char* key, const Kind& kind, Target& target) {
+        if (!read(key, kind, target)) {
+            reject(key, kind.expected());
+        }
+    }
+
+    /** The same for a list of such values. */
+    template <typename Kind, typename Element>
+    bool readList(const char* key, const Kind& kind, std::vector<Element>& target) {
+        const toml::array* array = findArray(key, "a list, each element " + kind.expected());
+        if (array == nullptr) {
+            return false;
+        }
+        target.clear();
+        for (const toml::node& node : *array) {
+            target.push_back(accepted(node, kind, elementKey(key, target.size())));
+        }
+        return true;
+    }
+
+    /** Has `read` read the table behind the key, where there is one. */
+    void readTable(const char* key, const std::function<void(TableReader&)>& read);
+
+    /**
+     * Has `read` read each table of the list behind the key, in order.
+     *
+     * @return whether the table has the key.
+     */
+    bool readTables(const char* key, const std::function<void(TableReader&)>& read);
+
+    /** Reports the key's value, or that it is missing. */
+    [[noreturn]] void reject(const char* key, const std::string& expected) const;
+
+    /** Reports a key that was not asked for. Called when everything known has been read. */
+    void finish() const;
+
+private:
+    const toml::node* find(const char* key);
+    const toml::array* findArray(const char* key, const std::string& expected);
+    static std::string elementKey(const char* key, std::size_t index);
+    std::string nameOf(std::string_view key) const;
+    TableReader tableAt(const toml::node& node, std::string_view key) const;
+    [[noreturn]] void rejectAt(const toml::source_region& place, std::string_view key, const std::string& value,
+                               const std::string& expected) const;
+    [[noreturn]] void rejectValue(const toml::node& node, std::string_view key, const std::string& expected) const;
+
+    template <typename Kind>
+    auto accepted(const toml::node& node, const Kind& kind, std::string_view key) const {
+        auto value = kind.accept(node);
+        if (!value) {
+            rejectValue(node, key, kind.expected());
+        }
+        return *std::move(value);
+    }
+
+    const toml::table& _table;
+    const std::string& _file;
+    std::string _name;
+    std::vector<const char*> _known;
+};
+
+} // namespace Norv::Agent
+
+#endif

@@ -1,0 +1,43 @@
+#ifndef LOG_DESTINATION_H
+#define LOG_DESTINATION_H
+
+#include "Line.h"
+
+#include "config/Configuration.h"
+
+#include <memory>
+#include <string>
+
+namespace OrvLog {
+
+/** Where lines go. Used by several threads at a time. */
+class Destination {
+public:
+    Destination() = default;
+    virtual ~Destination() = default;
+    Destination(const Destination&) = delete;
+    Destination& operator=(const Destination&) = delete;
+
+    /** What messages call it. */
+    virtual std::string name() const = 0;
+
+    /**
+     * Writes a line, without waiting.
+     *
+     * @return 0, or the error number that says why the line is lost.
+     */
+    virtual int write(const Line& line) = 0;
+};
+
+/** The host's standard error, as long as it takes what is written. */
+std::unique_ptr<Destination> standardErrorDestination();
+
+/** The file and rotation of `settings`, for any number of processes and threads that write and rotate the same file. */
+std::unique_ptr<Destination> fileDestination(const Norv::Agent::LogSettings& settings);
+
+/** syslog(3), with the identity and the options that the host has chosen. */
+std::unique_ptr<Destination> syslogDestination();
+
+} // namespace OrvLog
+
+#endif

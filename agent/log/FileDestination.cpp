@@ -1,0 +1,124 @@
+#include "Destination.h"
+#include "LineWriter.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <cerrno>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+#include <string>
+#include <utility>
+
+namespace OrvLog {
+
+namespace {
+
+/** An open file; negative where it could not be opened. */
+class Descriptor {
+public:
+    explicit Descriptor(const std::string& path)
+        : _number(open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOCTTY | O_NONBLOCK, 0640)) {}
+    ~Descriptor() {
+        if (_number >= 0) {
+            close(_number);
+        }
+    }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+
+    int number() const { return _number; }
+
+private:
+    int _number;
+};
+
+// The file is opened for each line: nothing is held that a host that closes its descriptors could take away or give to
+// somebody else, and a file that others removed or renamed is there again at once.
+class FileDestination final : public Destination {
+public:
+    explicit FileDestination(const Norv::Agent::LogSettings& settings)
+        : _path(settings.file), _rotateSize(settings.rotateSize), _rotateCount(settings.rotateCount) {}
+
+    std::string name() const override { return _path; }
+
+    int write(const Line& line) override {
+        {
+            const Descriptor file(_path);
+            if (file.number() < 0) {
+                return errno;
+            }
+            if (!isFull(file, line.whole().size())) {
+                return _writer.write(file.number(), line);
+            }
+            rotate(file);
+        }
+        return append(line);
+    }
+
+private:
+    int append(const Line& line) {
+        const Descriptor file(_path);
+        return file.number() < 0 ? errno : _writer.write(file.number(), line);
+    }
+
+    bool isFull(const Descriptor& file, std::size_t more) const {
+        struct stat status {};
+        return _rotateSize != 0 && fstat(file.number(), &status) == 0 && S_ISREG(status.st_mode) &&
+               status.st_size > 0 && static_cast<std::uint64_t>(status.st_size) + more > _rotateSize;
+    }
+
+    // Who has the lock rotates; what others write meanwhile goes into the file that is being renamed, and is not lost.
+    void rotate(const Descriptor& file) {
+        if (flock(file.number(), LOCK_EX | LOCK_NB) != 0) {
+            return;
+        }
+        // Another file of this name means that somebody else has just rotated.
+        struct stat opened {};
+        struct stat named {};
+        const bool isDue = fstat(file.number(), &opened) == 0 && stat(_path.c_str(), &named) == 0 &&
+                           named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
+        const int error = isDue ? shiftFiles() : 0;
+        // Closing would not do: a child that the host has just forked holds the same lock.
+        flock(file.number(), LOCK_UN);
+        if (isDue && _rotationError.exchange(error) != error && error != 0) {
+            append(Line(ownRecord(_path + ": cannot be rotated, and grows: " + strerrordesc_np(error))));
+        }
+    }
+
+    // Returns 0 or an error number. The first failure is the end of it, or the next step would overwrite a file.
+    int shiftFiles() const {
+        const auto rotated = [this](unsigned int number) { return _path + '.' + std::to_string(number); };
+        // The first free number, or the last one, whose file goes.
+        unsigned int number = 1;
+        while (number < _rotateCount && access(rotated(number).c_str(), F_OK) == 0) {
+            ++number;
+        }
+        for (; number > 1; --number) {
+            if (rename(rotated(number - 1).c_str(), rotated(number).c_str()) != 0) {
+                return errno;
+            }
+        }
+        const int result = _rotateCount > 0 ? rename(_path.c_str(), rotated(1).c_str()) : unlink(_path.c_str());
+        return result == 0 ? 0 : errno;
+    }
+
+    const std::string _path;
+    const std::uint64_t _rotateSize;
+    const unsigned int _rotateCount;
+    LineWriter _writer;
+    // Of the last rotation; it is reported when it changes.
+    std::atomic<int> _rotationError = 0;
+};
+
+} // namespace
+
+std::unique_ptr<Destination> fileDestination(const Norv::Agent::LogSettings& settings) {
+    return std::make_unique<FileDestination>(settings);
+}
+
+} // namespace OrvLog

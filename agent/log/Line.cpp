@@ -1,0 +1,117 @@
+#include "Line.h"
+
+#include <algorithm>
+#include <charconv>
+#include <chrono>
+#include <climits>
+#include <limits>
+#include <string_view>
+
+namespace OrvLog {
+
+namespace {
+
+constexpr std::string_view cutOff = "...\n";
+
+struct TimeText {
+    std::array<char, sizeof "2026-11-20T12:31:07.123Z "> characters;
+    std::string_view view() const { return {characters.data(), characters.size() - 1}; }
+};
+
+// Calculated here: gmtime_r takes a lock of the C library, which must not happen between a host's fork and exec.
+TimeText timeText(std::chrono::system_clock::time_point time) {
+    const auto day = std::chrono::floor<std::chrono::days>(time);
+    const std::chrono::year_month_day date{day};
+    const std::chrono::hh_mm_ss clock{std::chrono::floor<std::chrono::milliseconds>(time - day)};
+
+    TimeText text{};
+    auto* at = text.characters.data();
+    const auto put = [&at](unsigned int number, int digits, char after) {
+        for (int i = digits - 1; i >= 0; --i) {
+            at[i] = static_cast<char>('0' + number % 10);
+            number /= 10;
+        }
+        at[digits] = after;
+        at += digits + 1;
+    };
+    put(static_cast<unsigned int>(static_cast<int>(date.year())), 4, '-');
+    put(static_cast<unsigned int>(date.month()), 2, '-');
+    put(static_cast<unsigned int>(date.day()), 2, 'T');
+    put(static_cast<unsigned int>(clock.hours().count()), 2, ':');
+    put(static_cast<unsigned int>(clock.minutes().count()), 2, ':');
+    put(static_cast<unsigned int>(clock.seconds().count()), 2, '.');
+    put(static_cast<unsigned int>(clock.subseconds().count()), 3, 'Z');
+    *at = ' ';
+    return text;
+}
+
+} // namespace
+
+Line::Line(const Record& record) : _level(record.level) {
+    static_assert(_capacity <= PIPE_BUF, "a line is written to a pipe in one piece");
+    append(timeText(std::chrono::system_clock::now()).view());
+    _timeSize = _size;
+    append(record.kind == Kind::log ? "log " : "trace ");
+    appendNumber(record.level);
+    append(" ");
+    appendEscaped(record.category);
+    append(" ");
+    appendEscaped(record.function);
+    append(" ");
+    appendEscaped(record.file);
+    append(":");
+    appendNumber(record.line);
+    append(" ");
+    appendEscaped(record.text);
+    end();
+}
+
+// All of the piece or nothing of it and of what follows.
+void Line::append(std::string_view piece) {
+    _full = _full || piece.size() > _capacity - cutOff.size() - _size;
+    if (!_full) {
+        std::ranges::copy(piece, _text.begin() + _size);
+        _size += piece.size();
+    }
+}
+
+void Line::appendNumber(int number) {
+    std::array<char, std::numeric_limits<int>::digits10 + 2> digits{};
+    const auto* end = std::to_chars(digits.data(), digits.data() + digits.size(), number).ptr;
+    append({digits.data(), end});
+}
+
+void Line::appendEscaped(std::string_view text) {
+    constexpr std::string_view hexadecimal = "0123456789abcdef";
+    for (const char& character : text) {
+        const auto code = static_cast<unsigned char>(character);
+        if (character == '\n') {
+            append("\\n");
+        } else if (character == '\t') {
+            append("\\t");
+        } else if (code < 0x20 || code == 0x7f) {
+            const std::array escape{'\\', 'x', hexadecimal[code / 16], hexadecimal[code % 16]};
+            append({escape.data(), escape.size()});
+        } else {
+            append({&character, 1});
+        }
+    }
+}
+
+void Line::end() {
+    if (!_full) {
+        _text[_size++] = '\n';
+        return;
+    }
+    // The cut may have gone through a UTF-8 character; its pieces go, too.
+    while ((static_cast<unsigned char>(_text[_size - 1]) & 0xc0) == 0x80) {
+        --_size;
+    }
+    if (static_cast<unsigned char>(_text[_size - 1]) >= 0xc0) {
+        --_size;
+    }
+    std::ranges::copy(cutOff, _text.begin() + _size);
+    _size += cutOff.size();
+}
+
+} // namespace OrvLog

@@ -1,0 +1,78 @@
+#include "LineWriter.h"
+
+#include <sys/uio.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstddef>
+#include <ctime>
+#include <string_view>
+
+namespace OrvLog {
+
+namespace {
+
+// Keeps the signals that a failing write(2) raises away from the host, for which they could be the end.
+class WithoutWriteSignals {
+public:
+    WithoutWriteSignals() {
+        sigemptyset(&_signals);
+        sigaddset(&_signals, SIGPIPE);
+        sigaddset(&_signals, SIGXFSZ);
+        pthread_sigmask(SIG_BLOCK, &_signals, &_before);
+        sigpending(&_pendingBefore);
+    }
+
+    ~WithoutWriteSignals() { pthread_sigmask(SIG_SETMASK, &_before, nullptr); }
+
+    WithoutWriteSignals(const WithoutWriteSignals&) = delete;
+    WithoutWriteSignals& operator=(const WithoutWriteSignals&) = delete;
+
+    /** Takes back the signal that a write of this thread has just raised; not one that the host is waiting for. */
+    void takeBack(int signal) const {
+        if (sigismember(&_pendingBefore, signal) == 0) {
+            sigset_t raised;
+            sigemptyset(&raised);
+            sigaddset(&raised, signal);
+            const timespec atOnce{};
+            sigtimedwait(&raised, nullptr, &atOnce);
+        }
+    }
+
+private:
+    sigset_t _signals{};
+    sigset_t _before{};
+    sigset_t _pendingBefore{};
+};
+
+iovec piece(std::string_view text) {
+    // writev(2) reads only, but takes what readv(2) takes, too.
+    return {.iov_base = const_cast<char*>(text.data()), .iov_len = text.size()};
+}
+
+} // namespace
+
+int LineWriter::write(int descriptor, const Line& line) {
+    const bool torn = _torn.exchange(false);
+    const std::array pieces{piece(torn ? "\n" : ""), piece(line.whole())};
+    const std::size_t size = pieces[0].iov_len + pieces[1].iov_len;
+
+    const WithoutWriteSignals quiet;
+    const ssize_t written = TEMP_FAILURE_RETRY(::writev(descriptor, pieces.data(), pieces.size()));
+    if (written >= 0) {
+        _torn = static_cast<std::size_t>(written) < size;
+        return _torn ? ENOSPC : 0;
+    }
+    const int error = errno;
+    if (error == EPIPE) {
+        quiet.takeBack(SIGPIPE);
+    } else if (error == EFBIG) {
+        quiet.takeBack(SIGXFSZ);
+    }
+    _torn = torn;
+    return error;
+}
+
+} // namespace OrvLog

@@ -1,0 +1,115 @@
+#include "OrvLog/OrvLogger.h"
+
+#include "Destination.h"
+#include "Line.h"
+#include "Record.h"
+#include "RecordSocket.h"
+#include "Thresholds.h"
+
+#include "config/Configuration.h"
+
+#include <atomic>
+#include <cerrno>
+#include <cstddef>
+#include <cstring>
+#include <exception>
+#include <memory>
+#include <string>
+#include <string_view>
+
+namespace OrvLog {
+
+namespace {
+
+class Log {
+public:
+    explicit Log(const Norv::Agent::LogSettings& settings)
+        : _thresholds(settings), _socket(RecordSocket::fromEnvironment()), _destination(destinationFor(settings)) {}
+
+    void report(const Record& record) {
+        _socket.send(record);
+        if (_thresholds.passes(record.kind, record.category, record.level)) {
+            write(record);
+        }
+    }
+
+private:
+    static std::unique_ptr<Destination> destinationFor(const Norv::Agent::LogSettings& settings) {
+        using enum Norv::Agent::LogSettings::Destination;
+        switch (settings.destination) {
+        case file:
+            return fileDestination(settings);
+        case syslog:
+            return syslogDestination();
+        case standardError:
+            break;
+        }
+        return standardErrorDestination();
+    }
+
+    // Records that the destination did not take are counted; their number stands before the first that it takes again.
+    void write(const Record& record) {
+        if (const auto lost = _lost.exchange(0); lost != 0) {
+            const std::string text = std::to_string(lost) + (lost == 1 ? " record" : " records") +
+                                     " lost: " + _destination->name() + ": " + strerrordesc_np(_lossReason);
+            if (!tryWrite(ownRecord(text), lost)) {
+                ++_lost;
+                return;
+            }
+        }
+        tryWrite(record, 1);
+    }
+
+    bool tryWrite(const Record& record, std::size_t countedAs) {
+        const int error = _destination->write(Line(record));
+        if (error != 0) {
+            _lossReason = error;
+            _lost += countedAs;
+        }
+        return error == 0;
+    }
+
+    const Thresholds _thresholds;
+    const RecordSocket _socket;
+    const std::unique_ptr<Destination> _destination;
+    std::atomic<std::size_t> _lost = 0;
+    std::atomic<int> _lossReason = 0;
+};
+
+std::unique_ptr<Log> makeLog() {
+    try {
+        return std::make_unique<Log>(Norv::Agent::loadConfiguration().log);
+    } catch (const Norv::Agent::ConfigurationError& error) {
+        auto log = std::make_unique<Log>(Norv::Agent::LogSettings{});
+        log->report(ownRecord(error.what()));
+        return log;
+    }
+}
+
+void report(Kind kind, const char* function, const char* file, int line, const std::string& category, int level,
+            const std::string& text) {
+    constexpr auto textOf = [](const char* nullable) { return std::string_view(nullable == nullptr ? "" : nullable); };
+    const int error = errno;
+    try {
+        // Never destroyed, see the build's -z nodelete.
+        static Log& log = *makeLog().release();
+        log.report({kind, level, category, textOf(function), textOf(file), line, text});
+    } catch (const std::exception&) {
+        // Nothing but memory can be short here, and there is nowhere to say so.
+    }
+    errno = error;
+}
+
+} // namespace
+
+void OrvLogger::logLevelMessage(const char* function, const char* file, int line, const std::string& category,
+                                int level, char*, int, int, const std::string& message) {
+    report(Kind::log, function, file, line, category, level, message);
+}
+
+void OrvLogger::traceLevelMessage(const char* function, const char* file, int line, const std::string& category,
+                                  int level, char*, int, int, const std::string& message) {
+    report(Kind::trace, function, file, line, category, level, message);
+}
+
+} // namespace OrvLog

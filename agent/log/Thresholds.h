@@ -1,0 +1,42 @@
+#ifndef LOG_THRESHOLDS_H
+#define LOG_THRESHOLDS_H
+
+#include "Record.h"
+
+#include "config/Configuration.h"
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace OrvLog {
+
+/** Which records are written. Asked for every record, most of which are not. */
+class Thresholds {
+public:
+    explicit Thresholds(const Norv::Agent::LogSettings& settings);
+
+    bool passes(Kind kind, std::string_view category, int level) const;
+
+private:
+    struct Levels {
+        int log;
+        int trace;
+
+        int of(Kind kind) const { return kind == Kind::log ? log : trace; }
+    };
+    struct Category {
+        std::string prefix;
+        Levels levels;
+    };
+
+    Levels _general;
+    /** No category has a lower threshold: what is below needs no look at its category. */
+    Levels _lowest;
+    /** Longest prefix first. */
+    std::vector<Category> _categories;
+};
+
+} // namespace OrvLog
+
+#endif

@@ -1,0 +1,32 @@
+#include "Allocations.h"
+
+#include <atomic>
+#include <cstddef>
+#include <cstdlib>
+#include <new>
+
+namespace {
+
+std::atomic<int> count = 0;
+
+} // namespace
+
+int LogTest::allocations() {
+    return count;
+}
+
+// The library takes its operator new from the program.
+void* operator new(std::size_t size) {
+    ++count;
+    if (void* memory = std::malloc(size)) {
+        return memory;
+    }
+    throw std::bad_alloc();
+}
+
+void operator delete(void* memory) noexcept {
+    std::free(memory);
+}
+void operator delete(void* memory, std::size_t) noexcept {
+    std::free(memory);
+}

@@ -1,0 +1,253 @@
+#include "LogProcess.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <atomic>
+#include <fstream>
+#include <map>
+#include <regex>
+#include <set>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using LogTest::linesOfFile;
+using LogTest::LogProcess;
+using LogTest::textsOf;
+using LogTest::writeLog;
+using testing::ElementsAre;
+using testing::Le;
+using testing::UnorderedElementsAreArray;
+
+// Every writer's records, numbered.
+std::vector<std::string> expectedTexts(int writers, int records) {
+    std::vector<std::string> texts;
+    for (int writer = 0; writer < writers; ++writer) {
+        for (int record = 0; record < records; ++record) {
+            texts.push_back("writer " + std::to_string(writer) + " record " + std::to_string(record));
+        }
+    }
+    return texts;
+}
+
+void writeRecords(int writer, int records) {
+    for (int record = 0; record < records; ++record) {
+        writeLog(6000, "writer " + std::to_string(writer) + " record " + std::to_string(record));
+    }
+}
+
+// Texts of the log file and of all that were rotated.
+std::vector<std::string> allTexts(const LogProcess& process) {
+    std::vector<std::string> texts;
+    for (const std::string& name : process.folder.filesThatBegin("agent.log")) {
+        std::ranges::move(textsOf(linesOfFile(process.folder / name)), std::back_inserter(texts));
+    }
+    return texts;
+}
+
+TEST(FileTest, ThreadsWriteWholeLinesIntoOneFile) {
+    constexpr int threadCount = 8;
+    constexpr int records = 500;
+    const LogProcess process;
+    process.configureFile();
+    process.run([] {
+        std::vector<std::thread> threads;
+        for (int number = 0; number < threadCount; ++number) {
+            threads.emplace_back([number] { writeRecords(number, records); });
+        }
+        for (auto& thread : threads) {
+            thread.join();
+        }
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())), UnorderedElementsAreArray(expectedTexts(threadCount, records)));
+}
+
+TEST(FileTest, ProcessesAndThreadsWriteAndRotateOneFileWithoutLosingALine) {
+    constexpr int processCount = 4;
+    constexpr int threadCount = 2;
+    constexpr int records = 250;
+    const LogProcess process;
+    process.configureFile("rotate-size = 4000\nrotate-count = 1000\n");
+
+    std::vector<pid_t> children;
+    for (int child = 0; child < processCount; ++child) {
+        children.push_back(process.start([child] {
+            std::thread second([child] { writeRecords(threadCount * child + 1, records); });
+            writeRecords(threadCount * child, records);
+            second.join();
+        }));
+    }
+    for (const pid_t child : children) {
+        LogProcess::wait(child);
+    }
+
+    EXPECT_GT(process.folder.filesThatBegin("agent.log.").size(), 2U);
+    EXPECT_THAT(allTexts(process), UnorderedElementsAreArray(expectedTexts(processCount * threadCount, records)));
+}
+
+TEST(FileTest, RotationKeepsTheNewestFilesEachWithinItsSize) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 1000\nrotate-count = 2\n");
+    process.run([] { writeRecords(0, 100); });
+
+    EXPECT_THAT(process.folder.filesThatBegin("agent.log"),
+                testing::UnorderedElementsAre("agent.log", "agent.log.1", "agent.log.2"));
+    std::vector<std::string> texts;
+    for (const char* name : {"agent.log.2", "agent.log.1", "agent.log"}) {
+        EXPECT_THAT(fs::file_size(process.folder / name), Le(1000U));
+        std::ranges::move(textsOf(linesOfFile(process.folder / name)), std::back_inserter(texts));
+    }
+    const auto expected = expectedTexts(1, 100);
+    EXPECT_EQ(texts,
+              std::vector<std::string>(expected.end() - static_cast<std::ptrdiff_t>(texts.size()), expected.end()));
+}
+
+TEST(FileTest, WithoutRotatedFilesTheFileBeginsAnew) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 1000\nrotate-count = 0\n");
+    process.run([] { writeRecords(0, 100); });
+
+    EXPECT_THAT(process.folder.filesThatBegin("agent.log"), ElementsAre("agent.log"));
+    EXPECT_THAT(fs::file_size(process.file()), Le(1000U));
+    EXPECT_EQ(textsOf(linesOfFile(process.file())).back(), "writer 0 record 99");
+}
+
+TEST(FileTest, SizeZeroNeverRotates) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 0\n");
+    process.run([] { writeRecords(0, 100); });
+    EXPECT_EQ(textsOf(linesOfFile(process.file())), expectedTexts(1, 100));
+}
+
+TEST(FileTest, ARecordLargerThanAFileMayBeIsWritten) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 10\nrotate-count = 2\n");
+    process.run([] { writeRecords(0, 2); });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())), ElementsAre("writer 0 record 1"));
+    EXPECT_THAT(textsOf(linesOfFile(process.folder / "agent.log.1")), ElementsAre("writer 0 record 0"));
+}
+
+TEST(FileTest, ARotationThatFailsIsReportedOnceAndTheFileGrows) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 300\nrotate-count = 1\n");
+    // A file cannot take the place of a folder.
+    fs::create_directory(process.folder / "agent.log.1");
+    process.run([] { writeRecords(0, 10); });
+
+    auto texts = textsOf(linesOfFile(process.file()));
+    EXPECT_EQ(std::erase(texts, process.file().string() + ": cannot be rotated, and grows: Is a directory"), 1U);
+    EXPECT_EQ(texts, expectedTexts(1, 10));
+}
+
+TEST(FileTest, ARotatedFileIsNotOverwrittenWhereTheNextOneCannotMove) {
+    const LogProcess process;
+    process.configureFile("rotate-size = 300\nrotate-count = 2\n");
+    fs::create_directory(process.folder / "agent.log.2");
+    AgentTest::writeFile(process.folder / "agent.log.1", "old\n");
+    process.run([] { writeRecords(0, 10); });
+
+    EXPECT_THAT(linesOfFile(process.folder / "agent.log.1"), ElementsAre("old"));
+}
+
+TEST(FileTest, AFileThatOthersRemoveOrRenameIsMadeAgain) {
+    const LogProcess process;
+    process.configureFile();
+    process.run([&process] {
+        writeLog(6000, "first");
+        fs::rename(process.file(), process.folder / "moved");
+        writeLog(6000, "second");
+        fs::remove(process.file());
+        writeLog(6000, "third");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.folder / "moved")), ElementsAre("first"));
+    EXPECT_THAT(textsOf(linesOfFile(process.file())), ElementsAre("third"));
+}
+
+TEST(FileTest, LostRecordsAreCountedAndReportedWhenTheFileCanBeWrittenAgain) {
+    const LogProcess process;
+    const fs::path file = process.folder / "later/agent.log";
+    process.configure("[log]\ndestination = \"file\"\nfile = \"" + file.string() + "\"\n");
+    process.run([&file] {
+        writeLog(6000, "first");
+        writeLog(6000, "second");
+        writeLog(5000, "filtered out");
+        fs::create_directory(file.parent_path());
+        writeLog(6000, "third");
+        writeLog(6000, "fourth");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(file)),
+                ElementsAre("2 records lost: " + file.string() + ": No such file or directory", "third", "fourth"));
+}
+
+TEST(FileTest, AFullDeviceLosesRecords) {
+    if (!fs::exists("/dev/full")) {
+        GTEST_SKIP() << "no device that is always full";
+    }
+    const LogProcess process;
+    process.configureFile();
+    fs::create_symlink("/dev/full", process.file());
+    process.run([&process] {
+        writeLog(6000, "first");
+        fs::remove(process.file());
+        writeLog(6000, "second");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())),
+                ElementsAre("1 record lost: " + process.file().string() + ": No space left on device", "second"));
+}
+
+TEST(FileTest, APipeWithoutReaderLosesRecordsAtOnce) {
+    const LogProcess process;
+    process.configureFile();
+    ASSERT_EQ(mkfifo(process.file().c_str(), 0600), 0);
+    process.run([&process] {
+        writeLog(6000, "first");
+        fs::remove(process.file());
+        writeLog(6000, "second");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())),
+                ElementsAre("1 record lost: " + process.file().string() + ": No such device or address", "second"));
+}
+
+TEST(FileTest, ALimitOfTheHostEndsALineButNotTheHost) {
+    const LogProcess process;
+    process.configureFile();
+    process.run([] {
+        rlimit limit{};
+        getrlimit(RLIMIT_FSIZE, &limit);
+        limit.rlim_cur = 100;
+        setrlimit(RLIMIT_FSIZE, &limit);
+        writeLog(6000, "first");
+        writeLog(6000, "second");
+        writeLog(6000, "third");
+        limit.rlim_cur = limit.rlim_max;
+        setrlimit(RLIMIT_FSIZE, &limit);
+        writeLog(6000, "fourth");
+    });
+    const auto lines = linesOfFile(process.file());
+    ASSERT_EQ(lines.size(), 4U) << "the first line, a part of the second, the report and the fourth";
+    EXPECT_EQ(textsOf({lines[0]})[0], "first");
+    EXPECT_EQ(textsOf({lines[2]})[0], "2 records lost: " + process.file().string() + ": File too large");
+    EXPECT_EQ(textsOf({lines[3]})[0], "fourth");
+}
+
+TEST(FileTest, AChildOfTheHostGoesOnWriting) {
+    const LogProcess process;
+    process.configureFile();
+    process.run([&process] {
+        writeLog(6000, "parent");
+        process.run([] { writeLog(6000, "child"); });
+        writeLog(6000, "parent again");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())), ElementsAre("parent", "child", "parent again"));
+}
+
+} // namespace

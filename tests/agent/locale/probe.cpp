@@ -1,0 +1,10 @@
+// Prints the caption in the language of the environment, as a program does that finds the library where it is
+// installed.
+#include "Norv/Locale.h"
+
+#include <iostream>
+
+int main() {
+    const auto& library = Norv::Locale::getResourceLibrary(2, Norv::Locale::getLanguageId());
+    std::cout << Norv::make_string(Norv::ResourceString(library, L"MSGID_POWER_MANAGEMENT_CAPTION")) << '\n';
+}

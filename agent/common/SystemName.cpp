@@ -1,0 +1,68 @@
+#include "Norv/Common.h"
+
+#include "config/Configuration.h"
+
+#include <array>
+#include <memory>
+#include <optional>
+
+#include <netdb.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+namespace Norv {
+
+namespace {
+
+/** What hosts file or name service call the host in full; not set where they do not. */
+std::optional<std::string> canonicalName(const std::string& hostName) {
+    addrinfo hints{};
+    hints.ai_flags = AI_CANONNAME;
+    hints.ai_socktype = SOCK_STREAM;
+    addrinfo* found = nullptr;
+    if (::getaddrinfo(hostName.c_str(), nullptr, &hints, &found) != 0) {
+        return std::nullopt;
+    }
+    const std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> addresses(found, ::freeaddrinfo);
+    return addresses->ai_canonname != nullptr ? std::optional<std::string>(addresses->ai_canonname) : std::nullopt;
+}
+
+bool isFullyQualified(const std::string& name) {
+    return name.find('.') != std::string::npos;
+}
+
+std::string hostsName() {
+    std::array<char, 256> buffer{};
+    // The last byte stays zero: a name that fills the buffer need not be terminated.
+    if (::gethostname(buffer.data(), buffer.size() - 1) != 0 || buffer.front() == '\0') {
+        return "localhost";
+    }
+    std::string name = buffer.data();
+    if (isFullyQualified(name)) {
+        return name;
+    }
+    // A hosts file that lists the host's name as an alias of "localhost" gives no better name.
+    auto canonical = canonicalName(name);
+    return canonical && isFullyQualified(*canonical) ? *std::move(canonical) : name;
+}
+
+std::string determineSystemName() {
+    try {
+        if (auto configured = Agent::loadConfiguration().systemName) {
+            return *std::move(configured);
+        }
+    } catch (const Agent::ConfigurationError&) {
+        // Reported by the log library; the host has a name all the same.
+    }
+    return hostsName();
+}
+
+} // namespace
+
+std::string getSystemName() {
+    // Never destroyed: a host's threads may ask until the very end of the process.
+    static const std::string& name = *new std::string(determineSystemName());
+    return name;
+}
+
+} // namespace Norv

@@ -1,0 +1,55 @@
+/**
+ * What stands behind the cursor of Norv::Instrumentation: a backend gives the nodes of one kind of machine. Each
+ * process has one backend, which any number of threads use at once.
+ */
+#ifndef INSTRUMENTATION_BACKEND_H
+#define INSTRUMENTATION_BACKEND_H
+
+#include <cstddef>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace Norv::Agent {
+
+/** How a request for another power state ended. */
+struct PowerRequestOutcome {
+    bool accepted;
+    /** For people: what was asked of which node, and when it will be over or why it was refused. */
+    std::string description;
+};
+
+/**
+ * The power-management nodes as they stood when they were selected. Belongs to one thread at a time and must not
+ * outlive its backend. Every `node` is an index below `size()`.
+ */
+class NodeSelection {
+public:
+    virtual ~NodeSelection() = default;
+
+    virtual std::size_t size() const = 0;
+
+    /** Names from the root down, separated by slashes, without one in front: the node's identity. */
+    virtual const std::string& path(std::size_t node) const = 0;
+
+    /** What the node does now; not set where the backend cannot tell. The reason is in the log. */
+    virtual std::optional<unsigned int> powerState(std::size_t node) const = 0;
+
+    virtual const std::vector<unsigned int>& powerStates(std::size_t node) const = 0;
+
+    /** Asks for another power state; an accepted one shows in `powerState` of this selection at once. */
+    virtual PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) = 0;
+};
+
+class Backend {
+public:
+    virtual ~Backend() = default;
+
+    /** Never null; without nodes where the machine has none. */
+    virtual std::unique_ptr<NodeSelection> selectPowerManagementNodes() = 0;
+};
+
+} // namespace Norv::Agent
+
+#endif

@@ -1,0 +1,136 @@
+#include "Norv/Instrumentation.h"
+
+#include "Backend.h"
+#include "Report.h"
+#include "SimulatedBackend.h"
+#include "config/Configuration.h"
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <utility>
+
+namespace Norv {
+
+using namespace Agent;
+
+namespace {
+
+std::unique_ptr<Backend> createBackend() {
+    try {
+        Configuration configuration = loadConfiguration();
+        SimulatedSettings& simulated = configuration.instrumentation.simulated;
+        const std::size_t count = simulated.nodes.size();
+        const std::string machine =
+            std::to_string(count) + (count == 1 ? " node" : " nodes") + ", state in " + simulated.stateFile.string();
+        auto backend = std::make_unique<SimulatedBackend>(std::move(simulated));
+        if (configuration.source.empty()) {
+            report(failureLevel, "No configuration file: power management of a simulated machine, " + machine);
+        } else {
+            report(informationLevel, "Power management of a simulated machine: " + machine);
+        }
+        return backend;
+    } catch (const ConfigurationError&) {
+        // The log library says what is wrong, on its first use: now at the latest.
+        OrvLog::OrvLogger::traceLevelMessage(static_cast<const char*>(__func__), __FILE__, __LINE__,
+                                             instrumentationCategory, failureLevel, nullptr, 0, 0,
+                                             "No power-management node is offered: the configuration cannot be used");
+        return nullptr;
+    }
+}
+
+/**
+ * The backend of this process; null where the configuration cannot be used. It is never destroyed: a host's threads may
+ * use cursors until the very end of the process.
+ */
+Backend* processBackend() {
+    static Backend* const backend = createBackend().release();
+    return backend;
+}
+
+} // namespace
+
+class Instrumentation::Implementation {
+public:
+    Backend* const backend = processBackend();
+    /** Null until nodes were selected. */
+    std::unique_ptr<NodeSelection> nodes;
+    std::size_t node = 0;
+
+    bool isOnNode() const { return nodes && node < nodes->size(); }
+
+    PowerRequestOutcome write(NodeLexicon::Properties property, unsigned int value) const {
+        if (property == NodeLexicon::POWER_STATE && isOnNode()) {
+            return nodes->requestPowerState(node, value);
+        }
+        const std::string what = "write of " + std::to_string(value) + " to property " + std::to_string(property);
+        if (isOnNode()) {
+            return {false, what + " of node " + nodes->path(node) + ": expected property " +
+                               std::to_string(NodeLexicon::POWER_STATE)};
+        }
+        return {false, what + (backend != nullptr ? ": expected a cursor that stands on a node"
+                                                  : ": no node is offered, the configuration cannot be used")};
+    }
+};
+
+Instrumentation::Instrumentation() : _implementation(new Implementation) {}
+
+Instrumentation::~Instrumentation() {
+    delete _implementation;
+}
+
+bool Instrumentation::selectNode(NodeLexicon::NodeType type) {
+    _implementation->node = 0;
+    _implementation->nodes.reset();
+    if (type == NodeLexicon::POWER_MANAGEMENT_NODE && _implementation->backend) {
+        _implementation->nodes = _implementation->backend->selectPowerManagementNodes();
+    }
+    return _implementation->isOnNode();
+}
+
+Instrumentation::operator bool() {
+    return _implementation->isOnNode();
+}
+
+Instrumentation& Instrumentation::operator++() {
+    if (_implementation->isOnNode()) {
+        ++_implementation->node;
+    }
+    return *this;
+}
+
+// The tree's root is written in a path, as in a file's; people know the node by its path below the root.
+std::string Instrumentation::getPathToNode() {
+    return _implementation->isOnNode() ? '/' + _implementation->nodes->path(_implementation->node) : std::string();
+}
+
+// NOLINTNEXTLINE(readability-convert-member-functions-to-static): the libraries' interface is fixed
+std::string Instrumentation::convertPathToString(const std::string& path) {
+    return path.starts_with('/') ? path.substr(1) : path;
+}
+
+bool Instrumentation::getProperty(NodeLexicon::Properties property, std::vector<unsigned int>& values) {
+    if (property != NodeLexicon::POWER_STATE_LIST || !_implementation->isOnNode()) {
+        return false;
+    }
+    values = _implementation->nodes->powerStates(_implementation->node);
+    return true;
+}
+
+bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int& value) {
+    if (property != NodeLexicon::POWER_STATE || !_implementation->isOnNode()) {
+        return false;
+    }
+    const std::optional<unsigned int> state = _implementation->nodes->powerState(_implementation->node);
+    value = state.value_or(value);
+    return state.has_value();
+}
+
+bool Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
+    const PowerRequestOutcome outcome = _implementation->write(property, value);
+    report(alwaysWrittenLevel,
+           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description);
+    return outcome.accepted;
+}
+
+} // namespace Norv

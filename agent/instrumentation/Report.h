@@ -1,0 +1,27 @@
+/**
+ * The instrumentation's records in the agent's log.
+ */
+#ifndef INSTRUMENTATION_REPORT_H
+#define INSTRUMENTATION_REPORT_H
+
+#include "OrvLog/OrvLogger.h"
+
+#include <string>
+
+namespace Norv::Agent {
+
+inline constexpr const char* instrumentationCategory = "Corvane.Instrumentation";
+
+/** Levels of the instrumentation's records, beside alwaysWrittenLevel. */
+inline constexpr int informationLevel = 4000;
+inline constexpr int failureLevel = 6000;
+
+/** Writes a record of kind "log" whose place is the caller's. */
+inline void report(int level, const std::string& text, const char* function = __builtin_FUNCTION(),
+                   const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
+    OrvLog::OrvLogger::logLevelMessage(function, file, line, instrumentationCategory, level, nullptr, 0, 0, text);
+}
+
+} // namespace Norv::Agent
+
+#endif

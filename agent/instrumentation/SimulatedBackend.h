@@ -1,0 +1,37 @@
+/**
+ * Backend "simulated": a machine of any number of nodes that reboots and shuts down on paper only.
+ */
+#ifndef INSTRUMENTATION_SIMULATEDBACKEND_H
+#define INSTRUMENTATION_SIMULATEDBACKEND_H
+
+#include "Backend.h"
+#include "StateFile.h"
+#include "config/Configuration.h"
+
+#include <functional>
+#include <memory>
+
+namespace Norv::Agent {
+
+class SimulatedBackend final : public Backend {
+public:
+    /** Wall-clock time, which every process on the host shares. */
+    using Clock = std::function<TimePoint()>;
+
+    explicit SimulatedBackend(SimulatedSettings settings, Clock clock = wallClock);
+
+    std::unique_ptr<NodeSelection> selectPowerManagementNodes() override;
+
+private:
+    class Selection;
+
+    static TimePoint wallClock();
+
+    const SimulatedSettings _settings;
+    const Clock _clock;
+    StateFile _stateFile;
+};
+
+} // namespace Norv::Agent
+
+#endif

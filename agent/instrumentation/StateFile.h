@@ -1,0 +1,98 @@
+/**
+ * The state of the simulated machine: one file that every process on the host shares.
+ *
+ *     { "nodes": { "chassis/blade1": { "request": "reboot", "over": 1795177867123 } } }
+ *
+ * holds the last power request of each node that ever had one; "over" is in milliseconds since 1970 (UTC). The file is
+ * replaced as a whole, under a lock on "<file>.lock" beside it, so that a reader needs no lock and a process that is
+ * killed at any moment leaves a whole file. A damaged file is set aside as "<file>.damaged-<UTC time>-<number>".
+ */
+#ifndef INSTRUMENTATION_STATEFILE_H
+#define INSTRUMENTATION_STATEFILE_H
+
+#include "PowerTransition.h"
+
+#include <chrono>
+#include <filesystem>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+
+#include <sys/stat.h>
+
+namespace Norv::Agent {
+
+using TimePoint = std::chrono::sys_time<std::chrono::milliseconds>;
+
+struct PowerRequest {
+    /** Element of powerTransitions. */
+    const PowerTransition* transition;
+    /** When the transition is over. */
+    TimePoint over;
+};
+
+/** The last request of each node that had one, by the node's path. */
+using PowerRequests = std::map<std::string, PowerRequest>;
+
+/** Any number of threads may use one object at once. */
+class StateFile {
+public:
+    /** Nothing is read or made yet. The missing folders of `file` are made with the file. */
+    explicit StateFile(const std::filesystem::path& file);
+
+    /**
+     * What the file holds now; nothing where there is no file. A damaged file is reported, set aside and counts as
+     * none.
+     *
+     * @throws std::system_error where the file cannot be read.
+     */
+    std::shared_ptr<const PowerRequests> read();
+
+    /**
+     * Replaces the last request of a node.
+     *
+     * @return what the file holds afterwards.
+     * @throws std::system_error where the file cannot be read or written, or a damaged one cannot be set aside; the
+     * file is then as it was.
+     */
+    std::shared_ptr<const PowerRequests> write(const std::string& node, const PowerRequest& request);
+
+private:
+    /** Tells one content of the file from every other. */
+    struct Signature {
+        dev_t device;
+        ino_t inode;
+        off_t size;
+        std::chrono::nanoseconds modified;
+
+        bool operator==(const Signature&) const = default;
+    };
+
+    struct Content {
+        /** Not set where there is no file. */
+        std::optional<Signature> signature;
+        std::shared_ptr<const PowerRequests> requests = std::make_shared<PowerRequests>();
+        /** Why the file cannot be used; empty where it can. `requests` is then empty. */
+        std::string damage;
+    };
+
+    class Lock;
+
+    static Signature signatureOf(const struct stat& status);
+    std::optional<Signature> currentSignature() const;
+    Content load() const;
+    Content loadOrSetAside(const Lock& lock) const;
+    void store(const PowerRequests& requests, const std::optional<Signature>& replaced, const Lock& lock) const;
+
+    const std::filesystem::path _file;
+
+    std::mutex _mutex;
+    /** What was last read; guarded by _mutex. */
+    Content _content;
+};
+
+} // namespace Norv::Agent
+
+#endif

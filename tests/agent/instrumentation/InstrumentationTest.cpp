@@ -1,0 +1,276 @@
+#include "Norv/Instrumentation.h"
+
+#include "RecordedLog.h"
+#include "TestSupport.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <thread>
+#include <type_traits>
+
+#include <unistd.h>
+
+namespace {
+
+using namespace Norv;
+using AgentTest::takeLog;
+using AgentTest::TemporaryFolder;
+using AgentTest::writeFile;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::StartsWith;
+using testing::UnorderedElementsAre;
+
+static_assert(sizeof(Instrumentation) == sizeof(void*));
+static_assert(!std::is_polymorphic_v<Instrumentation>);
+static_assert(!std::is_copy_constructible_v<Instrumentation> && !std::is_copy_assignable_v<Instrumentation>);
+
+constexpr auto powerNodes = NodeLexicon::POWER_MANAGEMENT_NODE;
+constexpr auto powerState = NodeLexicon::POWER_STATE;
+constexpr auto powerStateList = NodeLexicon::POWER_STATE_LIST;
+
+TEST(InstrumentationLibrary, ExportsItsMembersAndNothingElse) {
+    EXPECT_THAT(
+        AgentTest::exportedSymbols(ORV_INSTRUMENTATION_LIBRARY),
+        UnorderedElementsAre(
+            "_ZN4Norv15InstrumentationC1Ev", "_ZN4Norv15InstrumentationC2Ev", "_ZN4Norv15InstrumentationD1Ev",
+            "_ZN4Norv15InstrumentationD2Ev", "_ZN4Norv15Instrumentation10selectNodeENS_11NodeLexicon8NodeTypeE",
+            "_ZN4Norv15InstrumentationcvbEv", "_ZN4Norv15InstrumentationppEv",
+            "_ZN4Norv15Instrumentation13getPathToNodeB5cxx11Ev",
+            "_ZN4Norv15Instrumentation19convertPathToStringERKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE",
+            "_ZN4Norv15Instrumentation11getPropertyENS_11NodeLexicon10PropertiesERSt6vectorIjSaIjEE",
+            "_ZN4Norv15Instrumentation11getPropertyENS_11NodeLexicon10PropertiesERj",
+            "_ZN4Norv15Instrumentation11setPropertyENS_11NodeLexicon10PropertiesERj"));
+}
+
+/** This process's machine: its configuration is read once, so all tests of a cursor share it. */
+class Cursor : public testing::Test {
+protected:
+    static void SetUpTestSuite() {
+        static const TemporaryFolder folder;
+        writeFile(folder / "agent.toml", R"(
+            [instrumentation.simulated]
+            state-file = ")" + (folder / "state.json").string() +
+                                             R"("
+            reboot-time = 3600
+            [[instrumentation.simulated.node]]
+            path = "system"
+            [[instrumentation.simulated.node]]
+            path = "chassis/blade1"
+            power-state = 12
+            power-states = [2, 8]
+            [[instrumentation.simulated.node]]
+            path = "chassis/blade2"
+            power-states = []
+        )");
+        setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
+        Instrumentation firstUse;
+        takeLog();
+    }
+
+    Instrumentation cursor;
+};
+
+/** Every member gives nothing, and leaves what it was handed alone. */
+void expectStandsOnNoNode(Instrumentation& cursor) {
+    EXPECT_FALSE(bool(cursor));
+    EXPECT_EQ(cursor.getPathToNode(), "");
+    unsigned int number = 77;
+    EXPECT_FALSE(cursor.getProperty(powerState, number));
+    EXPECT_EQ(number, 77);
+    std::vector<unsigned int> list = {7, 7};
+    EXPECT_FALSE(cursor.getProperty(powerStateList, list));
+    EXPECT_THAT(list, ElementsAre(7, 7));
+
+    number = 9;
+    EXPECT_FALSE(cursor.setProperty(powerState, number));
+    EXPECT_EQ(number, 9);
+    EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request refused: write of 9 to "
+                                       "property 123: expected a cursor that stands on a node"));
+}
+
+TEST_F(Cursor, StandsOnNoNodeBeforeTheFirstSelection) {
+    expectStandsOnNoNode(cursor);
+    ++cursor;
+    expectStandsOnNoNode(cursor);
+}
+
+TEST_F(Cursor, FindsNoNodeOfAnyOtherType) {
+    for (const int type : {0, 39, 41}) {
+        ASSERT_TRUE(cursor.selectNode(powerNodes));
+        EXPECT_FALSE(cursor.selectNode(static_cast<NodeLexicon::NodeType>(type))) << type;
+        expectStandsOnNoNode(cursor);
+    }
+}
+
+TEST_F(Cursor, WalksTheNodesInTheirOrder) {
+    ASSERT_TRUE(cursor.selectNode(powerNodes));
+    EXPECT_TRUE(bool(cursor));
+    EXPECT_EQ(cursor.getPathToNode(), "/system");
+    EXPECT_EQ(&++cursor, &cursor);
+    EXPECT_EQ(cursor.getPathToNode(), "/chassis/blade1");
+    ++cursor;
+    EXPECT_TRUE(bool(cursor));
+    EXPECT_EQ(cursor.getPathToNode(), "/chassis/blade2");
+    ++cursor;
+    expectStandsOnNoNode(cursor);
+    ++cursor;
+    expectStandsOnNoNode(cursor);
+}
+
+TEST_F(Cursor, BeginsAgainAtTheFirstNodeWithEverySelection) {
+    for (int i = 0; i < 2; ++i) {
+        ASSERT_TRUE(cursor.selectNode(powerNodes));
+        EXPECT_EQ(cursor.getPathToNode(), "/system");
+        ++cursor;
+    }
+}
+
+TEST_F(Cursor, ConvertsPathsToTextWhereverItStands) {
+    EXPECT_EQ(cursor.convertPathToString("/chassis/blade1"), "chassis/blade1");
+    EXPECT_EQ(cursor.convertPathToString("chassis/blade1"), "chassis/blade1");
+    EXPECT_EQ(cursor.convertPathToString("/"), "");
+    EXPECT_EQ(cursor.convertPathToString(""), "");
+}
+
+TEST_F(Cursor, ReadsTheStateAndTheListOfStates) {
+    cursor.selectNode(powerNodes);
+    ++cursor;
+    unsigned int state = 0;
+    EXPECT_TRUE(cursor.getProperty(powerState, state));
+    EXPECT_EQ(state, 12);
+    std::vector<unsigned int> list = {7};
+    EXPECT_TRUE(cursor.getProperty(powerStateList, list));
+    EXPECT_THAT(list, ElementsAre(2, 8));
+    ++cursor;
+    EXPECT_TRUE(cursor.getProperty(powerStateList, list));
+    EXPECT_THAT(list, IsEmpty());
+}
+
+TEST_F(Cursor, HasNoOtherPropertyAndNoneOfTheOtherKind) {
+    cursor.selectNode(powerNodes);
+    unsigned int number = 77;
+    std::vector<unsigned int> list = {7, 7};
+    for (const int property : {0, 122, 124, 125, 126}) {
+        EXPECT_FALSE(cursor.getProperty(static_cast<NodeLexicon::Properties>(property), number)) << property;
+    }
+    for (const int property : {0, 122, 123, 124, 126}) {
+        EXPECT_FALSE(cursor.getProperty(static_cast<NodeLexicon::Properties>(property), list)) << property;
+    }
+    EXPECT_EQ(number, 77);
+    EXPECT_THAT(list, ElementsAre(7, 7));
+}
+
+TEST_F(Cursor, WritesThePowerStateAndReadsItBack) {
+    cursor.selectNode(powerNodes);
+    unsigned int state = 9;
+    EXPECT_TRUE(cursor.setProperty(powerState, state));
+    EXPECT_EQ(state, 9);
+    EXPECT_TRUE(cursor.getProperty(powerState, state));
+    EXPECT_EQ(state, 9);
+    EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request accepted: reboot of simulated "
+                                       "node system, over in 3600 s"));
+}
+
+TEST_F(Cursor, RefusesWhatIsNoPowerRequest) {
+    cursor.selectNode(powerNodes);
+    unsigned int value = 5;
+    EXPECT_FALSE(cursor.setProperty(powerState, value));
+    EXPECT_FALSE(cursor.setProperty(powerStateList, value));
+    EXPECT_EQ(value, 5);
+    EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request refused: power state 5 of "
+                                       "simulated node system: expected 9 (reboot) or 12 (shutdown)",
+                                       "log 10000 Corvane.Instrumentation Power request refused: write of 5 to "
+                                       "property 125 of node system: expected property 123"));
+}
+
+TEST_F(Cursor, MayBeUsedBesideOthersInOtherThreads) {
+    std::vector<std::thread> threads;
+    std::atomic<int> visited = 0;
+    for (int i = 0; i < 4; ++i) {
+        threads.emplace_back([&] {
+            for (int round = 0; round < 50; ++round) {
+                Instrumentation own;
+                unsigned int state = 0;
+                for (own.selectNode(powerNodes); own; ++own) {
+                    visited += own.getProperty(powerState, state) ? 1 : 0;
+                }
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(visited, 4 * 50 * 3);
+}
+
+/** Processes that use the library: the configuration holds for the life of each. */
+class Processes : public testing::Test {
+protected:
+    void configure(const std::string& text) const { writeFile(folder / "agent.toml", text); }
+
+    void configureSimulated(const std::string& nodes, const std::string& rebootTime) const {
+        configure("[instrumentation.simulated]\nstate-file = \"" + stateFile + "\"\nreboot-time = " + rebootTime +
+                  '\n' + nodes);
+    }
+
+    /** What a process writes that runs the commands of probe.cpp. */
+    std::vector<std::string> run(const std::string& commands) const {
+        return AgentTest::linesOf("ORV_AGENT_CONFIG='" + (folder / "agent.toml").string() + "' " +
+                                  ORV_INSTRUMENTATION_PROBE + ' ' + commands);
+    }
+
+    const TemporaryFolder folder;
+    const std::string stateFile = folder / "state.json";
+    const std::string firstUse = "log 4000 Corvane.Instrumentation Power management of a simulated machine: ";
+    const std::string twoNodes = "[[instrumentation.simulated.node]]\npath = \"a\"\n"
+                                 "[[instrumentation.simulated.node]]\npath = \"b/c\"\n";
+};
+
+TEST_F(Processes, SayOnceWhichMachineIsManaged) {
+    configureSimulated(twoNodes, "10");
+    EXPECT_THAT(run("list list"), ElementsAre("a 1 2 5 8", "b/c 1 2 5 8", "a 1 2 5 8", "b/c 1 2 5 8",
+                                              firstUse + "2 nodes, state in " + stateFile));
+    configureSimulated("", "10");
+    EXPECT_THAT(run("list"), ElementsAre("system 1 2 5 8", firstUse + "1 node, state in " + stateFile));
+}
+
+TEST_F(Processes, SeeEachOthersRequests) {
+    configureSimulated(twoNodes, "3600");
+    EXPECT_THAT(run("write b/c 9"), ElementsAre("accepted", StartsWith(firstUse),
+                                                "log 10000 Corvane.Instrumentation Power request accepted: reboot of "
+                                                "simulated node b/c, over in 3600 s"));
+    EXPECT_THAT(run("list write a 12 list"),
+                ElementsAre("a 1 2 5 8", "b/c 9 2 5 8", "accepted", "a 12 2 5 8", "b/c 9 2 5 8", StartsWith(firstUse),
+                            StartsWith("log 10000 Corvane.Instrumentation Power request accepted: shutdown")));
+    configureSimulated(twoNodes, "0");
+    EXPECT_THAT(run("list"), ElementsAre("a 12 2 5 8", "b/c 1 2 5 8", StartsWith(firstUse)));
+}
+
+TEST_F(Processes, OfferNoNodeWhereTheConfigurationCannotBeUsed) {
+    configure("[instrumentation]\nbackend = \"abacus\"\n");
+    EXPECT_THAT(run("list list write system 9"),
+                ElementsAre("refused",
+                            "trace 6000 Corvane.Instrumentation No power-management node is offered: the configuration "
+                            "cannot be used",
+                            "log 10000 Corvane.Instrumentation Power request refused: write of 9 to property 123: no "
+                            "node is offered, the configuration cannot be used"));
+}
+
+TEST_F(Processes, SayThatTheyGoByNoConfigurationFile) {
+    if (std::filesystem::exists("/etc/orv/agent.toml")) {
+        GTEST_SKIP() << "this host has a configuration file";
+    }
+    const std::string state = geteuid() == 0 ? "/var/lib" : folder / "state";
+    EXPECT_EQ(AgentTest::linesOf("env -u ORV_AGENT_CONFIG XDG_STATE_HOME='" + (folder / "state").string() + "' " +
+                                 ORV_INSTRUMENTATION_PROBE + " list")
+                  .back(),
+              "log 6000 Corvane.Instrumentation No configuration file: power management of a simulated machine, 1 "
+              "node, state in " +
+                  state + "/orv/simulated-machine.json");
+}
+
+} // namespace

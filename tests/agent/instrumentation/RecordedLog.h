@@ -1,0 +1,17 @@
+/**
+ * Stands in for the agent's log in the programs that link it: keeps the records instead of writing them.
+ */
+#ifndef TESTS_INSTRUMENTATION_RECORDEDLOG_H
+#define TESTS_INSTRUMENTATION_RECORDEDLOG_H
+
+#include <string>
+#include <vector>
+
+namespace AgentTest {
+
+/** The records since the last call, each as "<kind> <level> <category> <text>". */
+std::vector<std::string> takeLog();
+
+} // namespace AgentTest
+
+#endif

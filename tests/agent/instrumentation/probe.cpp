@@ -1,0 +1,68 @@
+/**
+ * A process that uses the instrumentation library, for the tests of what holds for a process or among several. Runs the
+ * commands of its arguments one after the other, each with a cursor of its own:
+ *
+ *     list               each node: its text, property 123, property 125
+ *     write NODE VALUE   writes property 123 of a node
+ *
+ * and prints what they give, then the log records that were written meanwhile.
+ */
+#include "RecordedLog.h"
+
+#include "Norv/Instrumentation.h"
+
+#include <cstdlib>
+#include <iostream>
+#include <span>
+#include <string>
+#include <vector>
+
+using namespace Norv;
+
+namespace {
+
+void list() {
+    Instrumentation node;
+    node.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);
+    for (; node; ++node) {
+        unsigned int state = 0;
+        std::vector<unsigned int> states;
+        std::cout << node.convertPathToString(node.getPathToNode()) << ' '
+                  << (node.getProperty(NodeLexicon::POWER_STATE, state) ? std::to_string(state) : "unknown");
+        node.getProperty(NodeLexicon::POWER_STATE_LIST, states);
+        for (const unsigned int each : states) {
+            std::cout << ' ' << each;
+        }
+        std::cout << '\n';
+    }
+}
+
+void write(const std::string& path, unsigned int value) {
+    Instrumentation node;
+    node.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);
+    while (node && node.convertPathToString(node.getPathToNode()) != path) {
+        ++node;
+    }
+    std::cout << (node.setProperty(NodeLexicon::POWER_STATE, value) ? "accepted" : "refused") << '\n';
+}
+
+} // namespace
+
+int main(int count, char** values) {
+    const std::span arguments(values, static_cast<std::size_t>(count));
+    for (std::size_t i = 1; i < arguments.size(); ++i) {
+        const std::string command = arguments[i];
+        if (command == "list") {
+            list();
+        } else if (command == "write" && i + 2 < arguments.size()) {
+            write(arguments[i + 1], static_cast<unsigned int>(std::stoul(arguments[i + 2])));
+            i += 2;
+        } else {
+            std::cerr << "unknown command " << command << '\n';
+            return EXIT_FAILURE;
+        }
+    }
+    for (const std::string& record : AgentTest::takeLog()) {
+        std::cout << record << '\n';
+    }
+}

@@ -1,0 +1,51 @@
+/**
+ * What the stand-ins for the agent's libraries answer. They record what they are asked into the transcript.
+ */
+#ifndef SUPPORT_AGENT_H
+#define SUPPORT_AGENT_H
+
+#include "Faults.h"
+#include "cmpidt.h"
+
+#include <atomic>
+#include <functional>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace OrvTest {
+
+/** A power management node of the instrumentation tree. A property without a value is one that the node lacks. */
+struct Node {
+    std::string path;
+    std::optional<unsigned int> powerState;
+    std::optional<std::vector<unsigned int>> powerStates;
+};
+
+/** The script of one test. Faults are found by the name of the member or function, e.g. "selectNode". */
+struct Agent {
+    static Agent& instance();
+
+    /** Back to a machine without nodes. */
+    void reset();
+
+    std::vector<Node> nodes;
+    /** What `setProperty` returns. The nodes above are not changed. */
+    bool acceptsWrites = true;
+    std::string systemName = "managed.example.org";
+    unsigned int language = 7;
+    /** Texts by resource id; an id that is not here is its own text. */
+    std::map<std::wstring, std::wstring> texts;
+    /** What `isObjPathsEqual` returns; false where there is none. */
+    std::function<bool(const CMPIObjectPath*, const CMPIObjectPath*, bool)> pathsEqual;
+    Faults faults;
+
+    /** Objects of each class that live now. */
+    std::atomic<int> messageBuffers = 0;
+    std::atomic<int> instrumentations = 0;
+};
+
+} // namespace OrvTest
+
+#endif

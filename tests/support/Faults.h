@@ -1,0 +1,80 @@
+/**
+ * What goes wrong on purpose: which call, which time, and how.
+ */
+#ifndef SUPPORT_FAULTS_H
+#define SUPPORT_FAULTS_H
+
+#include "cmpidt.h"
+
+#include <functional>
+#include <map>
+#include <mutex>
+#include <optional>
+#include <string>
+
+namespace OrvTest {
+
+/** How a call departs from the usual. */
+struct Fault {
+    enum class Object { usual, null, withoutHandle };
+
+    /** What the call returns, where it returns an object. */
+    Object object = Object::usual;
+    /** The code and message that the call reports instead of CMPI_RC_OK. */
+    std::optional<CMPIrc> status = {};
+    CMPIString* message = nullptr;
+    /** Leaves the caller's status as it is. */
+    bool leavesStatus = false;
+    /** Done first; may throw, then the call does nothing else. */
+    std::function<void()> action = {};
+};
+
+inline Fault nullObject(CMPIrc status = CMPI_RC_ERR_FAILED) {
+    return {.object = Fault::Object::null, .status = status};
+}
+
+inline Fault objectWithoutHandle(CMPIrc status = CMPI_RC_ERR_FAILED) {
+    return {.object = Fault::Object::withoutHandle, .status = status};
+}
+
+inline Fault reports(CMPIrc status, CMPIString* message = nullptr) {
+    return {.status = status, .message = message};
+}
+
+inline Fault leavesStatus() {
+    return {.leavesStatus = true};
+}
+
+template <typename Exception>
+Fault throws(Exception exception) {
+    return {.action = [exception] { throw exception; }};
+}
+
+/** The faults of one party; may be asked from several threads at once. */
+class Faults {
+public:
+    /** Makes the `occurrence`th call of that name from now on (1 is the next one) go wrong. */
+    void at(const std::string& call, unsigned int occurrence, Fault fault);
+
+    /** Makes every call of that name go wrong, where `at` does not say otherwise. */
+    void always(const std::string& call, Fault fault);
+
+    /** To be asked once by each call: what is to go wrong now. Passes on what the fault's action throws. */
+    Fault next(const std::string& call);
+
+    void clear();
+
+private:
+    struct Plan {
+        unsigned int count = 0;
+        std::map<unsigned int, Fault> faults;
+        Fault usual;
+    };
+
+    std::mutex _mutex;
+    std::map<std::string, Plan> _plans;
+};
+
+} // namespace OrvTest
+
+#endif

@@ -1,0 +1,98 @@
+/**
+ * The one list of everything that a test's provider did: broker calls, log records, calls on the agent's libraries.
+ */
+#ifndef SUPPORT_TRANSCRIPT_H
+#define SUPPORT_TRANSCRIPT_H
+
+#include <cstdint>
+#include <map>
+#include <mutex>
+#include <string>
+#include <unordered_map>
+#include <variant>
+#include <vector>
+
+namespace OrvTest {
+
+using Lines = std::vector<std::string>;
+
+/** One record as the log library got it. */
+struct LogRecord {
+    enum class Kind { log, trace };
+
+    Kind kind;
+    int level;
+    std::string category;
+    std::string function;
+    std::string file;
+    int line;
+    std::string text;
+    /** Whether the three arguments without a name were null, 0 and 0. */
+    bool usualArguments;
+
+    bool operator==(const LogRecord&) const = default;
+};
+
+/**
+ * The transcript of one process; may be written from several threads at once.
+ *
+ * There are calls, which a test compares, and readings: looking at texts and states, which a provider may do as often
+ * as it likes (a string's characters, a path's namespace, the system name, a message buffer).
+ */
+class Transcript {
+public:
+    static Transcript& instance();
+
+    void call(std::string line);
+    void reading(std::string line);
+    void record(LogRecord record);
+
+    /**
+     * The calls in order, one line each, made comparable:
+     * - a log record and the equal trace record after it are one line "log+trace LEVEL CATEGORY FUNCTION FILE: TEXT";
+     *   records that do not come in such pairs stay lines of their own and keep their line numbers;
+     * - where the line number in a pair's text is the record's own, it reads "<line>" and FILE has none. Marks of
+     *   Trace.h report from lines of their own: FILE keeps its line there, and the caller's line in the text is
+     * "<line>";
+     * - an address in a text is "&NAME" where it belongs to a named object, else "<address>".
+     */
+    Lines calls() const;
+
+    /** Calls and readings in order, nothing folded and nothing replaced. */
+    Lines everything() const;
+
+    /** Forgets lines and numbers, not the names of objects, and ends a pause. */
+    void clear();
+
+    /** Keeps no line and no name until the next `clear`, for tests that do a great deal and look at results only. */
+    void pause();
+
+    /** A name for the next object of a kind: "path#1", "path#2", ... */
+    std::string nextName(const std::string& kind);
+
+    /** Names what stands at an address, until `forget`. */
+    void name(const void* address, const std::string& name);
+    void forget(const void* address);
+
+    /** The object's name, "null" or "<address>". */
+    std::string nameOf(const void* address) const;
+
+private:
+    struct Reading {
+        std::string line;
+    };
+    using Entry = std::variant<std::string, Reading, LogRecord>;
+
+    void add(Entry entry);
+    std::string withNames(const std::string& text) const;
+
+    mutable std::mutex _mutex;
+    std::vector<Entry> _entries;
+    std::map<std::string, unsigned int> _numbers;
+    std::unordered_map<std::uintptr_t, std::string> _names;
+    bool _paused = false;
+};
+
+} // namespace OrvTest
+
+#endif

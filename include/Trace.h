@@ -1,0 +1,173 @@
+/**
+ * What the provider library reports about itself: fixed line shapes, and records that go to the agent's log and to its
+ * trace.
+ *
+ * Every record is written twice with the same arguments, first as a log record and then as a trace record. Log files
+ * are read by tools: the texts, and the line numbers of the markers, never change.
+ */
+#ifndef TRACE_H
+#define TRACE_H
+
+#include "OrvLog/OrvLogger.h"
+#include "OrvLog/OrvMessageBuffer.h"
+
+#include <cstdarg>
+#include <cstddef>
+#include <cstdio>
+#include <cstring>
+#include <string>
+
+namespace Norv {
+
+/** The kind of a line. The numbers are fixed. */
+enum MessageType : int {
+    /** A function was entered. */
+    ENTERING = 0,
+    /** A function is about to return. */
+    EXITING = 1,
+    /** A method was invoked. */
+    METHOD = 2,
+    /** Free text. */
+    MESSAGE = 3,
+};
+
+/** Levels of records: the higher, the more important. */
+inline constexpr int progressLevel = 3000;
+inline constexpr int operationLevel = 4000;
+inline constexpr int failureLevel = 6000;
+
+/** A place in the source that reports something. */
+struct Site {
+    /** The function's own name, without scope and arguments. */
+    const char* function;
+    /** The source file as the build knows it. */
+    const char* file;
+    unsigned int line;
+
+    /** The place of the call; as a default argument, the place of the call that leaves it out. */
+    static constexpr Site here(const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
+                               unsigned int line = __builtin_LINE()) {
+        return Site{function, file, line};
+    }
+
+    /** The same function and file at the line of the call: for what a function reports through a helper of its own. */
+    constexpr Site atLine(unsigned int currentLine = __builtin_LINE()) const {
+        return Site{function, file, currentLine};
+    }
+};
+
+/** Size in bytes of each helper's text buffer; longer texts are cut. */
+inline constexpr std::size_t messageBufferSize = 512;
+
+/** Clears the buffer, formats into it as printf does, cutting what is too long, and returns it. */
+[[gnu::format(printf, 2, 3)]] inline char* formatMessage(char (&buffer)[messageBufferSize], const char* format, ...) {
+    std::memset(buffer, 0, sizeof buffer);
+    std::va_list arguments;
+    va_start(arguments, format);
+    std::vsnprintf(buffer, sizeof buffer, format, arguments);
+    va_end(arguments);
+    return buffer;
+}
+
+/**
+ * A line about a function or a free text.
+ *
+ * Each of the four formatting helpers has one buffer per thread, which its next call in that thread overwrites.
+ *
+ * @param text the function's name, or the free text where the type is MESSAGE.
+ * @param type any other value than the four gives the shape of ENTERING.
+ * @return the line in the helper's buffer.
+ */
+inline char* trace(const char* text, const char* file, unsigned int line, MessageType type) {
+    static thread_local char messageBuffer[messageBufferSize];
+    switch (type) {
+    case METHOD:
+        return formatMessage(messageBuffer, "METHOD: %s() was invoked in %s [Line: %d]", text, file,
+                             static_cast<int>(line));
+    case MESSAGE:
+        return formatMessage(messageBuffer, "MESSAGE [File: %s, Line: %d]: %s", file, static_cast<int>(line), text);
+    case EXITING:
+        return formatMessage(messageBuffer, "EXITING: %s() in %s [Line: %d]", text, file, static_cast<int>(line));
+    case ENTERING:
+    default:
+        return formatMessage(messageBuffer, "ENTERING: %s() in %s [Line: %d]", text, file, static_cast<int>(line));
+    }
+}
+
+/** As `trace`, with the function's parameters behind the line: labels and values in one text. */
+inline char* tracepara(const char* text, const char* file, unsigned int line, const char* parameters,
+                       MessageType type) {
+    static thread_local char messageBuffer[messageBufferSize];
+    switch (type) {
+    case METHOD:
+        return formatMessage(messageBuffer, "METHOD: %s() was invoked in %s [Line: %d],Parameters List: %s", text, file,
+                             static_cast<int>(line), parameters);
+    case MESSAGE:
+        return formatMessage(messageBuffer, "MESSAGE [File: %s, Line: %d]: %s,Parameters List: %s", file,
+                             static_cast<int>(line), text, parameters);
+    case EXITING:
+        return formatMessage(messageBuffer, "EXITING: %s() in %s [Line: %d],Parameters List: %s", text, file,
+                             static_cast<int>(line), parameters);
+    case ENTERING:
+    default:
+        return formatMessage(messageBuffer, "ENTERING: %s() in %s [Line: %d],Parameters List: %s", text, file,
+                             static_cast<int>(line), parameters);
+    }
+}
+
+/** A line about a variable that holds a text. */
+inline char* trace(const char* variable, const char* file, unsigned int line, const char* value) {
+    static thread_local char messageBuffer[messageBufferSize];
+    return formatMessage(messageBuffer, "VARIABLE: '%s' has Value '%s' at line %d in %s", variable, value,
+                         static_cast<int>(line), file);
+}
+
+/** A line about a variable that holds a number. */
+inline char* trace(const char* variable, const char* file, unsigned int line, unsigned int value) {
+    static thread_local char messageBuffer[messageBufferSize];
+    return formatMessage(messageBuffer, "VARIABLE: '%s' has Value '%d' at line %d in %s", variable,
+                         static_cast<int>(value), static_cast<int>(line), file);
+}
+
+/**
+ * Writes one record, to the log and then to the trace.
+ *
+ * @param category the reporting file's category.
+ * @param text gives the record's text; called once for each of the two, since the helpers' buffers are shared.
+ */
+template <typename Text>
+void writeRecord(const std::string& category, int level, const Site& site, Text text) {
+    const int line = static_cast<int>(site.line);
+    OrvLog::OrvMessageBuffer buffer;
+    OrvLog::OrvLogger::logLevelMessage(site.function, site.file, line, category, level, nullptr, 0, 0,
+                                       OrvLog::OrvMessageBuffer::str(buffer << text()));
+    OrvLog::OrvLogger::traceLevelMessage(site.function, site.file, line, category, level, nullptr, 0, 0,
+                                         OrvLog::OrvMessageBuffer::str(buffer << text()));
+}
+
+/** The line that sets one operation of a provider off from the next. */
+inline constexpr const char* separatorLine =
+    "==============================================================================";
+
+/**
+ * Marks the beginning of a provider's operation.
+ *
+ * @param logger the category of the provider's file.
+ * @param function,file,line the operation, and where it begins.
+ */
+inline void markProviderEntry(const std::string& logger, const char* function, const char* file, unsigned int line) {
+    writeRecord(logger, operationLevel, Site{"markProviderEntry", __FILE__, 336}, [] { return separatorLine; });
+    writeRecord(logger, operationLevel, Site{"markProviderEntry", __FILE__, 337},
+                [=] { return trace(function, file, line, ENTERING); });
+}
+
+/** Marks the end of a provider's operation; the arguments are those of `markProviderEntry`. */
+inline void markProviderExit(const std::string& logger, const char* function, const char* file, unsigned int line) {
+    writeRecord(logger, operationLevel, Site{"markProviderExit", __FILE__, 348},
+                [=] { return trace(function, file, line, EXITING); });
+    writeRecord(logger, operationLevel, Site{"markProviderExit", __FILE__, 349}, [] { return separatorLine; });
+}
+
+} // namespace Norv
+
+#endif

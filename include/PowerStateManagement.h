@@ -1,0 +1,101 @@
+/**
+ * The power-managed elements of the machine, as the agent's instrumentation tree shows them.
+ */
+#ifndef POWERSTATEMANAGEMENT_H
+#define POWERSTATEMANAGEMENT_H
+
+#include <exception>
+#include <map>
+#include <string>
+#include <vector>
+
+namespace Norv {
+
+/** Why a record could not be filled. Owns its text. */
+class ProviderException : public std::exception {
+public:
+    explicit ProviderException(const char* message) : _message(message) {}
+
+    const char* what() const noexcept override { return _message.c_str(); }
+
+private:
+    std::string _message;
+};
+
+namespace PowerStateManagementServiceProvider {
+
+/**
+ * One power-managed element: the names it goes by and its power state (CIM_PowerManagementService and
+ * CIM_PowerManagementCapabilities, DMTF DSP1027). A plain value: copies share nothing.
+ *
+ * A setter of a text stores its argument and reports whether it is not empty.
+ */
+class PowerStateManagement {
+public:
+    bool setName(std::string name);
+    bool setElementName(std::string elementName);
+    bool setInstanceID(std::string instanceID);
+    bool setCapabilitiesElementName(std::string capabilitiesElementName);
+
+    /**
+     * Stores the power state.
+     *
+     * @param powerState the state as the instrumentation tree counts it: 1 running, 8 hibernating, 10 off. The record
+     *                   keeps the code of CIM_AssociatedPowerManagementService.PowerState: 2 (On), 7 (Hibernate),
+     *                   12 (Off - Soft Graceful), and 1 (Other) for everything else.
+     * @return true.
+     */
+    bool setPowerState(unsigned int powerState);
+
+    /** Both advertise fixed lists, whatever the tree offers: the argument is ignored. Return true. */
+    bool setPowerChangeCapabilities(std::vector<unsigned int> codes);
+    bool setPowerStatesSupported(std::vector<unsigned int> codes);
+
+    std::string getName();
+    std::string getElementName();
+    std::string getInstanceID();
+    std::string getCapabilitiesElementName();
+
+    /** 0 where no power state was stored. */
+    unsigned short getPowerState();
+
+    /** Always 12 (Off - Soft Graceful), which is stored as well. */
+    unsigned short getRequestedPowerState();
+
+    /**
+     * Appends 2 (On), 5 (Power Cycle Off - Soft) and 8 (Off - Soft) to the stored list and returns all of it: a second
+     * call on the same record returns six codes.
+     */
+    std::vector<unsigned short> getPowerStatesSupported();
+
+    /** As `getPowerStatesSupported`, with 3 (Power State Settable), 4 (Power Cycling Supported) and 8 (Graceful). */
+    std::vector<unsigned short> getPowerChangeCapabilities();
+
+private:
+    std::string _name;
+    std::string _elementName;
+    std::string _instanceID;
+    std::vector<unsigned short> _powerChangeCapabilities;
+    std::string _capabilitiesElementName;
+    std::vector<unsigned short> _powerStatesSupported;
+    unsigned short _powerState = 0;
+    unsigned short _requestedPowerState = 0;
+};
+
+/**
+ * Reads the power-management nodes of the instrumentation tree.
+ *
+ * @param[in,out] instances receives a record for each node; what it holds already stays, unless a node has the same
+ * key.
+ * @param keyProperty "Name" or an empty text keys the records by name, "InstanceID" by instance ID; with any other text
+ *                    no record is stored.
+ * @return 0 when the whole tree was read; 1 when it has no power-management node, or when reading it failed: then the
+ *         reason is written to standard error, and the records of the nodes before are in the map.
+ */
+unsigned short getPowerStateManagementInstances(std::map<std::string, PowerStateManagement>& instances,
+                                                std::string keyProperty);
+
+} // namespace PowerStateManagementServiceProvider
+} // namespace Norv
+
+#endif

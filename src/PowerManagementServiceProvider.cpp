@@ -1,0 +1,147 @@
+/**
+ * TALVO_PowerManagementService: one instance for each power-managed element, and the method RequestPowerStateChange,
+ * which reboots the machine or shuts it down (CIM_PowerManagementService, DMTF DSP1027).
+ */
+#include "ProviderSupport.h"
+
+#include "Norv/Instrumentation.h"
+
+namespace Norv::PowerStateManagementServiceProvider {
+
+static const CMPIBroker* broker = nullptr;
+static const std::string loggerPowerMgmtService = "Corvane.PowerMgmtSvcProvider";
+static constexpr const char* key = "Name";
+static constexpr const char* requestPowerStateChangeMethod = "RequestPowerStateChange";
+
+static const ElementProvider provider = {
+    loggerPowerMgmtService,
+    key,
+    &PowerStateManagementObjFactory::getAllPMCMPIObjPaths,
+    &PowerStateManagementObjFactory::getAllPMCMPIInstances,
+    &PowerStateManagementObjFactory::getOnePMCMPIInstance,
+    "*** getOnePMCMPIInstance Failed: No Instance found***",
+    "getAllPMCMPIInstances Failed",
+};
+
+ORV_FIXED_INSTANCE_OPERATIONS(PowerManagementService)
+
+static CMPIStatus PowerManagementService_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext*,
+                                                           const CMPIResult* result, const CMPIObjectPath* objectPath) {
+    return enumInstanceNames(provider, broker, result, objectPath);
+}
+
+static CMPIStatus PowerManagementService_EnumInstances(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
+                                                       const CMPIObjectPath* objectPath, char const** properties) {
+    return enumInstances(provider, broker, result, objectPath, properties);
+}
+
+static CMPIStatus PowerManagementService_GetInstance(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
+                                                     const CMPIObjectPath* objectPath, char const** properties) {
+    return getInstance(provider, broker, result, objectPath, properties);
+}
+
+/** A power state that a client can ask for, and the write to the instrumentation tree that brings it about. */
+struct PowerStateChange {
+    CMPIUint16 powerState;
+    unsigned int written;
+    const char* failed;
+};
+
+static constexpr PowerStateChange powerStateChanges[] = {
+    {5, 9, "setProperty() falied to Reboot"},
+    {8, 12, "setProperty() falied to Shutdown"},
+};
+
+static const PowerStateChange* findPowerStateChange(CMPIUint16 powerState) {
+    for (const PowerStateChange& change : powerStateChanges) {
+        if (change.powerState == powerState) {
+            return &change;
+        }
+    }
+    return nullptr;
+}
+
+/** Whether a datetime argument is given and holds a value. A given argument is read again before its handle counts. */
+static bool isDateTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status) {
+    if (dateTimeOf(CMGetArg(in, name, status)) == nullptr) {
+        return false;
+    }
+    const CMPIDateTime* const dateTime = dateTimeOf(CMGetArg(in, name, status));
+    return !CMIsNullObject(dateTime);
+}
+
+/** Writes the change to the machine's power-management node. A failure is in the log only. */
+static void changePowerState(Instrumentation& instrumentation, const PowerStateChange& change, const Site& operation) {
+    instrumentation.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);
+    if (!instrumentation) {
+        logMessage(loggerPowerMgmtService, progressLevel, "No Instrumentation node found. ", operation.atLine());
+    }
+    logMessage(loggerPowerMgmtService, progressLevel,
+               "Entering try catch block to execute Shutdown/Reboot as requested", operation.atLine());
+    unsigned int value = change.written;
+    if (!instrumentation.setProperty(NodeLexicon::POWER_STATE, value)) {
+        logMessage(loggerPowerMgmtService, progressLevel, change.failed, operation.atLine());
+    }
+}
+
+/** What became of a request: a refused one leaves the result open and without a value. */
+enum class Outcome { answered, refused };
+
+/**
+ * RequestPowerStateChange, up to its result.
+ *
+ * @param in the method's arguments; the object path "ManagedElement" is released once the change was tried.
+ * @param operation the operation that reports.
+ */
+static Outcome requestPowerStateChange(const CMPIArgs* in, CMPIStatus* status, const Site& operation) {
+    const auto refuse = [](const char* reason, const Site& site) {
+        logMessage(loggerPowerMgmtService, failureLevel, reason, site);
+        return Outcome::refused;
+    };
+    if (isDateTimeGiven(in, "TimeoutPeriod", status)) {
+        return refuse("Use Of Timeout Period Not Supported", operation.atLine());
+    }
+    if (isDateTimeGiven(in, "Time", status)) {
+        return refuse("Use Of Time Property Not Supported", operation.atLine());
+    }
+    const CMPIUint16 powerState = CMGetArg(in, "PowerState", status).value.uint16;
+    logVariable(loggerPowerMgmtService, "powerState", static_cast<unsigned int>(powerState), operation.atLine());
+    const PowerStateChange* const change = findPowerStateChange(powerState);
+    if (change == nullptr) {
+        return refuse("Requested Power State change Not Supported", operation.atLine());
+    }
+    CMPIObjectPath* const managedElement = referenceOf(CMGetArg(in, "ManagedElement", status));
+    if (!CMIsNullObject(managedElement)) {
+        Instrumentation instrumentation;
+        changePowerState(instrumentation, *change, operation);
+        CMRelease(managedElement);
+    }
+    return Outcome::answered;
+}
+
+ORV_FIXED_OPERATION(PowerManagementService_MethodCleanup, CMPI_RC_OK, CMPIMethodMI*, const CMPIContext*, CMPIBoolean)
+
+static CMPIStatus PowerManagementService_InvokeMethod(CMPIMethodMI*, const CMPIContext*, const CMPIResult* result,
+                                                      const CMPIObjectPath* objectPath, const char* methodName,
+                                                      const CMPIArgs* in, CMPIArgs*) {
+    Operation operation(loggerPowerMgmtService, Site::here());
+    const CMPIString* const className = CMGetClassName(objectPath, &operation.status);
+    const PowerStateManagementObjFactory factory(key);
+
+    if (isText(textOf(className), powerManagementServiceClass) && isText(methodName, requestPowerStateChangeMethod) &&
+        requestPowerStateChange(in, &operation.status, operation.site()) == Outcome::refused) {
+        return operation.status;
+    }
+
+    // Whatever was found on the way, the method reports that it completed.
+    const CMPIUint32 value = 0;
+    operation.markExit();
+    CMReturnData(result, &value, CMPI_uint32);
+    CMReturnDone(result);
+    return operation.status;
+}
+
+CMInstanceMIStub(PowerManagementService_, PowerManagementServiceProvider, broker, CMNoHook)
+CMMethodMIStub(PowerManagementService_, PowerManagementServiceProvider, broker, CMNoHook)
+
+} // namespace Norv::PowerStateManagementServiceProvider

@@ -1,0 +1,599 @@
+#include "ProviderSupport.h"
+
+#include "Norv/Common.h"
+
+namespace Norv::PowerStateManagementServiceProvider {
+
+void logMessage(const std::string& category, int level, const char* text, const Site& site) {
+    writeRecord(category, level, site, [&] { return trace(text, site.file, site.line, MESSAGE); });
+}
+
+void logVariable(const std::string& category, const char* variable, const char* value, const Site& site) {
+    writeRecord(category, operationLevel, site, [&] { return trace(variable, site.file, site.line, value); });
+}
+
+void logVariable(const std::string& category, const char* variable, unsigned int value, const Site& site) {
+    writeRecord(category, operationLevel, site, [&] { return trace(variable, site.file, site.line, value); });
+}
+
+CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, const char* className,
+                             CMPIStatus* status) {
+    CMPIObjectPath* const path = CMNewObjectPath(broker, nameSpace, className, status);
+    if (CMIsNullObject(path)) {
+        return nullptr;
+    }
+    CMSetNameSpace(path, nameSpace);
+    CMSetHostname(path, getSystemName().c_str());
+    return path;
+}
+
+namespace {
+
+/** Visits the objects in order until a visit returns false; whether none did. Objects are counted in 16 bits. */
+template <typename Object, typename Visit>
+bool forEach(const std::vector<Object*>& objects, Visit visit) {
+    const auto count = static_cast<unsigned short>(objects.size());
+    for (unsigned short i = 0; i < count; ++i) {
+        if (!visit(objects.at(i))) {
+            return false;
+        }
+    }
+    return true;
+}
+
+void returnAll(const CMPIResult* result, const std::vector<CMPIObjectPath*>& paths) {
+    forEach(paths, [result](const CMPIObjectPath* path) {
+        CMReturnObjectPath(result, path);
+        return true;
+    });
+}
+
+void returnAll(const CMPIResult* result, const std::vector<CMPIInstance*>& instances) {
+    forEach(instances, [result](const CMPIInstance* instance) {
+        CMReturnInstance(result, instance);
+        return true;
+    });
+}
+
+/** Returns the first of the instances whose path equals the requested one under `flag`, if there is one. */
+void returnFirstMatch(const CMPIResult* result, const std::vector<CMPIInstance*>& instances,
+                      const CMPIObjectPath* objectPath, bool flag, CMPIStatus* status) {
+    forEach(instances, [&](const CMPIInstance* instance) {
+        if (CMIsNullObject(instance)) {
+            return true;
+        }
+        const CMPIObjectPath* const path = CMGetObjectPath(instance, status);
+        if (!isObjPathsEqual(objectPath, path, flag)) {
+            return true;
+        }
+        CMReturnInstance(result, instance);
+        return false;
+    });
+}
+
+} // namespace
+
+CMPIStatus enumInstanceNames(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
+                             const CMPIObjectPath* objectPath, const Site& site) {
+    Operation operation(provider.category, site);
+    PowerStateManagementObjFactory factory(provider.key);
+    std::vector<CMPIObjectPath*> paths;
+    paths.reserve(factory.getNumberOfInstances());
+    if ((factory.*provider.allObjectPaths)(broker, objectPath, paths, &operation.status) != 0) {
+        return operation.fail("***Can't get ObjectPaths.                     Exiting EnumerateInstanceNames***");
+    }
+    returnAll(result, paths);
+    return operation.complete(result);
+}
+
+CMPIStatus enumInstances(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
+                         const CMPIObjectPath* objectPath, char const** properties, const Site& site) {
+    Operation operation(provider.category, site);
+    PowerStateManagementObjFactory factory(provider.key);
+    std::vector<CMPIInstance*> instances;
+    instances.reserve(factory.getNumberOfInstances());
+    if ((factory.*provider.allInstances)(broker, objectPath, properties, false, instances, &operation.status) != 0) {
+        return operation.fail("***Could not get instances,                      exiting EnumerateInstance***");
+    }
+    returnAll(result, instances);
+    return operation.complete(result);
+}
+
+CMPIStatus getInstance(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
+                       const CMPIObjectPath* objectPath, char const** properties, const Site& site) {
+    Operation operation(provider.category, site);
+    if (CMGetKeyCount(objectPath, &operation.status) == 0) {
+        operation.report("At least one key should be passed");
+        return operation.complete(result);
+    }
+
+    CMPIString* const key = stringOf(CMGetKey(objectPath, provider.key, &operation.status));
+    PowerStateManagementObjFactory factory(provider.key);
+    std::vector<CMPIInstance*> instances;
+    instances.reserve(factory.getNumberOfInstances());
+    if (!CMIsNullObject(key)) {
+        if ((factory.*provider.oneInstance)(broker, objectPath, key, properties, instances, &operation.status) != 0) {
+            return operation.fail(provider.lookupFailed);
+        }
+        returnAll(result, instances);
+    } else {
+        if ((factory.*provider.allInstances)(broker, objectPath, properties, false, instances, &operation.status) !=
+            0) {
+            return operation.fail(provider.scanFailed);
+        }
+        returnFirstMatch(result, instances, objectPath, false, &operation.status);
+    }
+    return operation.complete(result);
+}
+
+namespace {
+
+/** The keys by which services and capabilities are had from a factory. */
+constexpr const char* srcKey = "Name";
+constexpr const char* targetKey = "InstanceID";
+
+/** The records that power states are taken from: one copy for a whole operation. */
+Records recordsFor(PowerStates powerStates, PowerStateManagementObjFactory& factory) {
+    return powerStates == PowerStates::none ? Records() : factory.getPowerStateManagementMap();
+}
+
+void setEnds(const AssociationProvider& provider, const CMPIInstance* association, const CMPIObjectPath* first,
+             const CMPIObjectPath* second) {
+    CMSetProperty(association, provider.first.role, &first, CMPI_ref);
+    CMSetProperty(association, provider.second.role, &second, CMPI_ref);
+}
+
+void setPowerStates(const CMPIInstance* association, PowerStateManagement& record) {
+    const CMPIUint16 powerState = record.getPowerState();
+    const CMPIUint16 requestedPowerState = record.getRequestedPowerState();
+    CMSetProperty(association, "PowerState", &powerState, CMPI_uint16);
+    CMSetProperty(association, "RequestedPowerState", &requestedPowerState, CMPI_uint16);
+}
+
+/** Whether two names of classes are the same: letter case is ignored, whatever the process's locale. */
+bool isSameName(const char* left, const char* right) {
+    const auto lower = [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; };
+    while (*left != '\0' && lower(*left) == lower(*right)) {
+        ++left;
+        ++right;
+    }
+    return lower(*left) == lower(*right);
+}
+
+/** Whether a request that may name a result class asks for this end. */
+bool isResultClass(const AssociationEnd& end, const char* resultClass) {
+    return end.resultClassAlias == nullptr || resultClass == nullptr || isSameName(resultClass, end.className) ||
+           isSameName(resultClass, end.resultClassAlias);
+}
+
+/** One request to the provider of an association, from the frame that all its operations have in common. */
+class AssociationRequest {
+public:
+    /** `ref` is the path that the request came with: the class of an enumeration, or the source of a traversal. */
+    AssociationRequest(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
+                       const CMPIObjectPath* ref, const Site& site)
+        : operation(provider.category, site), factory(srcKey), _provider(provider), _broker(broker), _context(context),
+          _ref(ref) {}
+
+    Operation operation;
+    /** The services. */
+    PowerStateManagementObjFactory factory;
+
+    /** The namespace of the request. */
+    const char* nameSpace() { return textOf(CMGetNameSpace(_ref, &operation.status)); }
+
+    /**
+     * Visits the pairs of object paths, one of each end, until a visit fails.
+     *
+     * @return whether none did, and no step: a failed step has been reported.
+     */
+    template <typename Visit>
+    bool forEachPair(const PairTexts& texts, Visit visit) {
+        return forEachPathOf(_provider.first, nullptr, texts, [&](CMPIObjectPath* first) {
+            return forEachPathOf(_provider.second, first, texts,
+                                 [&](CMPIObjectPath* second) { return visit(first, second); });
+        });
+    }
+
+    /** A path of the association without keys; null, which is reported, where the broker cannot make it. */
+    CMPIObjectPath* newAssociationPath(const PairTexts& texts) {
+        CMPIObjectPath* const path = newClassPath(_broker, nameSpace(), _provider.className, &operation.status);
+        isUsable(path, texts.associationPathFailed);
+        return path;
+    }
+
+    /** Finds the far end of a traversal; false where source and association do not belong together. */
+    bool resolve(const char* assocClass, const char* resultClass) {
+        _target = factory.get_assoc_targetClass_ObjectPath(_broker, _ref, assocClass, resultClass, &operation.status);
+        return !CMIsNullObject(_target);
+    }
+
+    /** Finds the far end of a reference. The association is always this provider's own, whatever is asked for. */
+    bool resolveReference() {
+        const bool resolved = resolve(_provider.className, nullptr);
+        _referencePath = CMNewObjectPath(_broker, nameSpace(), _provider.className, &operation.status);
+        return resolved;
+    }
+
+    /** The far end, once it is resolved; null where it is none of this association's. */
+    const AssociationEnd* farEnd() {
+        const char* const className = textOf(CMGetClassName(_target, &operation.status));
+        if (isText(className, _provider.first.className)) {
+            return &_provider.first;
+        }
+        return isText(className, _provider.second.className) ? &_provider.second : nullptr;
+    }
+
+    /** Visits the path of each object at the far end; false, with `notAvailable` reported, where they can't be had. */
+    template <typename Visit>
+    bool forEachFarPath(const AssociationEnd& end, const char* notAvailable, Visit visit) {
+        return forEachPath(end, _target, notAvailable, [&](const CMPIObjectPath* path) {
+            visit(path);
+            return true;
+        });
+    }
+
+    /** As `forEachFarPath`, for instances; another provider's come with all their properties. */
+    template <typename Visit>
+    bool forEachFarInstance(const AssociationEnd& end, char const** properties, bool keysOnly, const char* notAvailable,
+                            Visit visit) {
+        const auto visitOne = [&](const CMPIInstance* instance) {
+            visit(instance);
+            return true;
+        };
+        if (end.source == ObjectSource::objectManager) {
+            const CMPIEnumeration* const all = CBEnumInstances(_broker, _context, _target, nullptr, &operation.status);
+            return forEachEnumerated(
+                all, notAvailable, [](const CMPIData& data) { return data.value.inst; }, visitOne);
+        }
+        const auto all = end.source == ObjectSource::services
+                             ? &PowerStateManagementObjFactory::getAllPMCMPIInstances
+                             : &PowerStateManagementObjFactory::getAllPMCapCMPIInstances;
+        return forEachMade<CMPIInstance>(
+            end, notAvailable,
+            [&](PowerStateManagementObjFactory& source, std::vector<CMPIInstance*>& instances) {
+                return (source.*all)(_broker, _target, properties, keysOnly, instances, &operation.status);
+            },
+            visitOne);
+    }
+
+    /** An association of the far end's class without properties; null where the broker cannot make it. */
+    const CMPIInstance* newReference() {
+        const CMPIInstance* const reference = CMNewInstance(_broker, _referencePath, &operation.status);
+        return CMIsNullObject(reference) ? nullptr : reference;
+    }
+
+    /** Makes an association refer to the source and to an object at the far end. */
+    void setReferenceEnds(const CMPIInstance* reference, const AssociationEnd& end, const CMPIObjectPath* far) const {
+        const bool farIsFirst = &end == &_provider.first;
+        setEnds(_provider, reference, farIsFirst ? far : _ref, farIsFirst ? _ref : far);
+    }
+
+    /** Puts a path into the namespace of the request and on the managed system. */
+    void place(const CMPIObjectPath* path) {
+        CMSetNameSpace(path, nameSpace());
+        CMSetHostname(path, getSystemName().c_str());
+    }
+
+private:
+    bool isUsable(const CMPIObjectPath* path, const char* failure) const {
+        const bool usable = !CMIsNullObject(path);
+        if (!usable) {
+            operation.report(failure);
+        }
+        return usable;
+    }
+
+    /**
+     * Visits the paths of an end for an enumeration, those of this library's classes in the request's namespace.
+     *
+     * @param outer the path that the walk stands on at the first end; null for the first end itself.
+     */
+    template <typename Visit>
+    bool forEachPathOf(const AssociationEnd& end, const CMPIObjectPath* outer, const PairTexts& texts, Visit visit) {
+        if (end.source == ObjectSource::objectManager) {
+            const CMPIObjectPath* const classPath =
+                CMNewObjectPath(_broker, nameSpace(), end.className, &operation.status);
+            return isUsable(classPath, "Create CMPIObjectPath failed for ComputerSystemClass.") &&
+                   forEachPath(end, classPath, computerSystemsNotAvailable, visit);
+        }
+        const bool areServices = end.source == ObjectSource::services;
+        const char* const notAvailable = areServices ? texts.servicesNotAvailable : texts.capabilitiesNotAvailable;
+        return forEachPath(end, _ref, notAvailable, [&](CMPIObjectPath* path) {
+            // Before a capabilities object's path, it is the service's path that is tested once more.
+            if (!(areServices ? isUsable(path, texts.servicePathNull) : isUsable(outer, texts.capabilitiesPathNull))) {
+                return false;
+            }
+            CMSetNameSpace(path, nameSpace());
+            return visit(path);
+        });
+    }
+
+    /** Visits the paths of an end, made after `classPath`, until a visit returns false; whether none did. */
+    template <typename Visit>
+    bool forEachPath(const AssociationEnd& end, const CMPIObjectPath* classPath, const char* notAvailable,
+                     Visit visit) {
+        if (end.source == ObjectSource::objectManager) {
+            const CMPIEnumeration* const names = CBEnumInstanceNames(_broker, _context, classPath, &operation.status);
+            return forEachEnumerated(
+                names, notAvailable, [](const CMPIData& data) { return data.value.ref; }, visit);
+        }
+        const auto all = end.source == ObjectSource::services
+                             ? &PowerStateManagementObjFactory::getAllPMCMPIObjPaths
+                             : &PowerStateManagementObjFactory::getAllPMCapCMPIObjPaths;
+        return forEachMade<CMPIObjectPath>(
+            end, notAvailable,
+            [&](PowerStateManagementObjFactory& source, std::vector<CMPIObjectPath*>& paths) {
+                return (source.*all)(_broker, classPath, paths, &operation.status);
+            },
+            visit);
+    }
+
+    /** Visits what an up-call returned. An enumeration or an object that the object manager left out is skipped. */
+    template <typename Get, typename Visit>
+    bool forEachEnumerated(const CMPIEnumeration* enumeration, const char* notAvailable, Get get, Visit visit) {
+        if (operation.status.rc != CMPI_RC_OK) {
+            operation.report(notAvailable);
+            return false;
+        }
+        if (CMIsNullObject(enumeration)) {
+            return true;
+        }
+        while (CMHasNext(enumeration, &operation.status)) {
+            auto* const object = get(CMGetNext(enumeration, &operation.status));
+            if (!CMIsNullObject(object) && !visit(object)) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+    /** Visits what the factory of an end makes. */
+    template <typename Object, typename Make, typename Visit>
+    bool forEachMade(const AssociationEnd& end, const char* notAvailable, Make make, Visit visit) {
+        std::vector<Object*> objects;
+        const auto makeAll = [&](PowerStateManagementObjFactory& source) {
+            objects.reserve(source.getNumberOfInstances());
+            return make(source, objects) == PowerStateManagementObjFactory::done;
+        };
+        bool made = false;
+        if (end.source == ObjectSource::services) {
+            made = makeAll(factory);
+        } else {
+            PowerStateManagementObjFactory capabilities(targetKey);
+            made = makeAll(capabilities);
+        }
+        if (!made) {
+            operation.report(notAvailable);
+            return false;
+        }
+        return forEach(objects, visit);
+    }
+
+    const AssociationProvider& _provider;
+    const CMPIBroker* _broker;
+    const CMPIContext* _context;
+    const CMPIObjectPath* _ref;
+    CMPIObjectPath* _target = nullptr;
+    const CMPIObjectPath* _referencePath = nullptr;
+};
+
+/** The association class that a request asks for: where it names none, the provider's own. */
+const char* requestedClass(const AssociationProvider& provider, const char* assocClass) {
+    return assocClass == nullptr || *assocClass == '\0' ? provider.className : assocClass;
+}
+
+} // namespace
+
+unsigned short buildAssociations(const AssociationProvider& provider, const CMPIBroker* broker,
+                                 const CMPIContext* context, const CMPIObjectPath* ref, char const** properties,
+                                 std::vector<CMPIInstance*>& instances, const Site& site) {
+    AssociationRequest request(provider, broker, context, ref, site);
+    Records records = recordsFor(provider.inInstances, request.factory);
+    const bool complete =
+        request.forEachPair(provider.instances, [&](const CMPIObjectPath* first, const CMPIObjectPath* second) {
+            const CMPIObjectPath* const path = request.newAssociationPath(provider.instances);
+            if (path == nullptr) {
+                return false;
+            }
+            CMPIInstance* const instance = CMNewInstance(broker, path, nullptr);
+            if (!CMIsNullObject(instance)) {
+                CMSetPropertyFilter(instance, properties, provider.filterKeys);
+                setEnds(provider, instance, first, second);
+                if (!records.empty()) {
+                    setPowerStates(instance, records.begin()->second);
+                }
+            }
+            instances.push_back(instance);
+            return true;
+        });
+    if (!complete) {
+        return CMPI_RC_ERR_FAILED;
+    }
+    request.operation.markExit();
+    return CMPI_RC_OK;
+}
+
+CMPIStatus enumAssociationNames(const AssociationProvider& provider, const CMPIBroker* broker,
+                                const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* ref,
+                                const Site& site) {
+    AssociationRequest request(provider, broker, context, ref, site);
+    Operation& operation = request.operation;
+    const bool complete = request.forEachPair(provider.names, [&](CMPIObjectPath* first, CMPIObjectPath* second) {
+        const CMPIObjectPath* const path = request.newAssociationPath(provider.names);
+        if (path == nullptr) {
+            if (provider.onNamesPathFailed != nullptr) {
+                provider.onNamesPathFailed(broker, &operation.status);
+            }
+            return false;
+        }
+        CMAddKey(path, provider.first.role, &first, CMPI_ref);
+        CMAddKey(path, provider.second.role, &second, CMPI_ref);
+        CMReturnObjectPath(result, path);
+        return true;
+    });
+    if (!complete) {
+        return operation.status;
+    }
+    if (provider.namesCloseBeforeExit) {
+        return operation.complete(result);
+    }
+    operation.markExit();
+    CMReturnDone(result);
+    return operation.status;
+}
+
+CMPIStatus enumAssociations(const AssociationProvider& provider, const CMPIResult* result,
+                            const AssociationBuilder& build, const Site& site) {
+    const Operation operation(provider.category, site);
+    const PowerStateManagementObjFactory factory(srcKey);
+    std::vector<CMPIInstance*> instances;
+    if (build(instances) == CMPI_RC_OK) {
+        returnAll(result, instances);
+    }
+    return operation.complete(result);
+}
+
+CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIResult* result, const CMPIObjectPath* ref,
+                          const AssociationBuilder& build, const Site& site) {
+    Operation operation(provider.category, site);
+    const PowerStateManagementObjFactory factory(srcKey);
+    if (CMGetKeyCount(ref, &operation.status) == 0) {
+        operation.report("At least one key should be passed");
+        return operation.complete(result);
+    }
+    std::vector<CMPIInstance*> instances;
+    if (build(instances) == CMPI_RC_OK) {
+        returnFirstMatch(result, instances, ref, true, &operation.status);
+    }
+    return operation.complete(result);
+}
+
+CMPIStatus associatorNames(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
+                           const CMPIResult* result, const CMPIObjectPath* op, const char* assocClass,
+                           const char* resultClass, const Site& site) {
+    AssociationRequest request(provider, broker, context, op, site);
+    if (!request.resolve(requestedClass(provider, assocClass), resultClass)) {
+        return request.operation.fail(provider.targetNull.associatorNames);
+    }
+    if (const AssociationEnd* const end = request.farEnd()) {
+        const auto deliver = [&](const CMPIObjectPath* path) {
+            if (end->placedByAssociatorNames) {
+                request.place(path);
+            }
+            CMReturnObjectPath(result, path);
+        };
+        if (!isResultClass(*end, resultClass) ||
+            !request.forEachFarPath(*end, end->notAvailable.associatorNames, deliver)) {
+            return request.operation.status;
+        }
+    }
+    request.operation.markExit();
+    return request.operation.status;
+}
+
+CMPIStatus associators(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
+                       const CMPIResult* result, const CMPIObjectPath* op, const char* assocClass,
+                       const char* resultClass, char const** properties, const Site& site) {
+    AssociationRequest request(provider, broker, context, op, site);
+    if (!request.resolve(requestedClass(provider, assocClass), resultClass)) {
+        return request.operation.fail(provider.targetNull.associators);
+    }
+    if (const AssociationEnd* const end = request.farEnd()) {
+        const auto deliver = [&](const CMPIInstance* instance) { CMReturnInstance(result, instance); };
+        if (!isResultClass(*end, resultClass) ||
+            !request.forEachFarInstance(*end, properties, false, end->notAvailable.associators, deliver)) {
+            return request.operation.status;
+        }
+    }
+    request.operation.markExit();
+    return request.operation.status;
+}
+
+CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
+                          const CMPIResult* result, const CMPIObjectPath* op, const Site& site) {
+    AssociationRequest request(provider, broker, context, op, site);
+    CMPIStatus& status = request.operation.status;
+    if (!request.resolveReference()) {
+        return request.operation.fail(provider.targetNull.referenceNames);
+    }
+    if (const AssociationEnd* const end = request.farEnd()) {
+        const auto deliver = [&](const CMPIObjectPath* far) {
+            const CMPIInstance* const reference = request.newReference();
+            if (reference == nullptr) {
+                return;
+            }
+            if (end->source != ObjectSource::objectManager) {
+                request.place(far);
+            }
+            request.setReferenceEnds(reference, *end, far);
+            const CMPIObjectPath* const path = CMGetObjectPath(reference, &status);
+            if (!CMIsNullObject(path)) {
+                CMSetNameSpace(path, request.nameSpace());
+                CMReturnObjectPath(result, path);
+            }
+        };
+        if (!request.forEachFarPath(*end, end->notAvailable.referenceNames, deliver)) {
+            return status;
+        }
+    }
+    request.operation.markExit();
+    return status;
+}
+
+namespace {
+
+/** Sets the properties of a reference; false where it is not to be returned. */
+bool fillReference(const AssociationRequest& request, const CMPIInstance* reference, const AssociationEnd& end,
+                   const CMPIObjectPath* far, Records& records) {
+    if (end.inReferences == PowerStates::everyRecord) {
+        for (auto& [key, record] : records) {
+            request.setReferenceEnds(reference, end, far);
+            setPowerStates(reference, record);
+        }
+        return !records.empty();
+    }
+    request.setReferenceEnds(reference, end, far);
+    if (!records.empty()) {
+        setPowerStates(reference, records.begin()->second);
+    }
+    return true;
+}
+
+} // namespace
+
+CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
+                      const CMPIResult* result, const CMPIObjectPath* op, bool keysOnly, const Site& site) {
+    AssociationRequest request(provider, broker, context, op, site);
+    CMPIStatus& status = request.operation.status;
+    if (!request.resolveReference()) {
+        return request.operation.fail(provider.targetNull.references);
+    }
+    if (const AssociationEnd* const end = request.farEnd()) {
+        Records records = recordsFor(end->inReferences, request.factory);
+        const auto deliver = [&](const CMPIObjectPath* far) {
+            const CMPIInstance* const reference = request.newReference();
+            if (reference != nullptr && fillReference(request, reference, *end, far, records)) {
+                CMReturnInstance(result, reference);
+            }
+        };
+        const auto deliverPathOf = [&](const CMPIInstance* instance) {
+            const CMPIObjectPath* const far = CMIsNullObject(instance) ? nullptr : CMGetObjectPath(instance, &status);
+            if (!CMIsNullObject(far)) {
+                request.place(far);
+                deliver(far);
+            }
+        };
+        const char* const notAvailable = end->notAvailable.references;
+        const bool delivered = end->source == ObjectSource::objectManager
+                                   ? request.forEachFarPath(*end, notAvailable, deliver)
+                                   : request.forEachFarInstance(*end, nullptr, keysOnly, notAvailable, deliverPathOf);
+        if (!delivered) {
+            return status;
+        }
+    }
+    request.operation.markExit();
+    return status;
+}
+
+} // namespace Norv::PowerStateManagementServiceProvider

@@ -1,0 +1,144 @@
+/**
+ * TALVO_PowerManagementElementCapabilities: ties each service to each capabilities object (CIM_ElementCapabilities,
+ * DMTF DSP1027). Neither end is a computer system, so nothing is asked of the object manager.
+ */
+#include "ProviderSupport.h"
+
+namespace Norv::PowerStateManagementServiceProvider {
+
+static const CMPIBroker* broker = nullptr;
+static const std::string loggerPowerElementCapabilities = "Corvane.PowerElementCapProvider";
+
+static const char* filterKeys[] = {"ManagedElement", "Capabilities", nullptr};
+
+static constexpr const char* capabilitiesNotAvailable =
+    "***Can't get ObjectPaths for PowerManagementCapabilities.                 Exiting EnumerateInstanceNames***";
+static constexpr const char* capabilitiesPathNull = "CMPIObjectPath is NULL for PowerManagementCapabilities";
+static constexpr const char* associationPathFailed =
+    "Create CMPIObjectPath failed for                     PowerManagementElementCapabilities.";
+
+/** The one failure of an association that reaches the client as an error; its text ends without the period. */
+static void onNamesPathFailed(const CMPIBroker* mb, CMPIStatus* status) {
+    CMSetStatusWithChars(mb, status, CMPI_RC_ERR_FAILED,
+                         "Create CMPIObjectPath failed for                     PowerManagementElementCapabilities");
+    CMTraceMessage(mb, CMPI_LEV_INFO, "PowerManagementElementCapabilitiesProvider", associationPathFailed, nullptr);
+}
+
+static const AssociationProvider provider = {
+    .category = loggerPowerElementCapabilities,
+    .className = powerManagementElementCapabilitiesClass,
+    .first =
+        {
+            .className = powerManagementServiceClass,
+            .role = "ManagedElement",
+            .source = ObjectSource::services,
+            .notAvailable =
+                {
+                    .associatorNames = "getAllPMCMPIObjPaths Failed For powerManagementServiceClass",
+                    .associators = "getAllPMCMPIInstances Failed For powerManagementServiceClass",
+                    .referenceNames = "getAllPMCMPIObjPaths Failed for powerManagementServiceClass",
+                    .references = "getAllPMCMPIInstances Failed for powerManagementServiceClass",
+                },
+        },
+    .second =
+        {
+            .className = powerManagementCapabilitiesClass,
+            .role = "Capabilities",
+            .source = ObjectSource::capabilities,
+            .notAvailable =
+                {
+                    .associatorNames = "getAllPMCMPIObjPaths Failed For powerManagementCapabilitiesClass",
+                    .associators = " getAllPMCapCMPIInstances Failed for powerManagementCapabilitiesClass class",
+                    .referenceNames = "getAllPMCapCMPIObjPaths Failed for powerManagementCapabilitiesClass",
+                    .references = "getAllPMCapCMPIInstances Failed for powerManagementCapabilitiesClass",
+                },
+        },
+    .filterKeys = filterKeys,
+    .instances =
+        {
+            .servicesNotAvailable =
+                "***Can't get Power Management Service ObjectPaths.             Exiting EnumerateInstanceNames***",
+            .servicePathNull = servicePathNull,
+            .associationPathFailed = associationPathFailed,
+            .capabilitiesNotAvailable = capabilitiesNotAvailable,
+            .capabilitiesPathNull = capabilitiesPathNull,
+        },
+    .names =
+        {
+            .servicesNotAvailable =
+                "***Can't get Power Management Service ObjectPaths.           Exiting EnumerateInstanceNames***",
+            .servicePathNull = servicePathNull,
+            .associationPathFailed = associationPathFailed,
+            .capabilitiesNotAvailable = capabilitiesNotAvailable,
+            .capabilitiesPathNull = capabilitiesPathNull,
+        },
+    .targetNull =
+        {
+            .associatorNames = targetNullTexts.associatorNames,
+            .associators = "Object Path is NULL in Associations.",
+            .referenceNames = targetNullTexts.referenceNames,
+            .references = targetNullTexts.references,
+        },
+    .onNamesPathFailed = onNamesPathFailed,
+};
+
+ORV_FIXED_INSTANCE_OPERATIONS(PowerManagementElementCapabilities)
+ORV_FIXED_ASSOCIATION_OPERATIONS(PowerManagementElementCapabilities)
+
+static unsigned short PowerManagementElementCapabilities(const CMPIObjectPath* ref, const char** properties,
+                                                         std::vector<CMPIInstance*>& instances) {
+    return buildAssociations(provider, broker, nullptr, ref, properties, instances);
+}
+
+static CMPIStatus PowerManagementElementCapabilities_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext* ctx,
+                                                                       const CMPIResult* rslt,
+                                                                       const CMPIObjectPath* ref) {
+    return enumAssociationNames(provider, broker, ctx, rslt, ref);
+}
+
+static CMPIStatus PowerManagementElementCapabilities_EnumInstances(CMPIInstanceMI*, const CMPIContext*,
+                                                                   const CMPIResult* rslt, const CMPIObjectPath* ref,
+                                                                   const char** properties) {
+    return enumAssociations(provider, rslt, [=](std::vector<CMPIInstance*>& instances) {
+        return PowerManagementElementCapabilities(ref, properties, instances);
+    });
+}
+
+static CMPIStatus PowerManagementElementCapabilities_GetInstance(CMPIInstanceMI*, const CMPIContext*,
+                                                                 const CMPIResult* rslt, const CMPIObjectPath* ref,
+                                                                 const char** properties) {
+    return getAssociation(provider, rslt, ref, [=](std::vector<CMPIInstance*>& instances) {
+        return PowerManagementElementCapabilities(ref, properties, instances);
+    });
+}
+
+static CMPIStatus PowerManagementElementCapabilities_Associators(CMPIAssociationMI*, const CMPIContext* ctx,
+                                                                 const CMPIResult* rslt, const CMPIObjectPath* op,
+                                                                 const char* assocClass, const char* resultClass,
+                                                                 const char*, const char*, const char** properties) {
+    return associators(provider, broker, ctx, rslt, op, assocClass, resultClass, properties);
+}
+
+static CMPIStatus PowerManagementElementCapabilities_AssociatorNames(CMPIAssociationMI*, const CMPIContext* ctx,
+                                                                     const CMPIResult* rslt, const CMPIObjectPath* op,
+                                                                     const char* assocClass, const char* resultClass,
+                                                                     const char*, const char*) {
+    return associatorNames(provider, broker, ctx, rslt, op, assocClass, resultClass);
+}
+
+static CMPIStatus PowerManagementElementCapabilities_References(CMPIAssociationMI*, const CMPIContext* ctx,
+                                                                const CMPIResult* rslt, const CMPIObjectPath* op,
+                                                                const char*, const char*, const char**) {
+    return references(provider, broker, ctx, rslt, op, true);
+}
+
+static CMPIStatus PowerManagementElementCapabilities_ReferenceNames(CMPIAssociationMI*, const CMPIContext* ctx,
+                                                                    const CMPIResult* rslt, const CMPIObjectPath* op,
+                                                                    const char*, const char*) {
+    return referenceNames(provider, broker, ctx, rslt, op);
+}
+
+CMInstanceMIStub(PowerManagementElementCapabilities_, PowerManagementElementCapabilitiesProvider, broker, CMNoHook)
+CMAssociationMIStub(PowerManagementElementCapabilities_, PowerManagementElementCapabilitiesProvider, broker, CMNoHook)
+
+} // namespace Norv::PowerStateManagementServiceProvider

@@ -1,0 +1,142 @@
+#include "IdentifyingFacts.h"
+
+#include <algorithm>
+#include <fstream>
+#include <locale>
+#include <map>
+#include <optional>
+#include <string_view>
+
+namespace Norv::ComputerSystemProvider {
+
+namespace {
+
+/** A file or variable and what its value is to people. */
+struct Source {
+    const char* name;
+    const char* description;
+};
+
+/** The kernel opens these to everybody; the serial numbers and the UUID beside them it keeps for root. */
+constexpr Source firmwareFiles[] = {
+    {"sys_vendor", "System vendor"},
+    {"product_name", "Product name"},
+    {"product_version", "Product version"},
+    {"product_family", "Product family"},
+    {"product_sku", "Product SKU"},
+    {"board_vendor", "Board vendor"},
+    {"board_name", "Board name"},
+    {"board_version", "Board version"},
+    {"board_asset_tag", "Board asset tag"},
+    {"chassis_vendor", "Chassis vendor"},
+    {"chassis_version", "Chassis version"},
+    {"chassis_asset_tag", "Chassis asset tag"},
+    {"bios_vendor", "BIOS vendor"},
+    {"bios_version", "BIOS version"},
+    {"bios_date", "BIOS date"},
+};
+
+constexpr Source operatingSystemVariables[] = {
+    {"PRETTY_NAME", "Operating system"},
+    {"ID", "Operating system identifier"},
+    {"VERSION_ID", "Operating system version"},
+};
+
+std::string trimmed(const std::string& text) {
+    constexpr const char* blanks = " \t\r\n";
+    const std::size_t first = text.find_first_not_of(blanks);
+    return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+/** Surrogates are no characters, though the standard library decodes them. */
+bool isPrintable(char32_t character) {
+    const bool isControl = character < 0x20 || character == 0x7f;
+    const bool isSurrogate = character >= 0xd800 && character <= 0xdfff;
+    return !isControl && !isSurrogate;
+}
+
+/** Whether a text is UTF-8 without control characters: firmware holds any bytes, a CIM string must not. */
+bool isOneLine(const std::string& text) {
+    using Utf8 = std::codecvt<char32_t, char8_t, std::mbstate_t>;
+    const std::u8string bytes(text.begin(), text.end());
+    const char8_t* const end = bytes.data() + bytes.size();
+    const char8_t* next = nullptr;
+    std::u32string characters(bytes.size(), U'\0');
+    char32_t* last = nullptr;
+    std::mbstate_t state{};
+    const auto result =
+        std::use_facet<Utf8>(std::locale::classic())
+            .in(state, bytes.data(), end, next, characters.data(), characters.data() + characters.size(), last);
+    return result == Utf8::ok && std::all_of(characters.data(), last, isPrintable);
+}
+
+void append(std::vector<IdentifyingFact>& facts, const char* description, const std::string& value) {
+    if (!value.empty() && isOneLine(value)) {
+        facts.push_back({description, value});
+    }
+}
+
+/** The file's lines without the blanks around them; nothing where it cannot be read. */
+std::optional<std::vector<std::string>> linesOf(const std::string& file) {
+    std::ifstream stream(file);
+    std::vector<std::string> lines;
+    for (std::string line; std::getline(stream, line);) {
+        lines.push_back(trimmed(line));
+    }
+    return stream.is_open() && !stream.bad() ? std::optional(std::move(lines)) : std::nullopt;
+}
+
+/** A value without the shell's quotes and backslashes. */
+std::string unquoted(std::string_view text) {
+    const auto isQuotedWith = [text](char quote) {
+        return text.size() > 1 && text.front() == quote && text.back() == quote;
+    };
+    if (isQuotedWith('\'')) {
+        return std::string(text.substr(1, text.size() - 2));
+    }
+    if (isQuotedWith('"')) {
+        text = text.substr(1, text.size() - 2);
+    }
+    std::string value;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const bool escapes = text[i] == '\\' && i + 1 < text.size();
+        value += escapes ? text[++i] : text[i];
+    }
+    return value;
+}
+
+/** The assignments of an os-release file, the last one of each variable. */
+std::map<std::string, std::string> variablesOf(const std::vector<std::string>& lines) {
+    std::map<std::string, std::string> variables;
+    for (const std::string& line : lines) {
+        const std::size_t assignment = line.find('=');
+        if (assignment != std::string::npos && line.front() != '#') {
+            variables[line.substr(0, assignment)] = unquoted(std::string_view(line).substr(assignment + 1));
+        }
+    }
+    return variables;
+}
+
+} // namespace
+
+std::vector<IdentifyingFact> identifyingFacts(const FactSources& sources) {
+    std::vector<IdentifyingFact> facts;
+    for (const auto& [file, description] : firmwareFiles) {
+        const auto lines = linesOf(sources.firmware + '/' + file);
+        if (lines && lines->size() == 1) {
+            append(facts, description, lines->front());
+        }
+    }
+    for (const std::string& file : sources.operatingSystem) {
+        if (const auto lines = linesOf(file)) {
+            auto variables = variablesOf(*lines);
+            for (const auto& [variable, description] : operatingSystemVariables) {
+                append(facts, description, variables[variable]);
+            }
+            break;
+        }
+    }
+    return facts;
+}
+
+} // namespace Norv::ComputerSystemProvider

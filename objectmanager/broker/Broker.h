@@ -1,0 +1,95 @@
+/**
+ * The CMPI broker: the function tables through which providers reach the object manager.
+ *
+ * Every slot is there; what is not supported answers CMPI_RC_ERR_NOT_SUPPORTED. Slots may be called from any thread,
+ * but objects are made only where the calling thread has a current Request.
+ */
+#ifndef BROKER_BROKER_H
+#define BROKER_BROKER_H
+
+#include "broker/Operations.h"
+
+#include "cmpift.h"
+
+#include <functional>
+#include <span>
+#include <string>
+#include <string_view>
+
+namespace ObjectManager {
+
+/** A reference of an association class. */
+struct ReferenceEnd {
+    /** The name of the property. */
+    std::string role;
+    /** The class that it refers to. */
+    std::string className;
+};
+
+/** What broker and dispatch need to know of classes. Asked from several threads at once. */
+class ClassInformation {
+public:
+    ClassInformation() = default;
+    ClassInformation(const ClassInformation&) = delete;
+    ClassInformation& operator=(const ClassInformation&) = delete;
+    virtual ~ClassInformation() = default;
+
+    /** Whether `className` is `superClassName` or derived from it. */
+    virtual bool isA(std::string_view className, std::string_view superClassName) const = 0;
+    /** The names of a class's key properties, none where the class is not known. They live as long as this object. */
+    virtual std::span<const std::string> keyNames(std::string_view className) const = 0;
+    /** A class's name as it is declared; null where the class is not known. Lives as long as this object. */
+    virtual const std::string* declaredName(std::string_view className) const = 0;
+    /** The references of a class, none where it has none or is not known. They live as long as this object. */
+    virtual std::span<const ReferenceEnd> references(std::string_view className) const = 0;
+};
+
+/** What a provider, or the broker about a provider, had to say. */
+struct BrokerMessage {
+    enum class Kind { log, trace };
+
+    Kind kind = Kind::log;
+    /** A CMPISeverity of a log message, a CMPILevel of a trace. */
+    int level = 0;
+    /** The identifier of a log message, the component of a trace. */
+    std::string source;
+    std::string text;
+};
+
+/** Called from any thread; must not throw. */
+using MessageSink = std::function<void(const BrokerMessage&)>;
+
+class Broker {
+public:
+    /** How deep up-calls may nest: a provider that asks for itself ends here. */
+    static constexpr unsigned int maximumDepth = 16;
+
+    /**
+     * `upCalls` answers the providers' own requests and `classes` their questions about classes; both may be null and
+     * outlive the broker. Messages of providers go to standard error until another sink is set.
+     */
+    explicit Broker(Operations* upCalls = nullptr, const ClassInformation* classes = nullptr);
+    Broker(const Broker&) = delete;
+    Broker& operator=(const Broker&) = delete;
+    ~Broker() = default;
+
+    /** Not to be called while providers run. */
+    void setMessageSink(MessageSink sink) { _sink = std::move(sink); }
+
+    /** What providers are given. Lives as long as this object. */
+    const CMPIBroker* handle() const { return &_handle; }
+
+    Operations* upCalls() const { return _upCalls; }
+    const ClassInformation* classes() const { return _classes; }
+    void message(const BrokerMessage& message) const { _sink(message); }
+
+private:
+    CMPIBroker _handle;
+    Operations* _upCalls;
+    const ClassInformation* _classes;
+    MessageSink _sink;
+};
+
+} // namespace ObjectManager
+
+#endif

@@ -1,0 +1,27 @@
+/** How a CIM operation fails. */
+#ifndef OBJECTMANAGER_CIMERROR_H
+#define OBJECTMANAGER_CIMERROR_H
+
+#include "cmpidt.h"
+
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace ObjectManager {
+
+/** An operation that failed; what() is one line for the person who asked. */
+struct CimError : std::runtime_error {
+    CimError(CMPIrc failure, const std::string& message) : std::runtime_error(message), code(failure) {}
+
+    /** Never CMPI_RC_OK. */
+    CMPIrc code;
+    /** The provider ended a method with code OK, but gave no return value and left its result open: it refused. */
+    bool refused = false;
+    /** What the provider logged as failures meanwhile, in that order. */
+    std::vector<std::string> reasons;
+};
+
+} // namespace ObjectManager
+
+#endif

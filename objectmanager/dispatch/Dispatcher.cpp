@@ -1,0 +1,368 @@
+#include "dispatch/Dispatcher.h"
+
+#include "dispatch/ProviderCall.h"
+
+#include <algorithm>
+#include <iterator>
+#include <optional>
+#include <utility>
+
+namespace ObjectManager {
+
+namespace {
+
+CimError noInstance() {
+    return {CMPI_RC_ERR_NOT_FOUND, "there is no such instance"};
+}
+
+CimError leftOpen(const Registration& registration) {
+    return {CMPI_RC_ERR_FAILED, registration.provider + " ended without closing its result"};
+}
+
+CimError refused(const std::string& method) {
+    CimError error(CMPI_RC_ERR_FAILED, method + " was refused");
+    error.refused = true;
+    return error;
+}
+
+CimError wrongAnswer(const Registration& registration, const std::string& what) {
+    return {CMPI_RC_ERR_FAILED, registration.provider + " returned " + what};
+}
+
+/** A name as a provider gets it: where there is none, null. */
+const char* orNull(const std::string& name) {
+    return name.empty() ? nullptr : name.c_str();
+}
+
+/** Adds what was found through an association class, if anything was. */
+template <class Object>
+void append(std::vector<Associated<Object>>& found, const AssociationStep& step, std::vector<Object> objects) {
+    if (!objects.empty()) {
+        found.push_back({step.registration->className, std::move(objects)});
+    }
+}
+
+/** How a provider ended: throws where it was anything but well. */
+void requireSuccess(const Registration& registration, const CMPIStatus& status, const Request& request,
+                    const Result& result) {
+    std::string message = textOf(status.msg);
+    if (!request.misuse().empty()) {
+        throw CimError(CMPI_RC_ERR_FAILED, registration.provider + ' ' + request.misuse());
+    }
+    CMPIrc code = status.rc;
+    if (!result.errors().empty()) {
+        const CimError& error = result.errors().front();
+        code = code == CMPI_RC_OK ? error.code : code;
+        message = message.empty() ? error.what() : message;
+    }
+    if (code != CMPI_RC_OK) {
+        throw CimError(code, message.empty() ? registration.provider + " gave no reason" : message);
+    }
+}
+
+void passPaths(const Result& result, const PathSink& sink) {
+    for (std::size_t i = 0; i < result.pathCount(); ++i) {
+        sink(result.path(i));
+    }
+}
+
+void passInstances(const Result& result, const InstanceSink& sink) {
+    for (std::size_t i = 0; i < result.instanceCount(); ++i) {
+        sink(result.instance(i));
+    }
+}
+
+std::vector<ObjectPath> pathsOf(const Result& result) {
+    std::vector<ObjectPath> paths;
+    passPaths(result, [&](ObjectPath&& path) { paths.push_back(std::move(path)); });
+    return paths;
+}
+
+std::vector<Instance> instancesOf(const Result& result) {
+    std::vector<Instance> instances;
+    passInstances(result, [&](Instance&& instance) { instances.push_back(std::move(instance)); });
+    return instances;
+}
+
+} // namespace
+
+/** What an operation gives. */
+enum class Dispatcher::Answer { paths, instances, value, nothing };
+
+Dispatcher::Dispatcher(Registry registry, const Settings& settings)
+    : _registry(std::move(registry)), _log(settings.log), _broker(this, settings.classes),
+      _providers(_broker, settings.folders) {}
+
+/**
+ * Does one operation: `call` calls the provider with context, result and path, `take` takes what it returned.
+ * `unanswered`, where it is one, is thrown where the provider neither returned anything nor closed its result.
+ */
+template <class Call, class Take>
+auto Dispatcher::serve(const Invocation& invocation, const ObjectPath& path, const Registration& registration,
+                       Answer answer, const std::optional<CimError>& unanswered, Call call, Take take) {
+    const std::uint64_t before = _log != nullptr ? _log->newest() : 0;
+    try {
+        Request request(_broker);
+        Result result(request);
+        ObjectPath target = path;
+        if (equalNames(target.className, registration.className)) {
+            target.className = registration.className; // as the provider spells it
+        }
+        const CMPIContext* context = request.context({
+            {CMPIInitNameSpace, stringValue(path.nameSpace)},
+            {CMPIInvocationFlags, unsignedValue(CMPI_uint32, invocation.flags)},
+            {CMPIPrincipal, stringValue(invocation.principal)},
+        });
+        CMPIStatus status{CMPI_RC_OK, nullptr};
+        if (std::optional<std::string> thrown =
+                callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); })) {
+            throw CimError(CMPI_RC_ERR_FAILED, registration.provider + ' ' + *thrown);
+        }
+        requireSuccess(registration, status, request, result);
+        if (unanswered && !result.closed() && result.empty()) {
+            throw CimError(*unanswered);
+        }
+        if ((answer != Answer::paths && result.pathCount() != 0) ||
+            (answer != Answer::instances && result.instanceCount() != 0) ||
+            (answer != Answer::value && !result.data().empty())) {
+            throw wrongAnswer(registration, "what this operation does not give");
+        }
+        return take(result);
+    } catch (CimError& error) {
+        if (_log != nullptr) {
+            error.reasons = _log->failuresSince(before);
+        }
+        throw;
+    }
+}
+
+void Dispatcher::enumerateInstanceNames(const Invocation& invocation, const ObjectPath& classPath,
+                                        const PathSink& sink) {
+    const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    serve(
+        invocation, classPath, registration, Answer::paths, leftOpen(registration),
+        [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
+            return mi.ft->enumerateInstanceNames(&mi, context, result, path);
+        },
+        [&](const Result& result) { passPaths(result, sink); });
+}
+
+void Dispatcher::enumerateInstances(const Invocation& invocation, const ObjectPath& classPath,
+                                    const PropertyList& properties, const InstanceSink& sink) {
+    const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    serve(
+        invocation, classPath, registration, Answer::instances, leftOpen(registration),
+        [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
+            return mi.ft->enumerateInstances(&mi, context, result, path, request.propertyList(properties));
+        },
+        [&](const Result& result) { passInstances(result, sink); });
+}
+
+Instance Dispatcher::getInstance(const Invocation& invocation, const ObjectPath& path, const PropertyList& properties) {
+    const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    return serve(
+        invocation, path, registration, Answer::instances, noInstance(),
+        [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
+            return mi.ft->getInstance(&mi, context, result, target, request.propertyList(properties));
+        },
+        [&](const Result& result) {
+            if (result.instanceCount() == 0) {
+                throw noInstance();
+            }
+            if (result.instanceCount() != 1) {
+                throw wrongAnswer(registration, std::to_string(result.instanceCount()) + " instances, expected one");
+            }
+            return result.instance(0);
+        });
+}
+
+ObjectPath Dispatcher::createInstance(const Invocation& invocation, const ObjectPath& path, const Instance& instance) {
+    const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    return serve(
+        invocation, path, registration, Answer::paths, leftOpen(registration),
+        [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
+            return mi.ft->createInstance(&mi, context, result, target, request.instance(instance));
+        },
+        [&](const Result& result) {
+            if (result.pathCount() != 1) {
+                throw wrongAnswer(registration, std::to_string(result.pathCount()) + " object paths, expected one");
+            }
+            return result.path(0);
+        });
+}
+
+void Dispatcher::modifyInstance(const Invocation& invocation, const ObjectPath& path, const Instance& instance,
+                                const PropertyList& properties) {
+    const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    serve(
+        invocation, path, registration, Answer::nothing, leftOpen(registration),
+        [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
+            return mi.ft->modifyInstance(&mi, context, result, target, request.instance(instance),
+                                         request.propertyList(properties));
+        },
+        [](const Result&) {});
+}
+
+void Dispatcher::deleteInstance(const Invocation& invocation, const ObjectPath& path) {
+    const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    serve(
+        invocation, path, registration, Answer::nothing, leftOpen(registration),
+        [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
+            return mi.ft->deleteInstance(&mi, context, result, target);
+        },
+        [](const Result&) {});
+}
+
+void Dispatcher::execQuery(const Invocation& invocation, const ObjectPath& classPath, const std::string& query,
+                           const std::string& language, const InstanceSink& sink) {
+    const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
+    CMPIInstanceMI& mi = _providers.instanceProvider(registration);
+    serve(
+        invocation, classPath, registration, Answer::instances, leftOpen(registration),
+        [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
+            return mi.ft->execQuery(&mi, context, result, path, query.c_str(), language.c_str());
+        },
+        [&](const Result& result) { passInstances(result, sink); });
+}
+
+MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
+                                      const std::vector<NamedValue>& arguments) {
+    const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::method);
+    CMPIMethodMI& mi = _providers.methodProvider(registration);
+    const CMPIArgs* answers = nullptr;
+    return serve(
+        invocation, path, registration, Answer::value, refused(method),
+        [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
+            CMPIArgs* out = request.arguments({});
+            answers = out;
+            return mi.ft->invokeMethod(&mi, context, result, target, method.c_str(), request.arguments(arguments), out);
+        },
+        [&](const Result& result) {
+            if (result.data().size() != 1) {
+                throw wrongAnswer(registration, std::to_string(result.data().size()) + " values, expected one");
+            }
+            return MethodResult{result.data().front(), argumentsOf(answers)};
+        });
+}
+
+namespace {
+
+/** The failure of one association's provider, named by its class. */
+CimError failureOf(const Registration& registration, const CimError& error) {
+    CimError failure(error.code, registration.className + ": " + error.what());
+    failure.reasons = error.reasons;
+    return failure;
+}
+
+} // namespace
+
+/**
+ * Asks the provider of one association class. It leaves its result open, so that an open result is as complete as a
+ * closed one. A failure names the class.
+ */
+template <class Call, class Take>
+auto Dispatcher::follow(const Invocation& invocation, const AssociationWalk& walk, const AssociationStep& step,
+                        Answer answer, Call call, Take take) {
+    const Registration& registration = *step.registration;
+    try {
+        CMPIAssociationMI& mi = _providers.associationProvider(registration);
+        return serve(
+            invocation, walk.source(), registration, answer, std::nullopt,
+            [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* source) {
+                return call(mi, request, context, result, source);
+            },
+            [&](const Result& result) {
+                auto objects = take(result);
+                dropDuplicates(objects);
+                return objects;
+            });
+    } catch (const CimError& error) {
+        throw failureOf(registration, error);
+    }
+}
+
+std::vector<Associated<Instance>> Dispatcher::associators(const Invocation& invocation, const ObjectPath& source,
+                                                          const AssociationFilter& filter,
+                                                          const PropertyList& properties) {
+    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    std::vector<Associated<Instance>> found;
+    for (const AssociationStep& step : walk.steps()) {
+        std::vector<Instance> instances = follow(
+            invocation, walk, step, Answer::instances,
+            [&](CMPIAssociationMI& mi, Request& request, const CMPIContext* context, const CMPIResult* result,
+                const CMPIObjectPath* path) {
+                return mi.ft->associators(&mi, context, result, path, step.registration->className.c_str(),
+                                          orNull(step.resultClass), orNull(filter.role), orNull(filter.resultRole),
+                                          request.propertyList(properties));
+            },
+            instancesOf);
+        walk.keepAsked(step, instances);
+        walk.keepWanted(instances, properties);
+        append(found, step, std::move(instances));
+    }
+    return found;
+}
+
+std::vector<Associated<ObjectPath>> Dispatcher::associatorNames(const Invocation& invocation, const ObjectPath& source,
+                                                                const AssociationFilter& filter) {
+    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    std::vector<Associated<ObjectPath>> found;
+    for (const AssociationStep& step : walk.steps()) {
+        std::vector<ObjectPath> paths = follow(
+            invocation, walk, step, Answer::paths,
+            [&](CMPIAssociationMI& mi, Request&, const CMPIContext* context, const CMPIResult* result,
+                const CMPIObjectPath* path) {
+                return mi.ft->associatorNames(&mi, context, result, path, step.registration->className.c_str(),
+                                              orNull(step.resultClass), orNull(filter.role), orNull(filter.resultRole));
+            },
+            pathsOf);
+        walk.keepAsked(step, paths);
+        append(found, step, std::move(paths));
+    }
+    return found;
+}
+
+std::vector<Instance> Dispatcher::references(const Invocation& invocation, const ObjectPath& source,
+                                             const AssociationFilter& filter, const PropertyList& properties) {
+    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    std::vector<Instance> found;
+    for (const AssociationStep& step : walk.steps()) {
+        std::vector<Instance> instances = follow(
+            invocation, walk, step, Answer::instances,
+            [&](CMPIAssociationMI& mi, Request& request, const CMPIContext* context, const CMPIResult* result,
+                const CMPIObjectPath* path) {
+                return mi.ft->references(&mi, context, result, path, step.registration->className.c_str(),
+                                         orNull(filter.role), request.propertyList(properties));
+            },
+            instancesOf);
+        std::move(instances.begin(), instances.end(), std::back_inserter(found));
+    }
+    walk.keepWanted(found, properties);
+    return found;
+}
+
+std::vector<ObjectPath> Dispatcher::referenceNames(const Invocation& invocation, const ObjectPath& source,
+                                                   const AssociationFilter& filter) {
+    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    std::vector<ObjectPath> found;
+    for (const AssociationStep& step : walk.steps()) {
+        std::vector<ObjectPath> paths = follow(
+            invocation, walk, step, Answer::paths,
+            [&](CMPIAssociationMI& mi, Request&, const CMPIContext* context, const CMPIResult* result,
+                const CMPIObjectPath* path) {
+                return mi.ft->referenceNames(&mi, context, result, path, step.registration->className.c_str(),
+                                             orNull(filter.role));
+            },
+            pathsOf);
+        std::move(paths.begin(), paths.end(), std::back_inserter(found));
+    }
+    return found;
+}
+
+} // namespace ObjectManager

@@ -1,0 +1,271 @@
+#include "dispatch/Providers.h"
+
+#include "broker/Request.h"
+#include "dispatch/ProviderCall.h"
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+#include <cstring>
+#include <dlfcn.h>
+#include <functional>
+
+namespace ObjectManager {
+
+namespace {
+
+/** Of a kind of provider: how its factories end, what its functions are called, and when it is registered. */
+template <class MI>
+struct MIKind;
+
+template <>
+struct MIKind<CMPIInstanceMI> {
+    static constexpr const char* suffix = "_Create_InstanceMI";
+    static constexpr std::array slots{"cleanup",        "enumerateInstanceNames", "enumerateInstances", "getInstance",
+                                      "createInstance", "modifyInstance",         "deleteInstance",     "execQuery"};
+};
+
+template <>
+struct MIKind<CMPIMethodMI> {
+    static constexpr const char* suffix = "_Create_MethodMI";
+    static constexpr std::array slots{"cleanup", "invokeMethod"};
+};
+
+template <>
+struct MIKind<CMPIAssociationMI> {
+    static constexpr const char* suffix = "_Create_AssociationMI";
+    static constexpr std::array slots{"cleanup", "associators", "associatorNames", "references", "referenceNames"};
+};
+
+/** The first slot of a function table that is null; null where all are set. */
+template <class MI>
+const char* missingSlot(const MI& mi) {
+    constexpr auto& names = MIKind<MI>::slots;
+    std::array<void (*)(), names.size()> functions{};
+    static_assert(sizeof functions == sizeof mi.ft->cleanup * names.size());
+    std::memcpy(functions.data(), &mi.ft->cleanup, sizeof functions);
+    const auto missing = std::find(functions.begin(), functions.end(), nullptr);
+    return missing != functions.end() ? names[static_cast<std::size_t>(missing - functions.begin())] : nullptr;
+}
+
+/** What is wrong with a function table, as the end of a sentence about its factory; empty where nothing is. */
+template <class MI>
+std::string tableProblem(const MI& mi) {
+    if (mi.ft == nullptr) {
+        return "returned a provider without a function table";
+    }
+    if (mi.ft->ftVersion < CMPIVersion100 || mi.ft->ftVersion > CMPIVersion210) {
+        return "returned a function table of version " + std::to_string(mi.ft->ftVersion) + ", expected " +
+               std::to_string(CMPIVersion100) + " to " + std::to_string(CMPIVersion210);
+    }
+    if (mi.ft->miName == nullptr) {
+        return "returned a function table without a name";
+    }
+    if (const char* slot = missingSlot(mi); slot != nullptr) {
+        return std::string("returned a function table whose slot ") + slot + " is null";
+    }
+    return {};
+}
+
+std::string joined(const std::vector<std::filesystem::path>& folders) {
+    std::string text;
+    for (const std::filesystem::path& folder : folders) {
+        text += (text.empty() ? "" : ", ") + folder.string();
+    }
+    return text;
+}
+
+} // namespace
+
+/** A loaded library with the providers that its factories made. */
+class ProviderLibrary {
+public:
+    ProviderLibrary(const Broker& broker, const std::string& location,
+                    const std::vector<std::filesystem::path>& folders);
+    ProviderLibrary(const ProviderLibrary&) = delete;
+    ProviderLibrary& operator=(const ProviderLibrary&) = delete;
+    ~ProviderLibrary();
+
+    /** With every symbolic link resolved. */
+    const std::filesystem::path& file() const { return _file; }
+
+    /** Calls the factory where it was not called yet; the provider, null where `report` tells a problem. */
+    template <class MI>
+    MI* provider(const std::string& name, FactoryReport& report);
+
+private:
+    template <class MI>
+    MI* create(FactoryReport& report);
+    void complain(const std::string& factory, const std::string& problem) const {
+        _broker.message({BrokerMessage::Kind::log, CMPI_SEV_ERROR, factory, problem});
+    }
+
+    struct Loaded {
+        void* mi;
+        FactoryReport report;
+        /** The provider's cleanup; whether the library may be unloaded after it. */
+        std::function<bool()> cleanup;
+    };
+
+    const Broker& _broker;
+    std::filesystem::path _file;
+    void* _handle = nullptr;
+    std::map<std::string, Loaded> _providers;
+};
+
+ProviderLibrary::ProviderLibrary(const Broker& broker, const std::string& location,
+                                 const std::vector<std::filesystem::path>& folders)
+    : _broker(broker) {
+    const std::string name = "lib" + location + ".so";
+    for (const std::filesystem::path& folder : folders) {
+        for (const std::string& fileName : {name + ".1", name}) {
+            std::error_code error;
+            if (_file.empty() && std::filesystem::exists(folder / fileName, error)) {
+                _file = std::filesystem::weakly_canonical(folder / fileName, error);
+            }
+        }
+    }
+    if (_file.empty()) {
+        throw CimError(CMPI_RC_ERR_FAILED,
+                       "provider library " + name + ".1 or " + name + " not found in " + joined(folders));
+    }
+    _handle = dlopen(_file.c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (_handle == nullptr) {
+        throw CimError(CMPI_RC_ERR_FAILED, std::string("provider library does not load: ") + dlerror());
+    }
+}
+
+ProviderLibrary::~ProviderLibrary() {
+    bool unload = true;
+    for (const auto& [factory, loaded] : _providers) {
+        unload = loaded.cleanup() && unload;
+    }
+    if (unload) {
+        dlclose(_handle);
+    }
+}
+
+template <class MI>
+MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
+    report.factory = name + MIKind<MI>::suffix;
+    if (const auto known = _providers.find(report.factory); known != _providers.end()) {
+        report = known->second.report;
+        return static_cast<MI*>(known->second.mi);
+    }
+    MI* mi = create<MI>(report);
+    if (!report.problem.empty()) {
+        return nullptr;
+    }
+    const auto cleanup = [this, mi, factory = report.factory] {
+        Request request(_broker);
+        CMPIStatus status{CMPI_RC_OK, nullptr};
+        std::optional<std::string> thrown =
+            callProvider([&] { status = mi->ft->cleanup(mi, request.context({}), CMPIBoolean{1}); });
+        const bool keep = status.rc == CMPI_RC_DO_NOT_UNLOAD || status.rc == CMPI_RC_NEVER_UNLOAD;
+        if (thrown || (status.rc != CMPI_RC_OK && !keep)) {
+            complain(factory, thrown ? "cleanup " + *thrown : "cleanup failed with code " + std::to_string(status.rc));
+        }
+        return !keep;
+    };
+    _providers.emplace(report.factory, Loaded{mi, report, cleanup});
+    return mi;
+}
+
+template <class MI>
+MI* ProviderLibrary::create(FactoryReport& report) {
+    using Factory = MI*(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
+    auto* factory = reinterpret_cast<Factory*>(dlsym(_handle, report.factory.c_str()));
+    if (factory == nullptr) {
+        report.problem = _file.string() + " has no factory " + report.factory;
+        return nullptr;
+    }
+    Request request(_broker);
+    CMPIStatus status{CMPI_RC_OK, nullptr};
+    MI* mi = nullptr;
+    std::optional<std::string> thrown =
+        callProvider([&] { mi = factory(_broker.handle(), request.context({}), &status); });
+    std::string problem;
+    if (thrown) {
+        problem = *thrown;
+    } else if (mi == nullptr || status.rc != CMPI_RC_OK) {
+        const std::string message = textOf(status.msg);
+        problem = "returned no provider, code " + std::to_string(status.rc) + (message.empty() ? "" : ": " + message);
+    } else {
+        problem = tableProblem(*mi);
+    }
+    if (mi != nullptr && mi->ft != nullptr) {
+        report.miName = mi->ft->miName != nullptr ? mi->ft->miName : "";
+        report.tableVersion = mi->ft->ftVersion;
+        report.miVersion = mi->ft->miVersion;
+    }
+    if (!problem.empty()) {
+        report.problem = report.factory + " in " + _file.string() + ' ' + problem;
+    }
+    return mi;
+}
+
+bool ProviderReport::usable() const {
+    return problem.empty() && std::all_of(factories.begin(), factories.end(),
+                                          [](const FactoryReport& factory) { return factory.problem.empty(); });
+}
+
+Providers::Providers(const Broker& broker, std::vector<std::filesystem::path> folders)
+    : _broker(broker), _folders(std::move(folders)) {}
+
+Providers::~Providers() = default;
+
+ProviderLibrary& Providers::library(const std::string& location) {
+    std::unique_ptr<ProviderLibrary>& library = _libraries[location];
+    if (library == nullptr) {
+        library = std::make_unique<ProviderLibrary>(_broker, location, _folders);
+    }
+    return *library;
+}
+
+template <class MI>
+MI& Providers::provider(const Registration& registration) {
+    const std::lock_guard lock(_mutex);
+    FactoryReport report;
+    MI* mi = library(registration.location).provider<MI>(registration.provider, report);
+    if (mi == nullptr) {
+        throw CimError(CMPI_RC_ERR_FAILED, report.problem);
+    }
+    return *mi;
+}
+
+CMPIInstanceMI& Providers::instanceProvider(const Registration& registration) {
+    return provider<CMPIInstanceMI>(registration);
+}
+
+CMPIMethodMI& Providers::methodProvider(const Registration& registration) {
+    return provider<CMPIMethodMI>(registration);
+}
+
+CMPIAssociationMI& Providers::associationProvider(const Registration& registration) {
+    return provider<CMPIAssociationMI>(registration);
+}
+
+ProviderReport Providers::check(const Registration& registration) {
+    const std::lock_guard lock(_mutex);
+    ProviderReport report;
+    try {
+        ProviderLibrary& loaded = library(registration.location);
+        report.library = loaded.file();
+        const auto checkKind = [&]<class MI>(bool registered, const MI*) {
+            if (registered) {
+                loaded.provider<MI>(registration.provider, report.factories.emplace_back());
+            }
+        };
+        checkKind(registration.instance, static_cast<CMPIInstanceMI*>(nullptr));
+        checkKind(registration.method, static_cast<CMPIMethodMI*>(nullptr));
+        checkKind(registration.association, static_cast<CMPIAssociationMI*>(nullptr));
+        if (registration.property || registration.indication) {
+            report.problem = "property and indication providers are not served";
+        }
+    } catch (const CimError& error) {
+        report.problem = error.what();
+    }
+    return report;
+}
+
+} // namespace ObjectManager

@@ -1,0 +1,56 @@
+#include "dispatch/Registry.h"
+
+#include "TestProviders.h"
+
+namespace ObjectManager {
+namespace {
+
+class RegistryTest : public testing::Test {
+protected:
+    static Registration only(Registration registration, bool Registration::*kind) {
+        registration.instance = false;
+        registration.method = false;
+        registration.*kind = true;
+        return registration;
+    }
+
+    static Registration withProvider(Registration registration, const std::string& provider) {
+        registration.provider = provider;
+        return registration;
+    }
+
+    const Registry registry{
+        {withProvider(only(testRegistration("Test_Disk"), &Registration::instance), "DiskInstances"),
+         withProvider(only(testRegistration("Test_Disk"), &Registration::method), "DiskMethods"),
+         withProvider(only(testRegistration("Test_Holds"), &Registration::association), "Holds")}};
+};
+
+TEST_F(RegistryTest, FindsTheProviderOfEachKind) {
+    EXPECT_EQ("DiskInstances", registry.find("root/cimv2", "Test_Disk", ProviderKind::instance).provider);
+    EXPECT_EQ("DiskMethods", registry.find("root/cimv2", "Test_Disk", ProviderKind::method).provider);
+    EXPECT_EQ("Holds", registry.find("root/interop", "Test_Holds", ProviderKind::association).provider);
+}
+
+TEST_F(RegistryTest, LetterCaseDoesNotMatter) {
+    EXPECT_EQ("DiskInstances", registry.find("ROOT/CIMV2", "test_disk", ProviderKind::instance).provider);
+}
+
+TEST_F(RegistryTest, SaysWhatIsNotRegistered) {
+    const auto find = [&](const char* nameSpace, const char* className, ProviderKind kind) {
+        return errorOf([&] { registry.find(nameSpace, className, kind); });
+    };
+    EXPECT_THAT(find("root", "Test_Disk", ProviderKind::instance),
+                isError(CMPI_RC_ERR_INVALID_NAMESPACE, "no provider is registered in namespace \"root\""));
+    EXPECT_THAT(find("root/cimv2", "Test_Tape", ProviderKind::instance),
+                isError(CMPI_RC_ERR_INVALID_CLASS,
+                        "no provider is registered for class \"Test_Tape\" in namespace \"root/cimv2\""));
+    EXPECT_THAT(find("root/cimv2", "Test_Holds", ProviderKind::instance),
+                isError(CMPI_RC_ERR_NOT_SUPPORTED, "no instance provider is registered for class \"Test_Holds\""));
+    EXPECT_THAT(find("root/cimv2", "Test_Disk", ProviderKind::association),
+                isError(CMPI_RC_ERR_NOT_SUPPORTED, "no association provider is registered for class \"Test_Disk\""));
+    EXPECT_THAT(find("root/cimv2", "Test_Holds", ProviderKind::method),
+                isError(CMPI_RC_ERR_METHOD_NOT_AVAILABLE, "no method provider is registered for class \"Test_Holds\""));
+}
+
+} // namespace
+} // namespace ObjectManager

@@ -1,0 +1,108 @@
+#include "orvcim/Commands.h"
+#include "text/Layout.h"
+
+#include <fmt/format.h>
+#include <fmt/ranges.h>
+#include <nlohmann/json.hpp>
+
+namespace ObjectManager::Orvcim {
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+struct Finding {
+    const Registration& registration;
+    ProviderReport provider;
+    /** Of the class's declaration; empty where nothing is wrong. */
+    std::string schemaProblem;
+
+    bool good() const { return provider.usable() && schemaProblem.empty(); }
+};
+
+Finding findingOf(Session& session, const Registration& registration) {
+    const bool declared = session.catalogue().find(registration.className) != nullptr;
+    return {registration, session.dispatcher().check(registration),
+            declared ? "" : fmt::format("the class is not declared in {}", session.schemaFolder().string())};
+}
+
+std::string describe(const FactoryReport& factory) {
+    return factory.problem.empty() ? fmt::format("{}: {}, versions {} and {}", factory.factory, factory.miName,
+                                                 factory.tableVersion, factory.miVersion)
+                                   : fmt::format("{}: {}", factory.factory, factory.problem);
+}
+
+void writeTable(Session& session, const std::vector<Finding>& findings) {
+    for (const Finding& finding : findings) {
+        const Registration& registration = finding.registration;
+        const std::string library =
+            finding.provider.library.empty() ? registration.location : finding.provider.library.string();
+        std::vector<Row> rows = {rowOf({"namespaces", fmt::format("{}", fmt::join(registration.nameSpaces, ", "))}),
+                                 rowOf({"provider", registration.provider}), rowOf({"library", library})};
+        for (const FactoryReport& factory : finding.provider.factories) {
+            rows.push_back(rowOf({"factory", describe(factory)}));
+        }
+        for (const std::string& problem : {finding.provider.problem, finding.schemaProblem}) {
+            if (!problem.empty()) {
+                rows.push_back(rowOf({"problem", problem}));
+            }
+        }
+        constexpr std::size_t indent = 2;
+        session.out() << registration.className << ": " << (finding.good() ? "ok" : "not usable") << '\n'
+                      << aligned(rows, indent);
+    }
+}
+
+void writeJson(Session& session, const std::vector<Finding>& findings) {
+    Json json = Json::array();
+    for (const Finding& finding : findings) {
+        const Registration& registration = finding.registration;
+        Json factories = Json::array();
+        for (const FactoryReport& factory : finding.provider.factories) {
+            factories.push_back({{"factory", factory.factory},
+                                 {"name", factory.miName},
+                                 {"tableVersion", factory.tableVersion},
+                                 {"version", factory.miVersion},
+                                 {"problem", factory.problem}});
+        }
+        json.push_back({{"class", registration.className},
+                        {"namespaces", registration.nameSpaces},
+                        {"provider", registration.provider},
+                        {"location", registration.location},
+                        {"library", finding.provider.library.string()},
+                        {"usable", finding.good()},
+                        {"problems", Json::array()},
+                        {"factories", factories}});
+        for (const std::string& problem : {finding.provider.problem, finding.schemaProblem}) {
+            if (!problem.empty()) {
+                json.back()["problems"].push_back(problem);
+            }
+        }
+    }
+    constexpr int indent = 2;
+    session.out() << json.dump(indent, ' ', false, Json::error_handler_t::replace) << '\n';
+}
+
+} // namespace
+
+void checkProviders(Session& session) {
+    if (session.options().format == Format::mof) {
+        throw UsageError("found --format mof, expected table or json for check");
+    }
+    std::vector<Finding> findings;
+    std::vector<std::string> unusable;
+    for (const Registration& registration : session.dispatcher().registry().registrations()) {
+        findings.push_back(findingOf(session, registration));
+        if (!findings.back().good()) {
+            unusable.push_back(registration.className);
+        }
+    }
+    (session.options().format == Format::json ? writeJson : writeTable)(session, findings);
+    if (!unusable.empty() || findings.empty()) {
+        throw Failure(findings.empty()
+                          ? fmt::format("found no registration in {}, expected some", session.schemaFolder().string())
+                          : fmt::format("not usable: {}", fmt::join(unusable, ", ")));
+    }
+}
+
+} // namespace ObjectManager::Orvcim

@@ -1,0 +1,251 @@
+#include "orvcim/CommandLine.h"
+
+#include "orvcim/AgentLog.h"
+#include "orvcim/Commands.h"
+#include "text/ObjectPathText.h"
+#include "text/StatusText.h"
+
+#include <CLI/CLI.hpp>
+#include <fmt/format.h>
+#include <fmt/ranges.h>
+
+#include <algorithm>
+#include <iostream>
+#include <map>
+
+namespace ObjectManager::Orvcim {
+
+namespace {
+
+constexpr int failed = 1;
+constexpr int badUsage = 2;
+
+using Command = void (*)(Session&);
+
+const std::map<std::string, Format> formats = {{"table", Format::table}, {"json", Format::json}, {"mof", Format::mof}};
+
+/** Declares the command line, and takes from it what was asked for. */
+class CommandLine {
+public:
+    CommandLine() : _app("The object manager of power management, on the command line.", "orvcim") {
+        _app.fallthrough();
+        _app.set_version_flag("--version", "orvcim " ORVCIM_VERSION);
+        generalOptions();
+        objectCommands();
+        associationCommands();
+        powerCommands();
+        add(_app, "check", "Say which providers load, from where, and what is wrong if one does not", checkProviders);
+    }
+
+    CLI::App& app() { return _app; }
+    const Options& options() const { return _options; }
+
+    /** @throws UsageError where the command line has none. */
+    Command command() const {
+        if (_command == nullptr) {
+            throw UsageError(fmt::format("found no command, expected one of {}", fmt::join(_names, ", ")));
+        }
+        return _command;
+    }
+
+    /** What the command is about, as errors name it. */
+    std::string subject() const {
+        return !_options.method.empty() ? _options.method : !_options.target.empty() ? _options.target : _name;
+    }
+
+private:
+    void generalOptions() {
+        _app.add_option("--namespace", _options.nameSpace, "Namespace of the classes")->capture_default_str();
+        _app.add_option_function<std::string>(
+                "--format", [this](const std::string& format) { _options.format = formats.at(format); },
+                "table (the default), json or mof")
+            ->check(CLI::IsMember(&formats).description(""))
+            ->type_name("FORMAT");
+        _app.add_option("--provider-path", _options.providerFolders,
+                        "Search provider libraries here first (repeatable)")
+            ->type_name("DIR")
+            ->allow_extra_args(false);
+        _app.add_option("--schema", _options.schemaFolder, "Folder of class declarations and registrations")
+            ->type_name("DIR");
+    }
+
+    void objectCommands() {
+        add(_app, "classes", "List the classes that are served", listClasses);
+        addTarget(add(_app, "names", "List the paths of a class's instances", enumerateNames), "CLASS");
+        CLI::App& instances = add(_app, "instances", "Show a class's instances", enumerateInstances);
+        addTarget(instances, "CLASS");
+        addProperties(instances);
+        CLI::App& get = add(_app, "get", "Show one instance", getInstance);
+        addTarget(get, "PATH");
+        addProperties(get);
+        CLI::App& invoke = add(_app, "invoke", "Call a method", invokeMethod);
+        addTarget(invoke, "PATH");
+        invoke.add_option("METHOD", _options.method, "Name of the method")->required()->type_name("");
+        invoke.add_option("NAME=VALUE", _options.arguments, "Arguments; for an array, one for each element")
+            ->type_name("");
+    }
+
+    void associationCommands() {
+        CLI::App& associators =
+            add(_app, "associators", "Show what an instance is associated with, by association", listAssociators);
+        addAssociators(associators);
+        addProperties(associators);
+        addAssociators(add(_app, "associator-names", "List the paths of what an instance is associated with",
+                           listAssociatorNames));
+        CLI::App& references =
+            add(_app, "references", "Show the associations that refer to an instance", listReferences);
+        addReferences(references);
+        addProperties(references);
+        addReferences(add(_app, "reference-names", "List the paths of the associations that refer to an instance",
+                          listReferenceNames));
+        CLI::App& graph = add(_app, "graph", "Draw all instances with their associations, as DOT", drawGraph);
+        graph.add_option("--svg", _options.picture, "Draw them as SVG into a file, with Graphviz")->type_name("FILE");
+    }
+
+    void powerCommands() {
+        CLI::App& power = *_app.add_subcommand("power", "See and change the machine's power state");
+        power.fallthrough();
+        add(power, "status", "Show the power states", powerStatus);
+        addPowerRequest(add(power, "reboot", "Reboot the machine", powerReboot));
+        addPowerRequest(add(power, "shutdown", "Shut the machine down", powerShutdown));
+    }
+
+    CLI::App& add(CLI::App& parent, const std::string& name, const std::string& description, Command toDo) {
+        CLI::App& subcommand = *parent.add_subcommand(name, description);
+        subcommand.fallthrough();
+        subcommand.footer("The options that 'orvcim --help' shows may be given here too.");
+        const std::string words = &parent == &_app ? name : parent.get_name() + " " + name;
+        _names.push_back(words);
+        subcommand.callback([this, words, toDo] {
+            _name = words;
+            _command = toDo;
+        });
+        return subcommand;
+    }
+
+    void addTarget(CLI::App& subcommand, const std::string& name) {
+        subcommand
+            .add_option(name, _options.target, name == "PATH" ? "Object path of the instance" : "Name of the class")
+            ->required()
+            ->type_name("");
+    }
+
+    void addAssociators(CLI::App& subcommand) {
+        addTarget(subcommand, "PATH");
+        addAssociation(subcommand, "--assoc-class");
+        addRestriction(subcommand, "--result-class", _options.filter.resultClass,
+                       "Follow to objects of this class or its descendants", "CLASS");
+        addRestriction(subcommand, "--result-role", _options.filter.resultRole,
+                       "Follow where this reference refers to the other object", "NAME");
+    }
+
+    void addReferences(CLI::App& subcommand) {
+        addTarget(subcommand, "PATH");
+        // The result is the associations.
+        addAssociation(subcommand, "--assoc-class,--result-class");
+    }
+
+    void addAssociation(CLI::App& subcommand, const std::string& option) {
+        addRestriction(subcommand, option, _options.filter.associationClass,
+                       "Follow associations of this class or its descendants", "CLASS");
+        addRestriction(subcommand, "--role", _options.filter.role, "Follow where this reference refers to the instance",
+                       "NAME");
+    }
+
+    static void addRestriction(CLI::App& subcommand, const std::string& option, std::string& value,
+                               const std::string& description, const std::string& type) {
+        subcommand.add_option(option, value, description)->type_name(type);
+    }
+
+    void addProperties(CLI::App& subcommand) {
+        subcommand
+            .add_option_function<std::vector<std::string>>(
+                "--properties", [this](const std::vector<std::string>& names) { _options.properties = names; },
+                "The properties to show, separated by commas")
+            ->delimiter(',')
+            ->type_name("NAME,NAME...");
+    }
+
+    void addPowerRequest(CLI::App& subcommand) {
+        subcommand.add_option("--service", _options.service, "Path of the service, where there are several")
+            ->type_name("PATH");
+        subcommand.add_flag("--yes", _options.yes, "Do not ask, whatever the machine is");
+    }
+
+    CLI::App _app;
+    Options _options;
+    /** Of all commands. */
+    std::vector<std::string> _names;
+    /** Of the one that was asked for. */
+    std::string _name;
+    Command _command = nullptr;
+};
+
+int report(int status, const std::string& message) {
+    std::cerr << "orvcim: " << message << '\n';
+    return status;
+}
+
+/**
+ * What the agent's log tells of failures, each said once; begins with `introduction` where it tells anything. What it
+ * says of the machine and of accepted requests is no failure.
+ */
+std::string reasonsText(const std::vector<std::string>& logged, const char* introduction) {
+    std::vector<std::string> reasons;
+    for (const std::string& each : logged) {
+        if (!isSimulationNotice(each) && !isAcceptance(each) &&
+            std::find(reasons.begin(), reasons.end(), each) == reasons.end()) {
+            reasons.push_back(each);
+        }
+    }
+    return reasons.empty() ? "" : fmt::format("{}{}", introduction, fmt::join(reasons, "; "));
+}
+
+std::string refusalText(const CimError& error) {
+    const std::string reasons = reasonsText(error.reasons, ": ");
+    return error.what() + (reasons.empty() ? ": the provider gave no reason" : reasons);
+}
+
+std::string failureText(const std::string& subject, const CimError& error) {
+    // That there is no such instance is all there is to say.
+    const std::string reasons =
+        error.code == CMPI_RC_ERR_NOT_FOUND ? "" : reasonsText(error.reasons, "; the provider logged: ");
+    return fmt::format("{}: {}: {}{}", subject, statusText(error.code), error.what(), reasons);
+}
+
+} // namespace
+
+int run(int argc, const char* const* argv) {
+    CommandLine commandLine;
+    try {
+        commandLine.app().parse(argc, argv);
+    } catch (const CLI::Success& success) {
+        return commandLine.app().exit(success);
+    } catch (const CLI::ParseError& error) {
+        return report(badUsage, fmt::format("{} (orvcim --help tells what can be done)", error.what()));
+    }
+    try {
+        const Command command = commandLine.command();
+        Session session(commandLine.options(), std::cout);
+        command(session);
+        // Providers report some failures to nobody but the log, with an answer that is merely empty.
+        if (const std::string logged = reasonsText(session.log().failuresSince(0), "the provider logged: ");
+            !logged.empty()) {
+            report(0, logged);
+        }
+    } catch (const CimError& error) {
+        return report(failed, error.refused ? refusalText(error) : failureText(commandLine.subject(), error));
+    } catch (const UsageError& error) {
+        return report(badUsage, error.what());
+    } catch (const ObjectPathError& error) {
+        return report(badUsage, error.what());
+    } catch (const std::exception& error) {
+        return report(failed, error.what());
+    }
+    if (!std::cout.flush()) {
+        return report(failed, "standard output cannot be written");
+    }
+    return 0;
+}
+
+} // namespace ObjectManager::Orvcim

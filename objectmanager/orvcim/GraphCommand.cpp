@@ -1,0 +1,112 @@
+#include "orvcim/Commands.h"
+#include "orvcim/Graphviz.h"
+#include "text/ObjectPathText.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <iterator>
+#include <unordered_map>
+
+namespace ObjectManager::Orvcim {
+
+namespace {
+
+/** A graph in the DOT language, whose nodes are instances and whose edges are associations. */
+class Graph {
+public:
+    explicit Graph(const Catalogue& catalogue) : _catalogue(catalogue) {}
+
+    void addInstance(const ObjectPath& path) { nodeOf(path); }
+
+    /** An edge from the first reference to each other one, labelled with what the association says beside. */
+    void addAssociation(const Instance& association) {
+        const Class* known = _catalogue.find(association.path.className);
+        std::string label = association.path.className;
+        std::vector<std::string> nodes;
+        for (const NamedValue& property : association.properties) {
+            if (const auto* end = std::get_if<std::shared_ptr<const ObjectPath>>(&property.value.content)) {
+                nodes.push_back(nodeOf(**end));
+            } else {
+                const Property* declared = known == nullptr ? nullptr : known->property(property.name);
+                label += fmt::format("\n{}: {}", property.name, plainText(property.value, declared));
+            }
+        }
+        for (std::size_t i = 1; i < nodes.size(); ++i) {
+            _edges += fmt::format("    {} -> {} [label={}];\n", nodes.front(), nodes[i], dotString(label));
+        }
+    }
+
+    std::string text() const { return "digraph orvcim {\n    node [shape=box];\n" + _nodes + _edges + "}\n"; }
+
+private:
+    /** The name of the path's node, which is added where there is none. */
+    std::string nodeOf(const ObjectPath& path) {
+        const auto [known, added] = _names.try_emplace(path, fmt::format("n{}", _names.size() + 1));
+        if (added) {
+            _nodes += fmt::format("    {} [label={}];\n", known->second, dotString(labelOf(path)));
+        }
+        return known->second;
+    }
+
+    /** The class, and below it the keys but for those that only tell a class. */
+    static std::string labelOf(const ObjectPath& path) {
+        std::string label = path.className;
+        for (const NamedValue& key : path.keys) {
+            if (!equalNames(key.name, "CreationClassName") && !equalNames(key.name, "SystemCreationClassName")) {
+                label += fmt::format("\n{}: {}", key.name, plainText(key.value, nullptr));
+            }
+        }
+        return label;
+    }
+
+    const Catalogue& _catalogue;
+    std::unordered_map<ObjectPath, std::string, ObjectPathHash> _names;
+    std::string _nodes;
+    std::string _edges;
+};
+
+bool isAssociation(const Catalogue& catalogue, const Registration& registration) {
+    return !catalogue.references(registration.className).empty();
+}
+
+Graph graphOf(Session& session) {
+    Graph graph(session.catalogue());
+    const std::string& nameSpace = session.options().nameSpace;
+    const auto classes = session.dispatcher().registry().all(nameSpace, ProviderKind::instance);
+    const auto classPath = [&](const Registration* registration) {
+        return ObjectPath{{}, nameSpace, registration->className, {}};
+    };
+    for (const Registration* registration : classes) {
+        if (!isAssociation(session.catalogue(), *registration)) {
+            const auto paths =
+                session.dispatcher().enumerateInstanceNames(Session::invocation(), classPath(registration));
+            std::for_each(paths.begin(), paths.end(), [&](const ObjectPath& path) { graph.addInstance(path); });
+        }
+    }
+    for (const Registration* registration : classes) {
+        if (isAssociation(session.catalogue(), *registration)) {
+            const auto associations =
+                session.dispatcher().enumerateInstances(Session::invocation(), classPath(registration), std::nullopt);
+            std::for_each(associations.begin(), associations.end(),
+                          [&](const Instance& association) { graph.addAssociation(association); });
+        }
+    }
+    return graph;
+}
+
+} // namespace
+
+void drawGraph(Session& session) {
+    if (session.options().format != Format::table) {
+        throw UsageError("found --format, expected none: graph writes DOT, or SVG with --svg");
+    }
+    const std::string text = graphOf(session).text();
+    if (session.options().picture.empty()) {
+        session.out() << text;
+    } else {
+        drawSvg(text, session.options().picture);
+    }
+}
+
+} // namespace ObjectManager::Orvcim

@@ -1,0 +1,185 @@
+/* The associations of what is shipped, from every end and as a drawing. */
+#include "Provided.h"
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <iterator>
+#include <ostream>
+
+namespace OrvcimTest {
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+std::string contentOf(const std::filesystem::path& file) {
+    std::ifstream stream(file);
+    EXPECT_TRUE(stream.is_open()) << file;
+    return {std::istreambuf_iterator<char>(stream), {}};
+}
+
+/** The file data/<name> has the answer. */
+struct Query {
+    const char* name;
+    const char* command;
+    /** SYSTEM, SERVICE or CAPABILITIES stands for the path of the machine's. */
+    const char* source;
+    std::vector<std::string> options;
+};
+
+void PrintTo(const Query& query, std::ostream* out) {
+    *out << query.name;
+}
+
+class AssociationTest : public ProvidedTest, public testing::WithParamInterface<Query> {
+protected:
+    std::string pathOf(const std::string& source) const {
+        return source == "SYSTEM" ? _system : source == "SERVICE" ? _service : _capabilities;
+    }
+};
+
+TEST_P(AssociationTest, isAnsweredAsItsFileSays) {
+    std::vector<std::string> arguments = {GetParam().command, pathOf(GetParam().source)};
+    arguments.insert(arguments.end(), GetParam().options.begin(), GetParam().options.end());
+    EXPECT_EQ(answerOf(arguments), contentOf(std::filesystem::path(ORVCIM_TEST_DATA) / GetParam().name));
+}
+
+const std::vector<std::string> elementName = {"--properties", "ElementName"};
+
+INSTANTIATE_TEST_SUITE_P(
+    query, AssociationTest,
+    testing::Values(Query{"system.associator-names", "associator-names", "SYSTEM", {}},
+                    Query{"service.associator-names", "associator-names", "SERVICE", {}},
+                    Query{"capabilities.associator-names", "associator-names", "CAPABILITIES", {}},
+                    Query{"system.associators", "associators", "SYSTEM", elementName},
+                    Query{"service.associators", "associators", "SERVICE", elementName},
+                    Query{"capabilities.associators", "associators", "CAPABILITIES", elementName},
+                    Query{"system.reference-names", "reference-names", "SYSTEM", {}},
+                    Query{"service.reference-names", "reference-names", "SERVICE", {}},
+                    Query{"capabilities.reference-names", "reference-names", "CAPABILITIES", {}},
+                    Query{"system.references", "references", "SYSTEM", {}},
+                    Query{"service.references", "references", "SERVICE", {}},
+                    Query{"capabilities.references", "references", "CAPABILITIES", {}},
+                    Query{"nothing", "associators", "CAPABILITIES", {"--assoc-class", "CIM_Dependency"}},
+                    Query{"nothing", "associators", "SYSTEM", {"--result-class", "CIM_System"}},
+                    Query{"nothing", "references", "SERVICE", {"--role", "UserOfService"}}),
+    [](const auto& query) {
+        std::string name = query.param.command + std::to_string(query.index);
+        std::erase(name, '-');
+        return name;
+    });
+
+struct Restricted {
+    const char* option;
+    const char* value;
+    const char* association;
+};
+
+TEST_F(ProvidedTest, restrictsAssociationsByClassesTheirAncestorsAndRoles) {
+    const Restricted restrictions[] = {
+        {"--assoc-class", "TALVO_PowerManagementHostedService", "TALVO_PowerManagementHostedService"},
+        {"--assoc-class", "CIM_Dependency", "TALVO_PowerManagementHostedService"},
+        {"--assoc-class", "cim_serviceavailabletoelement", "TALVO_AssociatedPowerManagementService"},
+        {"--result-class", "CIM_Capabilities", "TALVO_PowerManagementElementCapabilities"},
+        {"--role", "ServiceProvided", "TALVO_AssociatedPowerManagementService"},
+        {"--role", "dependent", "TALVO_PowerManagementHostedService"},
+        {"--result-role", "Capabilities", "TALVO_PowerManagementElementCapabilities"},
+    };
+    for (const Restricted& restricted : restrictions) {
+        const std::string names = answerOf({"associator-names", _service, restricted.option, restricted.value});
+        EXPECT_THAT(names, StartsWith(std::string(restricted.association) + "\n  root/cimv2:"));
+        EXPECT_EQ(std::count(names.begin(), names.end(), '\n'), 2) << names;
+    }
+}
+
+/** What is shipped, but for the registration of the computer system. */
+class NoComputerSystemTest : public ProvidedTest {
+protected:
+    NoComputerSystemTest() {
+        std::filesystem::copy(ORV_SCHEMA_FOLDER, _folder / "schema");
+        std::filesystem::remove(_folder / "schema" / "orv-computer-system.reg");
+    }
+
+    Outcome withoutSystem(std::vector<std::string> arguments) const {
+        arguments.insert(arguments.end(), {"--schema", (_folder / "schema").string()});
+        return orvcim(arguments);
+    }
+};
+
+TEST_F(NoComputerSystemTest, failsForTheAssociationsThatNeedItAndSaysWhy) {
+    for (const char* command : {"associators", "associator-names", "references", "reference-names"}) {
+        const Outcome outcome = withoutSystem({command, _service});
+        EXPECT_EQ(outcome.err, "orvcim: " + _service +
+                                   ": CIM_ERR_INVALID_CLASS (5): TALVO_AssociatedPowerManagementService: no provider "
+                                   "is registered for class \"TALVO_ComputerSystem\" in namespace \"root/cimv2\"; the "
+                                   "provider logged: CBEnumInstanceNames Failed for the target Class\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+}
+
+TEST_F(NoComputerSystemTest, servesTheAssociationThatDoesNotNeedIt) {
+    const Outcome outcome = withoutSystem({"associator-names", _service, "--assoc-class", "CIM_ElementCapabilities"});
+    EXPECT_EQ(outcome.out, "TALVO_PowerManagementElementCapabilities\n  " + _capabilities + "\n");
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST_F(NoComputerSystemTest, tellsWhatTheProviderLoggedBesideAnAnswerThatIsMerelyEmpty) {
+    const Outcome outcome = withoutSystem({"instances", "TALVO_AssociatedPowerManagementService"});
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.err, "orvcim: the provider logged: CBEnumInstanceNames Failed for the target Class\n");
+    EXPECT_EQ(outcome.status, 0);
+}
+
+/** `dot` is a script of the test's own. */
+class GraphTest : public ProvidedTest {
+protected:
+    void writeDot(const std::string& script) const {
+        const std::filesystem::path dot = _folder / "dot";
+        std::ofstream(dot) << "#!/bin/sh\n" << script << '\n';
+        std::filesystem::permissions(dot, std::filesystem::perms::owner_all);
+    }
+
+    Outcome draw(const std::string& file) const {
+        return orvcim({"graph", "--svg", file}, {{"PATH", _folder.string()}});
+    }
+
+    const std::filesystem::path _expected = std::filesystem::path(ORVCIM_TEST_DATA) / "graph.dot";
+};
+
+TEST_F(GraphTest, hasEveryInstanceWithItsAssociations) {
+    EXPECT_EQ(answerOf({"graph"}), contentOf(_expected));
+}
+
+TEST_F(GraphTest, isDrawnByGraphviz) {
+    writeDot("echo \"$@\" > '" + (_folder / "arguments").string() + "'; exec /bin/cat > \"${2#-o}\"");
+    const std::string picture = (_folder / "picture.svg").string();
+    const Outcome outcome = draw(picture);
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 0);
+    EXPECT_EQ(contentOf(_folder / "arguments"), "-Tsvg -o" + picture + "\n");
+    EXPECT_EQ(contentOf(picture), contentOf(_expected));
+}
+
+TEST_F(GraphTest, isNotDrawnWithoutGraphviz) {
+    const Outcome outcome = draw((_folder / "picture.svg").string());
+    EXPECT_EQ(outcome.err, "orvcim: cannot run the program dot (No such file or directory), expected Graphviz to be "
+                           "installed for --svg\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST_F(GraphTest, isNotDrawnWhereGraphvizFails) {
+    writeDot("exit 3");
+    EXPECT_EQ(draw("/nowhere/picture.svg").err,
+              "orvcim: the program dot did not draw /nowhere/picture.svg (exit status 3)\n");
+    writeDot("kill -9 $$");
+    const Outcome outcome = draw("/nowhere/picture.svg");
+    EXPECT_EQ(outcome.err, "orvcim: the program dot did not draw /nowhere/picture.svg (signal 9)\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+} // namespace
+} // namespace OrvcimTest

@@ -1,0 +1,156 @@
+#include "Orvcim.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <map>
+#include <string>
+
+namespace OrvcimTest {
+namespace {
+
+using testing::EndsWith;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::StartsWith;
+
+using Environment = std::map<std::string, std::string>;
+
+const Environment simulated = {};
+const Environment real = {{"ORVCIM_TEST_MACHINE", "real"}};
+
+TEST(Power, rebootsASimulatedMachineWithoutAsking) {
+    const Outcome outcome = orvcim({"power", "reboot"}, simulated);
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.status, 0);
+    EXPECT_EQ(outcome.out, "Power request accepted: 5 for TALVO_ComputerSystem TALVO_ComputerSystem testhost\n");
+}
+
+TEST(Power, shutsASimulatedMachineDownWithoutAsking) {
+    const Outcome outcome = orvcim({"power", "shutdown"}, simulated);
+    EXPECT_EQ(outcome.status, 0);
+    EXPECT_EQ(outcome.out, "Power request accepted: 8 for TALVO_ComputerSystem TALVO_ComputerSystem testhost\n");
+}
+
+TEST(Power, answersProgramsWithTheResultOfTheMethod) {
+    EXPECT_EQ(orvcim({"power", "reboot", "--format", "json"}, simulated).out,
+              "{\n  \"method\": \"RequestPowerStateChange\",\n  \"returnValue\": 0,\n  \"outputs\": {}\n}\n");
+    EXPECT_EQ(orvcim({"power", "reboot", "--format", "mof"}, simulated).out,
+              "// RequestPowerStateChange\ninstance of __MethodParameters {\n    ReturnValue = 0;\n};\n");
+}
+
+TEST(Power, leavesAMachineThatMayBeRealAloneWhereItCannotAsk) {
+    for (const char* machine : {"real", "silent"}) {
+        const Outcome outcome = orvcim({"power", "shutdown"}, {{"ORVCIM_TEST_MACHINE", machine}});
+        EXPECT_EQ(outcome.err, "orvcim: testhost is not known to be a simulated machine: expected --yes, or a terminal "
+                               "to ask on\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+}
+
+TEST(Power, asksAtATerminalBeforeItActs) {
+    const Outcome outcome = orvcim({"power", "reboot"}, real, "y\n");
+    EXPECT_EQ(outcome.err, "Really reboot testhost? [y/N] ");
+    EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 5 "));
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(Power, leavesTheMachineAloneWithoutAYes) {
+    for (const char* answer : {"n\n", "\n", "yesterday\n", "\x04"}) {
+        const Outcome outcome = orvcim({"power", "reboot"}, real, answer);
+        EXPECT_EQ(outcome.err, "Really reboot testhost? [y/N] orvcim: not confirmed: testhost was left alone\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+}
+
+TEST(Power, doesNotAskWhereItWasToldNotTo) {
+    const Outcome outcome = orvcim({"power", "reboot", "--yes"}, real);
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 5 "));
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(Power, failsWhereTheAgentRefusedThoughTheMethodReturnedNothingWrong) {
+    for (const char* format : {"table", "json", "mof"}) {
+        const Outcome outcome = orvcim({"power", "reboot", "--format", format}, {{"ORVCIM_TEST_ANSWER", "refused"}});
+        EXPECT_EQ(outcome.err,
+                  "orvcim: Power request refused: 5 for TALVO_ComputerSystem TALVO_ComputerSystem testhost\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+}
+
+TEST(Power, failsWhereTheAgentSaidNothingOfARequest) {
+    const Outcome outcome = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_ANSWER", "nothing"}});
+    EXPECT_EQ(outcome.err,
+              "orvcim: RequestPowerStateChange ended without a failure, but the agent accepted no power request\n");
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST(Power, givesTheResultOfTheMethodWhereTheAgentCannotBeHeard) {
+    const Outcome outcome = orvcim({"power", "reboot", "--yes"}, {{"ORVCIM_TEST_MACHINE", "silent"}});
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.out, "RequestPowerStateChange\n    ReturnValue  0 (Completed with No Error)\n");
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(Power, failsWithWhatTheReturnValueMeans) {
+    const Outcome outcome = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_ANSWER", "4"}});
+    EXPECT_EQ(outcome.err, "orvcim: RequestPowerStateChange failed with 4 (Failed)\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST(Power, wantsAServiceToBeChosenWhereThereAreSeveral) {
+    const Environment three = {{"ORVCIM_TEST_SERVICES", "3"}};
+    const Outcome undecided = orvcim({"power", "reboot"}, three);
+    EXPECT_EQ(undecided.err, "orvcim: found 3 instances of TALVO_PowerManagementService, expected one, or --service "
+                             "PATH to choose\n");
+    EXPECT_EQ(undecided.status, 1);
+    const std::string second = "TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\",Name="
+                               "\"service2\",SystemCreationClassName=\"TALVO_ComputerSystem\",SystemName=\"testhost\"";
+    EXPECT_EQ(orvcim({"power", "reboot", "--service", second}, three).status, 0);
+}
+
+TEST(Power, doesNotTakeAServiceThatIsNotThere) {
+    const Outcome none = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_SERVICES", "0"}});
+    EXPECT_EQ(none.err, "orvcim: found 0 instances of TALVO_PowerManagementService, expected one\n");
+    EXPECT_EQ(none.status, 1);
+    const std::string second = "TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\",Name="
+                               "\"service2\",SystemCreationClassName=\"TALVO_ComputerSystem\",SystemName=\"testhost\"";
+    const Outcome wrong = orvcim({"power", "reboot", "--service", second}, simulated);
+    EXPECT_EQ(wrong.err, "orvcim: found no service root/cimv2:" + second +
+                             ", expected one of those that 'orvcim names TALVO_PowerManagementService' lists\n");
+    EXPECT_EQ(wrong.status, 1);
+}
+
+TEST(PowerStatus, showsTheStatesWhereTheyAreServed) {
+    const Outcome outcome = orvcim({"power", "status", "--namespace", "root/associated"}, simulated);
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.out, "SYSTEM    SERVICE   POWER STATE\n"
+                           "testhost  service1  2 (On)\n");
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(PowerStatus, givesProgramsTheInstances) {
+    const Outcome outcome = orvcim({"power", "status", "--namespace", "root/associated", "--format", "mof"}, simulated);
+    EXPECT_THAT(outcome.out, StartsWith("instance of TALVO_AssociatedPowerManagementService {\n"
+                                        "    ServiceProvided = \""));
+    EXPECT_THAT(outcome.out, EndsWith("    PowerState = 2;\n};\n"));
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(PowerStatus, showsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
+    const Outcome outcome = orvcim({"power", "status"}, simulated);
+    EXPECT_EQ(outcome.err, "orvcim: the power state itself is not served: TALVO_AssociatedPowerManagementService is "
+                           "not registered in root/cimv2\n");
+    EXPECT_EQ(outcome.out, "SERVICE OR CAPABILITIES  POWER STATES THAT CAN BE ASKED FOR\n"
+                           "service1\n"
+                           "capabilities1            5 (Power Cycle (Off-Soft)), 8 (Off-Soft)\n");
+    EXPECT_EQ(outcome.status, 0);
+}
+
+} // namespace
+} // namespace OrvcimTest

@@ -1,0 +1,128 @@
+#include "Provided.h"
+
+#include <gmock/gmock.h>
+
+#include <utility>
+
+namespace OrvcimTest {
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+TEST_F(ProvidedTest, everyRegisteredProviderLoads) {
+    EXPECT_EQ(orvcim({"check"}).status, 0);
+}
+
+TEST_F(ProvidedTest, namesTheService) {
+    EXPECT_EQ(answerOf({"names", "TALVO_PowerManagementService"}), _service + "\n");
+    EXPECT_EQ(answerOf({"names", "TALVO_PowerManagementService", "--namespace", "root/interop"}).substr(0, 13),
+              "root/interop:");
+}
+
+TEST_F(ProvidedTest, showsTheServiceInEveryFormat) {
+    const std::string table = answerOf({"get", _service});
+    EXPECT_THAT(table, StartsWith("root/cimv2:TALVO_PowerManagementService\n"
+                                  "  * CreationClassName        TALVO_PowerManagementService\n"
+                                  "  * Name                     PowerStateManagement_chassis/blade1\n"
+                                  "  * SystemCreationClassName  TALVO_ComputerSystem\n"
+                                  "  * SystemName               machine.example\n"
+                                  "    Caption                  "));
+    EXPECT_THAT(table, HasSubstr("    ElementName              PowerStateManagement_chassis/blade1\n"));
+    EXPECT_EQ(answerOf({"instances", "TALVO_PowerManagementService"}), table);
+    EXPECT_EQ(answerOf({"instances", "TALVO_PowerManagementService", "--properties", "ElementName", "--format", "mof"}),
+              "instance of TALVO_PowerManagementService {\n"
+              "    CreationClassName = \"TALVO_PowerManagementService\";\n"
+              "    Name = \"PowerStateManagement_chassis/blade1\";\n"
+              "    SystemCreationClassName = \"TALVO_ComputerSystem\";\n"
+              "    SystemName = \"machine.example\";\n"
+              "    ElementName = \"PowerStateManagement_chassis/blade1\";\n"
+              "};\n");
+    EXPECT_THAT(answerOf({"get", _service, "--format", "json"}),
+                HasSubstr("\"SystemName\": \"machine.example\",\n    \"Caption\": \""));
+}
+
+TEST_F(ProvidedTest, showsTheCapabilitiesWithWhatTheirCodesMean) {
+    EXPECT_EQ(answerOf({"instances", "TALVO_PowerManagementCapabilities"}),
+              "root/cimv2:TALVO_PowerManagementCapabilities\n"
+              "  * InstanceID               chassis/blade1\n"
+              "    PowerChangeCapabilities  3 (Power State Settable), 4 (Power Cycling Supported),\n"
+              "                             8 (Graceful Shutdown Supported)\n"
+              "    ElementName              PowerStateManagementCapabilities_chassis/blade1\n"
+              "    PowerStatesSupported     2 (On), 5 (Power Cycle (Off-Soft)), 8 (Off-Soft)\n");
+}
+
+TEST_F(ProvidedTest, showsTheComputerSystemWithWhatItsCodesMean) {
+    EXPECT_EQ(answerOf({"instances", "TALVO_ComputerSystem", "--properties",
+                        "ElementName,NameFormat,EnabledState,RequestedState,Dedicated"}),
+              "root/cimv2:TALVO_ComputerSystem\n"
+              "  * CreationClassName  TALVO_ComputerSystem\n"
+              "  * Name               machine.example\n"
+              "    ElementName        machine.example\n"
+              "    NameFormat         IP\n"
+              "    EnabledState       2 (Enabled)\n"
+              "    RequestedState     12 (Not Applicable)\n"
+              "    Dedicated          0 (Not Dedicated)\n");
+    EXPECT_EQ(
+        orvcim({"instances", "TALVO_ComputerSystem", "--properties", "OtherIdentifyingInfo,IdentifyingDescriptions"})
+            .status,
+        0);
+}
+
+TEST_F(ProvidedTest, reportsAnInstanceThatIsNotThere) {
+    std::string other = _service;
+    other.replace(other.find("blade1"), 6, "blade2");
+    const Outcome outcome = orvcim({"get", other});
+    EXPECT_EQ(outcome.err, "orvcim: " + other + ": CIM_ERR_NOT_FOUND (6): there is no such instance\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST_F(ProvidedTest, rebootsAndShutsDownTheSimulatedMachine) {
+    EXPECT_THAT(answerOf({"power", "reboot"}), StartsWith("Power request accepted: reboot of simulated node"));
+    EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
+    EXPECT_THAT(answerOf({"power", "shutdown"}), StartsWith("Power request accepted: shutdown of simulated node"));
+    EXPECT_EQ(answerOf({"invoke", _service, "RequestPowerStateChange", "PowerState=5", "ManagedElement=" + _system}),
+              "RequestPowerStateChange\n    ReturnValue  0 (Completed with No Error)\n");
+}
+
+TEST_F(ProvidedTest, showsARefusedRequestAsRefused) {
+    const std::string system = "ManagedElement=" + _system;
+    const std::pair<std::vector<std::string>, std::string> requests[] = {
+        {{"PowerState=2", system}, "Requested Power State change Not Supported"},
+        {{"PowerState=5", system, "Time=00000000000100.000000:000"}, "Use Of Time Property Not Supported"},
+        {{"PowerState=5", system, "TimeoutPeriod=00000000000100.000000:000"}, "Use Of Timeout Period Not Supported"}};
+    for (const auto& [given, reason] : requests) {
+        std::vector<std::string> arguments = {"invoke", _service, "RequestPowerStateChange"};
+        arguments.insert(arguments.end(), given.begin(), given.end());
+        const Outcome outcome = orvcim(arguments);
+        EXPECT_EQ(outcome.err, "orvcim: RequestPowerStateChange was refused: " + reason + "\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+    EXPECT_FALSE(std::filesystem::exists(_folder / "state.json"));
+}
+
+TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
+    const std::string heading = "SYSTEM           SERVICE                              POWER STATE\n"
+                                "machine.example  PowerStateManagement_chassis/blade1  ";
+    const auto rebootsIn = [this](const char* seconds) {
+        configure(std::string("reboot-time = ") + seconds +
+                  "\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
+        answerOf({"power", "reboot"});
+        return answerOf({"power", "status"});
+    };
+    EXPECT_EQ(answerOf({"power", "status"}), heading + "2 (On)\n");
+    EXPECT_EQ(rebootsIn("0"), heading + "2 (On)\n");
+    EXPECT_EQ(rebootsIn("3600"), heading + "1 (Other), as during a reboot\n");
+}
+
+TEST_F(ProvidedTest, offersNoServiceWhereTheConfigurationIsWrong) {
+    configure("backend = 5\n");
+    const Outcome outcome = orvcim({"power", "reboot", "--yes"});
+    EXPECT_THAT(outcome.err, HasSubstr("orvcim: "));
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+} // namespace
+} // namespace OrvcimTest

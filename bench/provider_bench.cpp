@@ -1,0 +1,292 @@
+/**
+ * The provider library's operations through the embedded object manager, beside the floor: the same broker calls made
+ * by a bare loop. Prints, after the measurements, a table of the cost of one object (an instance, a path, a pair of an
+ * association, a method call) and its ratio to the floor.
+ *
+ * The agent reads its configuration once in a process, so each number of nodes and each setting of the log runs in a
+ * process of its own.
+ */
+#include "dispatch/Dispatcher.h"
+
+#include <benchmark/benchmark.h>
+
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <map>
+#include <string>
+#include <vector>
+
+namespace {
+
+using namespace ObjectManager;
+
+/** What one process measures. */
+struct Setup {
+    unsigned int nodes;
+    unsigned int systems;
+    /** Whether every record is written to a file, or what the default thresholds let through. */
+    bool logEverything;
+    bool associations;
+};
+
+constexpr Setup setups[] = {
+    {1, 1, false, false}, {100, 1, false, false}, {10'000, 1, false, false}, {60'000, 1, false, false},
+    {1, 1, true, false},  {100, 1, true, false},  {10'000, 1, true, false},  {60'000, 1, true, false},
+    {1, 1, false, true},  {100, 10, false, true}, {1'000, 1, false, true},   {300, 1, false, true},
+};
+
+void writeConfiguration(const Setup& setup, const std::filesystem::path& folder) {
+    std::ofstream file(folder / "agent.toml");
+    file << "[system]\nname = \"bench.example\"\n";
+    if (setup.logEverything) {
+        file << "[log]\ndestination = \"file\"\nfile = \"" << (folder / "agent.log").string()
+             << "\"\nlevel = 0\ntrace-level = 0\n";
+    }
+    file << "[instrumentation.simulated]\nstate-file = \"" << (folder / "machine.json").string()
+         << "\"\nreboot-time = 0\n";
+    for (unsigned int i = 0; i < setup.nodes; ++i) {
+        file << "[[instrumentation.simulated.node]]\npath = \"node" << i << "\"\n";
+    }
+    file.close();
+    setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
+    setenv("ORV_BENCH_NODES", std::to_string(setup.nodes).c_str(), 1);
+    setenv("ORV_BENCH_SYSTEMS", std::to_string(setup.systems).c_str(), 1);
+}
+
+constexpr const char* nameSpace = "root/cimv2";
+
+Registration registration(const char* className, const char* provider, const char* location) {
+    Registration made;
+    made.className = className;
+    made.provider = provider;
+    made.location = location;
+    made.nameSpaces = {nameSpace};
+    made.instance = true;
+    made.method = std::string(className).ends_with("Service");
+    return made;
+}
+
+Registry registry() {
+    constexpr const char* library = "orvpowerstatemanagementprovider";
+    Registration associated =
+        registration("TALVO_AssociatedPowerManagementService", "AssociatedPowerManagementServiceProvider", library);
+    associated.method = false;
+    return Registry({
+        registration("TALVO_PowerManagementService", "PowerManagementServiceProvider", library),
+        registration("TALVO_PowerManagementCapabilities", "PowerManagementCapabilitiesProvider", library),
+        associated,
+        registration("TALVO_PowerManagementElementCapabilities", "PowerManagementElementCapabilitiesProvider", library),
+        registration("TALVO_ComputerSystem", "FloorComputerSystemProvider", "orvfloorprovider"),
+        registration("FLOOR_Service", "FloorServiceProvider", "orvfloorprovider"),
+        registration("FLOOR_Capabilities", "FloorCapabilitiesProvider", "orvfloorprovider"),
+    });
+}
+
+ObjectPath pathOf(const std::string& className, std::vector<NamedValue> keys = {}) {
+    return ObjectPath{"", nameSpace, className, std::move(keys)};
+}
+
+/** Runs one operation and says how many objects it returned. */
+using Operation = std::function<std::size_t(Dispatcher&, const std::string& className)>;
+
+const Operation enumInstanceNames = [](Dispatcher& dispatcher, const std::string& className) {
+    return dispatcher.enumerateInstanceNames({}, pathOf(className)).size();
+};
+
+const Operation enumInstances = [](Dispatcher& dispatcher, const std::string& className) {
+    return dispatcher.enumerateInstances({}, pathOf(className), {}).size();
+};
+
+/** A lookup by key. The key is the last one of the floor as well, which does not look at it. */
+Operation getInstance(const std::string& key, const std::string& value) {
+    return [key, value](Dispatcher& dispatcher, const std::string& className) {
+        dispatcher.getInstance({}, pathOf(className, {{key, stringValue(value)}}), {});
+        return std::size_t{1};
+    };
+}
+
+/** RequestPowerStateChange. A state that the provider refuses ends before anything is written. */
+Operation requestPowerStateChange(std::uint64_t powerState) {
+    return [powerState](Dispatcher& dispatcher, const std::string& className) {
+        const std::vector<NamedValue> arguments = {
+            {"PowerState", unsignedValue(CMPI_uint16, powerState)},
+            {"ManagedElement", referenceValue(pathOf("TALVO_ComputerSystem"))},
+        };
+        try {
+            dispatcher.invokeMethod({}, pathOf(className), "RequestPowerStateChange", arguments);
+        } catch (const CimError& error) {
+            if (!error.refused) {
+                throw;
+            }
+        }
+        return std::size_t{1};
+    };
+}
+
+struct Measured {
+    const char* operation;
+    /** The class that is measured, and the one that stands for the floor; null where there is none. */
+    const char* className;
+    const char* floorClass;
+    Operation run;
+};
+
+std::vector<Measured> elementOperations() {
+    constexpr const char* service = "TALVO_PowerManagementService";
+    constexpr const char* capabilities = "TALVO_PowerManagementCapabilities";
+    return {
+        {"service EnumInstanceNames", service, "FLOOR_Service", enumInstanceNames},
+        {"service EnumInstances", service, "FLOOR_Service", enumInstances},
+        {"service GetInstance", service, "FLOOR_Service", getInstance("Name", "PowerStateManagement_node0")},
+        {"service RequestPowerStateChange refused", service, "FLOOR_Service", requestPowerStateChange(2)},
+        {"service RequestPowerStateChange accepted", service, "FLOOR_Service", requestPowerStateChange(5)},
+        {"capabilities EnumInstanceNames", capabilities, "FLOOR_Capabilities", enumInstanceNames},
+        {"capabilities EnumInstances", capabilities, "FLOOR_Capabilities", enumInstances},
+        {"capabilities GetInstance", capabilities, "FLOOR_Capabilities", getInstance("InstanceID", "node0")},
+    };
+}
+
+std::vector<Measured> associationOperations(const Setup& setup) {
+    if (setup.nodes == 300) {
+        constexpr const char* className = "TALVO_PowerManagementElementCapabilities";
+        return {{"capabilities association EnumInstanceNames", className, nullptr, enumInstanceNames}};
+    }
+    constexpr const char* className = "TALVO_AssociatedPowerManagementService";
+    return {{"system association EnumInstanceNames", className, nullptr, enumInstanceNames},
+            {"system association EnumInstances", className, nullptr, enumInstances}};
+}
+
+/** Sends each measurement to the parent process as a line "name<TAB>nanoseconds of one object", and shows it. */
+class Reporter : public benchmark::ConsoleReporter {
+public:
+    explicit Reporter(std::FILE* results) : _results(results) {}
+
+    void ReportRuns(const std::vector<Run>& runs) override {
+        ConsoleReporter::ReportRuns(runs);
+        for (const Run& run : runs) {
+            const auto rate = run.counters.find("items_per_second");
+            if (!run.error_occurred && rate != run.counters.end()) {
+                std::fprintf(_results, "%s\t%.1f\n", run.benchmark_name().c_str(), 1e9 / rate->second.value);
+            }
+        }
+        std::fflush(_results);
+    }
+
+private:
+    std::FILE* _results;
+};
+
+void measure(benchmark::State& state, Dispatcher& dispatcher, const std::string& className, const Operation& run) {
+    std::size_t objects = 0;
+    try {
+        for (auto _ : state) {
+            objects += run(dispatcher, className);
+        }
+    } catch (const CimError& error) {
+        state.SkipWithError(error.what());
+    }
+    state.SetItemsProcessed(static_cast<std::int64_t>(objects));
+}
+
+int runSetup(const Setup& setup, int argc, char** argv, const std::filesystem::path& folder, std::FILE* results) {
+    writeConfiguration(setup, folder);
+    // Every power request is logged on standard error, which is of no interest here.
+    if (std::freopen("/dev/null", "w", stderr) == nullptr) {
+        return 1;
+    }
+    Dispatcher dispatcher(registry(), {{ORV_LIBRARY_FOLDER}, nullptr, nullptr});
+    // The first request reads the configuration of all the nodes.
+    enumInstanceNames(dispatcher, "TALVO_PowerManagementService");
+    const std::string size = setup.associations ? std::to_string(setup.nodes) + "x" +
+                                                      std::to_string(setup.nodes == 300 ? 300 : setup.systems)
+                                                : std::to_string(setup.nodes);
+    const std::string suffix = std::string(setup.logEverything ? "/log everything/" : "/log default/") + size;
+    for (const Measured& measured : setup.associations ? associationOperations(setup) : elementOperations()) {
+        const auto add = [&](const char* what, const char* className) {
+            benchmark::RegisterBenchmark((std::string(measured.operation) + what + suffix).c_str(), measure,
+                                         std::ref(dispatcher), std::string(className), measured.run);
+        };
+        add("", measured.className);
+        if (measured.floorClass != nullptr && !setup.logEverything) {
+            add(" floor", measured.floorClass);
+        }
+    }
+    benchmark::Initialize(&argc, argv);
+    Reporter reporter(results);
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    return 0;
+}
+
+/** Nanoseconds of one object by the benchmark's name, in the order of measuring. */
+using Results = std::vector<std::pair<std::string, double>>;
+
+bool runInProcess(const Setup& setup, int argc, char** argv, Results& results) {
+    std::string folder = (std::filesystem::temp_directory_path() / "orv-bench-XXXXXX").string();
+    int ends[2];
+    if (mkdtemp(folder.data()) == nullptr || pipe(ends) != 0) {
+        std::perror("provider_bench");
+        return false;
+    }
+    std::fflush(nullptr);
+    const pid_t child = fork();
+    if (child == 0) {
+        close(ends[0]);
+        const int status = runSetup(setup, argc, argv, folder, fdopen(ends[1], "w"));
+        std::fflush(nullptr);
+        _exit(status);
+    }
+    close(ends[1]);
+    std::FILE* const lines = fdopen(ends[0], "r");
+    char name[256];
+    double nanoseconds = 0;
+    while (std::fscanf(lines, "%255[^\t]\t%lf\n", name, &nanoseconds) == 2) {
+        results.emplace_back(name, nanoseconds);
+    }
+    std::fclose(lines);
+    int status = 0;
+    waitpid(child, &status, 0);
+    std::filesystem::remove_all(folder);
+    return WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+/** The floor's name for a measurement: it is measured once, since it logs nothing. */
+std::string floorOf(std::string name) {
+    const std::size_t slash = name.find('/');
+    const std::size_t size = name.rfind('/');
+    return name.substr(0, slash) + " floor/log default" + name.substr(size);
+}
+
+void printTable(const Results& results) {
+    std::map<std::string, double> byName(results.begin(), results.end());
+    std::printf("\n%-72s %12s %12s %8s\n", "operation / log / nodes", "ns/object", "floor", "ratio");
+    for (const auto& [name, nanoseconds] : results) {
+        if (name.find(" floor/") != std::string::npos) {
+            continue;
+        }
+        const auto floor = byName.find(floorOf(name));
+        if (floor == byName.end()) {
+            std::printf("%-72s %12.0f\n", name.c_str(), nanoseconds);
+        } else {
+            std::printf("%-72s %12.0f %12.0f %8.2f\n", name.c_str(), nanoseconds, floor->second,
+                        nanoseconds / floor->second);
+        }
+    }
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Results results;
+    bool ran = true;
+    for (const Setup& setup : setups) {
+        ran = runInProcess(setup, argc, argv, results) && ran;
+    }
+    printTable(results);
+    return ran ? 0 : 1;
+}

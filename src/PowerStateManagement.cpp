@@ -121,8 +121,8 @@ unsigned short getPowerStateManagementInstances(std::map<std::string, PowerState
         unsigned int powerState = 0;
         for (; cursor; ++cursor) {
             PowerStateManagement record;
-            const std::string path = cursor.convertPathToString(cursor.getPathToNode());
-            const std::string name = "PowerStateManagement_" + path;
+            std::string path = cursor.convertPathToString(cursor.getPathToNode());
+            std::string name = "PowerStateManagement_" + path;
             require(record.setInstanceID(path), "Failed while setting InstanceID.");
             require(record.setName(name), "Failed while setting Name.");
             require(record.setElementName(name), "Failed while setting Element Name.");
@@ -137,10 +137,11 @@ unsigned short getPowerStateManagementInstances(std::map<std::string, PowerState
                 require(record.setPowerState(powerState), "Failed while setting PowerState.");
             }
 
+            // A tree often lists its nodes in order: then each record belongs behind the last one.
             if (keyProperty == "Name" || keyProperty.empty()) {
-                instances[name] = std::move(record);
+                instances.insert_or_assign(instances.end(), std::move(name), std::move(record));
             } else if (keyProperty == "InstanceID") {
-                instances[path] = std::move(record);
+                instances.insert_or_assign(instances.end(), std::move(path), std::move(record));
             }
         }
         return 0;

@@ -36,10 +36,16 @@ struct Setup {
 };
 
 constexpr Setup setups[] = {
-    {1, 1, false, false}, {100, 1, false, false}, {10'000, 1, false, false}, {60'000, 1, false, false},
-    {1, 1, true, false},  {100, 1, true, false},  {10'000, 1, true, false},  {60'000, 1, true, false},
-    {1, 1, false, true},  {100, 10, false, true}, {1'000, 1, false, true},   {300, 1, false, true},
+    {1, 1, false, false},     {100, 1, false, false}, {10'000, 1, false, false}, {60'000, 1, false, false},
+    {1, 1, true, false},      {100, 1, true, false},  {10'000, 1, true, false},  {60'000, 1, true, false},
+    {1, 1, false, true},      {100, 1, false, true},  {1'000, 1, false, true},   {100, 10, false, true},
+    {1'000, 10, false, true}, {300, 1, false, true},
 };
+
+/** Numbers of one length, so that the order of the nodes is that of their names, as an administrator would have it. */
+std::string nodePath(unsigned int node) {
+    return "node" + std::to_string(100'000 + node);
+}
 
 void writeConfiguration(const Setup& setup, const std::filesystem::path& folder) {
     std::ofstream file(folder / "agent.toml");
@@ -51,7 +57,7 @@ void writeConfiguration(const Setup& setup, const std::filesystem::path& folder)
     file << "[instrumentation.simulated]\nstate-file = \"" << (folder / "machine.json").string()
          << "\"\nreboot-time = 0\n";
     for (unsigned int i = 0; i < setup.nodes; ++i) {
-        file << "[[instrumentation.simulated.node]]\npath = \"node" << i << "\"\n";
+        file << "[[instrumentation.simulated.node]]\npath = \"" << nodePath(i) << "\"\n";
     }
     file.close();
     setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
@@ -95,12 +101,18 @@ ObjectPath pathOf(const std::string& className, std::vector<NamedValue> keys = {
 /** Runs one operation and says how many objects it returned. */
 using Operation = std::function<std::size_t(Dispatcher&, const std::string& className)>;
 
+// An answer is looked at object by object, as a client's is written, and not kept.
+
 const Operation enumInstanceNames = [](Dispatcher& dispatcher, const std::string& className) {
-    return dispatcher.enumerateInstanceNames({}, pathOf(className)).size();
+    std::size_t count = 0;
+    dispatcher.enumerateInstanceNames({}, pathOf(className), [&](ObjectPath&& /*path*/) { ++count; });
+    return count;
 };
 
 const Operation enumInstances = [](Dispatcher& dispatcher, const std::string& className) {
-    return dispatcher.enumerateInstances({}, pathOf(className), {}).size();
+    std::size_t count = 0;
+    dispatcher.enumerateInstances({}, pathOf(className), {}, [&](Instance&& /*instance*/) { ++count; });
+    return count;
 };
 
 /** A lookup by key. The key is the last one of the floor as well, which does not look at it. */
@@ -143,12 +155,12 @@ std::vector<Measured> elementOperations() {
     return {
         {"service EnumInstanceNames", service, "FLOOR_Service", enumInstanceNames},
         {"service EnumInstances", service, "FLOOR_Service", enumInstances},
-        {"service GetInstance", service, "FLOOR_Service", getInstance("Name", "PowerStateManagement_node0")},
+        {"service GetInstance", service, "FLOOR_Service", getInstance("Name", "PowerStateManagement_" + nodePath(0))},
         {"service RequestPowerStateChange refused", service, "FLOOR_Service", requestPowerStateChange(2)},
         {"service RequestPowerStateChange accepted", service, "FLOOR_Service", requestPowerStateChange(5)},
         {"capabilities EnumInstanceNames", capabilities, "FLOOR_Capabilities", enumInstanceNames},
         {"capabilities EnumInstances", capabilities, "FLOOR_Capabilities", enumInstances},
-        {"capabilities GetInstance", capabilities, "FLOOR_Capabilities", getInstance("InstanceID", "node0")},
+        {"capabilities GetInstance", capabilities, "FLOOR_Capabilities", getInstance("InstanceID", nodePath(0))},
     };
 }
 

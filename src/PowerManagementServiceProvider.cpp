@@ -61,13 +61,16 @@ static const PowerStateChange* findPowerStateChange(CMPIUint16 powerState) {
     return nullptr;
 }
 
-/** Whether a datetime argument is given and holds a value. A given argument is read again before its handle counts. */
-static bool isDateTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status) {
-    if (dateTimeOf(CMGetArg(in, name, status)) == nullptr) {
+/**
+ * Whether a time is given, which is read again before its handle counts. One of another type than datetime is given all
+ * the same: a client that wants the change at some time must not get it at once.
+ */
+static bool isTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status) {
+    if (CMGetArg(in, name, status).value.dateTime == nullptr) {
         return false;
     }
-    const CMPIDateTime* const dateTime = dateTimeOf(CMGetArg(in, name, status));
-    return !CMIsNullObject(dateTime);
+    const CMPIData time = CMGetArg(in, name, status);
+    return isObjectType(time.type) ? !CMIsNullObject(time.value.dateTime) : time.value.dateTime != nullptr;
 }
 
 /** Writes the change to the machine's power-management node. A failure is in the log only. */
@@ -98,10 +101,10 @@ static Outcome requestPowerStateChange(const CMPIArgs* in, CMPIStatus* status, c
         logMessage(loggerPowerMgmtService, failureLevel, reason, site);
         return Outcome::refused;
     };
-    if (isDateTimeGiven(in, "TimeoutPeriod", status)) {
+    if (isTimeGiven(in, "TimeoutPeriod", status)) {
         return refuse("Use Of Timeout Period Not Supported", operation.atLine());
     }
-    if (isDateTimeGiven(in, "Time", status)) {
+    if (isTimeGiven(in, "Time", status)) {
         return refuse("Use Of Time Property Not Supported", operation.atLine());
     }
     const CMPIUint16 powerState = CMGetArg(in, "PowerState", status).value.uint16;
@@ -110,7 +113,8 @@ static Outcome requestPowerStateChange(const CMPIArgs* in, CMPIStatus* status, c
     if (change == nullptr) {
         return refuse("Requested Power State change Not Supported", operation.atLine());
     }
-    CMPIObjectPath* const managedElement = referenceOf(CMGetArg(in, "ManagedElement", status));
+    const CMPIData element = CMGetArg(in, "ManagedElement", status);
+    CMPIObjectPath* const managedElement = isObjectType(element.type) ? element.value.ref : nullptr;
     if (!CMIsNullObject(managedElement)) {
         Instrumentation instrumentation;
         changePowerState(instrumentation, *change, operation);

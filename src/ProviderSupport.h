@@ -105,15 +105,25 @@ inline bool isText(const char* text, const char* expected) {
     return text != nullptr && std::strcmp(text, expected) == 0;
 }
 
-/** The pointer in a value, where the value is of the type that has it; null where it is of another. */
+/** The string in a value; null where the value is of another type. */
 inline CMPIString* stringOf(const CMPIData& data) {
     return data.type == CMPI_string ? data.value.string : nullptr;
 }
-inline CMPIDateTime* dateTimeOf(const CMPIData& data) {
-    return data.type == CMPI_dateTime ? data.value.dateTime : nullptr;
-}
-inline CMPIObjectPath* referenceOf(const CMPIData& data) {
-    return data.type == CMPI_ref ? data.value.ref : nullptr;
+
+/** Whether a value of this type is a pointer to a CMPI object. All of them begin with a handle and a function table. */
+inline bool isObjectType(CMPIType type) {
+    switch (type) {
+    case CMPI_instance:
+    case CMPI_ref:
+    case CMPI_args:
+    case CMPI_filter:
+    case CMPI_enumeration:
+    case CMPI_string:
+    case CMPI_dateTime:
+        return true;
+    default:
+        return (type & CMPI_ARRAY) != 0;
+    }
 }
 
 /**

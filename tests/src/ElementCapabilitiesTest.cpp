@@ -4,9 +4,6 @@
  */
 #include "Associations.h"
 
-#include <fstream>
-#include <iterator>
-
 namespace OrvTest {
 namespace {
 
@@ -177,19 +174,6 @@ TEST_F(ElementCapabilities, ResultClassesDoNotFilter) {
     }
     EXPECT_EQ(returned.paths.size(), 6);
     EXPECT_EQ(returned.instances.size(), 6);
-}
-
-/**
- * The factory makes the capabilities' instances without ever failing, so these two texts cannot be brought about; the
- * library has them for the day when it does.
- */
-TEST_F(ElementCapabilities, TheLibraryHasTextsForFailuresThatCannotHappen) {
-    std::ifstream file(ProviderLibrary::file, std::ios::binary);
-    const std::string content{std::istreambuf_iterator<char>(file), {}};
-    ASSERT_FALSE(content.empty()) << ProviderLibrary::file;
-    for (const std::string& text : {tested.second.failures.associators, tested.second.failures.references}) {
-        EXPECT_NE(content.find(text + '\0'), std::string::npos) << text;
-    }
 }
 
 } // namespace

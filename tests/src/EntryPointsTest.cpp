@@ -5,6 +5,8 @@
 #include "ProviderLibrary.h"
 #include "RequestFixture.h"
 
+#include <fstream>
+#include <iterator>
 #include <set>
 
 namespace OrvTest {
@@ -275,6 +277,25 @@ TEST_F(EntryPoints, BothProvidersOfAFileShareItsBroker) {
     haveNodes({"a"});
     expectOk(mi->ft->enumerateInstanceNames(mi, context, result, ref));
     EXPECT_THAT(transcript.calls(), testing::Contains(testing::StartsWith("other.newObjectPath(")));
+}
+
+/**
+ * What fails first is always something else: a record without an instance ID, and the factory makes the instances of
+ * capabilities without ever failing. The library has these texts for the day when that changes.
+ */
+TEST_F(EntryPoints, TheLibraryHasTextsForFailuresThatCannotHappen) {
+    std::ifstream file(ProviderLibrary::file, std::ios::binary);
+    const std::string content{std::istreambuf_iterator<char>(file), {}};
+    ASSERT_FALSE(content.empty()) << ProviderLibrary::file;
+    for (const char* text :
+         {"Failed while setting Name.", "Failed while setting Element Name.",
+          "Failed while setting Capabilities Element Name.", "Failed while setting PowerChangeCapabilities.",
+          "Failed while setting PowerStatesSupported.", "Failed while setting PowerState.",
+          "getAllPMCapCMPIInstances Failed",
+          " getAllPMCapCMPIInstances Failed for powerManagementCapabilitiesClass class",
+          "getAllPMCapCMPIInstances Failed for powerManagementCapabilitiesClass"}) {
+        EXPECT_NE(content.find('\0' + std::string(text) + '\0'), std::string::npos) << text;
+    }
 }
 
 } // namespace

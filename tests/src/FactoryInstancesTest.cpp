@@ -168,6 +168,28 @@ TEST_F(FactoryInstances, TheListIsComparedWithRegardToCase) {
               capabilitiesKey)));
 }
 
+TEST_F(FactoryInstances, TheListIsReadUpToTheEndOfASixteenBitIndex) {
+    std::vector<const char*> list(65'537, "Name");
+    list.push_back(nullptr);
+    list[65'536] = "ElementName";
+    service(list.data());
+    EXPECT_THAT(transcript.calls(), testing::Not(testing::Contains(serviceElementName)));
+    std::swap(list[65'535], list[65'536]);
+    service(list.data());
+    EXPECT_THAT(transcript.calls(), testing::Contains(serviceElementName));
+}
+
+TEST_F(FactoryInstances, TheCodesOfAListAreCountedInSixteenBits) {
+    for (int call = 0; call < 21'845; ++call) {
+        record.getPowerStatesSupported();
+    }
+    const char* states[] = {"PowerStatesSupported", nullptr};
+    capabilities(states);
+    EXPECT_THAT(transcript.calls(), testing::IsSupersetOf({std::string("broker.newArray(2, CMPI_uint16) -> array#1"),
+                                                           std::string("array#1.setElementAt(1, CMPI_uint16, 5)")}));
+    EXPECT_THAT(transcript.calls(), testing::Not(testing::Contains(testing::StartsWith("array#1.setElementAt(2"))));
+}
+
 TEST_F(FactoryInstances, AnEmptyListSelectsTheKeysOnly) {
     const NamedAddress nothingName(nothing, "nothing");
     service(nothing);

@@ -203,6 +203,40 @@ TEST_F(RequestPowerStateChange, TimesThatHoldNothingAreNone) {
                  "element.release()", "~Instrumentation()", answered());
 }
 
+TEST_F(RequestPowerStateChange, ATimeOfAnotherTypeIsRefusedToo) {
+    const CMPIData text = stringValue(broker.string("text", "20261120120000.000000+000"));
+    for (const CMPIData& value : {text, uint16Value(60)}) {
+        in = broker.args("in");
+        request(5);
+        broker.setArg(in, "TimeoutPeriod", value);
+        transcript.clear();
+        expectOk(invoke());
+        EXPECT_EQ(transcript.calls().back(), message(6000, "Use Of Timeout Period Not Supported"));
+        in = broker.args("in");
+        request(5);
+        broker.setArg(in, "Time", value);
+        transcript.clear();
+        expectOk(invoke());
+        EXPECT_EQ(transcript.calls().back(), message(6000, "Use Of Time Property Not Supported"));
+    }
+}
+
+TEST_F(RequestPowerStateChange, AnyObjectIsAManagedElement) {
+    request(5);
+    broker.setArg(in, "ManagedElement", stringValue(broker.string("name", "system")));
+    expectOk(invoke());
+    EXPECT_CALLS(opened(), powerStateRead("5"), powerStateShown("5"), "in.getArg(ManagedElement) -> \"system\"",
+                 "Instrumentation()", "instrumentation.selectNode(40) -> true", acting,
+                 "instrumentation.setProperty(123, 9) -> true", "name.release()", "~Instrumentation()", answered());
+}
+
+TEST_F(RequestPowerStateChange, ANumberIsNoManagedElement) {
+    request(5);
+    broker.setArg(in, "ManagedElement", uint16Value(1));
+    expectOk(invoke());
+    EXPECT_CALLS(opened(), powerStateRead("5"), powerStateShown("5"), "in.getArg(ManagedElement) -> 1", answered());
+}
+
 TEST_F(RequestPowerStateChange, NullTimesAreNone) {
     request(8);
     broker.setArg(in, "TimeoutPeriod", nullValue(CMPI_dateTime));

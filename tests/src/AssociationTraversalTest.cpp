@@ -627,6 +627,14 @@ TEST_P(TraversalToOwnObjects, OwnObjectsAreCountedInSixteenBits) {
     }
 }
 
+TEST_P(TraversalToComputerSystems, TheEndOfTheEnumerationIsTheLastCallThatWritesTheStatus) {
+    haveFarObjects(2);
+    broker.faults.always("hasNext", reports(CMPI_RC_ERR_ACCESS_DENIED));
+    for (const char* operation : {"AssociatorNames", "Associators"}) {
+        EXPECT_EQ(traverse(operation).rc, CMPI_RC_ERR_ACCESS_DENIED) << operation;
+    }
+}
+
 TEST_P(TraversalToComputerSystems, ObjectsOfTheObjectManagerAreAllReturned) {
     haveRecords(1);
     transcript.pause();

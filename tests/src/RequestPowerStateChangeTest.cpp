@@ -302,6 +302,15 @@ INSTANTIATE_TEST_SUITE_P(
                     OtherRequest{"Neither", "TALVO_ComputerSystem", "StopService"}),
     [](const auto& tested) { return tested.param.name; });
 
+TEST_F(RequestPowerStateChange, WithoutMethodOrClassNothingIsDone) {
+    request(5);
+    expectOk(invoke(nullptr));
+    EXPECT_CALLS(opened(), answered());
+    broker.faults.always("getClassName", nullObject(CMPI_RC_ERR_FAILED));
+    EXPECT_EQ(invoke().rc, CMPI_RC_ERR_FAILED);
+    EXPECT_THAT(transcript.calls(), testing::Not(testing::Contains(testing::HasSubstr("setProperty(123"))));
+}
+
 TEST_F(RequestPowerStateChange, AnotherMethodReturnsTheStatusOfTheClassName) {
     broker.faults.always("getClassName", reports(CMPI_RC_ERR_INVALID_CLASS));
     EXPECT_EQ(invoke("StopService").rc, CMPI_RC_ERR_INVALID_CLASS);

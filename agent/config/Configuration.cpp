@@ -27,15 +27,17 @@ constexpr std::array<std::pair<std::string_view, Destination>, 3> destinations{{
 }};
 
 using Backend = InstrumentationSettings::Backend;
-constexpr std::array<std::pair<std::string_view, Backend>, 1> backends{{
+constexpr std::array<std::pair<std::string_view, Backend>, 2> backends{{
     {"simulated", Backend::simulated},
+    {"logind", Backend::logind},
 }};
 
 constexpr Integer<int> level{0, alwaysWrittenLevel};
 constexpr Integer<unsigned int> powerState{0, std::numeric_limits<std::uint16_t>::max()};
 constexpr Integer<std::uint64_t> fileSize{0, std::numeric_limits<std::int64_t>::max()};
 constexpr Integer<unsigned int> fileCount{0, 1000};
-constexpr Seconds transitionTime{std::chrono::hours{24}};
+constexpr Seconds transitionTime{std::chrono::seconds{0}, std::chrono::hours{24}};
+constexpr Seconds waitingTime{std::chrono::milliseconds{100}, std::chrono::minutes{1}};
 
 // Nothing where the variable is not set or empty.
 std::optional<std::string> environment(const char* name) {
@@ -88,9 +90,18 @@ void readSimulated(TableReader& table, SimulatedSettings& simulated) {
     }
 }
 
+void readLogind(TableReader& table, LogindSettings& logind) {
+    table.read("delay", transitionTime, logind.delay);
+    table.read("timeout", waitingTime, logind.timeout);
+}
+
 void readInstrumentation(TableReader& table, InstrumentationSettings& instrumentation) {
     table.read("backend", Choice<Backend>{backends}, instrumentation.backend);
+    if (ORV_LOGIND == 0 && instrumentation.backend == Backend::logind) {
+        table.reject("backend", "\"simulated\": backend logind is not built in");
+    }
     table.readTable("simulated", [&](TableReader& simulated) { readSimulated(simulated, instrumentation.simulated); });
+    table.readTable("logind", [&](TableReader& logind) { readLogind(logind, instrumentation.logind); });
 }
 
 void readConfiguration(TableReader& file, Configuration& configuration) {

@@ -62,12 +62,22 @@ struct SimulatedSettings {
     std::vector<SimulatedNode> nodes = {SimulatedNode{"system"}};
 };
 
+/** Table [instrumentation.logind]. */
+struct LogindSettings {
+    /** From an accepted request until the machine goes down, so that the answer reaches who asked; 0 for at once. */
+    std::chrono::milliseconds delay{5'000};
+    /** How long an operation may wait for the bus and for systemd-logind, all in all. */
+    std::chrono::milliseconds timeout{5'000};
+};
+
 /** Table [instrumentation]. */
 struct InstrumentationSettings {
-    enum class Backend { simulated };
+    /** Builds without systemd's library have no logind: a file that asks for it cannot be used. */
+    enum class Backend { simulated, logind };
 
     Backend backend = Backend::simulated;
     SimulatedSettings simulated;
+    LogindSettings logind;
 };
 
 struct Configuration {

@@ -34,7 +34,18 @@ std::string describe(const toml::key& key) {
     return !text.empty() && std::ranges::all_of(text, isBare) ? text : describe(toml::value<std::string>(text));
 }
 
+double secondsOf(std::chrono::milliseconds duration) {
+    return std::chrono::duration<double>(duration).count();
+}
+
 } // namespace
+
+std::string Seconds::expected() const {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    text << "a number of seconds from " << secondsOf(low) << " to " << secondsOf(high);
+    return text.str();
+}
 
 std::optional<std::chrono::milliseconds> Seconds::accept(const toml::node& node) const {
     if (!node.is_number()) {
@@ -42,7 +53,7 @@ std::optional<std::chrono::milliseconds> Seconds::accept(const toml::node& node)
     }
     const double value = *node.value<double>();
     // In this form "not a number" is out of range, too.
-    if (!(value >= 0 && value <= static_cast<double>(high.count()))) {
+    if (!(value >= secondsOf(low) && value <= secondsOf(high))) {
         return std::nullopt;
     }
     return std::chrono::milliseconds{std::llround(value * 1000)};

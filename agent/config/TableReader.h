@@ -41,9 +41,10 @@ struct Integer {
 
 /** Seconds, whole or with decimals. */
 struct Seconds {
-    std::chrono::seconds high;
+    std::chrono::milliseconds low;
+    std::chrono::milliseconds high;
 
-    std::string expected() const { return "a number of seconds from 0 to " + std::to_string(high.count()); }
+    std::string expected() const;
     std::optional<std::chrono::milliseconds> accept(const toml::node& node) const;
 };
 

@@ -5,6 +5,8 @@
 #ifndef INSTRUMENTATION_BACKEND_H
 #define INSTRUMENTATION_BACKEND_H
 
+#include "config/Configuration.h"
+
 #include <cstddef>
 #include <memory>
 #include <optional>
@@ -42,13 +44,35 @@ public:
     virtual PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) = 0;
 };
 
+/** What stands behind the nodes, for people who want to know whether it will do. */
+struct MachineReport {
+    struct Fact {
+        std::string name;
+        std::string value;
+    };
+
+    /** What it does now, and what it can be asked to do. */
+    std::vector<Fact> facts;
+    /** What is missing, and what to do about it. */
+    std::vector<std::string> problems;
+};
+
 class Backend {
 public:
     virtual ~Backend() = default;
 
+    /** The machine, for people, as it completes "Power management of". */
+    virtual std::string machine() const = 0;
+
     /** Never null; without nodes where the machine has none. */
     virtual std::unique_ptr<NodeSelection> selectPowerManagementNodes() = 0;
+
+    /** Looks at the machine and asks nothing of it. */
+    virtual MachineReport examine() = 0;
 };
+
+/** The backend of the configuration. Nothing is asked of its machine yet. */
+std::unique_ptr<Backend> makeBackend(const Configuration& configuration);
 
 } // namespace Norv::Agent
 

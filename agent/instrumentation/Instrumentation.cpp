@@ -2,13 +2,14 @@
 
 #include "Backend.h"
 #include "Report.h"
-#include "SimulatedBackend.h"
 #include "config/Configuration.h"
 
+#include <cerrno>
 #include <cstddef>
 #include <memory>
 #include <string>
-#include <utility>
+
+#include <unistd.h>
 
 namespace Norv {
 
@@ -18,16 +19,12 @@ namespace {
 
 std::unique_ptr<Backend> createBackend() {
     try {
-        Configuration configuration = loadConfiguration();
-        SimulatedSettings& simulated = configuration.instrumentation.simulated;
-        const std::size_t count = simulated.nodes.size();
-        const std::string machine =
-            std::to_string(count) + (count == 1 ? " node" : " nodes") + ", state in " + simulated.stateFile.string();
-        auto backend = std::make_unique<SimulatedBackend>(std::move(simulated));
+        const Configuration configuration = loadConfiguration();
+        auto backend = makeBackend(configuration);
         if (configuration.source.empty()) {
-            report(failureLevel, "No configuration file: power management of a simulated machine, " + machine);
+            report(failureLevel, "No configuration file: power management of " + backend->machine());
         } else {
-            report(informationLevel, "Power management of a simulated machine: " + machine);
+            report(informationLevel, "Power management of " + backend->machine());
         }
         return backend;
     } catch (const ConfigurationError&) {
@@ -46,6 +43,12 @@ std::unique_ptr<Backend> createBackend() {
 Backend* processBackend() {
     static Backend* const backend = createBackend().release();
     return backend;
+}
+
+/** Who asks, as far as a library can know: whom a client of the host is, only the host knows. */
+std::string requester() {
+    return std::string(" [asked by ") + program_invocation_short_name + ", process " + std::to_string(getpid()) +
+           ", uid " + std::to_string(geteuid()) + ']';
 }
 
 } // namespace
@@ -128,8 +131,8 @@ bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int
 
 bool Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
     const PowerRequestOutcome outcome = _implementation->write(property, value);
-    report(alwaysWrittenLevel,
-           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description);
+    report(alwaysWrittenLevel, (outcome.accepted ? "Power request accepted: " : "Power request refused: ") +
+                                   outcome.description + requester());
     return outcome.accepted;
 }
 

@@ -2,49 +2,23 @@
 
 #include "PowerTransition.h"
 #include "Report.h"
+#include "Wording.h"
 
 #include <algorithm>
-#include <array>
-#include <charconv>
+#include <cerrno>
 #include <exception>
 #include <system_error>
 #include <utility>
 
+#include <unistd.h>
+
 namespace Norv::Agent {
-
-namespace {
-
-/** Seconds in the shortest exact form, whatever the process's locale: "10 s", "2.5 s". */
-std::string inSeconds(std::chrono::milliseconds duration) {
-    std::array<char, 32> text;
-    const double seconds = std::chrono::duration<double>(duration).count();
-    char* const begin = text.data();
-    char* const end = std::to_chars(begin, begin + text.size(), seconds, std::chars_format::fixed).ptr;
-    return std::string(begin, end) + " s";
-}
-
-/** "9 (reboot) or 12 (shutdown)". */
-std::string acceptedStates() {
-    std::string text;
-    for (const PowerTransition& transition : powerTransitions) {
-        text += text.empty() ? "" : " or ";
-        text += std::to_string(transition.state) + " (" + transition.name + ')';
-    }
-    return text;
-}
-
-} // namespace
 
 class SimulatedBackend::Selection final : public NodeSelection {
 public:
-    explicit Selection(SimulatedBackend& backend) : _backend(backend) {
-        try {
-            _requests = backend._stateFile.read();
-        } catch (const std::system_error& error) {
-            report(failureLevel,
-                   std::string("The power states of the simulated machine cannot be told: ") + error.what());
-        }
-    }
+    /** `requests` is what the state file holds; null where it cannot be read. */
+    Selection(SimulatedBackend& backend, std::shared_ptr<const PowerRequests> requests)
+        : _backend(backend), _requests(std::move(requests)) {}
 
     std::size_t size() const override { return _backend._settings.nodes.size(); }
 
@@ -73,7 +47,8 @@ public:
         const std::string where = "of simulated node " + path(node);
         const auto* const transition = std::ranges::find(powerTransitions, state, &PowerTransition::state);
         if (transition == powerTransitions.end()) {
-            return {false, "power state " + std::to_string(state) + ' ' + where + ": expected " + acceptedStates()};
+            return {false, "power state " + std::to_string(state) + ' ' + where + ": expected " +
+                               acceptedStates(powerTransitions)};
         }
         const std::string what = transition->name + (' ' + where);
         const std::chrono::milliseconds duration = _backend._settings.*transition->duration;
@@ -94,8 +69,41 @@ private:
 SimulatedBackend::SimulatedBackend(SimulatedSettings settings, Clock clock)
     : _settings(std::move(settings)), _clock(std::move(clock)), _stateFile(_settings.stateFile) {}
 
+std::string SimulatedBackend::machine() const {
+    const std::size_t count = _settings.nodes.size();
+    return "a simulated machine (" + std::to_string(count) + (count == 1 ? " node" : " nodes") + ", state in " +
+           _settings.stateFile.string() + ')';
+}
+
 std::unique_ptr<NodeSelection> SimulatedBackend::selectPowerManagementNodes() {
-    return std::make_unique<Selection>(*this);
+    std::shared_ptr<const PowerRequests> requests;
+    try {
+        requests = _stateFile.read();
+    } catch (const std::system_error& error) {
+        report(failureLevel, std::string("The power states of the simulated machine cannot be told: ") + error.what());
+    }
+    return std::make_unique<Selection>(*this, std::move(requests));
+}
+
+MachineReport SimulatedBackend::examine() {
+    MachineReport found;
+    try {
+        const Selection nodes(*this, _stateFile.read());
+        for (std::size_t node = 0; node < nodes.size(); ++node) {
+            found.facts.push_back(
+                {"node " + nodes.path(node), "power state " + std::to_string(*nodes.powerState(node))});
+        }
+        std::filesystem::path folder = _settings.stateFile.parent_path();
+        while (!std::filesystem::exists(folder)) {
+            folder = folder.parent_path();
+        }
+        if (::access(folder.c_str(), W_OK) != 0) {
+            throw std::system_error(errno, std::generic_category(), folder.string() + ": cannot be written");
+        }
+    } catch (const std::system_error& error) {
+        found.problems.push_back(std::string(error.what()) + ": let the user write there, or name another state-file");
+    }
+    return found;
 }
 
 TimePoint SimulatedBackend::wallClock() {

@@ -20,7 +20,9 @@ public:
 
     explicit SimulatedBackend(SimulatedSettings settings, Clock clock = wallClock);
 
+    std::string machine() const override;
     std::unique_ptr<NodeSelection> selectPowerManagementNodes() override;
+    MachineReport examine() override;
 
 private:
     class Selection;

@@ -1,3 +1,4 @@
+#include "orvcim/AgentExamination.h"
 #include "orvcim/Commands.h"
 #include "text/Layout.h"
 
@@ -32,7 +33,21 @@ std::string describe(const FactoryReport& factory) {
                                    : fmt::format("{}: {}", factory.factory, factory.problem);
 }
 
-void writeTable(Session& session, const std::vector<Finding>& findings) {
+constexpr std::size_t tableIndent = 2;
+
+void writeTable(Session& session, const AgentExamination& agent) {
+    std::vector<Row> rows;
+    for (const auto& [name, value] : agent.facts) {
+        rows.push_back(rowOf({name, value}));
+    }
+    for (const std::string& problem : agent.problems) {
+        rows.push_back(rowOf({"problem", problem}));
+    }
+    session.out() << "Embedded agent: " << (agent.problems.empty() ? "ok" : "not usable") << '\n'
+                  << aligned(rows, tableIndent);
+}
+
+void writeTable(Session& session, const std::vector<Finding>& findings, const AgentExamination& agent) {
     for (const Finding& finding : findings) {
         const Registration& registration = finding.registration;
         const std::string library =
@@ -47,14 +62,14 @@ void writeTable(Session& session, const std::vector<Finding>& findings) {
                 rows.push_back(rowOf({"problem", problem}));
             }
         }
-        constexpr std::size_t indent = 2;
         session.out() << registration.className << ": " << (finding.good() ? "ok" : "not usable") << '\n'
-                      << aligned(rows, indent);
+                      << aligned(rows, tableIndent);
     }
+    writeTable(session, agent);
 }
 
-void writeJson(Session& session, const std::vector<Finding>& findings) {
-    Json json = Json::array();
+void writeJson(Session& session, const std::vector<Finding>& findings, const AgentExamination& agent) {
+    Json providers = Json::array();
     for (const Finding& finding : findings) {
         const Registration& registration = finding.registration;
         Json factories = Json::array();
@@ -65,20 +80,26 @@ void writeJson(Session& session, const std::vector<Finding>& findings) {
                                  {"version", factory.miVersion},
                                  {"problem", factory.problem}});
         }
-        json.push_back({{"class", registration.className},
-                        {"namespaces", registration.nameSpaces},
-                        {"provider", registration.provider},
-                        {"location", registration.location},
-                        {"library", finding.provider.library.string()},
-                        {"usable", finding.good()},
-                        {"problems", Json::array()},
-                        {"factories", factories}});
+        providers.push_back({{"class", registration.className},
+                             {"namespaces", registration.nameSpaces},
+                             {"provider", registration.provider},
+                             {"location", registration.location},
+                             {"library", finding.provider.library.string()},
+                             {"usable", finding.good()},
+                             {"problems", Json::array()},
+                             {"factories", factories}});
         for (const std::string& problem : {finding.provider.problem, finding.schemaProblem}) {
             if (!problem.empty()) {
-                json.back()["problems"].push_back(problem);
+                providers.back()["problems"].push_back(problem);
             }
         }
     }
+    Json facts = Json::object();
+    for (const auto& [name, value] : agent.facts) {
+        facts[name] = value;
+    }
+    const Json json = {{"providers", providers},
+                       {"agent", {{"usable", agent.problems.empty()}, {"facts", facts}, {"problems", agent.problems}}}};
     constexpr int indent = 2;
     session.out() << json.dump(indent, ' ', false, Json::error_handler_t::replace) << '\n';
 }
@@ -97,7 +118,15 @@ void checkProviders(Session& session) {
             unusable.push_back(registration.className);
         }
     }
-    (session.options().format == Format::json ? writeJson : writeTable)(session, findings);
+    const AgentExamination agent = examineAgent();
+    if (!agent.problems.empty()) {
+        unusable.emplace_back("the embedded agent");
+    }
+    if (session.options().format == Format::json) {
+        writeJson(session, findings, agent);
+    } else {
+        writeTable(session, findings, agent);
+    }
     if (!unusable.empty() || findings.empty()) {
         throw Failure(findings.empty()
                           ? fmt::format("found no registration in {}, expected some", session.schemaFolder().string())

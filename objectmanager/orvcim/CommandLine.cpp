@@ -34,7 +34,8 @@ public:
         objectCommands();
         associationCommands();
         powerCommands();
-        add(_app, "check", "Say which providers load, from where, and what is wrong if one does not", checkProviders);
+        add(_app, "check", "Say which providers load and what the agent can do, and what is wrong or missing",
+            checkProviders);
     }
 
     CLI::App& app() { return _app; }

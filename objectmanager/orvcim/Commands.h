@@ -35,7 +35,8 @@ void powerStatus(Session& session);
 void powerReboot(Session& session);
 void powerShutdown(Session& session);
 
-/** What is found of every registered provider. Throws Failure, after its answer, where something is wrong. */
+/** What is found of every registered provider and of the embedded agent. Throws Failure, after its answer, where
+ * something is wrong. */
 void checkProviders(Session& session);
 
 } // namespace ObjectManager::Orvcim

@@ -69,6 +69,8 @@ TEST_F(ConfigurationTest, AnEmptyFileLeavesEverythingAtItsDefault) {
 
     const InstrumentationSettings& instrumentation = configuration.instrumentation;
     EXPECT_EQ(instrumentation.backend, InstrumentationSettings::Backend::simulated);
+    EXPECT_EQ(instrumentation.logind.delay, milliseconds{5'000});
+    EXPECT_EQ(instrumentation.logind.timeout, milliseconds{5'000});
     EXPECT_EQ(instrumentation.simulated.rebootTime, milliseconds{10'000});
     EXPECT_EQ(instrumentation.simulated.shutdownTime, milliseconds{5'000});
     ASSERT_EQ(instrumentation.simulated.nodes.size(), 1U);
@@ -101,6 +103,10 @@ TEST_F(ConfigurationTest, EveryKeyOfTheFileIsRead) {
         [instrumentation]
         backend = "simulated"
 
+        [instrumentation.logind]
+        delay = 7.5
+        timeout = 0.5
+
         [instrumentation.simulated]
         state-file = "/var/lib/state.json"
         reboot-time = 0.25
@@ -132,6 +138,9 @@ TEST_F(ConfigurationTest, EveryKeyOfTheFileIsRead) {
     EXPECT_EQ(log.categories[1].logLevel, std::nullopt);
     EXPECT_EQ(log.categories[1].traceLevel, 10000);
 
+    EXPECT_EQ(configuration.instrumentation.logind.delay, milliseconds{7'500});
+    EXPECT_EQ(configuration.instrumentation.logind.timeout, milliseconds{500});
+
     const auto& simulated = configuration.instrumentation.simulated;
     EXPECT_EQ(simulated.stateFile, "/var/lib/state.json");
     EXPECT_EQ(simulated.rebootTime, milliseconds{250});
@@ -160,6 +169,16 @@ TEST_F(ConfigurationTest, ALargeTreeIsReadInOrder) {
     ASSERT_EQ(nodes.size(), static_cast<std::size_t>(count));
     EXPECT_EQ(nodes.front().path, "rack/blade0");
     EXPECT_EQ(nodes.back().path, "rack/blade59999");
+}
+
+TEST_F(ConfigurationTest, TheBackendLogindCanBeChosenWhereItIsBuiltIn) {
+    const std::string text = "[instrumentation]\nbackend = \"logind\"\n";
+    if (ORV_LOGIND != 0) {
+        EXPECT_EQ(load(text).instrumentation.backend, InstrumentationSettings::Backend::logind);
+    } else {
+        EXPECT_EQ(errorOf(text), file.string() + ":2: instrumentation.backend: \"logind\": expected \"simulated\": "
+                                                 "backend logind is not built in");
+    }
 }
 
 struct WrongFile {
@@ -211,7 +230,11 @@ constexpr WrongFile wrongFiles[] = {
     {"PrefixTwice", "[[log.category]]\nprefix = \"A\"\n[[log.category]]\nprefix = \"A\"\n",
      ":4: log.category[1].prefix: \"A\": expected a prefix that stands here once"},
     {"UnknownBackend", "[instrumentation]\nbackend = \"ipmi\"\n",
-     ":2: instrumentation.backend: \"ipmi\": expected \"simulated\""},
+     ":2: instrumentation.backend: \"ipmi\": expected \"simulated\" or \"logind\""},
+    {"NoTimeToWait", "[instrumentation.logind]\ntimeout = 0\n",
+     ":2: instrumentation.logind.timeout: 0: expected a number of seconds from 0.1 to 60"},
+    {"TooLongADelay", "[instrumentation.logind]\ndelay = 86401\n",
+     ":2: instrumentation.logind.delay: 86401: expected a number of seconds from 0 to 86400"},
     {"NegativeTime", "[instrumentation.simulated]\nreboot-time = -0.5\n",
      ":2: instrumentation.simulated.reboot-time: -0.5: expected a number of seconds from 0 to 86400"},
     {"TimeThatIsNoNumber", "[instrumentation.simulated]\nshutdown-time = nan\n",

@@ -46,6 +46,10 @@ TEST(InstrumentationLibrary, ExportsItsMembersAndNothingElse) {
             "_ZN4Norv15Instrumentation11setPropertyENS_11NodeLexicon10PropertiesERj"));
 }
 
+/** Who asks for what this process does. */
+const std::string askedByThis =
+    " [asked by instrumentation_test, process " + std::to_string(getpid()) + ", uid " + std::to_string(geteuid()) + ']';
+
 /** This process's machine: its configuration is read once, so all tests of a cursor share it. */
 class Cursor : public testing::Test {
 protected:
@@ -89,7 +93,8 @@ void expectStandsOnNoNode(Instrumentation& cursor) {
     EXPECT_FALSE(cursor.setProperty(powerState, number));
     EXPECT_EQ(number, 9);
     EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request refused: write of 9 to "
-                                       "property 123: expected a cursor that stands on a node"));
+                                       "property 123: expected a cursor that stands on a node" +
+                                       askedByThis));
 }
 
 TEST_F(Cursor, StandsOnNoNodeBeforeTheFirstSelection) {
@@ -172,7 +177,8 @@ TEST_F(Cursor, WritesThePowerStateAndReadsItBack) {
     EXPECT_TRUE(cursor.getProperty(powerState, state));
     EXPECT_EQ(state, 9);
     EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request accepted: reboot of simulated "
-                                       "node system, over in 3600 s"));
+                                       "node system, over in 3600 s" +
+                                       askedByThis));
 }
 
 TEST_F(Cursor, RefusesWhatIsNoPowerRequest) {
@@ -182,9 +188,11 @@ TEST_F(Cursor, RefusesWhatIsNoPowerRequest) {
     EXPECT_FALSE(cursor.setProperty(powerStateList, value));
     EXPECT_EQ(value, 5);
     EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request refused: power state 5 of "
-                                       "simulated node system: expected 9 (reboot) or 12 (shutdown)",
+                                       "simulated node system: expected 9 (reboot) or 12 (shutdown)" +
+                                           askedByThis,
                                        "log 10000 Corvane.Instrumentation Power request refused: write of 5 to "
-                                       "property 125 of node system: expected property 123"));
+                                       "property 125 of node system: expected property 123" +
+                                           askedByThis));
 }
 
 TEST_F(Cursor, MayBeUsedBesideOthersInOtherThreads) {
@@ -219,13 +227,16 @@ protected:
 
     /** What a process writes that runs the commands of probe.cpp. */
     std::vector<std::string> run(const std::string& commands) const {
-        return AgentTest::linesOf("ORV_AGENT_CONFIG='" + (folder / "agent.toml").string() + "' " +
-                                  ORV_INSTRUMENTATION_PROBE + ' ' + commands);
+        std::vector<std::string> lines = AgentTest::linesOf("ORV_AGENT_CONFIG='" + (folder / "agent.toml").string() +
+                                                            "' " + ORV_INSTRUMENTATION_PROBE + ' ' + commands);
+        AgentTest::maskRequester(lines);
+        return lines;
     }
 
     const TemporaryFolder folder;
     const std::string stateFile = folder / "state.json";
-    const std::string firstUse = "log 4000 Corvane.Instrumentation Power management of a simulated machine: ";
+    const std::string firstUse = "log 4000 Corvane.Instrumentation Power management of a simulated machine (";
+    const std::string askedByProbe = " [asked by instrumentation_probe, process N, uid N]";
     const std::string twoNodes = "[[instrumentation.simulated.node]]\npath = \"a\"\n"
                                  "[[instrumentation.simulated.node]]\npath = \"b/c\"\n";
 };
@@ -233,16 +244,17 @@ protected:
 TEST_F(Processes, SayOnceWhichMachineIsManaged) {
     configureSimulated(twoNodes, "10");
     EXPECT_THAT(run("list list"), ElementsAre("a 1 2 5 8", "b/c 1 2 5 8", "a 1 2 5 8", "b/c 1 2 5 8",
-                                              firstUse + "2 nodes, state in " + stateFile));
+                                              firstUse + "2 nodes, state in " + stateFile + ")"));
     configureSimulated("", "10");
-    EXPECT_THAT(run("list"), ElementsAre("system 1 2 5 8", firstUse + "1 node, state in " + stateFile));
+    EXPECT_THAT(run("list"), ElementsAre("system 1 2 5 8", firstUse + "1 node, state in " + stateFile + ")"));
 }
 
 TEST_F(Processes, SeeEachOthersRequests) {
     configureSimulated(twoNodes, "3600");
     EXPECT_THAT(run("write b/c 9"), ElementsAre("accepted", StartsWith(firstUse),
                                                 "log 10000 Corvane.Instrumentation Power request accepted: reboot of "
-                                                "simulated node b/c, over in 3600 s"));
+                                                "simulated node b/c, over in 3600 s" +
+                                                    askedByProbe));
     EXPECT_THAT(run("list write a 12 list"),
                 ElementsAre("a 1 2 5 8", "b/c 9 2 5 8", "accepted", "a 12 2 5 8", "b/c 9 2 5 8", StartsWith(firstUse),
                             StartsWith("log 10000 Corvane.Instrumentation Power request accepted: shutdown")));
@@ -257,7 +269,8 @@ TEST_F(Processes, OfferNoNodeWhereTheConfigurationCannotBeUsed) {
                             "trace 6000 Corvane.Instrumentation No power-management node is offered: the configuration "
                             "cannot be used",
                             "log 10000 Corvane.Instrumentation Power request refused: write of 9 to property 123: no "
-                            "node is offered, the configuration cannot be used"));
+                            "node is offered, the configuration cannot be used" +
+                                askedByProbe));
 }
 
 TEST_F(Processes, SayThatTheyGoByNoConfigurationFile) {
@@ -268,9 +281,9 @@ TEST_F(Processes, SayThatTheyGoByNoConfigurationFile) {
     EXPECT_EQ(AgentTest::linesOf("env -u ORV_AGENT_CONFIG XDG_STATE_HOME='" + (folder / "state").string() + "' " +
                                  ORV_INSTRUMENTATION_PROBE + " list")
                   .back(),
-              "log 6000 Corvane.Instrumentation No configuration file: power management of a simulated machine, 1 "
+              "log 6000 Corvane.Instrumentation No configuration file: power management of a simulated machine (1 "
               "node, state in " +
-                  state + "/orv/simulated-machine.json");
+                  state + "/orv/simulated-machine.json)");
 }
 
 } // namespace

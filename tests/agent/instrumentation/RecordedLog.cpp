@@ -3,6 +3,7 @@
 #include "OrvLog/OrvLogger.h"
 
 #include <mutex>
+#include <regex>
 #include <utility>
 
 namespace {
@@ -22,6 +23,13 @@ namespace AgentTest {
 std::vector<std::string> takeLog() {
     const std::lock_guard guard(mutex);
     return std::exchange(records, {});
+}
+
+void maskRequester(std::vector<std::string>& lines) {
+    static const std::regex numbers("process [0-9]+, uid [0-9]+\\]$");
+    for (std::string& line : lines) {
+        line = std::regex_replace(line, numbers, "process N, uid N]");
+    }
 }
 
 } // namespace AgentTest

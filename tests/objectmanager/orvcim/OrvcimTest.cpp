@@ -319,9 +319,9 @@ TEST(Check, saysTheSameAsJson) {
                                         ORVCIM_TEST_LIBRARIES, "check", "--format", "json"},
                                        {});
     EXPECT_EQ(outcome.status, 1);
-    EXPECT_THAT(outcome.out, StartsWith("[\n  {\n    \"class\": \"Test_Good\",\n"));
+    EXPECT_THAT(outcome.out, StartsWith("{\n  \"providers\": [\n    {\n      \"class\": \"Test_Good\",\n"));
     EXPECT_THAT(outcome.out, AllOf(HasSubstr("\"usable\": true"), HasSubstr("\"usable\": false"),
-                                   HasSubstr("\"name\": \"instanceThing\""), EndsWith("]\n")));
+                                   HasSubstr("\"name\": \"instanceThing\""), EndsWith("}\n")));
 }
 
 } // namespace

@@ -2,6 +2,8 @@
 
 #include <gmock/gmock.h>
 
+#include <unistd.h>
+
 #include <utility>
 
 namespace OrvcimTest {
@@ -12,6 +14,42 @@ using testing::StartsWith;
 
 TEST_F(ProvidedTest, everyRegisteredProviderLoads) {
     EXPECT_EQ(orvcim({"check"}).status, 0);
+}
+
+TEST_F(ProvidedTest, checksTheAgent) {
+    EXPECT_THAT(answerOf({"check"}), HasSubstr("Embedded agent: ok\n"
+                                               "  user                 uid " +
+                                               std::to_string(geteuid()) +
+                                               "\n"
+                                               "  configuration        " +
+                                               (_folder / "agent.toml").string() +
+                                               "\n"
+                                               "  log                  " +
+                                               (_folder / "log").string() +
+                                               ", level 6000\n"
+                                               "  machine              a simulated machine (1 node, state in " +
+                                               (_folder / "state.json").string() +
+                                               ")\n"
+                                               "  node chassis/blade1  power state 1\n"));
+}
+
+TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
+    configure("reboot-time = \"soon\"\n");
+    const Outcome wrong = orvcim({"check", "--format", "json"});
+    EXPECT_EQ(wrong.err, "orvcim: not usable: the embedded agent\n");
+    EXPECT_EQ(wrong.status, 1);
+    EXPECT_THAT(wrong.out, HasSubstr("agent.toml:8: instrumentation.simulated.reboot-time: \\\"soon\\\": expected a "
+                                     "number of seconds from 0 to 86400: as long as this is so, no power-management "
+                                     "node is offered\""));
+
+    configure("");
+    std::filesystem::create_directory(_folder / "state.json");
+    EXPECT_THAT(orvcim({"check"}).out, HasSubstr("state.json: is not a regular file: Invalid argument"));
+
+    std::ofstream(_folder / "agent.toml") << "[log]\ndestination = \"file\"\nfile = \"/nowhere/agent.log\"\n";
+    EXPECT_THAT(
+        orvcim({"check", "--format", "json"}).out,
+        HasSubstr("the log /nowhere/agent.log cannot be written: /nowhere: No such file or directory: let uid "));
 }
 
 TEST_F(ProvidedTest, namesTheService) {

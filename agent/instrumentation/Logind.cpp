@@ -1,0 +1,253 @@
+#include "Logind.h"
+
+#include "Wording.h"
+
+#include <systemd/sd-bus.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <string_view>
+#include <system_error>
+
+namespace Norv::Agent {
+
+namespace {
+
+constexpr const char* service = "org.freedesktop.login1";
+constexpr const char* path = "/org/freedesktop/login1";
+constexpr const char* managerInterface = "org.freedesktop.login1.Manager";
+constexpr const char* propertiesInterface = "org.freedesktop.DBus.Properties";
+
+using Kind = LogindError::Kind;
+
+/** Errors by which the bus says that nobody can answer. */
+constexpr std::array<std::string_view, 3> noServiceErrors = {
+    SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER, "org.freedesktop.systemd1.NoSuchUnit"};
+/** Errors by which the bus says that whoever should have answered is gone. */
+constexpr std::array<std::string_view, 2> unansweredErrors = {SD_BUS_ERROR_NO_REPLY, SD_BUS_ERROR_DISCONNECTED};
+
+std::string textOf(int error) {
+    return std::generic_category().message(error);
+}
+
+/** What others say of themselves, without what would break a line or change a terminal. */
+std::string printable(const char* text) {
+    std::string result(text);
+    std::ranges::replace_if(
+        result, [](unsigned char character) { return character < 0x20 || character == 0x7f; }, ' ');
+    return result;
+}
+
+class BusErrorText {
+public:
+    BusErrorText() = default;
+    ~BusErrorText() { sd_bus_error_free(&_error); }
+    BusErrorText(const BusErrorText&) = delete;
+    BusErrorText& operator=(const BusErrorText&) = delete;
+
+    sd_bus_error* target() { return &_error; }
+
+    bool isOneOf(const auto& names) const { return std::ranges::find(names, _error.name) != names.end(); }
+
+    std::string text() const { return std::string(_error.name) + ": " + printable(_error.message); }
+
+private:
+    sd_bus_error _error = SD_BUS_ERROR_NULL;
+};
+
+[[noreturn]] void failToConnect(const std::string& reason) {
+    const char* address = std::getenv("DBUS_SYSTEM_BUS_ADDRESS");
+    throw LogindError(Kind::noBus, "the system bus" +
+                                       (address == nullptr ? std::string() : " at " + printable(address)) +
+                                       " cannot be reached: " + reason);
+}
+
+/** `result` as sd-bus gives it, for what fails only where memory is short or an answer has another form. */
+void require(int result, const char* method) {
+    if (result < 0) {
+        throw LogindError(Kind::refused, std::string(method) + ": " + textOf(-result));
+    }
+}
+
+/** Whether a list of names separated by colons has a name. */
+bool contains(std::string_view list, std::string_view name) {
+    for (;;) {
+        const std::size_t end = list.find(':');
+        if (list.substr(0, end) == name) {
+            return true;
+        }
+        if (end == std::string_view::npos) {
+            return false;
+        }
+        list.remove_prefix(end + 1);
+    }
+}
+
+} // namespace
+
+std::chrono::microseconds Deadline::remaining() const {
+    const auto left = std::chrono::floor<std::chrono::microseconds>(_end - std::chrono::steady_clock::now());
+    return std::max(left, std::chrono::microseconds{0});
+}
+
+void Logind::Closer::operator()(sd_bus* bus) const {
+    sd_bus_close_unref(bus);
+}
+
+void Logind::Unreferencer::operator()(sd_bus_message* message) const {
+    sd_bus_message_unref(message);
+}
+
+Logind::Logind(const Deadline& deadline) : _deadline(deadline) {
+    sd_bus* bus = nullptr;
+    if (const int result = sd_bus_open_system(&bus); result < 0) {
+        failToConnect(textOf(-result));
+    }
+    _bus.reset(bus);
+    waitUntilConnected();
+}
+
+// A first call would do this, too, but without an end where somebody listens at the address and says nothing.
+void Logind::waitUntilConnected() {
+    for (;;) {
+        const int ready = sd_bus_is_ready(_bus.get());
+        if (ready > 0) {
+            return;
+        }
+        int result = ready < 0 ? ready : sd_bus_process(_bus.get(), nullptr);
+        if (result == 0) {
+            const auto remaining = _deadline.remaining();
+            if (remaining.count() == 0) {
+                failToConnect("it does not answer within " + inSeconds(_deadline.whole()));
+            }
+            result = sd_bus_wait(_bus.get(), static_cast<std::uint64_t>(remaining.count()));
+        }
+        if (result < 0 && result != -EINTR) {
+            failToConnect(textOf(-result));
+        }
+    }
+}
+
+Logind::Message Logind::newCall(const char* interface, const char* method) {
+    sd_bus_message* call = nullptr;
+    require(sd_bus_message_new_method_call(_bus.get(), &call, service, path, interface, method), method);
+    return Message(call);
+}
+
+Logind::Message Logind::send(const Message& call, const char* method) {
+    const auto unanswered = [method](const std::string& reason) {
+        return LogindError(Kind::unanswered, std::string(method) + ": " + reason);
+    };
+    const auto noAnswerInTime = [&] {
+        return unanswered("systemd-logind does not answer within " + inSeconds(_deadline.whole()));
+    };
+    const auto remaining = static_cast<std::uint64_t>(_deadline.remaining().count());
+    if (remaining == 0) {
+        // To sd-bus this would mean a time of its own.
+        throw noAnswerInTime();
+    }
+    BusErrorText error;
+    sd_bus_message* reply = nullptr;
+    const int result = sd_bus_call(_bus.get(), call.get(), remaining, error.target(), &reply);
+    if (result >= 0) {
+        return Message(reply);
+    }
+    if (_deadline.remaining().count() == 0) {
+        throw noAnswerInTime();
+    }
+    // An answer leaves the connection open.
+    if (sd_bus_is_open(_bus.get()) <= 0) {
+        throw unanswered("the connection to the system bus was lost: " + textOf(-result));
+    }
+    if (error.isOneOf(unansweredErrors)) {
+        throw unanswered("systemd-logind ended without an answer: " + error.text());
+    }
+    if (error.isOneOf(noServiceErrors)) {
+        throw LogindError(Kind::noService, "systemd-logind is not on the system bus: " + error.text());
+    }
+    throw LogindError(Kind::refused, std::string(method) + ": " + error.text());
+}
+
+Logind::Message Logind::property(const char* name) {
+    const Message call = newCall(propertiesInterface, "Get");
+    require(sd_bus_message_append(call.get(), "ss", managerInterface, name), name);
+    return send(call, name);
+}
+
+bool Logind::isPreparingForShutdown() {
+    constexpr const char* name = "PreparingForShutdown";
+    const Message reply = property(name);
+    int preparing = 0;
+    require(sd_bus_message_read(reply.get(), "v", "b", &preparing), name);
+    return preparing != 0;
+}
+
+ScheduledShutdown Logind::scheduledShutdown() {
+    constexpr const char* name = "ScheduledShutdown";
+    const Message reply = property(name);
+    const char* type = nullptr;
+    std::uint64_t time = 0;
+    require(sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
+    return {printable(type), WallTime(std::chrono::microseconds(time))};
+}
+
+std::string Logind::can(const char* method) {
+    const Message reply = send(newCall(managerInterface, method), method);
+    const char* answer = nullptr;
+    require(sd_bus_message_read(reply.get(), "s", &answer), method);
+    return printable(answer);
+}
+
+std::vector<Inhibitor> Logind::shutdownInhibitors() {
+    constexpr const char* method = "ListInhibitors";
+    const Message reply = send(newCall(managerInterface, method), method);
+    require(sd_bus_message_enter_container(reply.get(), 'a', "(ssssuu)"), method);
+    std::vector<Inhibitor> inhibitors;
+    for (;;) {
+        const char* what = nullptr;
+        const char* who = nullptr;
+        const char* why = nullptr;
+        const char* mode = nullptr;
+        std::uint32_t uid = 0;
+        std::uint32_t pid = 0;
+        const int result = sd_bus_message_read(reply.get(), "(ssssuu)", &what, &who, &why, &mode, &uid, &pid);
+        require(result, method);
+        if (result == 0) {
+            return inhibitors;
+        }
+        // The other mode is "delay".
+        if (contains(what, "shutdown") && std::string_view(mode).starts_with("block")) {
+            inhibitors.push_back({printable(who), printable(why), uid, pid});
+        }
+    }
+}
+
+void Logind::shutDown(const char* method) {
+    const Message call = newCall(managerInterface, method);
+    constexpr int interactive = 0;
+    require(sd_bus_message_append(call.get(), "b", interactive), method);
+    send(call, method);
+}
+
+void Logind::scheduleShutdown(const ScheduledShutdown& shutdown) {
+    constexpr const char* method = "ScheduleShutdown";
+    const Message call = newCall(managerInterface, method);
+    const auto time = static_cast<std::uint64_t>(shutdown.time.time_since_epoch().count());
+    require(sd_bus_message_append(call.get(), "st", shutdown.type.c_str(), time), method);
+    send(call, method);
+}
+
+void Logind::cancelScheduledShutdown() noexcept {
+    sd_bus_message* call = nullptr;
+    if (sd_bus_message_new_method_call(_bus.get(), &call, service, path, managerInterface, "CancelScheduledShutdown") >=
+        0) {
+        const Message owner(call);
+        sd_bus_message_set_expect_reply(call, 0);
+        sd_bus_send(_bus.get(), call, nullptr);
+    }
+}
+
+} // namespace Norv::Agent

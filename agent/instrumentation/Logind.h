@@ -1,0 +1,122 @@
+/**
+ * systemd-logind, org.freedesktop.login1(5), on the system bus.
+ */
+#ifndef INSTRUMENTATION_LOGIND_H
+#define INSTRUMENTATION_LOGIND_H
+
+#include <chrono>
+#include <cstdint>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+struct sd_bus;
+struct sd_bus_message;
+
+namespace Norv::Agent {
+
+/** The time that everything an operation waits for may take together. */
+class Deadline {
+public:
+    explicit Deadline(std::chrono::milliseconds whole)
+        : _whole(whole), _end(std::chrono::steady_clock::now() + whole) {}
+
+    std::chrono::milliseconds whole() const { return _whole; }
+
+    /** Not negative. */
+    std::chrono::microseconds remaining() const;
+
+private:
+    std::chrono::milliseconds _whole;
+    std::chrono::steady_clock::time_point _end;
+};
+
+/** A call that did not do what it should. what() is the reason, for people. */
+class LogindError : public std::runtime_error {
+public:
+    enum class Kind {
+        /** There is no way to the bus. */
+        noBus,
+        /** Nobody on the bus is systemd-logind, and nobody starts it. */
+        noService,
+        /** Systemd-logind, or the bus in its place, said no. */
+        refused,
+        /** No answer came: whether the call did something is not known. */
+        unanswered,
+    };
+
+    LogindError(Kind kind, const std::string& reason) : std::runtime_error(reason), _kind(kind) {}
+
+    Kind kind() const { return _kind; }
+
+private:
+    Kind _kind;
+};
+
+using WallTime = std::chrono::sys_time<std::chrono::microseconds>;
+
+struct ScheduledShutdown {
+    /** "reboot", "poweroff" and the like; empty where nothing is scheduled. */
+    std::string type;
+    WallTime time;
+};
+
+/** Something on the machine that does not want it to go down. */
+struct Inhibitor {
+    std::string who;
+    std::string why;
+    std::uint32_t uid;
+    std::uint32_t pid;
+};
+
+/**
+ * A connection to systemd-logind, for one thread and one operation: none is kept, so that nothing depends on what a
+ * host does with its descriptors, or whether it forks, and a bus that was restarted is found again.
+ *
+ * Every member throws LogindError, at the latest when the time is over.
+ */
+class Logind {
+public:
+    /** Connects to the bus that DBUS_SYSTEM_BUS_ADDRESS names, else to the machine's. */
+    explicit Logind(const Deadline& deadline);
+
+    bool isPreparingForShutdown();
+
+    ScheduledShutdown scheduledShutdown();
+
+    /** What a method such as CanReboot answers: "yes" or why not. */
+    std::string can(const char* method);
+
+    /** Those that forbid a shutdown, not those that merely delay it. */
+    std::vector<Inhibitor> shutdownInhibitors();
+
+    /** Calls Reboot or PowerOff. Never lets polkit ask anybody. */
+    void shutDown(const char* method);
+
+    void scheduleShutdown(const ScheduledShutdown& shutdown);
+
+    /** Asks for the scheduled shutdown to be cancelled, without waiting for an answer. Does not throw. */
+    void cancelScheduledShutdown() noexcept;
+
+private:
+    struct Closer {
+        void operator()(sd_bus* bus) const;
+    };
+    struct Unreferencer {
+        void operator()(sd_bus_message* message) const;
+    };
+    using Message = std::unique_ptr<sd_bus_message, Unreferencer>;
+
+    void waitUntilConnected();
+    Message newCall(const char* interface, const char* method);
+    Message send(const Message& call, const char* method);
+    Message property(const char* name);
+
+    Deadline _deadline;
+    std::unique_ptr<sd_bus, Closer> _bus;
+};
+
+} // namespace Norv::Agent
+
+#endif

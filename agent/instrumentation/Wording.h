@@ -1,0 +1,30 @@
+/**
+ * Texts for people that several backends use.
+ */
+#ifndef INSTRUMENTATION_WORDING_H
+#define INSTRUMENTATION_WORDING_H
+
+#include <chrono>
+#include <string>
+
+namespace Norv::Agent {
+
+/** Seconds in the shortest exact form, whatever the process's locale: "10 s", "2.5 s". */
+std::string inSeconds(std::chrono::milliseconds duration);
+
+/** A time in UTC: "2026-11-20T12:31:07Z". */
+std::string inUtc(std::chrono::system_clock::time_point time);
+
+/** "9 (reboot) or 12 (shutdown)", from a table of what can be asked for. */
+std::string acceptedStates(const auto& transitions) {
+    std::string text;
+    for (const auto& transition : transitions) {
+        text += text.empty() ? "" : " or ";
+        text += std::to_string(transition.state) + " (" + transition.name + ')';
+    }
+    return text;
+}
+
+} // namespace Norv::Agent
+
+#endif

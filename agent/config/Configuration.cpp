@@ -17,6 +17,7 @@ namespace Norv::Agent {
 
 namespace {
 
+constexpr const char* fileVariable = "ORV_AGENT_CONFIG";
 constexpr const char* defaultFile = "/etc/orv/agent.toml";
 
 using Destination = LogSettings::Destination;
@@ -147,16 +148,12 @@ Configuration configurationFrom(const std::string& file) {
     return configuration;
 }
 
-// The file to read; nothing where the built-in defaults hold. A file that is there but cannot be reached counts as
-// there: it is an error, not a reason to go on without it.
-std::optional<std::string> configurationFile() {
-    if (auto named = environment("ORV_AGENT_CONFIG")) {
-        return named;
-    }
+// Whether the built-in defaults hold. A file that is there but cannot be reached counts as there: it is an error, not a
+// reason to go on without it.
+bool isWithoutFile() {
     std::error_code error;
-    const auto status = std::filesystem::symlink_status(defaultFile, error);
-    return status.type() == std::filesystem::file_type::not_found ? std::nullopt
-                                                                  : std::optional<std::string>(defaultFile);
+    return !environment(fileVariable) &&
+           std::filesystem::symlink_status(defaultFile, error).type() == std::filesystem::file_type::not_found;
 }
 
 std::filesystem::path defaultStateFile() {
@@ -177,9 +174,12 @@ std::filesystem::path defaultStateFile() {
 
 } // namespace
 
+std::string configurationFile() {
+    return environment(fileVariable).value_or(defaultFile);
+}
+
 Configuration loadConfiguration() {
-    const auto file = configurationFile();
-    Configuration configuration = file ? configurationFrom(*file) : Configuration{};
+    Configuration configuration = isWithoutFile() ? Configuration{} : configurationFrom(configurationFile());
     if (configuration.instrumentation.simulated.stateFile.empty()) {
         configuration.instrumentation.simulated.stateFile = defaultStateFile();
     }

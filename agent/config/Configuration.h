@@ -95,6 +95,10 @@ public:
     using std::runtime_error::runtime_error;
 };
 
+/** The file that the environment variable ORV_AGENT_CONFIG names, else /etc/orv/agent.toml, whether it exists or not.
+ */
+std::string configurationFile();
+
 /**
  * Reads the file that the environment variable ORV_AGENT_CONFIG names, else /etc/orv/agent.toml where it exists, else
  * gives the built-in defaults. Keys that the file leaves out have their defaults.

@@ -7,15 +7,18 @@
 #include "Thresholds.h"
 
 #include "config/Configuration.h"
+#include "config/ConfigurationWatch.h"
 
 #include <atomic>
 #include <cerrno>
 #include <cstddef>
 #include <cstring>
 #include <exception>
+#include <forward_list>
 #include <memory>
 #include <string>
 #include <string_view>
+#include <utility>
 
 namespace OrvLog {
 
@@ -23,17 +26,36 @@ namespace {
 
 class Log {
 public:
-    explicit Log(const Norv::Agent::LogSettings& settings)
-        : _thresholds(settings), _socket(RecordSocket::fromEnvironment()), _destination(destinationFor(settings)) {}
+    /** `watch` was made before the settings were read. */
+    Log(const Norv::Agent::LogSettings& settings, std::unique_ptr<Norv::Agent::ConfigurationWatch> watch)
+        : _watch(std::move(watch)), _generations{Thresholds(settings)}, _thresholds(&_generations.front()),
+          _socket(RecordSocket::fromEnvironment()), _destination(destinationFor(settings)) {}
 
     void report(const Record& record) {
+        _watch->onChange([this] { renewThresholds(); });
         _socket.send(record);
-        if (_thresholds.passes(record.kind, record.category, record.level)) {
+        if (_thresholds.load(std::memory_order_acquire)->passes(record.kind, record.category, record.level)) {
             write(record);
         }
     }
 
 private:
+    // What holds for the thresholds holds for nothing else: records go where they went before.
+    void renewThresholds() {
+        try {
+            const auto configuration = Norv::Agent::loadConfiguration();
+            const Thresholds thresholds(configuration.log);
+            if (thresholds == _generations.front()) {
+                return;
+            }
+            _generations.push_front(thresholds);
+            _thresholds.store(&_generations.front(), std::memory_order_release);
+            report(ownRecord(Norv::Agent::configurationFile() + " has changed: its thresholds hold from now on"));
+        } catch (const Norv::Agent::ConfigurationError& error) {
+            report(ownRecord(std::string(error.what()) + ": the former thresholds go on to hold"));
+        }
+    }
+
     static std::unique_ptr<Destination> destinationFor(const Norv::Agent::LogSettings& settings) {
         using enum Norv::Agent::LogSettings::Destination;
         switch (settings.destination) {
@@ -69,7 +91,10 @@ private:
         return error == 0;
     }
 
-    const Thresholds _thresholds;
+    const std::unique_ptr<Norv::Agent::ConfigurationWatch> _watch;
+    /** The newest first. Those before stay, since other threads may be reading them. */
+    std::forward_list<Thresholds> _generations;
+    std::atomic<const Thresholds*> _thresholds;
     const RecordSocket _socket;
     const std::unique_ptr<Destination> _destination;
     std::atomic<std::size_t> _lost = 0;
@@ -77,10 +102,12 @@ private:
 };
 
 std::unique_ptr<Log> makeLog() {
+    auto watch = std::make_unique<Norv::Agent::ConfigurationWatch>();
     try {
-        return std::make_unique<Log>(Norv::Agent::loadConfiguration().log);
+        const auto configuration = Norv::Agent::loadConfiguration();
+        return std::make_unique<Log>(configuration.log, std::move(watch));
     } catch (const Norv::Agent::ConfigurationError& error) {
-        auto log = std::make_unique<Log>(Norv::Agent::LogSettings{});
+        auto log = std::make_unique<Log>(Norv::Agent::LogSettings{}, std::move(watch));
         log->report(ownRecord(error.what()));
         return log;
     }

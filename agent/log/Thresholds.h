@@ -18,16 +18,21 @@ public:
 
     bool passes(Kind kind, std::string_view category, int level) const;
 
+    bool operator==(const Thresholds&) const = default;
+
 private:
     struct Levels {
         int log;
         int trace;
 
         int of(Kind kind) const { return kind == Kind::log ? log : trace; }
+        bool operator==(const Levels&) const = default;
     };
     struct Category {
         std::string prefix;
         Levels levels;
+
+        bool operator==(const Category&) const = default;
     };
 
     Levels _general;

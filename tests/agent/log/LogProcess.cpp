@@ -8,9 +8,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <sstream>
+#include <thread>
 
 namespace LogTest {
 
@@ -58,6 +60,14 @@ void LogProcess::wait(pid_t child) {
 
 std::vector<std::string> LogProcess::standardError() const {
     return linesOfFile(standardErrorFile());
+}
+
+void waitUntil(const std::function<bool()>& isSo) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::minutes(1);
+    while (!isSo()) {
+        ASSERT_LT(std::chrono::steady_clock::now(), end);
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
 }
 
 std::vector<std::string> linesOfFile(const std::filesystem::path& file) {

@@ -46,6 +46,9 @@ private:
     std::filesystem::path standardErrorFile() const { return folder / "stderr"; }
 };
 
+/** Waits until something is so; fails the test where that takes longer than a minute. */
+void waitUntil(const std::function<bool()>& isSo);
+
 std::vector<std::string> linesOfFile(const std::filesystem::path& file);
 
 /** The lines' texts: what stands behind the sixth blank. */

@@ -5,9 +5,13 @@
 
 #include <gmock/gmock.h>
 
+#include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
+#include <filesystem>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace {
@@ -151,7 +155,7 @@ TEST(LoggerTest, AWrongConfigurationIsReportedOnceAndTheDefaultsHold) {
     const LogProcess process;
     process.configure("[log]\nlevel = 60000\ntrace-level = 0\n");
     process.run([] {
-        writeLog(5999, "below");
+        writeLog(5999, "below", "Corvane.Other");
         writeLog(6000, "at the threshold");
         writeTrace(9999, "trace");
     });
@@ -173,14 +177,104 @@ TEST(LoggerTest, NothingIsSaidWhereThereIsNoConfiguration) {
     EXPECT_THAT(textsOf(process.standardError()), ElementsAre("text"));
 }
 
-TEST(LoggerTest, TheConfigurationIsReadOnce) {
+/** Writes records below the default thresholds until something is said on standard error. */
+void writeUntilSomethingIsSaid(const LogProcess& process) {
+    LogTest::waitUntil([&process] {
+        writeLog(3000, "below");
+        return !process.standardError().empty();
+    });
+}
+
+TEST(LoggerTest, ThresholdsFollowTheConfigurationWhileTheProcessRuns) {
     const LogProcess process;
     process.run([&process] {
-        writeLog(1, "before");
-        process.configure(everything);
-        writeLog(1, "after");
+        writeLog(3000, "below");
+        process.configure("[log]\ntrace-level = 0\n[[log.category]]\nprefix = \"Corvane.Power\"\nlevel = 3000\n");
+        writeUntilSomethingIsSaid(process);
+        writeLog(3000, "power", "Corvane.Power");
+        writeTrace(0, "trace");
+        writeLog(3000, "below");
     });
-    EXPECT_THAT(process.standardError(), IsEmpty());
+    EXPECT_THAT(textsOf(process.standardError()),
+                ElementsAre((process.folder / "agent.toml").string() + " has changed: its thresholds hold from now on",
+                            "power", "trace"));
+}
+
+TEST(LoggerTest, AFileThatIsMadeOrRemovedIsAChange) {
+    const LogProcess process;
+    process.run([&process] {
+        writeLog(1, "first use");
+        std::filesystem::remove(process.folder / "agent.toml");
+        writeUntilSomethingIsSaid(process);
+        process.configure("[log]\nlevel = 3000\n");
+        LogTest::waitUntil([&process] {
+            writeLog(3000, "heard");
+            return textsOf(process.standardError()).back() == "heard";
+        });
+    });
+    const std::string file = process.folder / "agent.toml";
+    EXPECT_THAT(textsOf(process.standardError()),
+                ElementsAre(file + ": No such file or directory: expected a file that can be read: the former "
+                                   "thresholds go on to hold",
+                            file + " has changed: its thresholds hold from now on", "heard"));
+}
+
+TEST(LoggerTest, AWrongChangeIsReportedOnceAndTheFormerThresholdsGoOnToHold) {
+    const LogProcess process;
+    process.configure("[log]\nlevel = 5000\n");
+    process.run([&process] {
+        writeLog(1, "first use");
+        process.configure("[log]\nlevel = 1\ntrace-level = -1\n");
+        writeUntilSomethingIsSaid(process);
+        writeLog(4999, "below", "Corvane.Other");
+        writeLog(5000, "at the threshold");
+    });
+    EXPECT_THAT(
+        textsOf(process.standardError()),
+        ElementsAre((process.folder / "agent.toml").string() +
+                        ":3: log.trace-level: -1: expected an integer from 0 to 10000: the former thresholds go "
+                        "on to hold",
+                    "at the threshold"));
+}
+
+TEST(LoggerTest, AChangeOfSomethingElseIsNotTold) {
+    const LogProcess process;
+    process.run([&process] {
+        writeLog(1, "first use");
+        process.configure("[system]\nname = \"other\"\n");
+        std::this_thread::sleep_for(std::chrono::milliseconds(2500));
+        writeLog(6000, "failure");
+    });
+    EXPECT_THAT(textsOf(process.standardError()), ElementsAre("failure"));
+}
+
+TEST(LoggerTest, ThresholdsMayChangeWhileThreadsWrite) {
+    const LogProcess process;
+    process.configureFile();
+    process.run([&process] {
+        std::atomic<bool> over = false;
+        std::vector<std::thread> threads;
+        for (int number = 0; number < 4; ++number) {
+            threads.emplace_back([&over] {
+                while (!over) {
+                    writeLog(5000, "text");
+                }
+            });
+        }
+        for (const char* level : {"5500", "5600", "5700"}) {
+            const auto changes = [&process] {
+                return exists(process.file()) ? LogTest::linesOfFile(process.file()).size() : 0;
+            };
+            const auto before = changes();
+            process.configureFile("level = " + std::string(level) + "\n");
+            LogTest::waitUntil([&] { return changes() > before; });
+        }
+        over = true;
+        for (std::thread& thread : threads) {
+            thread.join();
+        }
+    });
+    EXPECT_THAT(textsOf(LogTest::linesOfFile(process.file())), SizeIs(3));
 }
 
 TEST(LoggerTest, TheCallersErrorNumberStays) {

@@ -1,0 +1,76 @@
+#ifndef AGENT_CONFIGURATIONWATCH_H
+#define AGENT_CONFIGURATIONWATCH_H
+
+#include <atomic>
+#include <chrono>
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include <sys/types.h>
+
+namespace Norv::Agent {
+
+/**
+ * Notices that the configuration file has become another one, was changed, made or removed. Asked as often as one
+ * likes: it looks at the file once a second at most. Used by several threads at a time; takes no lock and allocates
+ * nothing.
+ */
+class ConfigurationWatch {
+public:
+    /** Takes the file as it is now for known. */
+    ConfigurationWatch();
+
+    /**
+     * Has `action` act where the file has changed since the last time, or since the beginning. Only one thread at a
+     * time does so; others go on meanwhile, and so does `action` where it comes here itself.
+     */
+    void onChange(const auto& action) {
+        if (!isDue() || _looking.test_and_set(std::memory_order_acquire)) {
+            return;
+        }
+        const Looking untilTheEnd(_looking);
+        if (look()) {
+            action();
+        }
+    }
+
+private:
+    class Looking {
+    public:
+        explicit Looking(std::atomic_flag& flag) : _flag(flag) {}
+        ~Looking() { _flag.clear(std::memory_order_release); }
+        Looking(const Looking&) = delete;
+        Looking& operator=(const Looking&) = delete;
+
+    private:
+        std::atomic_flag& _flag;
+    };
+
+    /** Tells one content of the file from every other. */
+    struct Signature {
+        dev_t device;
+        ino_t inode;
+        off_t size;
+        std::chrono::nanoseconds modified;
+
+        bool operator==(const Signature&) const = default;
+    };
+
+    bool isDue() const;
+    /** Looks at the file. @return whether it is another one than the last time. */
+    bool look();
+    std::optional<Signature> signature() const;
+
+    const std::string _file;
+    /** When to look again, in milliseconds of a clock of its own. */
+    std::atomic<std::int64_t> _next;
+    /** Set while a thread looks. */
+    std::atomic_flag _looking;
+    /** Belongs to the thread that looks. */
+    std::optional<Signature> _known;
+};
+
+} // namespace Norv::Agent
+
+#endif

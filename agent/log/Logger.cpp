@@ -1,6 +1,7 @@
 #include "OrvLog/OrvLogger.h"
 
 #include "Destination.h"
+#include "LastOperation.h"
 #include "Line.h"
 #include "Record.h"
 #include "RecordSocket.h"
@@ -35,7 +36,12 @@ public:
         _watch->onChange([this] { renewThresholds(); });
         _socket.send(record);
         if (_thresholds.load(std::memory_order_acquire)->passes(record.kind, record.category, record.level)) {
+            if (LastOperation::isNeededFor(record)) {
+                writeLastOperation(record.category);
+            }
             write(record);
+        } else if (LastOperation::isOne(record)) {
+            LastOperation::ofThisThread().remember(record);
         }
     }
 
@@ -54,6 +60,14 @@ private:
         } catch (const Norv::Agent::ConfigurationError& error) {
             report(ownRecord(std::string(error.what()) + ": the former thresholds go on to hold"));
         }
+    }
+
+    void writeLastOperation(std::string_view category) {
+        auto& operation = LastOperation::ofThisThread();
+        if (operation.hasBeen(category)) {
+            write(operation.record());
+        }
+        operation.forget();
     }
 
     static std::unique_ptr<Destination> destinationFor(const Norv::Agent::LogSettings& settings) {

@@ -277,6 +277,47 @@ TEST(LoggerTest, ThresholdsMayChangeWhileThreadsWrite) {
     EXPECT_THAT(textsOf(LogTest::linesOfFile(process.file())), SizeIs(3));
 }
 
+TEST(LoggerTest, AFailureIsWrittenWithTheOperationBeforeIt) {
+    const LogProcess process;
+    process.run([] {
+        writeLog(4000, "operation");
+        writeLog(3999, "step");
+        writeTrace(5999, "trace");
+        writeLog(6000, "failure");
+        writeLog(6000, "second failure");
+    });
+    const auto lines = process.standardError();
+    EXPECT_THAT(textsOf(lines), ElementsAre("operation", "failure", "second failure"));
+    EXPECT_THAT(lines[0], HasSubstr(" log 4000 Corvane.Test function file.cpp:7 operation"));
+}
+
+TEST(LoggerTest, AFailureIsNotWrittenWithWhatIsNotItsOperation) {
+    const LogProcess process;
+    process.configure("[log]\ntrace-level = 6000\n[[log.category]]\nprefix = \"Corvane.Silent\"\nlevel = 7000\n");
+    process.run([] {
+        writeLog(4000, "of another category");
+        writeLog(6000, "failure", "Corvane.Other");
+        writeLog(4000, "of another thread");
+        std::thread([] { writeLog(6000, "failure of a thread"); }).join();
+        writeTrace(6000, "trace");
+        writeLog(10000, "power request");
+        writeLog(4000, "of a failure that is not written", "Corvane.Silent");
+        writeLog(6000, "not written", "Corvane.Silent");
+        writeLog(7000, "written", "Corvane.Silent");
+    });
+    EXPECT_THAT(textsOf(process.standardError()),
+                ElementsAre("failure", "failure of a thread", "trace", "power request", "not written", "written"));
+}
+
+TEST(LoggerTest, AnOperationIsCutOffWhereItIsLong) {
+    const LogProcess process;
+    process.run([] {
+        writeLog(4000, std::string(300, 'x'));
+        writeLog(6000, "failure");
+    });
+    EXPECT_THAT(textsOf(process.standardError()), ElementsAre(std::string(256, 'x'), "failure"));
+}
+
 TEST(LoggerTest, TheCallersErrorNumberStays) {
     const LogProcess process;
     process.configure("[log]\ndestination = \"file\"\nfile = \"" + (process.folder / "missing/file").string() + "\"\n");

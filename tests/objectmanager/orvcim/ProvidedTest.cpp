@@ -9,6 +9,7 @@
 namespace OrvcimTest {
 namespace {
 
+using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::StartsWith;
 
@@ -138,6 +139,19 @@ TEST_F(ProvidedTest, showsARefusedRequestAsRefused) {
         EXPECT_EQ(outcome.status, 1);
     }
     EXPECT_FALSE(std::filesystem::exists(_folder / "state.json"));
+}
+
+TEST_F(ProvidedTest, logsWhatWasAskedForBesideWhyItWasRefused) {
+    orvcim({"invoke", _service, "RequestPowerStateChange", "PowerState=2", "ManagedElement=" + _system});
+    std::ifstream log(_folder / "log");
+    std::vector<std::string> lines;
+    for (std::string line; std::getline(log, line);) {
+        lines.push_back(line);
+    }
+    EXPECT_THAT(lines,
+                ElementsAre(HasSubstr(" log 4000 Corvane.PowerMgmtSvcProvider PowerManagementService_InvokeMethod "),
+                            HasSubstr("]: Requested Power State change Not Supported")));
+    EXPECT_THAT(lines.front(), HasSubstr(" VARIABLE: 'powerState' has Value '2' "));
 }
 
 TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {

@@ -1,6 +1,7 @@
 #include "OrvLog/OrvLogger.h"
 
 #include "Destination.h"
+#include "Gate.h"
 #include "LastOperation.h"
 #include "Line.h"
 #include "Record.h"
@@ -97,7 +98,8 @@ private:
     }
 
     bool tryWrite(const Record& record, std::size_t countedAs) {
-        const int error = _destination->write(Line(record));
+        const auto pass = _gate.enter();
+        const int error = pass ? _destination->write(Line(record)) : EBUSY;
         if (error != 0) {
             _lossReason = error;
             _lost += countedAs;
@@ -111,6 +113,7 @@ private:
     std::atomic<const Thresholds*> _thresholds;
     const RecordSocket _socket;
     const std::unique_ptr<Destination> _destination;
+    Gate _gate;
     std::atomic<std::size_t> _lost = 0;
     std::atomic<int> _lossReason = 0;
 };

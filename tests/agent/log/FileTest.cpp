@@ -1,13 +1,16 @@
+#include "Hanging.h"
 #include "LogProcess.h"
 
 #include <gmock/gmock.h>
 
+#include <fcntl.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
+#include <chrono>
 #include <fstream>
 #include <map>
 #include <regex>
@@ -179,7 +182,7 @@ TEST(FileTest, LostRecordsAreCountedAndReportedWhenTheFileCanBeWrittenAgain) {
     process.run([&file] {
         writeLog(6000, "first");
         writeLog(6000, "second");
-        writeLog(5000, "filtered out");
+        writeLog(3000, "filtered out");
         fs::create_directory(file.parent_path());
         writeLog(6000, "third");
         writeLog(6000, "fourth");
@@ -215,6 +218,106 @@ TEST(FileTest, APipeWithoutReaderLosesRecordsAtOnce) {
     });
     EXPECT_THAT(textsOf(linesOfFile(process.file())),
                 ElementsAre("1 record lost: " + process.file().string() + ": No such device or address", "second"));
+}
+
+TEST(FileTest, APipeThatNobodyEmptiesLosesRecordsAtOnce) {
+    const LogProcess process;
+    process.configureFile();
+    ASSERT_EQ(mkfifo(process.file().c_str(), 0600), 0);
+    const int reader = open(process.file().c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    ASSERT_GE(reader, 0);
+    process.run([&process] {
+        constexpr int moreThanItTakes = 2000;
+        writeRecords(0, moreThanItTakes);
+        fs::remove(process.file());
+        writeLog(6000, "next");
+    });
+    const auto texts = textsOf(linesOfFile(process.file()));
+    ASSERT_EQ(texts.size(), 2U);
+    EXPECT_THAT(texts[0], testing::MatchesRegex("[0-9]+ records lost: " + process.file().string() +
+                                                ": Resource temporarily unavailable"));
+    EXPECT_EQ(texts[1], "next");
+    close(reader);
+}
+
+TEST(FileTest, AFileThatMayNotBeWrittenLosesRecords) {
+    const LogProcess process;
+    process.configureFile();
+    AgentTest::writeFile(process.file(), "");
+    fs::permissions(process.file(), fs::perms::owner_read);
+    process.run([&process] {
+        writeLog(1, "reads the configuration");
+        constexpr uid_t nobody = 65534;
+        if (geteuid() == 0) {
+            ASSERT_EQ(seteuid(nobody), 0);
+        }
+        writeLog(6000, "first");
+        if (getuid() == 0) {
+            ASSERT_EQ(seteuid(0), 0);
+        }
+        fs::permissions(process.file(), fs::perms::owner_write, fs::perm_options::add);
+        writeLog(6000, "second");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())),
+                ElementsAre("1 record lost: " + process.file().string() + ": Permission denied", "second"));
+}
+
+TEST(FileTest, OthersMayRenameTheFileWhileManyWrite) {
+    constexpr int processCount = 3;
+    constexpr int threadCount = 2;
+    constexpr int records = 400;
+    const LogProcess process;
+    process.configureFile();
+    std::vector<pid_t> children;
+    for (int child = 0; child < processCount; ++child) {
+        children.push_back(process.start([child] {
+            std::thread second([child] { writeRecords(threadCount * child + 1, records); });
+            writeRecords(threadCount * child, records);
+            second.join();
+        }));
+    }
+    // As logrotate(8) does.
+    std::atomic<bool> over = false;
+    std::thread rotator([&] {
+        for (int number = 0; !over; ++number) {
+            std::error_code notThereYet;
+            fs::rename(process.file(), process.file().string() + ".moved" + std::to_string(number), notThereYet);
+            std::this_thread::sleep_for(std::chrono::milliseconds(2));
+        }
+    });
+    for (const pid_t child : children) {
+        LogProcess::wait(child);
+    }
+    over = true;
+    rotator.join();
+    EXPECT_THAT(allTexts(process), UnorderedElementsAreArray(expectedTexts(processCount * threadCount, records)));
+}
+
+TEST(FileTest, AFileSystemThatHangsHoldsOneThreadAndNotTheOthers) {
+    const LogProcess process;
+    process.configureFile();
+    process.run([&process] {
+        LogTest::hangFiles(true);
+        std::thread held([] { writeLog(6000, "held"); });
+        LogTest::waitUntil([] { return LogTest::hangingWrites() == 1; });
+        std::this_thread::sleep_for(std::chrono::milliseconds(1500));
+
+        // A child has none of the threads that hang.
+        process.run([] {
+            LogTest::hangFiles(false);
+            writeLog(6000, "child");
+        });
+        // Would never end, were it to write.
+        writeLog(6000, "first");
+        writeLog(6000, "second");
+
+        LogTest::hangFiles(false);
+        held.join();
+        writeLog(6000, "third");
+    });
+    EXPECT_THAT(textsOf(linesOfFile(process.file())),
+                ElementsAre("child", "held", "2 records lost: " + process.file().string() + ": Device or resource busy",
+                            "third"));
 }
 
 TEST(FileTest, ALimitOfTheHostEndsALineButNotTheHost) {

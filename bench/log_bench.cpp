@@ -1,0 +1,81 @@
+/**
+ * What the agent's log costs whoever calls it: mostly nothing is written. Counts the allocations as well.
+ */
+#include "Allocations.h"
+#include "OrvLog/OrvLogger.h"
+
+#include <benchmark/benchmark.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <iostream>
+#include <string>
+
+#include <unistd.h>
+
+namespace {
+
+using OrvLog::OrvLogger;
+
+const std::string filtered = "Corvane.Filtered";
+const std::string written = "Corvane.Written";
+
+using Write = void (*)(const char*, const char*, int, const std::string&, int, char*, int, int, const std::string&);
+
+/** Writes records with a text of as many characters as the benchmark's argument says. */
+void writeRecords(benchmark::State& state, Write write, const std::string& category, int level) {
+    const std::string text(static_cast<std::size_t>(state.range(0)), 'x');
+    // What is made once was made before.
+    write(__func__, __FILE__, __LINE__, category, level, nullptr, 0, 0, text);
+    const int before = LogTest::allocations();
+    for (auto _ : state) {
+        write(__func__, __FILE__, __LINE__, category, level, nullptr, 0, 0, text);
+    }
+    state.counters["allocations"] = LogTest::allocations() - before;
+}
+
+/** A step, by far below the threshold. */
+void filteredStep(benchmark::State& state) {
+    writeRecords(state, OrvLogger::logLevelMessage, filtered, 3000);
+}
+
+/** An operation, which is remembered in case that a failure follows. */
+void filteredOperation(benchmark::State& state) {
+    writeRecords(state, OrvLogger::logLevelMessage, filtered, 4000);
+}
+
+void filteredTrace(benchmark::State& state) {
+    writeRecords(state, OrvLogger::traceLevelMessage, filtered, 6000);
+}
+
+void writtenToAFile(benchmark::State& state) {
+    writeRecords(state, OrvLogger::logLevelMessage, written, 4000);
+}
+
+BENCHMARK(filteredStep)->Arg(1)->Arg(100);
+BENCHMARK(filteredOperation)->Arg(1)->Arg(100);
+BENCHMARK(filteredTrace)->Arg(1)->Arg(100);
+BENCHMARK(writtenToAFile)->Arg(1)->Arg(100);
+
+} // namespace
+
+int main(int argc, char** argv) {
+    std::string folder = (std::filesystem::temp_directory_path() / "orv-log-bench-XXXXXX").string();
+    if (mkdtemp(folder.data()) == nullptr) {
+        std::cerr << folder << ": cannot be made\n";
+        return EXIT_FAILURE;
+    }
+    std::ofstream(folder + "/agent.toml")
+        << "[log]\ndestination = \"file\"\nfile = \"" << folder << "/agent.log\"\n[[log.category]]\nprefix = \""
+        << written << "\"\nlevel = 0\n";
+    setenv("ORV_AGENT_CONFIG", (folder + "/agent.toml").c_str(), 1);
+
+    benchmark::Initialize(&argc, argv);
+    const bool understood = !benchmark::ReportUnrecognizedArguments(argc, argv);
+    if (understood) {
+        benchmark::RunSpecifiedBenchmarks();
+    }
+    std::filesystem::remove_all(folder);
+    return understood ? EXIT_SUCCESS : EXIT_FAILURE;
+}

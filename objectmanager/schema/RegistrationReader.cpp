@@ -2,12 +2,12 @@
 
 #include "schema/Files.h"
 #include "schema/MofLexer.h"
+#include "schema/ProviderTypes.h"
 
 #include <fmt/format.h>
 #include <fmt/ranges.h>
 
 #include <algorithm>
-#include <array>
 #include <iterator>
 #include <sstream>
 #include <string>
@@ -16,17 +16,6 @@
 namespace ObjectManager {
 
 namespace {
-
-struct ProviderType {
-    std::string_view name;
-    bool Registration::*flag;
-};
-
-constexpr std::array<ProviderType, 5> providerTypes{{{"instance", &Registration::instance},
-                                                     {"method", &Registration::method},
-                                                     {"association", &Registration::association},
-                                                     {"property", &Registration::property},
-                                                     {"indication", &Registration::indication}}};
 
 std::string_view trimmed(std::string_view text) {
     constexpr std::string_view blanks = " \t\r";

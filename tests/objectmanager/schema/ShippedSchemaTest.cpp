@@ -1,4 +1,5 @@
 #include "schema/Catalogue.h"
+#include "schema/Files.h"
 #include "schema/Literals.h"
 #include "schema/RegistrationReader.h"
 
@@ -15,6 +16,8 @@ using testing::AllOf;
 using testing::Contains;
 using testing::ElementsAre;
 using testing::Field;
+using testing::HasSubstr;
+using testing::Not;
 using testing::Optional;
 
 class ShippedSchemaTest : public testing::Test {
@@ -45,6 +48,34 @@ TEST_F(ShippedSchemaTest, registersTheCapabilitiesForInstancesOnly) {
                                Field(&Registration::provider, "PowerManagementCapabilitiesProvider"),
                                Field(&Registration::instance, true), Field(&Registration::method, false),
                                Field(&Registration::association, false))));
+}
+
+/** The text of the instances that register a library, by the name of its files. */
+std::string instancesOf(const std::string& name) {
+    return readFile(std::filesystem::path(ORV_SCHEMA_FOLDER) / "pg" / (name + ".mof"));
+}
+
+TEST_F(ShippedSchemaTest, registersTheLibrariesByInstancesToo) {
+    const std::string power = instancesOf("orv-power-management");
+    EXPECT_THAT(power, HasSubstr("    Location = \"orvpowerstatemanagementprovider\";\n"));
+    EXPECT_THAT(power, Not(HasSubstr("TALVO_ComputerSystem")));
+    const std::string computerSystem = instancesOf("orv-computer-system");
+    EXPECT_THAT(computerSystem, HasSubstr("    Location = \"orvcomputersystemprovider\";\n"));
+    EXPECT_THAT(computerSystem, Not(HasSubstr("TALVO_Power")));
+    for (const Registration& registration : _registrations) {
+        const std::string types = registration.association ? "2, 3" : registration.method ? "2, 5" : "2";
+        EXPECT_THAT(power + computerSystem, HasSubstr("    ProviderName = \"" + registration.provider +
+                                                      "\";\n"
+                                                      "    CapabilityID = \"" +
+                                                      registration.className +
+                                                      "\";\n"
+                                                      "    ClassName = \"" +
+                                                      registration.className +
+                                                      "\";\n"
+                                                      "    Namespaces = {\"root/cimv2\", \"root/interop\"};\n"
+                                                      "    ProviderType = {" +
+                                                      types + "};\n"));
+    }
 }
 
 struct Link {

@@ -32,6 +32,27 @@ function(orv_shared_library target)
   install(TARGETS ${target} LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}" NAMELINK_SKIP)
 endfunction()
 
+# orv_provider_library(TARGET sources...): a shared library that is also found where object managers look for providers,
+# under the name that they make of its registration.
+function(orv_provider_library target)
+  orv_shared_library(${target} ${ARGN})
+  set(link "${CMAKE_CURRENT_BINARY_DIR}/lib${target}.so")
+  file(CREATE_LINK "../lib${target}.so.1" "${link}" SYMBOLIC)
+  install(FILES "${link}" DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmpi")
+endfunction()
+
+# orv_install_manual(FILE): installs a manual page of docs/man, compressed as systems have theirs.
+function(orv_install_manual file)
+  string(REGEX REPLACE ".*\\." "" section "${file}")
+  set(source "${PROJECT_SOURCE_DIR}/docs/man/${file}")
+  set(compressed "${CMAKE_CURRENT_BINARY_DIR}/${file}.gz")
+  add_custom_command(OUTPUT "${compressed}"
+    COMMAND gzip -9 --no-name --to-stdout "${source}" > "${compressed}"
+    DEPENDS "${source}" VERBATIM)
+  add_custom_target(manual-${file} ALL DEPENDS "${compressed}")
+  install(FILES "${compressed}" DESTINATION "${CMAKE_INSTALL_MANDIR}/man${section}")
+endfunction()
+
 # orv_add_test(NAME SOURCES... LIBRARIES...): a GoogleTest program that ctest runs.
 function(orv_add_test name)
   cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;LIBRARIES")

@@ -38,6 +38,8 @@ public:
 
     const Registry& registry() const { return _registry; }
     Broker& broker() { return _broker; }
+    /** Where failures' reasons come from; may be null. */
+    LogTap* log() { return _log; }
 
     /** What is found of a registered provider. */
     ProviderReport check(const Registration& registration) { return _providers.check(registration); }

@@ -19,34 +19,37 @@ bool serves(const Registration& registration, ProviderKind kind) {
     }
 }
 
-bool isIn(const Registration& registration, std::string_view nameSpace) {
-    return std::any_of(registration.nameSpaces.begin(), registration.nameSpaces.end(),
-                       [&](const std::string& name) { return equalNames(name, nameSpace); });
-}
-
 CimError unknownNameSpace(std::string_view nameSpace) {
     return {CMPI_RC_ERR_INVALID_NAMESPACE, "no provider is registered in namespace \"" + std::string(nameSpace) + '"'};
 }
 
 } // namespace
 
+bool Registration::isIn(std::string_view nameSpace) const {
+    return std::any_of(nameSpaces.begin(), nameSpaces.end(),
+                       [&](const std::string& name) { return equalNames(name, nameSpace); });
+}
+
+void Registry::requireNameSpace(std::string_view nameSpace) const {
+    if (std::none_of(_registrations.begin(), _registrations.end(),
+                     [&](const Registration& registration) { return registration.isIn(nameSpace); })) {
+        throw unknownNameSpace(nameSpace);
+    }
+}
+
 const Registration& Registry::find(std::string_view nameSpace, std::string_view className, ProviderKind kind) const {
-    bool nameSpaceKnown = false;
+    requireNameSpace(nameSpace);
     bool classKnown = false;
     for (const Registration& registration : _registrations) {
-        if (!isIn(registration, nameSpace)) {
+        if (!registration.isIn(nameSpace)) {
             continue;
         }
-        nameSpaceKnown = true;
         if (equalNames(registration.className, className)) {
             classKnown = true;
             if (serves(registration, kind)) {
                 return registration;
             }
         }
-    }
-    if (!nameSpaceKnown) {
-        throw unknownNameSpace(nameSpace);
     }
     if (!classKnown) {
         throw CimError(CMPI_RC_ERR_INVALID_CLASS, "no provider is registered for class \"" + std::string(className) +
@@ -62,22 +65,18 @@ const Registration& Registry::find(std::string_view nameSpace, std::string_view 
 }
 
 std::vector<const Registration*> Registry::all(std::string_view nameSpace, ProviderKind kind) const {
+    requireNameSpace(nameSpace);
     std::vector<const Registration*> found;
-    bool nameSpaceKnown = false;
     for (const Registration& registration : _registrations) {
-        if (!isIn(registration, nameSpace)) {
+        if (!registration.isIn(nameSpace)) {
             continue;
         }
-        nameSpaceKnown = true;
         const auto sameClass = [&](const Registration* other) {
             return equalNames(other->className, registration.className);
         };
         if (serves(registration, kind) && std::none_of(found.begin(), found.end(), sameClass)) {
             found.push_back(&registration);
         }
-    }
-    if (!nameSpaceKnown) {
-        throw unknownNameSpace(nameSpace);
     }
     return found;
 }

@@ -23,6 +23,9 @@ struct Registration {
     bool association = false;
     bool property = false;
     bool indication = false;
+
+    /** Whether the class is served in the namespace; letter case is ignored. */
+    bool isIn(std::string_view nameSpace) const;
 };
 
 enum class ProviderKind { instance, method, association };
@@ -33,6 +36,9 @@ public:
     explicit Registry(std::vector<Registration> registrations) : _registrations(std::move(registrations)) {}
 
     const std::vector<Registration>& registrations() const { return _registrations; }
+
+    /** @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace. */
+    void requireNameSpace(std::string_view nameSpace) const;
 
     /**
      * The first registration that serves the class in the namespace; letter case is ignored.

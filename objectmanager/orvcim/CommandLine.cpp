@@ -1,6 +1,6 @@
 #include "orvcim/CommandLine.h"
 
-#include "orvcim/AgentLog.h"
+#include "dispatch/AgentLog.h"
 #include "orvcim/Commands.h"
 #include "text/ObjectPathText.h"
 #include "text/StatusText.h"
@@ -185,21 +185,6 @@ private:
 int report(int status, const std::string& message) {
     std::cerr << "orvcim: " << message << '\n';
     return status;
-}
-
-/**
- * What the agent's log tells of failures, each said once; begins with `introduction` where it tells anything. What it
- * says of the machine and of accepted requests is no failure.
- */
-std::string reasonsText(const std::vector<std::string>& logged, const char* introduction) {
-    std::vector<std::string> reasons;
-    for (const std::string& each : logged) {
-        if (!isSimulationNotice(each) && !isAcceptance(each) &&
-            std::find(reasons.begin(), reasons.end(), each) == reasons.end()) {
-            reasons.push_back(each);
-        }
-    }
-    return reasons.empty() ? "" : fmt::format("{}{}", introduction, fmt::join(reasons, "; "));
 }
 
 std::string refusalText(const CimError& error) {

@@ -1,6 +1,6 @@
 #include "orvcim/MethodCall.h"
 
-#include "orvcim/AgentLog.h"
+#include "dispatch/AgentLog.h"
 
 #include <utility>
 

@@ -1,4 +1,4 @@
-#include "orvcim/AgentLog.h"
+#include "dispatch/AgentLog.h"
 #include "orvcim/Commands.h"
 #include "orvcim/MethodCall.h"
 #include "text/ObjectPathText.h"

@@ -27,21 +27,24 @@ Qualifiers merged(const Qualifiers& inherited, Qualifiers own) {
 
 /** Adds the elements of a class to those that it inherits. */
 template <typename T>
-void addElements(std::vector<T>& elements, const std::vector<T>& own, const std::string& place) {
-    for (const T& element : own) {
+void addElements(std::vector<T>& elements, const std::vector<T>& own, const Class& owner) {
+    for (T element : own) {
+        element.origin = owner.name;
+        element.declaredBy = owner.name;
         const auto inherited = std::find_if(elements.begin(), elements.end(),
                                             [&](const T& e) { return equalNames(e.name, element.name); });
         if (inherited == elements.end()) {
-            elements.push_back(element);
+            elements.push_back(std::move(element));
             continue;
         }
         if (inherited->type != element.type) {
-            throw SchemaError(place, fmt::format("found {} {}, expected the type {} that it is inherited with",
-                                                 typeName(element.type), element.name, typeName(inherited->type)));
+            throw SchemaError(owner.place,
+                              fmt::format("found {} {}, expected the type {} that it is inherited with",
+                                          typeName(element.type), element.name, typeName(inherited->type)));
         }
-        Qualifiers qualifiers = merged(inherited->qualifiers, element.qualifiers);
-        *inherited = element;
-        inherited->qualifiers = std::move(qualifiers);
+        element.qualifiers = merged(inherited->qualifiers, std::move(element.qualifiers));
+        element.origin = inherited->origin;
+        *inherited = std::move(element);
     }
 }
 
@@ -71,9 +74,20 @@ public:
 private:
     /** `descendants` counts the classes on the way down to the one that is completed. */
     Class complete(const Class& declared, std::size_t descendants) const {
-        if (declared.superClass.empty()) {
-            return declared;
+        Class whole = declared;
+        whole.properties.clear();
+        whole.methods.clear();
+        if (!declared.superClass.empty()) {
+            Class inherited = complete(superClassOf(declared, descendants), descendants + 1);
+            whole.properties = std::move(inherited.properties);
+            whole.methods = std::move(inherited.methods);
         }
+        addElements(whole.properties, declared.properties, declared);
+        addElements(whole.methods, declared.methods, declared);
+        return whole;
+    }
+
+    const Class& superClassOf(const Class& declared, std::size_t descendants) const {
         const auto ancestor = _declared.find(declared.superClass);
         if (ancestor == _declared.end() || descendants > _declared.size()) {
             throw SchemaError(declared.place,
@@ -81,13 +95,7 @@ private:
                                           declared.name,
                                           ancestor == _declared.end() ? "a declared class" : "no descendant of it"));
         }
-        Class whole = declared;
-        Class inherited = complete(ancestor->second, descendants + 1);
-        whole.properties = std::move(inherited.properties);
-        whole.methods = std::move(inherited.methods);
-        addElements(whole.properties, declared.properties, declared.place);
-        addElements(whole.methods, declared.methods, declared.place);
-        return whole;
+        return ancestor->second;
     }
 
     void checkReferences(const Class& whole) const {
@@ -133,6 +141,15 @@ Catalogue::Catalogue(std::vector<Class> declarations) {
 const Class* Catalogue::find(std::string_view name) const {
     const auto found = _classes.find(name);
     return found == _classes.end() ? nullptr : &found->second.whole;
+}
+
+std::vector<const Class*> Catalogue::all() const {
+    std::vector<const Class*> classes;
+    classes.reserve(_classes.size());
+    for (const auto& [name, entry] : _classes) {
+        classes.push_back(&entry.whole);
+    }
+    return classes;
 }
 
 bool Catalogue::isA(std::string_view name, std::string_view ancestor) const {

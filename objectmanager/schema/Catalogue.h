@@ -40,6 +40,9 @@ public:
      */
     const Class* find(std::string_view name) const;
 
+    /** All classes, by name. */
+    std::vector<const Class*> all() const;
+
     /** Whether the class is `ancestor` or descends from it. An unknown class is nothing but itself. */
     bool isA(std::string_view name, std::string_view ancestor) const override;
 

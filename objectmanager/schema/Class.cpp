@@ -79,6 +79,10 @@ std::optional<std::string> meaning(const Element& element, const Value& value) {
     return entry == map.end() ? std::nullopt : std::optional(texts[static_cast<std::size_t>(entry - map.begin())]);
 }
 
+bool Element::isDeclaredBy(const Class& owner) const {
+    return declaredBy == owner.name;
+}
+
 bool Parameter::isIn() const {
     return find(qualifiers, "In") == nullptr || hasFlag(qualifiers, "In");
 }

@@ -19,6 +19,8 @@ using Qualifiers = std::vector<NamedValue>;
 /** Whether the boolean qualifier `name` is there and TRUE. */
 bool hasFlag(const Qualifiers& qualifiers, std::string_view name);
 
+struct Class;
+
 /** What a property, a parameter and a method's return value have in common. */
 struct Element {
     std::string name;
@@ -27,6 +29,12 @@ struct Element {
     /** The class that is referred to, where the type is CMPI_ref. */
     std::string referenceClass;
     Qualifiers qualifiers;
+    /* In a catalogue: the class that declared the element first, and the one whose declaration this is. They differ
+       where the element was overridden; a parameter has neither. */
+    std::string origin;
+    std::string declaredBy;
+
+    bool isDeclaredBy(const Class& owner) const;
 };
 
 /**

@@ -1,8 +1,8 @@
 /**
  * What the agent's log tells about the machine, beside what it tells about providers.
  */
-#ifndef ORVCIM_AGENTLOG_H
-#define ORVCIM_AGENTLOG_H
+#ifndef DISPATCH_AGENTLOG_H
+#define DISPATCH_AGENTLOG_H
 
 #include "dispatch/LogTap.h"
 
@@ -10,7 +10,7 @@
 #include <string_view>
 #include <vector>
 
-namespace ObjectManager::Orvcim {
+namespace ObjectManager {
 
 /** Whether a text is the agent's notice that the machine is a simulated one. */
 bool isSimulationNotice(std::string_view text);
@@ -26,6 +26,12 @@ enum class PowerAnswer { accepted, refused };
 /** The text of the first record in which the agent's instrumentation so answered a power request; empty if none. */
 std::string powerRequestText(const std::vector<LogRecord>& records, PowerAnswer answer);
 
-} // namespace ObjectManager::Orvcim
+/**
+ * What failures the messages tell of, each said once; begins with `introduction` where they tell of any. What the agent
+ * says of the machine and of accepted requests is no failure.
+ */
+std::string reasonsText(const std::vector<std::string>& logged, const char* introduction);
+
+} // namespace ObjectManager
 
 #endif

@@ -1,10 +1,10 @@
-#include "orvcim/AgentLog.h"
+#include "dispatch/AgentLog.h"
 
 #include "model/Model.h"
 
 #include <algorithm>
 
-namespace ObjectManager::Orvcim {
+namespace ObjectManager {
 
 namespace {
 
@@ -39,4 +39,19 @@ std::string powerRequestText(const std::vector<LogRecord>& records, PowerAnswer 
     return found == records.end() ? std::string() : found->text;
 }
 
-} // namespace ObjectManager::Orvcim
+std::string reasonsText(const std::vector<std::string>& logged, const char* introduction) {
+    std::vector<std::string> reasons;
+    for (const std::string& each : logged) {
+        if (!isSimulationNotice(each) && !isAcceptance(each) &&
+            std::find(reasons.begin(), reasons.end(), each) == reasons.end()) {
+            reasons.push_back(each);
+        }
+    }
+    std::string text;
+    for (const std::string& reason : reasons) {
+        text += (text.empty() ? introduction : "; ") + reason;
+    }
+    return text;
+}
+
+} // namespace ObjectManager

@@ -1,0 +1,266 @@
+#include "cimxml/HttpHeaders.h"
+
+#include "cimxml/Markup.h"
+#include "cimxml/ProtocolError.h"
+
+#include <algorithm>
+#include <charconv>
+#include <optional>
+#include <utility>
+
+namespace ObjectManager::CimXml {
+
+namespace {
+
+constexpr std::string_view extension = "http://www.dmtf.org/cim/mapping/http/v1.";
+constexpr std::string_view replyExtension = "http://www.dmtf.org/cim/mapping/http/v1.0 ; ns=";
+
+/** The pieces of a text between separators, without the white space around them. */
+std::vector<std::string_view> split(std::string_view text, char separator) {
+    std::vector<std::string_view> pieces;
+    for (std::size_t start = 0; start <= text.size();) {
+        const std::size_t end = std::min(text.find(separator, start), text.size());
+        pieces.push_back(trimmed(text.substr(start, end - start)));
+        start = end + 1;
+    }
+    return pieces;
+}
+
+std::string_view unquoted(std::string_view text) {
+    return text.size() >= 2 && text.front() == '"' && text.back() == '"' ? text.substr(1, text.size() - 2) : text;
+}
+
+/** The value of a parameter of a header value such as 'text/xml; charset="utf-8"'; nothing where it is not there. */
+std::optional<std::string_view> parameterOf(std::string_view value, std::string_view name) {
+    const std::vector<std::string_view> pieces = split(value, ';');
+    for (auto piece = pieces.begin() + 1; piece != pieces.end(); ++piece) {
+        const std::size_t equals = piece->find('=');
+        if (equals != std::string_view::npos && equalNames(trimmed(piece->substr(0, equals)), name)) {
+            return unquoted(trimmed(piece->substr(equals + 1)));
+        }
+    }
+    return std::nullopt;
+}
+
+/** Whether a list such as 'text/xml, application/xml;q=0.5' takes one of the names, and does not rule it out. */
+bool accepts(std::string_view list, std::initializer_list<std::string_view> names) {
+    for (const std::string_view entry : split(list, ',')) {
+        const std::string_view name = split(entry, ';').front();
+        const std::string_view weight = parameterOf(entry, "q").value_or("1");
+        const bool ruledOut = weight.find_first_not_of("0.") == std::string_view::npos;
+        const bool named = std::any_of(names.begin(), names.end(), [&](auto other) { return equalNames(name, other); });
+        if (named && !ruledOut) {
+            return true;
+        }
+    }
+    return false;
+}
+
+bool takesApplicationXml(std::string_view accept) {
+    return accepts(accept, {"application/xml", "application/*", "*/*"});
+}
+
+/** The two digits that an extension declaration such as '"URI" ; ns=73' gives to CIM's headers. */
+std::optional<std::string> numberOf(std::string_view declarations) {
+    for (const std::string_view declaration : split(declarations, ',')) {
+        const std::string_view number = parameterOf(declaration, "ns").value_or("");
+        const bool digits = number.size() == 2 && number.find_first_not_of("0123456789") == std::string_view::npos;
+        if (digits && unquoted(split(declaration, ';').front()).starts_with(extension)) {
+            return std::string(number);
+        }
+    }
+    return std::nullopt;
+}
+
+/** Resolves the "%41" in a header value. */
+std::string decoded(std::string_view value, std::string_view header) {
+    std::string text;
+    for (std::size_t i = 0; i < value.size(); ++i) {
+        if (value[i] != '%') {
+            text += value[i];
+            continue;
+        }
+        const std::string_view digits = value.substr(i + 1, 2);
+        unsigned char byte = 0;
+        const auto [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), byte, 16);
+        if (error != std::errc() || digits.size() != 2 || end != digits.data() + digits.size()) {
+            throw headerMismatch("found '%' in the header " + std::string(header) +
+                                 ", expected two hexadecimal digits behind it");
+        }
+        text += static_cast<char>(byte);
+        i += digits.size();
+    }
+    return text;
+}
+
+/** What a reply to M-POST declares. */
+std::vector<std::pair<std::string, std::string>> extensionHeaders(const std::string& prefix) {
+    if (prefix.empty()) {
+        return {};
+    }
+    return {{"Ext", ""},
+            {"Cache-Control", "no-cache"},
+            {"Man", std::string(replyExtension) + prefix.substr(0, prefix.size() - 1)}};
+}
+
+} // namespace
+
+RequestHeaders::RequestHeaders(const HttpRequest& request) : _request(request) {
+    if (request.method == "POST") {
+        return;
+    }
+    if (request.method != "M-POST") {
+        throw ProtocolError(Http::methodNotAllowed, nullptr,
+                            "found the HTTP method " + request.method + ", expected POST or M-POST");
+    }
+    const std::string* declarations = find("Man");
+    const auto number = declarations == nullptr ? std::nullopt : numberOf(*declarations);
+    if (!number) {
+        throw ProtocolError(Http::notExtended, nullptr,
+                            "found no header Man with " + std::string(extension) + "0, expected it with M-POST");
+    }
+    _prefix = *number + '-';
+}
+
+const std::string* RequestHeaders::find(std::string_view name) const {
+    const auto found = std::find_if(_request.headers.begin(), _request.headers.end(),
+                                    [&](const auto& header) { return equalNames(header.first, name); });
+    return found == _request.headers.end() ? nullptr : &found->second;
+}
+
+const std::string* RequestHeaders::findOwn(std::string_view name) const {
+    const std::string whole = prefixed(name);
+    const auto count = std::count_if(_request.headers.begin(), _request.headers.end(),
+                                     [&](const auto& header) { return equalNames(header.first, whole); });
+    if (count > 1) {
+        throw headerMismatch("found the header " + whole + " twice, expected it once");
+    }
+    return find(whole);
+}
+
+void RequestHeaders::check() const {
+    checkTypes();
+    if (findOwn("CIMExport") != nullptr) {
+        throw ProtocolError(Http::notImplemented, "unsupported-operation", "found an export, expected an operation");
+    }
+    const std::string* operation = findOwn("CIMOperation");
+    if (operation == nullptr) {
+        throw ProtocolError(Http::badRequest, nullptr,
+                            "found no header " + prefixed("CIMOperation") + ", expected it of a CIM operation");
+    }
+    if (!equalNames(trimmed(*operation), "MethodCall")) {
+        throw ProtocolError(Http::badRequest, "unsupported-operation",
+                            "found the CIMOperation \"" + *operation + "\", expected MethodCall");
+    }
+    if (findOwn("CIMBatch") != nullptr) {
+        throw ProtocolError(Http::notImplemented, "multiple-requests-unsupported",
+                            "found several operations in one request, expected one");
+    }
+    const std::string* version = findOwn("CIMProtocolVersion");
+    if (version != nullptr && !trimmed(*version).starts_with("1.")) {
+        throw ProtocolError(Http::notImplemented, "unsupported-protocol-version",
+                            "found the CIMProtocolVersion \"" + *version + "\", expected 1.x");
+    }
+}
+
+void RequestHeaders::checkTypes() const {
+    const std::string* type = find("Content-Type");
+    const std::string_view media = type == nullptr ? std::string_view() : split(*type, ';').front();
+    const std::string_view charset =
+        type == nullptr ? std::string_view() : parameterOf(*type, "charset").value_or("utf-8");
+    if ((!equalNames(media, "application/xml") && !equalNames(media, "text/xml")) ||
+        (!equalNames(charset, "utf-8") && !equalNames(charset, "us-ascii"))) {
+        throw ProtocolError(Http::unsupportedMediaType, nullptr,
+                            "found the Content-Type \"" + (type == nullptr ? "" : *type) +
+                                "\", expected application/xml or text/xml in utf-8");
+    }
+    const std::string* encoding = find("Content-Encoding");
+    if (encoding != nullptr && !equalNames(trimmed(*encoding), "identity")) {
+        throw ProtocolError(Http::unsupportedMediaType, nullptr,
+                            "found the Content-Encoding \"" + *encoding + "\", expected none");
+    }
+    const std::string* accept = find("Accept");
+    if (accept != nullptr && !takesApplicationXml(*accept) && !accepts(*accept, {"text/xml", "text/*"})) {
+        throw ProtocolError(Http::notAcceptable, nullptr,
+                            "found the Accept \"" + *accept + "\", expected application/xml or text/xml in it");
+    }
+    const std::string* charsets = find("Accept-Charset");
+    if (charsets != nullptr && !accepts(*charsets, {"utf-8", "*"})) {
+        throw ProtocolError(Http::notAcceptable, nullptr,
+                            "found the Accept-Charset \"" + *charsets + "\", expected utf-8 in it");
+    }
+}
+
+void RequestHeaders::checkAgainst(const Message& message) const {
+    const std::string* version = findOwn("CIMProtocolVersion");
+    if (version != nullptr && trimmed(*version) != message.protocolVersion()) {
+        throw headerMismatch("found the CIMProtocolVersion \"" + *version + "\", expected \"" +
+                             message.protocolVersion() + "\" as in the body");
+    }
+    const std::string* method = findOwn("CIMMethod");
+    if (method == nullptr || !equalNames(trimmed(decoded(*method, "CIMMethod")), message.method())) {
+        throw headerMismatch(
+            (method == nullptr ? "found no header CIMMethod" : "found the CIMMethod \"" + *method + '"') +
+            ", expected \"" + message.method() + "\" as in the body");
+    }
+    checkObject(message);
+}
+
+/** The namespace must be the same and, where a class's method is called, the class. */
+void RequestHeaders::checkObject(const Message& message) const {
+    const std::string* object = findOwn("CIMObject");
+    const std::string path = object == nullptr ? std::string() : decoded(*object, "CIMObject");
+    std::string_view nameSpace = trimmed(path);
+    nameSpace.remove_prefix(nameSpace.starts_with('/') ? 1 : 0);
+    std::string_view className;
+    if (const std::size_t colon = nameSpace.find(':'); colon != std::string_view::npos) {
+        className = nameSpace.substr(colon + 1);
+        className = className.substr(0, className.find('.'));
+        nameSpace = nameSpace.substr(0, colon);
+    }
+    std::string expected = message.nameSpace();
+    bool same = object != nullptr && equalNames(nameSpace, expected);
+    if (!message.isIntrinsic()) {
+        const std::string target = requiredAttribute(
+            message.target(), std::string_view(message.target().name()) == "CLASSNAME" ? "NAME" : "CLASSNAME");
+        same = same && equalNames(className, target);
+        expected += ':' + target;
+    }
+    if (!same) {
+        throw headerMismatch(
+            (object == nullptr ? "found no header CIMObject" : "found the CIMObject \"" + *object + '"') +
+            ", expected \"" + expected + "\" as in the body");
+    }
+}
+
+const char* RequestHeaders::replyType() const {
+    const std::string* accept = find("Accept");
+    return accept == nullptr || takesApplicationXml(*accept) ? "application/xml; charset=\"utf-8\""
+                                                             : "text/xml; charset=\"utf-8\"";
+}
+
+std::string RequestHeaders::host() const {
+    const std::string* host = find("Host");
+    return host == nullptr ? std::string() : *host;
+}
+
+std::vector<std::pair<std::string, std::string>> RequestHeaders::ofAnswer() const {
+    std::vector<std::pair<std::string, std::string>> headers = extensionHeaders(_prefix);
+    headers.emplace_back("Content-Type", replyType());
+    headers.emplace_back(prefixed("CIMOperation"), "MethodResponse");
+    return headers;
+}
+
+std::vector<std::pair<std::string, std::string>> headersOfFailure(const ProtocolError& error,
+                                                                  const std::string& prefix) {
+    std::vector<std::pair<std::string, std::string>> headers = extensionHeaders(prefix);
+    if (error.status() == Http::methodNotAllowed) {
+        headers.emplace_back("Allow", "POST, M-POST");
+    }
+    if (error.cimError() != nullptr) {
+        headers.emplace_back(prefix + "CIMError", error.cimError());
+    }
+    return headers;
+}
+
+} // namespace ObjectManager::CimXml

@@ -1,0 +1,59 @@
+/** What the headers of a request say, and those of the reply. */
+#ifndef CIMXML_HTTPHEADERS_H
+#define CIMXML_HTTPHEADERS_H
+
+#include "cimxml/ProtocolError.h"
+#include "cimxml/RequestReader.h"
+#include "cimxml/Service.h"
+
+#include <string>
+#include <string_view>
+
+namespace ObjectManager::CimXml {
+
+/**
+ * The headers of a request. Requests are made with POST, or with M-POST after RFC 2774: there the header Man declares
+ * the number that the names of CIM's headers begin with, as in "73-CIMOperation".
+ *
+ * The functions throw ProtocolError where the request cannot be answered.
+ */
+class RequestHeaders {
+public:
+    /** The request outlives this. Looks at nothing but the HTTP method and its extension. */
+    explicit RequestHeaders(const HttpRequest& request);
+
+    /** What can be told before the body is read: that it asks for a CIM operation, in a form that is understood. */
+    void check() const;
+    /** That they say what the body says. */
+    void checkAgainst(const Message& message) const;
+
+    /** The media type of the reply: application/xml, unless the client takes text/xml only. */
+    const char* replyType() const;
+    /** What the client calls the host; empty where it does not tell. */
+    std::string host() const;
+
+    /** What the names of CIM's headers begin with, "73-"; empty for POST. */
+    const std::string& prefix() const { return _prefix; }
+
+    /** The headers of a reply that is a CIM document. */
+    std::vector<std::pair<std::string, std::string>> ofAnswer() const;
+
+private:
+    const std::string* find(std::string_view name) const;
+    /** One of CIM's own, which may be there once only. */
+    const std::string* findOwn(std::string_view name) const;
+    std::string prefixed(std::string_view name) const { return _prefix + std::string(name); }
+    void checkTypes() const;
+    void checkObject(const Message& message) const;
+
+    const HttpRequest& _request;
+    std::string _prefix;
+};
+
+/** Those of a reply to a request that was refused. */
+std::vector<std::pair<std::string, std::string>> headersOfFailure(const ProtocolError& error,
+                                                                  const std::string& prefix);
+
+} // namespace ObjectManager::CimXml
+
+#endif

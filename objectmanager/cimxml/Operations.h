@@ -1,0 +1,30 @@
+/** The operations that a message can ask for. */
+#ifndef CIMXML_OPERATIONS_H
+#define CIMXML_OPERATIONS_H
+
+#include "cimxml/RequestReader.h"
+#include "cimxml/ResponseWriter.h"
+#include "cimxml/Service.h"
+
+namespace ObjectManager::CimXml {
+
+/** One operation, and where its answer goes. */
+struct Operation {
+    Dispatcher& dispatcher;
+    const Catalogue& catalogue;
+    const Message& message;
+    const Caller& caller;
+    ResponseWriter& writer;
+};
+
+/**
+ * Does what the message asks for, if the caller may, and writes what stands in the IMETHODRESPONSE or METHODRESPONSE.
+ *
+ * @throws CimError where it fails, ProtocolError where an element lacks what the document type demands. What was
+ * written by then is of no use.
+ */
+void perform(const Operation& operation);
+
+} // namespace ObjectManager::CimXml
+
+#endif

@@ -1,0 +1,126 @@
+#include "cimxml/Parameters.h"
+
+#include "cimxml/Markup.h"
+
+#include <algorithm>
+
+namespace ObjectManager::CimXml {
+
+namespace {
+
+[[noreturn]] void invalid(const std::string& message) {
+    throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, message);
+}
+
+bool takes(const ParameterNames& names, std::string_view name) {
+    return std::any_of(names.begin(), names.end(),
+                       [&](std::string_view other) { return !other.empty() && equalNames(other, name); });
+}
+
+} // namespace
+
+Parameters::Parameters(const Message& message, const Catalogue& catalogue, const ParameterNames& names)
+    : _message(message), _reader(catalogue, message.nameSpace()) {
+    const auto& arguments = message.arguments();
+    for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
+        if (!takes(names, argument->name)) {
+            invalid("found the parameter " + argument->name + ", which " + message.method() + " does not have");
+        }
+        if (std::any_of(arguments.begin(), argument,
+                        [&](const Argument& other) { return equalNames(other.name, argument->name); })) {
+            invalid("found the parameter " + argument->name + " twice, expected it once");
+        }
+    }
+}
+
+pugi::xml_node Parameters::optional(std::string_view name, std::initializer_list<std::string_view> elements) const {
+    const auto& arguments = _message.arguments();
+    const auto found = std::find_if(arguments.begin(), arguments.end(),
+                                    [&](const Argument& argument) { return equalNames(argument.name, name); });
+    if (found == arguments.end() || !found->content) {
+        return {};
+    }
+    if (std::find(elements.begin(), elements.end(), std::string_view(found->content.name())) == elements.end()) {
+        invalid(std::string("found a ") + found->content.name() + " for the parameter " + std::string(name) +
+                ", expected a " + std::string(*elements.begin()));
+    }
+    return found->content;
+}
+
+pugi::xml_node Parameters::required(std::string_view name, std::initializer_list<std::string_view> elements) const {
+    const pugi::xml_node found = optional(name, elements);
+    if (!found) {
+        invalid("found no parameter " + std::string(name) + ", expected it with " + _message.method());
+    }
+    return found;
+}
+
+bool Parameters::flag(std::string_view name, bool otherwise) const {
+    const pugi::xml_node found = optional(name, {"VALUE"});
+    return found ? std::get<bool>(_reader.value(found, CMPI_boolean, std::string(name)).content) : otherwise;
+}
+
+std::string Parameters::text(std::string_view name) const {
+    return textOf(required(name, {"VALUE"}));
+}
+
+std::string Parameters::optionalText(std::string_view name) const {
+    const pugi::xml_node found = optional(name, {"VALUE"});
+    return found ? textOf(found) : std::string();
+}
+
+ObjectPath Parameters::className(std::string_view name) const {
+    return _reader.className(required(name, {"CLASSNAME"}));
+}
+
+std::string Parameters::optionalClassName(std::string_view name) const {
+    const pugi::xml_node found = optional(name, {"CLASSNAME"});
+    return found ? _reader.className(found).className : std::string();
+}
+
+ObjectPath Parameters::instanceName(std::string_view name) const {
+    return _reader.instanceName(required(name, {"INSTANCENAME"}));
+}
+
+ObjectPath Parameters::objectName(std::string_view name) const {
+    const pugi::xml_node found = required(name, {"INSTANCENAME", "CLASSNAME"});
+    return std::string_view(found.name()) == "CLASSNAME" ? _reader.className(found) : _reader.instanceName(found);
+}
+
+PropertyList Parameters::propertyList() const {
+    constexpr std::string_view name = "PropertyList";
+    const pugi::xml_node found = optional(name, {"VALUE.ARRAY"});
+    if (!found) {
+        return std::nullopt;
+    }
+    PropertyList properties(std::in_place);
+    const Value value = _reader.value(found, CMPI_stringA, std::string(name));
+    for (const Value& element : std::get<Value::Array>(value.content)) {
+        if (const auto* property = std::get_if<std::string>(&element.content)) {
+            properties->push_back(*property);
+        }
+    }
+    return properties;
+}
+
+Instance Parameters::instance(std::string_view name) const {
+    return _reader.instance(required(name, {"INSTANCE"}));
+}
+
+Instance Parameters::namedInstance(std::string_view name) const {
+    const pugi::xml_node found = required(name, {"VALUE.NAMEDINSTANCE"});
+    ObjectPath path = _reader.instanceName(requiredChild(found, {"INSTANCENAME"}));
+    Instance instance = _reader.instance(requiredChild(found, {"INSTANCE"}));
+    if (!equalNames(instance.path.className, path.className)) {
+        invalid("found an instance of " + instance.path.className + " under the name of one of " + path.className);
+    }
+    instance.path = std::move(path);
+    return instance;
+}
+
+Value Parameters::value(std::string_view name, CMPIType type) const {
+    const pugi::xml_node found = optional(name, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE"});
+    return found ? _reader.value(found, type, std::string(name)) : nullValue(type);
+}
+
+} // namespace ObjectManager::CimXml

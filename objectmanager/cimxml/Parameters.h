@@ -1,0 +1,57 @@
+/** The parameters of an intrinsic method. */
+#ifndef CIMXML_PARAMETERS_H
+#define CIMXML_PARAMETERS_H
+
+#include "broker/Operations.h"
+#include "cimxml/RequestReader.h"
+#include "cimxml/ValueReader.h"
+
+#include <array>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace ObjectManager::CimXml {
+
+/** What a method takes; the rest is empty. */
+using ParameterNames = std::array<std::string_view, 8>;
+
+/**
+ * Every function throws CimError with CMPI_RC_ERR_INVALID_PARAMETER where a parameter is no such value or, if it has no
+ * default, is missing; ProtocolError where an element lacks what the document type demands. A parameter without a value
+ * is the same as none.
+ */
+class Parameters {
+public:
+    /** Both outlive the parameters. Throws where a parameter is none of the names, or comes twice. */
+    Parameters(const Message& message, const Catalogue& catalogue, const ParameterNames& names);
+
+    bool flag(std::string_view name, bool otherwise) const;
+    std::string text(std::string_view name) const;
+    /** Empty where it is missing. */
+    std::string optionalText(std::string_view name) const;
+    /** A class as a path without keys. */
+    ObjectPath className(std::string_view name) const;
+    /** Empty where it is missing. */
+    std::string optionalClassName(std::string_view name) const;
+    ObjectPath instanceName(std::string_view name) const;
+    /** The name of an instance, or of a class, which has no keys. */
+    ObjectPath objectName(std::string_view name) const;
+    PropertyList propertyList() const;
+    Instance instance(std::string_view name) const;
+    /** An instance, with its own name as its path. */
+    Instance namedInstance(std::string_view name) const;
+    /** The value of a property, null where the parameter is missing. */
+    Value value(std::string_view name, CMPIType type) const;
+
+private:
+    pugi::xml_node optional(std::string_view name, std::initializer_list<std::string_view> elements) const;
+    pugi::xml_node required(std::string_view name, std::initializer_list<std::string_view> elements) const;
+
+    const Message& _message;
+    ValueReader _reader;
+};
+
+} // namespace ObjectManager::CimXml
+
+#endif

@@ -1,0 +1,90 @@
+/** CIM objects as CIM-XML writes them, appended to a text. */
+#ifndef CIMXML_RESPONSEWRITER_H
+#define CIMXML_RESPONSEWRITER_H
+
+#include "broker/Operations.h"
+#include "schema/Catalogue.h"
+
+#include <string>
+#include <string_view>
+
+namespace ObjectManager::CimXml {
+
+/** What is written of an instance or class. */
+struct Selection {
+    /** The properties wanted; nothing means all. */
+    PropertyList properties;
+    /** The class whose properties are wanted, its ancestors' included; null means all. */
+    const Class* within = nullptr;
+    bool classOrigin = false;
+    /* Of classes only. */
+    bool localOnly = false;
+    bool qualifiers = false;
+};
+
+class ResponseWriter {
+public:
+    /** The catalogue outlives the writer. `host` is that of paths that name none, `nameSpace` likewise. */
+    ResponseWriter(const Catalogue& catalogue, std::string host, std::string nameSpace)
+        : _catalogue(catalogue), _host(std::move(host)), _nameSpace(std::move(nameSpace)) {}
+
+    /** What was written. */
+    std::string take() { return std::move(_text); }
+    std::size_t size() const { return _text.size(); }
+    /** Drops what was written behind the first `size` bytes. */
+    void truncate(std::size_t size) { _text.resize(size); }
+
+    /** Appends markup as it is. */
+    void raw(std::string_view markup) { _text += markup; }
+    /** Appends ` name="value"`. */
+    void attribute(std::string_view name, std::string_view value);
+
+    void error(CMPIrc code, std::string_view description);
+
+    /** A CLASSNAME. */
+    void className(std::string_view name);
+    /** An INSTANCENAME. */
+    void instanceName(const ObjectPath& path);
+    /** An INSTANCEPATH. */
+    void instancePath(const ObjectPath& path);
+    /** An OBJECTPATH. */
+    void objectPath(const ObjectPath& path);
+
+    /** An INSTANCE. */
+    void instance(const Instance& instance, const Selection& selection);
+    /** A VALUE.NAMEDINSTANCE. */
+    void namedInstance(const Instance& instance, const Selection& selection);
+    /** A VALUE.OBJECTWITHPATH. */
+    void objectWithPath(const Instance& instance, const Selection& selection);
+
+    /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; nothing where the value is null. */
+    void value(const Value& value);
+    /** A RETURNVALUE. */
+    void returnValue(const Value& value);
+    /** A PARAMVALUE. */
+    void parameter(const NamedValue& parameter);
+
+    /** A CLASS. */
+    void classDeclaration(const Class& declared, const Selection& selection);
+
+private:
+    void localNameSpacePath(const std::string& nameSpace);
+    void reference(const ObjectPath& path);
+    void scalar(const Value& value);
+    void key(const NamedValue& key);
+    void property(const NamedValue& property, const Class* declared, const Selection& selection);
+    void propertyDeclaration(const Property& property, const Class& owner, const Selection& selection);
+    void methodDeclaration(const Method& method, const Class& owner, const Selection& selection);
+    void parameterDeclaration(const Parameter& parameter, const Selection& selection);
+    void qualifiers(const Qualifiers& qualifiers, const Selection& selection);
+    void origin(const Element& element, const Class& owner, const Selection& selection);
+
+    const Catalogue& _catalogue;
+    std::string _host;
+    std::string _nameSpace;
+    std::string _text;
+};
+
+} // namespace ObjectManager::CimXml
+
+#endif

@@ -1,0 +1,81 @@
+#include "cimxml/Service.h"
+
+#include "cimxml/HttpHeaders.h"
+#include "cimxml/Operations.h"
+#include "cimxml/ProtocolError.h"
+#include "cimxml/RequestReader.h"
+#include "cimxml/ResponseWriter.h"
+#include "dispatch/AgentLog.h"
+
+#include <unistd.h>
+
+#include <array>
+#include <exception>
+
+namespace ObjectManager::CimXml {
+
+namespace {
+
+HttpReply failure(unsigned int status, std::vector<std::pair<std::string, std::string>> headers,
+                  const std::string& message) {
+    headers.emplace_back("Content-Type", "text/plain; charset=\"utf-8\"");
+    return {status, std::move(headers), message + '\n'};
+}
+
+/** The host's name for those who were asked by none. */
+std::string ownHostName() {
+    std::array<char, 256> name{};
+    return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "localhost";
+}
+
+/** What the client is told of an operation that failed. */
+std::string descriptionOf(const CimError& error) {
+    return error.what() + reasonsText(error.reasons, error.refused ? ": " : "; the provider logged: ");
+}
+
+/** The document that answers the message. */
+std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, const Message& message, const Caller& caller,
+                       const std::string& host) {
+    ResponseWriter writer(catalogue, host.empty() ? ownHostName() : host, message.nameSpace());
+    const char* const response = message.isIntrinsic() ? "IMETHODRESPONSE" : "METHODRESPONSE";
+    writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">\n<MESSAGE");
+    writer.attribute("ID", message.id());
+    writer.attribute("PROTOCOLVERSION", "1.0");
+    writer.raw(">\n<SIMPLERSP>\n<");
+    writer.raw(response);
+    writer.attribute("NAME", message.method());
+    writer.raw(">\n");
+    const std::size_t start = writer.size();
+    try {
+        perform({dispatcher, catalogue, message, caller, writer});
+    } catch (const CimError& error) {
+        writer.truncate(start);
+        writer.error(error.code, descriptionOf(error));
+    }
+    writer.raw("</");
+    writer.raw(response);
+    writer.raw(">\n</SIMPLERSP>\n</MESSAGE>\n</CIM>\n");
+    return writer.take();
+}
+
+} // namespace
+
+Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue) : _dispatcher(dispatcher), _catalogue(catalogue) {}
+
+HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
+    std::string prefix;
+    try {
+        const RequestHeaders headers(request);
+        prefix = headers.prefix();
+        headers.check();
+        const Message message(request.body);
+        headers.checkAgainst(message);
+        return {Http::ok, headers.ofAnswer(), documentOf(_dispatcher, _catalogue, message, caller, headers.host())};
+    } catch (const ProtocolError& error) {
+        return failure(error.status(), headersOfFailure(error, prefix), error.what());
+    } catch (const std::exception& error) {
+        return failure(Http::internalServerError, {}, error.what());
+    }
+}
+
+} // namespace ObjectManager::CimXml

@@ -30,7 +30,10 @@ std::string ownHostName() {
 
 /** What the client is told of an operation that failed. */
 std::string descriptionOf(const CimError& error) {
-    return error.what() + reasonsText(error.reasons, error.refused ? ": " : "; the provider logged: ");
+    // That there is no such instance is all there is to say.
+    return error.code == CMPI_RC_ERR_NOT_FOUND
+               ? error.what()
+               : error.what() + reasonsText(error.reasons, error.refused ? ": " : "; the provider logged: ");
 }
 
 /** The document that answers the message. */

@@ -1,0 +1,71 @@
+#include "ServiceFixture.h"
+
+#include <gmock/gmock.h>
+
+#include <atomic>
+#include <thread>
+
+namespace ObjectManager::CimXml {
+namespace {
+
+using testing::HasSubstr;
+
+class ServiceTest : public ServiceFixture {
+protected:
+    static HttpReply enumerate(const std::string& className) {
+        return answer("POST", requestHeaders("EnumerateInstances"),
+                      requestBody("EnumerateInstances", "<IPARAMVALUE NAME=\"ClassName\"><CLASSNAME NAME=\"" +
+                                                            className + "\"/></IPARAMVALUE>"));
+    }
+};
+
+/** Every request is cut off at every byte: what remains is refused, and never taken for something else. */
+TEST_F(ServiceTest, refusesEveryRequestThatIsCutOff) {
+    const std::string whole =
+        requestBody("GetInstance", "<IPARAMVALUE NAME=\"InstanceName\"><INSTANCENAME CLASSNAME=\"Test_Disk\">"
+                                   "<KEYBINDING NAME=\"Name\"><KEYVALUE>a&amp;<![CDATA[b]]></KEYVALUE></KEYBINDING>"
+                                   "</INSTANCENAME></IPARAMVALUE>");
+    for (std::size_t length = 0; length < whole.size(); ++length) {
+        const HttpReply reply = answer("POST", requestHeaders("GetInstance"), whole.substr(0, length));
+        ASSERT_EQ(reply.status, 400U) << length;
+        ASSERT_EQ(headerOf(reply, "CIMError"), "request-not-well-formed") << length;
+    }
+    EXPECT_EQ(answer("POST", requestHeaders("GetInstance"), whole).status, 200U);
+}
+
+TEST_F(ServiceTest, namesTheHostItselfWhereTheClientDoesNot) {
+    auto headers = requestHeaders("AssociatorNames", "root/cimv2");
+    headers.erase(headers.begin());
+    const HttpReply reply = answer(
+        "POST", headers,
+        requestBody("AssociatorNames",
+                    "<IPARAMVALUE NAME=\"ObjectName\"><INSTANCENAME CLASSNAME=\"TALVO_PowerManagementCapabilities\">"
+                    "<KEYVALUE>chassis/blade1</KEYVALUE></INSTANCENAME></IPARAMVALUE>",
+                    "root/cimv2"));
+    EXPECT_THAT(reply.body, HasSubstr("<HOST>"));
+    EXPECT_THAT(reply.body, testing::Not(HasSubstr("<HOST></HOST>")));
+}
+
+TEST_F(ServiceTest, answersSeveralThreadsAtOnce) {
+    const std::string disks = enumerate("Test_Disk").body;
+    const std::string failure = enumerate("Test_Fails").body;
+    ASSERT_THAT(disks, HasSubstr("<INSTANCE "));
+    ASSERT_THAT(failure, HasSubstr("<ERROR CODE=\"2\""));
+    std::atomic<int> wrong = 0;
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 8; ++i) {
+        threads.emplace_back([&] {
+            for (int j = 0; j < 50; ++j) {
+                wrong += enumerate("Test_Disk").body != disks;
+                wrong += enumerate("Test_Fails").body != failure;
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(wrong, 0);
+}
+
+} // namespace
+} // namespace ObjectManager::CimXml

@@ -79,18 +79,24 @@ const Class& declaredClass(const Call& call, const std::string& className) {
 
 /* What of them is asked for. */
 
-/** The properties as the class spells them; what it does not have is left out. */
-PropertyList spelled(const PropertyList& properties, const Class* declared) {
+/**
+ * What a provider is asked for: the properties as the class spells them, without those that it does not have, and with
+ * its keys, lest instances lose their paths.
+ */
+PropertyList askedOfProvider(const Call& call, const PropertyList& properties, const std::string& className) {
+    const Class* declared = call.catalogue().find(className);
     if (!properties || declared == nullptr) {
         return properties;
     }
-    PropertyList found(std::in_place);
+    const auto keys = call.catalogue().keyNames(className);
+    PropertyList asked(std::in_place, keys.begin(), keys.end());
     for (const std::string& name : *properties) {
-        if (const Property* property = declared->property(name)) {
-            found->push_back(property->name);
+        const Property* property = declared->property(name);
+        if (property != nullptr && !property->isKey()) {
+            asked->push_back(property->name);
         }
     }
-    return found;
+    return asked;
 }
 
 /** Of instances. LocalOnly and IncludeQualifiers, which are deprecated for them, are always taken as false. */
@@ -118,7 +124,7 @@ void getInstance(const Call& call) {
     const ObjectPath path = call.parameters.instanceName("InstanceName");
     const Selection selection = selectionOfInstances(call);
     requireServed(call, path.className);
-    const PropertyList properties = spelled(selection.properties, call.catalogue().find(path.className));
+    const PropertyList properties = askedOfProvider(call, selection.properties, path.className);
     const Instance instance = call.dispatcher().getInstance(call.invocation(), path, properties);
     call.writer().raw("<IRETURNVALUE>\n");
     call.writer().instance(instance, selection);
@@ -133,7 +139,7 @@ void enumerateInstances(const Call& call) {
     }
     call.writer().raw("<IRETURNVALUE>\n");
     forEachServed(call, classPath, [&](const ObjectPath& path) {
-        const PropertyList properties = spelled(selection.properties, call.catalogue().find(path.className));
+        const PropertyList properties = askedOfProvider(call, selection.properties, path.className);
         call.dispatcher().enumerateInstances(call.invocation(), path, properties, [&](Instance&& instance) {
             call.writer().namedInstance(instance, selection);
         });
@@ -198,8 +204,9 @@ void associatorNames(const Call& call) {
 
 void references(const Call& call) {
     const Selection selection = selectionOfInstances(call);
+    // With all properties, since the paths of associations are made of some.
     const auto found =
-        call.dispatcher().references(call.invocation(), source(call), referenceFilter(call), selection.properties);
+        call.dispatcher().references(call.invocation(), source(call), referenceFilter(call), std::nullopt);
     call.writer().raw("<IRETURNVALUE>\n");
     for (const Instance& instance : found) {
         call.writer().objectWithPath(instance, selection);
@@ -230,7 +237,8 @@ const Property& namedProperty(const Call& call, const ObjectPath& path) {
 void getProperty(const Call& call) {
     const ObjectPath path = call.parameters.instanceName("InstanceName");
     const std::string& name = namedProperty(call, path).name;
-    const Instance instance = call.dispatcher().getInstance(call.invocation(), path, PropertyList({name}));
+    const PropertyList properties = askedOfProvider(call, PropertyList({name}), path.className);
+    const Instance instance = call.dispatcher().getInstance(call.invocation(), path, properties);
     const NamedValue* property = find(instance.properties, name);
     call.writer().raw("<IRETURNVALUE>");
     if (property != nullptr) {
@@ -263,9 +271,7 @@ void modifyInstance(const Call& call) {
     const Instance instance = call.parameters.namedInstance("ModifiedInstance");
     call.parameters.flag("IncludeQualifiers", true);
     requireServed(call, instance.path.className);
-    const PropertyList properties =
-        spelled(call.parameters.propertyList(), call.catalogue().find(instance.path.className));
-    call.dispatcher().modifyInstance(call.invocation(), instance.path, instance, properties);
+    call.dispatcher().modifyInstance(call.invocation(), instance.path, instance, call.parameters.propertyList());
 }
 
 void deleteInstance(const Call& call) {

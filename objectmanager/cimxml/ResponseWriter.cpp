@@ -170,7 +170,7 @@ void ResponseWriter::instanceName(const ObjectPath& path) {
 
 void ResponseWriter::instancePath(const ObjectPath& path) {
     raw("<INSTANCEPATH>\n<NAMESPACEPATH>\n<HOST>");
-    appendText(_text, path.host.empty() ? _host : path.host);
+    appendText(_text, _host);
     raw("</HOST>\n");
     localNameSpacePath(path.nameSpace);
     raw("</NAMESPACEPATH>\n");

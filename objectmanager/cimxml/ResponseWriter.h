@@ -24,7 +24,13 @@ struct Selection {
 
 class ResponseWriter {
 public:
-    /** The catalogue outlives the writer. `host` is that of paths that name none, `nameSpace` likewise. */
+    /**
+     * The catalogue outlives the writer.
+     *
+     * @param host what the client calls the host. Every path has it, also where a provider named another, so that the
+     *             client can follow the path.
+     * @param nameSpace of paths that name none.
+     */
     ResponseWriter(const Catalogue& catalogue, std::string host, std::string nameSpace)
         : _catalogue(catalogue), _host(std::move(host)), _nameSpace(std::move(nameSpace)) {}
 

@@ -25,7 +25,7 @@ public:
         // A reboot is over at once, so that it leaves nothing behind for the next case.
         std::ofstream(configuration) << "[system]\nname = \"machine.example\"\n"
                                      << "[log]\ndestination = \"file\"\nfile = \"" << name << "/log\"\n"
-                                     << "[instrumentation.simulated]\nstate-file = \"" << name << "/state.json\"\n"
+                                     << "[instrumentation.simulated]\nstate-file = \"" << stateFile().string() << "\"\n"
                                      << "reboot-time = 0\n"
                                      << "[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n";
         setenv("ORV_AGENT_CONFIG", configuration.c_str(), 1);
@@ -37,6 +37,8 @@ public:
         std::error_code ignored;
         std::filesystem::remove_all(_folder, ignored);
     }
+
+    std::filesystem::path stateFile() const { return _folder / "state.json"; }
 
 private:
     std::filesystem::path _folder;
@@ -56,11 +58,19 @@ struct World {
     }
 };
 
+World& world() {
+    static World only;
+    return only;
+}
+
 } // namespace
 
 Service& ServiceFixture::service() {
-    static World world;
-    return world.service;
+    return world().service;
+}
+
+std::filesystem::path ServiceFixture::stateFile() {
+    return world().agent.stateFile();
 }
 
 HttpReply ServiceFixture::answer(const std::string& httpMethod,

@@ -9,6 +9,7 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <string>
 #include <utility>
 #include <vector>
@@ -19,6 +20,9 @@ class ServiceFixture : public testing::Test {
 protected:
     /** Made once: the agent reads its configuration once in a process. */
     static Service& service();
+
+    /** Where the simulated machine keeps its state. */
+    static std::filesystem::path stateFile();
 
     static HttpReply answer(const std::string& httpMethod, std::vector<std::pair<std::string, std::string>> headers,
                             const std::string& body, const Caller& caller = {"operator", true, true});

@@ -1,14 +1,19 @@
 #include "ServiceFixture.h"
+#include "WireCase.h"
 
 #include <gmock/gmock.h>
 
 #include <atomic>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <thread>
 
 namespace ObjectManager::CimXml {
 namespace {
 
 using testing::HasSubstr;
+using testing::Not;
 
 class ServiceTest : public ServiceFixture {
 protected:
@@ -43,7 +48,23 @@ TEST_F(ServiceTest, namesTheHostItselfWhereTheClientDoesNot) {
                     "<KEYVALUE>chassis/blade1</KEYVALUE></INSTANCENAME></IPARAMVALUE>",
                     "root/cimv2"));
     EXPECT_THAT(reply.body, HasSubstr("<HOST>"));
-    EXPECT_THAT(reply.body, testing::Not(HasSubstr("<HOST></HOST>")));
+    EXPECT_THAT(reply.body, Not(HasSubstr("<HOST></HOST>")));
+}
+
+/** The provider returns 0 whether or not the machine accepted the request. */
+TEST_F(ServiceTest, tellsThatTheMachineRefused) {
+    std::ifstream file(std::filesystem::path(TEST_CASES) / "invoke.wire", std::ios::binary);
+    const WireCase reboot = readWireCase({std::istreambuf_iterator<char>(file), {}});
+    const auto status = [&] {
+        const std::string body = service().answer(reboot.request(), reboot.caller).body;
+        return body.substr(0, body.find('\n', body.find("<ERROR")));
+    };
+    EXPECT_THAT(status(), Not(HasSubstr("<ERROR")));
+    std::filesystem::remove(stateFile());
+    std::filesystem::create_directories(stateFile() / "in the way");
+    EXPECT_THAT(status(), HasSubstr("<ERROR CODE=\"1\" DESCRIPTION=\"Power request refused: reboot of "));
+    std::filesystem::remove_all(stateFile());
+    EXPECT_THAT(status(), Not(HasSubstr("<ERROR")));
 }
 
 TEST_F(ServiceTest, answersSeveralThreadsAtOnce) {

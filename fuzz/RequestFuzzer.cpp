@@ -1,0 +1,50 @@
+/*
+ * Requests in the form of the wire cases, which are its corpus. Whatever comes, there is a reply, and it is either a
+ * document that is well-formed or a refusal. No provider is called.
+ */
+#include "WireCase.h"
+#include "cimxml/Markup.h"
+#include "schema/RegistrationReader.h"
+
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <iostream>
+
+using namespace ObjectManager;
+
+namespace {
+
+/** The registrations as they are shipped, but that they offer nothing. */
+Registry registryWithoutProviders() {
+    std::vector<Registration> registrations = readRegistrations(std::filesystem::path(FUZZ_SCHEMA));
+    for (Registration& registration : registrations) {
+        registration.instance = false;
+        registration.method = false;
+        registration.association = false;
+    }
+    return Registry(registrations);
+}
+
+[[noreturn]] void fail(const HttpReply& reply) {
+    std::cerr << "unexpected reply: " << CimXml::textOf(reply) << std::endl;
+    std::abort();
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+    static const Catalogue catalogue = readCatalogue(FUZZ_SCHEMA);
+    static Dispatcher dispatcher(registryWithoutProviders(), {{}, &catalogue, nullptr});
+    static CimXml::Service service(dispatcher, catalogue);
+
+    const CimXml::WireCase given = CimXml::readWireCase({reinterpret_cast<const char*>(data), size});
+    const CimXml::HttpReply reply = service.answer(given.request(), given.caller);
+    if (reply.status == 200) {
+        pugi::xml_document document;
+        CimXml::parseMarkup(reply.body, document);
+    } else if (reply.status == 500) {
+        fail(reply);
+    }
+    return 0;
+}

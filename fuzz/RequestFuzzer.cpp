@@ -26,7 +26,7 @@ Registry registryWithoutProviders() {
     return Registry(registrations);
 }
 
-[[noreturn]] void fail(const HttpReply& reply) {
+[[noreturn]] void fail(const CimXml::HttpReply& reply) {
     std::cerr << "unexpected reply: " << CimXml::textOf(reply) << std::endl;
     std::abort();
 }

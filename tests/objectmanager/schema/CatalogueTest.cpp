@@ -51,6 +51,26 @@ TEST_F(CatalogueTest, givesAClassWhatItInheritsWithTheAncestorsElementsFirst) {
     EXPECT_EQ(child.superClass, "Parent");
 }
 
+TEST_F(CatalogueTest, tellsWhichClassDeclaredAnElementFirstAndWhichLast) {
+    const Class& child = *_catalogue.find("Child");
+    const auto isDeclared = [](const char* origin, const char* last) {
+        return testing::AllOf(Field(&Element::origin, origin), Field(&Element::declaredBy, last));
+    };
+    EXPECT_THAT(*child.property("Caption"), isDeclared("Base", "Base"));
+    EXPECT_THAT(*child.property("Name"), isDeclared("Parent", "Child"));
+    EXPECT_THAT(*child.property("Own"), isDeclared("Child", "Child"));
+    EXPECT_THAT(*child.method("Act"), isDeclared("Parent", "Child"));
+    EXPECT_TRUE(child.property("Name")->isDeclaredBy(child));
+    EXPECT_FALSE(child.property("Caption")->isDeclaredBy(child));
+}
+
+TEST_F(CatalogueTest, listsAllClassesByName) {
+    EXPECT_THAT(_catalogue.all(), ElementsAre(testing::Pointee(Field(&Class::name, "Base")),
+                                              testing::Pointee(Field(&Class::name, "Child")),
+                                              testing::Pointee(Field(&Class::name, "Parent")),
+                                              testing::Pointee(Field(&Class::name, "Stranger"))));
+}
+
 TEST_F(CatalogueTest, keepsInheritedQualifiersThatADeclarationDoesNotChange) {
     const Property& name = *_catalogue.find("Child")->property("Name");
     EXPECT_TRUE(name.isKey());

@@ -141,6 +141,46 @@ TEST_F(ShippedSchemaTest, givesTheCapabilitiesTheirKeyAndTheirCodes) {
     EXPECT_THAT(meaningOf("PowerChangeCapabilities", 8), Optional(std::string("Graceful Shutdown Supported")));
 }
 
+/** So that the served classes can be loaded beside the whole common model, whatever else that declares. */
+TEST_F(ShippedSchemaTest, hasTheServedClassesOverrideNothingButToNarrowReferences) {
+    for (const Class* served : _catalogue.all()) {
+        if (!served->name.starts_with("TALVO_")) {
+            continue;
+        }
+        const Class& ancestor = *_catalogue.find(served->superClass);
+        EXPECT_EQ(served->methods.size(), ancestor.methods.size()) << served->name;
+        ASSERT_EQ(served->properties.size(), ancestor.properties.size()) << served->name;
+        for (const Property& property : served->properties) {
+            if (property.isDeclaredBy(*served)) {
+                const std::string& wider = ancestor.property(property.name)->referenceClass;
+                EXPECT_NE(property.referenceClass, wider) << served->name << '.' << property.name;
+                EXPECT_TRUE(_catalogue.isA(property.referenceClass, wider)) << served->name << '.' << property.name;
+            }
+        }
+        for (const Method& method : served->methods) {
+            EXPECT_FALSE(method.isDeclaredBy(*served)) << served->name << '.' << method.name;
+        }
+    }
+}
+
+TEST_F(ShippedSchemaTest, derivesTheServedClassesFromTheClassesOfTheProfile) {
+    const std::pair<const char*, const char*> derivations[] = {
+        {"TALVO_AssociatedPowerManagementService", "CIM_AssociatedPowerManagementService"},
+        {"TALVO_ComputerSystem", "CIM_ComputerSystem"},
+        {"TALVO_PowerManagementCapabilities", "CIM_PowerManagementCapabilities"},
+        {"TALVO_PowerManagementElementCapabilities", "CIM_ElementCapabilities"},
+        {"TALVO_PowerManagementHostedService", "CIM_HostedService"},
+        {"TALVO_PowerManagementService", "CIM_PowerManagementService"},
+    };
+    std::vector<std::pair<std::string, std::string>> served;
+    for (const Class* declared : _catalogue.all()) {
+        if (declared->name.starts_with("TALVO_")) {
+            served.emplace_back(declared->name, declared->superClass);
+        }
+    }
+    EXPECT_THAT(served, testing::ElementsAreArray(derivations));
+}
+
 TEST_F(ShippedSchemaTest, hasTheServedClassesDescendFromTheCommonModel) {
     EXPECT_TRUE(_catalogue.isA("TALVO_PowerManagementService", "CIM_Service"));
     EXPECT_TRUE(_catalogue.isA("TALVO_PowerManagementService", "CIM_ManagedElement"));

@@ -245,7 +245,7 @@ void ResponseWriter::property(const NamedValue& property, const Class* declared,
     raw(element);
     attribute("NAME", property.name);
     if (type == CMPI_ref) {
-        if (known != nullptr) {
+        if (known != nullptr && !known->referenceClass.empty()) {
             attribute("REFERENCECLASS", known->referenceClass);
         }
     } else {

@@ -61,3 +61,14 @@ function(orv_add_test name)
   add_test(NAME ${name} COMMAND ${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
 endfunction()
+
+# orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema
+# and registrations beside those of the tests.
+function(orv_test_schema target folder)
+  add_custom_target(${target}_schema
+    COMMAND "${CMAKE_COMMAND}" -E copy_directory
+      "${CMAKE_BINARY_DIR}/share/orv/schema" "${CMAKE_SOURCE_DIR}/tests/objectmanager/cimxml/schema" "${folder}"
+    VERBATIM)
+  add_dependencies(${target}_schema orv_schema)
+  add_dependencies(${target} ${target}_schema)
+endfunction()

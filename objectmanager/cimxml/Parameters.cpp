@@ -96,9 +96,16 @@ PropertyList Parameters::propertyList() const {
     PropertyList properties(std::in_place);
     const Value value = _reader.value(found, CMPI_stringA, std::string(name));
     for (const Value& element : std::get<Value::Array>(value.content)) {
-        if (const auto* property = std::get_if<std::string>(&element.content)) {
-            properties->push_back(*property);
+        const auto* property = std::get_if<std::string>(&element.content);
+        if (property == nullptr || std::any_of(properties->begin(), properties->end(), [&](const std::string& other) {
+                return equalNames(other, *property);
+            })) {
+            continue;
         }
+        if (properties->size() == maximumNames) {
+            invalid("found more than " + std::to_string(maximumNames) + " properties in " + std::string(name));
+        }
+        properties->push_back(*property);
     }
     return properties;
 }

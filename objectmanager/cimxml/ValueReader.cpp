@@ -18,6 +18,13 @@ namespace {
     throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, message);
 }
 
+/** Throws where one more is too many: they are looked through for each. */
+void requireRoom(std::size_t count, const std::string& what) {
+    if (count == maximumNames) {
+        invalid("found more than " + std::to_string(maximumNames) + ' ' + what);
+    }
+}
+
 /** An integer in a form that may be sent, decimal or hexadecimal, as a literal: without leading zeros. */
 std::optional<std::string> integerLiteral(std::string_view text) {
     const bool isSigned = text.starts_with('-') || text.starts_with('+');
@@ -105,6 +112,7 @@ ObjectPath ValueReader::instanceName(const pugi::xml_node& element, const std::s
         if (find(path.keys, name) != nullptr) {
             invalid("found the key " + name + " twice, expected it once");
         }
+        requireRoom(path.keys.size(), "keys");
         name = key == nullptr ? name : key->name;
         path.keys.push_back({name, keyValue(requiredChild(binding, {"KEYVALUE", "VALUE.REFERENCE"}), key, name)});
     }
@@ -251,6 +259,7 @@ Instance ValueReader::instance(const pugi::xml_node& element) const {
         if (find(instance.properties, read.name) != nullptr) {
             invalid("found the property " + read.name + " twice, expected it once");
         }
+        requireRoom(instance.properties.size(), "properties");
         const Property* known = declared == nullptr ? nullptr : declared->property(read.name);
         if (known != nullptr && known->isKey() && !read.value.isNull()) {
             instance.path.keys.push_back(read);

@@ -12,6 +12,9 @@
 
 namespace ObjectManager::CimXml {
 
+/** How many keys, properties and names of properties a request may list. */
+constexpr std::size_t maximumNames = 1000;
+
 /**
  * The value that a text means in a type. White space around numbers, truth values and dates does not matter.
  *

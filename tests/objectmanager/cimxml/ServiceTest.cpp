@@ -1,5 +1,6 @@
 #include "ServiceFixture.h"
 #include "WireCase.h"
+#include "cimxml/ValueReader.h"
 
 #include <gmock/gmock.h>
 
@@ -36,6 +37,29 @@ TEST_F(ServiceTest, refusesEveryRequestThatIsCutOff) {
         ASSERT_EQ(headerOf(reply, "CIMError"), "request-not-well-formed") << length;
     }
     EXPECT_EQ(answer("POST", requestHeaders("GetInstance"), whole).status, 200U);
+}
+
+/** What is looked through for each name cannot be made long enough to keep a thread busy. */
+TEST_F(ServiceTest, boundsHowManyNamesARequestLists) {
+    std::string keys;
+    std::string names;
+    std::string properties;
+    for (std::size_t i = 0; i <= maximumNames; ++i) {
+        const std::string name = "n" + std::to_string(i);
+        keys += "<KEYBINDING NAME=\"" + name + "\"><KEYVALUE>x</KEYVALUE></KEYBINDING>";
+        names += "<VALUE>" + name + "</VALUE>";
+        properties += "<PROPERTY NAME=\"" + name + "\" TYPE=\"string\"/>";
+    }
+    const std::pair<std::string, std::string> requests[] = {
+        {"GetInstance", "<IPARAMVALUE NAME=\"InstanceName\"><INSTANCENAME CLASSNAME=\"No_Such\">" + keys +
+                            "</INSTANCENAME></IPARAMVALUE>"},
+        {"GetClass", "<IPARAMVALUE NAME=\"PropertyList\"><VALUE.ARRAY>" + names + "</VALUE.ARRAY></IPARAMVALUE>"},
+        {"CreateInstance", "<IPARAMVALUE NAME=\"NewInstance\"><INSTANCE CLASSNAME=\"No_Such\">" + properties +
+                               "</INSTANCE></IPARAMVALUE>"}};
+    for (const auto& [method, parameters] : requests) {
+        const HttpReply reply = answer("POST", requestHeaders(method), requestBody(method, parameters));
+        EXPECT_THAT(reply.body, HasSubstr("<ERROR CODE=\"4\" DESCRIPTION=\"found more than 1000 ")) << method;
+    }
 }
 
 TEST_F(ServiceTest, namesTheHostItselfWhereTheClientDoesNot) {

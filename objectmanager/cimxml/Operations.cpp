@@ -51,21 +51,36 @@ void requireServed(const Call& call, const std::string& className) {
     }
 }
 
+/** The failure of one class's provider in an enumeration of an ancestor, named by the class. */
+CimError failureOf(const std::string& className, const CimError& error) {
+    CimError failure(error.code, className + ": " + error.what());
+    failure.reasons = error.reasons;
+    return failure;
+}
+
 /** Calls for each class that is the one named or descends from it, and has a provider of instances. */
 template <class Do>
 void forEachServed(const Call& call, const ObjectPath& classPath, Do doWith) {
-    bool known = call.catalogue().find(classPath.className) != nullptr;
+    bool served = false;
     for (const Registration* registration :
          call.dispatcher().registry().all(classPath.nameSpace, ProviderKind::instance)) {
         if (call.catalogue().isA(registration->className, classPath.className)) {
-            known = true;
+            served = true;
             ObjectPath path = classPath;
             path.className = registration->className;
-            doWith(path);
+            try {
+                doWith(path);
+            } catch (const CimError& error) {
+                if (equalNames(path.className, classPath.className)) {
+                    throw;
+                }
+                throw failureOf(path.className, error);
+            }
         }
     }
-    if (!known && !isRegistered(call, classPath.className)) {
-        throw unknownClass(classPath.className);
+    // Nobody having to serve it, a class that is declared has no instances.
+    if (!served && (isRegistered(call, classPath.className) || call.catalogue().find(classPath.className) == nullptr)) {
+        call.dispatcher().registry().find(classPath.nameSpace, classPath.className, ProviderKind::instance);
     }
 }
 

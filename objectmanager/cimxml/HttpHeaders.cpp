@@ -105,21 +105,22 @@ std::vector<std::pair<std::string, std::string>> extensionHeaders(const std::str
 
 } // namespace
 
-RequestHeaders::RequestHeaders(const HttpRequest& request) : _request(request) {
-    if (request.method == "POST") {
-        return;
-    }
-    if (request.method != "M-POST") {
+RequestHeaders::RequestHeaders(const HttpRequest& request) : _request(request), _extended(request.method == "M-POST") {
+    if (!_extended && request.method != "POST") {
         throw ProtocolError(Http::methodNotAllowed, nullptr,
                             "found the HTTP method " + request.method + ", expected POST or M-POST");
     }
-    const std::string* declarations = find("Man");
-    const auto number = declarations == nullptr ? std::nullopt : numberOf(*declarations);
-    if (!number) {
+    for (const char* declaration : {"Man", "Opt"}) {
+        const std::string* declared = find(declaration);
+        const auto number = declared == nullptr ? std::nullopt : numberOf(*declared);
+        if (number && _prefix.empty()) {
+            _prefix = *number + '-';
+        }
+    }
+    if (_extended && _prefix.empty()) {
         throw ProtocolError(Http::notExtended, nullptr,
                             "found no header Man with " + std::string(extension) + "0, expected it with M-POST");
     }
-    _prefix = *number + '-';
 }
 
 const std::string* RequestHeaders::find(std::string_view name) const {
@@ -130,12 +131,17 @@ const std::string* RequestHeaders::find(std::string_view name) const {
 
 const std::string* RequestHeaders::findOwn(std::string_view name) const {
     const std::string whole = prefixed(name);
-    const auto count = std::count_if(_request.headers.begin(), _request.headers.end(),
-                                     [&](const auto& header) { return equalNames(header.first, whole); });
-    if (count > 1) {
-        throw headerMismatch("found the header " + whole + " twice, expected it once");
+    const std::string* found = nullptr;
+    for (const auto& [header, value] : _request.headers) {
+        if (!equalNames(header, whole) && !equalNames(header, name)) {
+            continue;
+        }
+        if (found != nullptr) {
+            throw headerMismatch("found the header " + std::string(name) + " twice, expected it once");
+        }
+        found = &value;
     }
-    return find(whole);
+    return found;
 }
 
 void RequestHeaders::check() const {
@@ -245,9 +251,9 @@ std::string RequestHeaders::host() const {
 }
 
 std::vector<std::pair<std::string, std::string>> RequestHeaders::ofAnswer() const {
-    std::vector<std::pair<std::string, std::string>> headers = extensionHeaders(_prefix);
+    std::vector<std::pair<std::string, std::string>> headers = extensionHeaders(replyPrefix());
     headers.emplace_back("Content-Type", replyType());
-    headers.emplace_back(prefixed("CIMOperation"), "MethodResponse");
+    headers.emplace_back(replyPrefix() + "CIMOperation", "MethodResponse");
     return headers;
 }
 

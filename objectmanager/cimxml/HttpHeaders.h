@@ -13,7 +13,8 @@ namespace ObjectManager::CimXml {
 
 /**
  * The headers of a request. Requests are made with POST, or with M-POST after RFC 2774: there the header Man declares
- * the number that the names of CIM's headers begin with, as in "73-CIMOperation".
+ * the number that the names of CIM's headers begin with, as in "73-CIMOperation". It is taken from the header Opt too,
+ * and with POST.
  *
  * The functions throw ProtocolError where the request cannot be answered.
  */
@@ -32,8 +33,8 @@ public:
     /** What the client calls the host; empty where it does not tell. */
     std::string host() const;
 
-    /** What the names of CIM's headers begin with, "73-"; empty for POST. */
-    const std::string& prefix() const { return _prefix; }
+    /** What the names of CIM's headers in the reply begin with, "73-"; empty for POST. */
+    std::string replyPrefix() const { return _extended ? _prefix : std::string(); }
 
     /** The headers of a reply that is a CIM document. */
     std::vector<std::pair<std::string, std::string>> ofAnswer() const;
@@ -47,6 +48,9 @@ private:
     void checkObject(const Message& message) const;
 
     const HttpRequest& _request;
+    /** The method is M-POST. */
+    bool _extended;
+    /** For example "73-"; empty where none is declared. */
     std::string _prefix;
 };
 

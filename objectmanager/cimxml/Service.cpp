@@ -69,7 +69,7 @@ HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
     std::string prefix;
     try {
         const RequestHeaders headers(request);
-        prefix = headers.prefix();
+        prefix = headers.replyPrefix();
         headers.check();
         const Message message(request.body);
         headers.checkAgainst(message);

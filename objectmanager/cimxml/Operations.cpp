@@ -31,10 +31,10 @@ struct Call {
 
 /* What classes there are. */
 
-bool isRegistered(const Call& call, std::string_view className) {
-    const auto& registrations = call.dispatcher().registry().registrations();
+bool isRegistered(const Operation& operation, std::string_view className) {
+    const auto& registrations = operation.dispatcher.registry().registrations();
     return std::any_of(registrations.begin(), registrations.end(), [&](const Registration& registration) {
-        return equalNames(registration.className, className) && registration.isIn(call.nameSpace());
+        return equalNames(registration.className, className) && registration.isIn(operation.message.nameSpace());
     });
 }
 
@@ -43,9 +43,9 @@ CimError unknownClass(const std::string& className) {
 }
 
 /** Throws where nobody serves instances of the class itself, so that there is none. */
-void requireServed(const Call& call, const std::string& className) {
-    if (!isRegistered(call, className)) {
-        throw call.catalogue().find(className) == nullptr
+void requireServed(const Operation& operation, const std::string& className) {
+    if (!isRegistered(operation, className)) {
+        throw operation.catalogue.find(className) == nullptr
             ? unknownClass(className)
             : CimError(CMPI_RC_ERR_NOT_FOUND, "no provider serves instances of the class " + className);
     }
@@ -79,7 +79,8 @@ void forEachServed(const Call& call, const ObjectPath& classPath, Do doWith) {
         }
     }
     // Nobody having to serve it, a class that is declared has no instances.
-    if (!served && (isRegistered(call, classPath.className) || call.catalogue().find(classPath.className) == nullptr)) {
+    if (!served &&
+        (isRegistered(call.operation, classPath.className) || call.catalogue().find(classPath.className) == nullptr)) {
         call.dispatcher().registry().find(classPath.nameSpace, classPath.className, ProviderKind::instance);
     }
 }
@@ -138,7 +139,7 @@ Selection selectionOfClasses(const Call& call) {
 void getInstance(const Call& call) {
     const ObjectPath path = call.parameters.instanceName("InstanceName");
     const Selection selection = selectionOfInstances(call);
-    requireServed(call, path.className);
+    requireServed(call.operation, path.className);
     const PropertyList properties = askedOfProvider(call, selection.properties, path.className);
     const Instance instance = call.dispatcher().getInstance(call.invocation(), path, properties);
     call.writer().raw("<IRETURNVALUE>\n");
@@ -241,7 +242,7 @@ void referenceNames(const Call& call) {
 /** The property of the class that PropertyName names. */
 const Property& namedProperty(const Call& call, const ObjectPath& path) {
     const std::string name = call.parameters.text("PropertyName");
-    requireServed(call, path.className);
+    requireServed(call.operation, path.className);
     const Property* property = declaredClass(call, path.className).property(name);
     if (property == nullptr) {
         throw CimError(CMPI_RC_ERR_NO_SUCH_PROPERTY, path.className + " has no property " + name);
@@ -271,7 +272,7 @@ void setProperty(const Call& call) {
 
 void createInstance(const Call& call) {
     const Instance instance = call.parameters.instance("NewInstance");
-    if (!isRegistered(call, instance.path.className)) {
+    if (!isRegistered(call.operation, instance.path.className)) {
         declaredClass(call, instance.path.className);
         throw CimError(CMPI_RC_ERR_NOT_SUPPORTED,
                        "no provider serves instances of the class " + instance.path.className);
@@ -285,13 +286,13 @@ void createInstance(const Call& call) {
 void modifyInstance(const Call& call) {
     const Instance instance = call.parameters.namedInstance("ModifiedInstance");
     call.parameters.flag("IncludeQualifiers", true);
-    requireServed(call, instance.path.className);
+    requireServed(call.operation, instance.path.className);
     call.dispatcher().modifyInstance(call.invocation(), instance.path, instance, call.parameters.propertyList());
 }
 
 void deleteInstance(const Call& call) {
     const ObjectPath path = call.parameters.instanceName("InstanceName");
-    requireServed(call, path.className);
+    requireServed(call.operation, path.className);
     call.dispatcher().deleteInstance(call.invocation(), path);
 }
 
@@ -466,6 +467,7 @@ void callMethod(const Operation& operation) {
         throw CimError(CMPI_RC_ERR_METHOD_NOT_FOUND, declared->name + " has no method " + message.method());
     }
     const std::vector<NamedValue> arguments = argumentsOf(operation, *method);
+    requireServed(operation, path.className);
     Invocation invocation;
     invocation.principal = operation.caller.user;
     LogTap* log = operation.dispatcher.log();

@@ -302,7 +302,7 @@ std::string classOfQuery(const std::string& query) {
     bool from = false;
     for (std::size_t start = query.find_first_not_of(space); start != std::string::npos;) {
         const std::size_t end = std::min(query.find_first_of(space, start), query.size());
-        const std::string word = query.substr(start, end - start);
+        std::string word = query.substr(start, end - start);
         if (from) {
             return word;
         }

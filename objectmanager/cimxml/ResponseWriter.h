@@ -66,7 +66,7 @@ public:
     /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; nothing where the value is null. */
     void value(const Value& value);
     /** A RETURNVALUE. */
-    void returnValue(const Value& value);
+    void returnValue(const Value& returned);
     /** A PARAMVALUE. */
     void parameter(const NamedValue& parameter);
 

@@ -35,6 +35,14 @@ TEST_F(RegistryTest, LetterCaseDoesNotMatter) {
     EXPECT_EQ("DiskInstances", registry.find("ROOT/CIMV2", "test_disk", ProviderKind::instance).provider);
 }
 
+TEST_F(RegistryTest, KnowsTheNamespacesThatARegistrationNames) {
+    EXPECT_NO_THROW(registry.requireNameSpace("Root/Interop"));
+    EXPECT_THAT(errorOf([&] { registry.requireNameSpace("root/inter"); }),
+                isError(CMPI_RC_ERR_INVALID_NAMESPACE, "no provider is registered in namespace \"root/inter\""));
+    EXPECT_TRUE(registry.registrations().front().isIn("ROOT/cimv2"));
+    EXPECT_FALSE(registry.registrations().front().isIn("root"));
+}
+
 TEST_F(RegistryTest, SaysWhatIsNotRegistered) {
     const auto find = [&](const char* nameSpace, const char* className, ProviderKind kind) {
         return errorOf([&] { registry.find(nameSpace, className, kind); });

@@ -6,6 +6,11 @@ namespace {
 
 constexpr std::string_view replacement = "\xEF\xBF\xBD";
 
+/** Whether the byte is a character that stands for itself wherever it is, as most are. */
+bool isPlain(unsigned char byte) {
+    return byte >= 0x20 && byte < 0x80 && byte != '<' && byte != '>' && byte != '&' && byte != '"';
+}
+
 unsigned char byteAt(std::string_view text, std::size_t position) {
     return static_cast<unsigned char>(text[position]);
 }
@@ -57,6 +62,10 @@ void append(std::string& document, std::string_view text, bool inAttribute) {
     std::size_t written = 0;
     for (std::size_t position = 0; position < text.size();) {
         const unsigned char byte = byteAt(text, position);
+        if (isPlain(byte)) {
+            ++position;
+            continue;
+        }
         std::string_view instead;
         std::size_t length = 1;
         if (byte < 0x80) {
@@ -83,7 +92,7 @@ bool isXmlCharacter(std::uint32_t code) {
            (code >= 0xE000 && code <= 0xFFFD) || (code >= 0x10000 && code <= 0x10FFFF);
 }
 
-std::size_t characterLength(std::string_view text, std::size_t position) {
+std::size_t specialCharacterLength(std::string_view text, std::size_t position) {
     const unsigned char first = byteAt(text, position);
     if (first < 0x80) {
         return isXmlCharacter(first) ? 1 : 0;

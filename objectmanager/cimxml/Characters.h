@@ -12,9 +12,14 @@ namespace ObjectManager::CimXml {
 /** Whether a document may contain the character, literally or as a reference. */
 bool isXmlCharacter(std::uint32_t code);
 
-/** How many bytes the character at `position` has; 0 where there is no UTF-8, or a character that XML does not allow.
- */
-std::size_t characterLength(std::string_view text, std::size_t position);
+/** `characterLength` of what is a control character or none of ASCII's. */
+std::size_t specialCharacterLength(std::string_view text, std::size_t position);
+
+/** How many bytes the character at `position` has; 0 where there is none in UTF-8, or one that XML does not allow. */
+inline std::size_t characterLength(std::string_view text, std::size_t position) {
+    const auto byte = static_cast<unsigned char>(text[position]);
+    return byte >= 0x20 && byte < 0x80 ? 1 : specialCharacterLength(text, position);
+}
 
 /* Append a text so that a reader of the document gets it back. What XML cannot say becomes U+FFFD. */
 

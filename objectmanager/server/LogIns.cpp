@@ -1,0 +1,54 @@
+#include "server/LogIns.h"
+
+#include <gnutls/crypto.h>
+#include <gnutls/gnutls.h>
+
+#include <stdexcept>
+
+namespace ObjectManager::Server {
+
+namespace {
+
+void require(int status, const char* what) {
+    if (status != GNUTLS_E_SUCCESS) {
+        throw std::runtime_error(std::string(what) + ": " + gnutls_strerror(status));
+    }
+}
+
+} // namespace
+
+RecentLogIns::RecentLogIns() {
+    require(gnutls_rnd(GNUTLS_RND_KEY, _secret.data(), _secret.size()), "random key");
+}
+
+std::optional<CimXml::Caller> RecentLogIns::find(const std::string& user, const std::string& password,
+                                                 Clock::time_point now) {
+    const Digest digest = digestOf(user, password);
+    const std::lock_guard lock(_mutex);
+    const auto found = _entries.find(digest);
+    return found == _entries.end() || found->second.until <= now ? std::nullopt : std::optional(found->second.caller);
+}
+
+void RecentLogIns::remember(const std::string& user, const std::string& password, const CimXml::Caller& caller,
+                            Clock::time_point now) {
+    const Digest digest = digestOf(user, password);
+    const std::lock_guard lock(_mutex);
+    if (_entries.size() >= capacity) {
+        std::erase_if(_entries, [now](const auto& entry) { return entry.second.until <= now; });
+    }
+    if (_entries.size() < capacity) {
+        _entries.insert_or_assign(digest, Entry{caller, now + lifetime});
+    }
+}
+
+RecentLogIns::Digest RecentLogIns::digestOf(const std::string& user, const std::string& password) const {
+    // A user's name has no colon here, as it has none in HTTP.
+    const std::string text = user + ':' + password;
+    Digest digest{};
+    require(
+        gnutls_hmac_fast(GNUTLS_MAC_SHA256, _secret.data(), _secret.size(), text.data(), text.size(), digest.data()),
+        "digest");
+    return digest;
+}
+
+} // namespace ObjectManager::Server

@@ -1,0 +1,29 @@
+/** Log-ins against the system's users. */
+#ifndef SERVER_PAMAUTHENTICATOR_H
+#define SERVER_PAMAUTHENTICATOR_H
+
+#include "server/LogIns.h"
+#include "server/Settings.h"
+
+#include <string>
+#include <utility>
+
+namespace ObjectManager::Server {
+
+/** Asks PAM, and takes roles from the groups that the user is in. */
+class PamAuthenticator final : public Authenticator {
+public:
+    explicit PamAuthenticator(PamSettings settings) : _settings(std::move(settings)) {}
+
+    LogIn logIn(const std::string& user, const std::string& password, const std::string& address) override;
+
+private:
+    const PamSettings _settings;
+};
+
+/** Whether the system has a group of that name. */
+bool groupExists(const std::string& name);
+
+} // namespace ObjectManager::Server
+
+#endif

@@ -1,0 +1,178 @@
+#include "HttpClient.h"
+
+#include <arpa/inet.h>
+#include <netdb.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cctype>
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+#include <utility>
+
+namespace ServerTest {
+
+namespace {
+
+constexpr int patience = 30;
+
+void require(bool done, const char* what) {
+    if (!done) {
+        throw std::system_error(errno, std::generic_category(), what);
+    }
+}
+
+/** A call with a time is interrupted also by signals that are nobody's, such as those that stop and continue a process.
+ */
+ssize_t receiveFrom(int socket, char* data, std::size_t size) {
+    ssize_t received = 0;
+    do {
+        received = recv(socket, data, size, 0);
+    } while (received < 0 && errno == EINTR);
+    return received;
+}
+
+addrinfo* resolve(const std::string& address, std::uint16_t port) {
+    addrinfo wanted{};
+    wanted.ai_flags = AI_NUMERICHOST;
+    wanted.ai_socktype = SOCK_STREAM;
+    addrinfo* found = nullptr;
+    if (getaddrinfo(address.c_str(), std::to_string(port).c_str(), &wanted, &found) != 0) {
+        throw std::runtime_error(address + " is no address");
+    }
+    return found;
+}
+
+std::string base64(std::string_view text) {
+    constexpr std::string_view digits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::string result;
+    for (std::size_t i = 0; i < text.size(); i += 3) {
+        const auto byte = [&](std::size_t at) { return at < text.size() ? static_cast<unsigned char>(text[at]) : 0U; };
+        const unsigned int bits = byte(i) << 16U | byte(i + 1) << 8U | byte(i + 2);
+        result += digits[bits >> 18U];
+        result += digits[bits >> 12U & 63U];
+        result += i + 1 < text.size() ? digits[bits >> 6U & 63U] : '=';
+        result += i + 2 < text.size() ? digits[bits & 63U] : '=';
+    }
+    return result;
+}
+
+} // namespace
+
+HttpClient::HttpClient(std::uint16_t port, const std::string& to, const std::string& from) {
+    addrinfo* const target = resolve(to, port);
+    _socket = socket(target->ai_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    require(_socket >= 0, "socket");
+    const timeval time{patience, 0};
+    setsockopt(_socket, SOL_SOCKET, SO_RCVTIMEO, &time, sizeof time);
+    setsockopt(_socket, SOL_SOCKET, SO_SNDTIMEO, &time, sizeof time);
+    if (!from.empty()) {
+        addrinfo* const source = resolve(from, 0);
+        require(bind(_socket, source->ai_addr, source->ai_addrlen) == 0, "bind");
+        freeaddrinfo(source);
+    }
+    const int connected = connect(_socket, target->ai_addr, target->ai_addrlen);
+    const int error = errno;
+    freeaddrinfo(target);
+    if (connected != 0) {
+        close(_socket);
+        throw std::system_error(error, std::generic_category(), "connect");
+    }
+}
+
+HttpClient::HttpClient(HttpClient&& other) noexcept
+    : _socket(std::exchange(other._socket, -1)), _received(std::move(other._received)) {}
+
+HttpClient::~HttpClient() {
+    if (_socket >= 0) {
+        close(_socket);
+    }
+}
+
+bool HttpClient::send(std::string_view text) const {
+    while (!text.empty()) {
+        const ssize_t sent = ::send(_socket, text.data(), text.size(), MSG_NOSIGNAL);
+        if (sent < 0 && (errno == EPIPE || errno == ECONNRESET)) {
+            return false;
+        }
+        require(sent >= 0, "send");
+        text.remove_prefix(static_cast<std::size_t>(sent));
+    }
+    return true;
+}
+
+bool HttpClient::fill() {
+    std::array<char, 65536> buffer{};
+    const ssize_t size = receiveFrom(_socket, buffer.data(), buffer.size());
+    if (size < 0 && errno == ECONNRESET) {
+        return false;
+    }
+    require(size >= 0, "recv");
+    _received.append(buffer.data(), static_cast<std::size_t>(size));
+    return size > 0;
+}
+
+Reply HttpClient::receive() {
+    constexpr std::string_view headerEnd = "\r\n\r\n";
+    const auto needMore = [this] {
+        if (!fill()) {
+            throw std::runtime_error("the connection ended after \"" + _received + '"');
+        }
+    };
+    while (_received.find(headerEnd) == std::string::npos) {
+        needMore();
+    }
+    const std::size_t bodyStart = _received.find(headerEnd) + headerEnd.size();
+    Reply reply;
+    std::size_t at = _received.find("\r\n") + 2;
+    reply.status = std::stoi(_received.substr(_received.find(' ') + 1, 3));
+    while (at + 2 < bodyStart) {
+        const std::size_t end = _received.find("\r\n", at);
+        const std::size_t colon = _received.find(": ", at);
+        std::string name = _received.substr(at, colon - at);
+        std::transform(name.begin(), name.end(), name.begin(), [](unsigned char c) { return std::tolower(c); });
+        reply.headers[name] = _received.substr(colon + 2, end - colon - 2);
+        at = end + 2;
+    }
+    const std::size_t size = std::stoul(reply.headers.at("content-length"));
+    while (_received.size() < bodyStart + size) {
+        needMore();
+    }
+    reply.body = _received.substr(bodyStart, size);
+    _received.erase(0, bodyStart + size);
+    return reply;
+}
+
+std::string HttpClient::receiveSome(std::size_t most) const {
+    std::string text(most, '\0');
+    const ssize_t size = receiveFrom(_socket, text.data(), text.size());
+    require(size >= 0, "recv");
+    text.resize(static_cast<std::size_t>(size));
+    return text;
+}
+
+std::string HttpClient::receiveAll() {
+    while (fill()) {
+    }
+    return std::exchange(_received, "");
+}
+
+void HttpClient::reset() {
+    const linger atOnce{1, 0};
+    setsockopt(_socket, SOL_SOCKET, SO_LINGER, &atOnce, sizeof atOnce);
+    close(std::exchange(_socket, -1));
+}
+
+std::string post(std::string_view body, std::string_view headers) {
+    return "POST /cimom HTTP/1.1\r\nHost: localhost\r\n" + std::string(headers) +
+           "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + std::string(body);
+}
+
+std::string logInAs(const std::string& user, const std::string& password) {
+    return "Authorization: Basic " + base64(user + ":" + password) + "\r\n";
+}
+
+} // namespace ServerTest

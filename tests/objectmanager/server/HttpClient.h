@@ -1,0 +1,61 @@
+/** A client that does exactly what a test says, right or wrong. */
+#ifndef TESTS_SERVER_HTTPCLIENT_H
+#define TESTS_SERVER_HTTPCLIENT_H
+
+#include <chrono>
+#include <cstdint>
+#include <map>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace ServerTest {
+
+struct Reply {
+    int status = 0;
+    /** Names in lower case. */
+    std::map<std::string, std::string> headers;
+    std::string body;
+};
+
+/** One connection. Whatever the server does not do in good time ends the test with an exception. */
+class HttpClient {
+public:
+    /**
+     * @param from the address that the client has; any where it is empty.
+     * @throws std::system_error where it is not let in.
+     */
+    explicit HttpClient(std::uint16_t port, const std::string& to = "127.0.0.1", const std::string& from = "");
+    HttpClient(const HttpClient&) = delete;
+    HttpClient& operator=(const HttpClient&) = delete;
+    HttpClient(HttpClient&& other) noexcept;
+    ~HttpClient();
+
+    /** @return false where the server has closed the connection. */
+    bool send(std::string_view text) const;
+    /** Waits for the whole reply. @throws std::runtime_error where the connection ends before. */
+    Reply receive();
+    /** Waits until something has come, and takes as much of it as there is room for. */
+    std::string receiveSome(std::size_t most) const;
+    /** Waits for the end of the connection. @return what came before. */
+    std::string receiveAll();
+    /** Goes away without a word. */
+    void reset();
+
+private:
+    bool fill();
+
+    int _socket;
+    /** What was received and is not part of a reply yet. */
+    std::string _received;
+};
+
+/** The text of a request. @param headers each with its line end. */
+std::string post(std::string_view body, std::string_view headers = "");
+
+/** The header for a log-in, with its line end. */
+std::string logInAs(const std::string& user, const std::string& password);
+
+} // namespace ServerTest
+
+#endif

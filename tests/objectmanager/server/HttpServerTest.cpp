@@ -1,0 +1,451 @@
+/* What clients get from the server over real connections, and what it logs. */
+#include "Served.h"
+
+#include <atomic>
+
+namespace ServerTest {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Pair;
+using testing::StartsWith;
+
+using HttpServerTest = Served;
+
+TEST_F(HttpServerTest, handsTheWholeRequestToTheHandler) {
+    std::vector<std::pair<std::string, std::string>> headers;
+    std::string method;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        headers = request.headers;
+        method = request.method;
+        EXPECT_EQ(caller.user, "");
+        EXPECT_TRUE(caller.mayRead);
+        EXPECT_TRUE(caller.mayChangePower);
+        return echo(request, caller);
+    });
+    HttpClient asking = client();
+    asking.send("M-POST /cimom HTTP/1.1\r\nHost: localhost\r\nMan: http://www.dmtf.org/cim/mapping/http/v1.0; ns=73\r\n"
+                "73-CIMOperation: MethodCall\r\nContent-Length: 5\r\n\r\nhello");
+    EXPECT_EQ(asking.receive().body, "hello");
+    EXPECT_EQ(method, "M-POST");
+    EXPECT_THAT(headers,
+                ElementsAre(Pair("Host", "localhost"), Pair("Man", "http://www.dmtf.org/cim/mapping/http/v1.0; ns=73"),
+                            Pair("73-CIMOperation", "MethodCall"), Pair("Content-Length", "5")));
+}
+
+TEST_F(HttpServerTest, sendsWhatTheHandlerGives) {
+    serve([](const CimXml::HttpRequest&, const CimXml::Caller&) {
+        return CimXml::HttpReply{501, {{"CIMError", "unsupported-operation"}, {"X-Other", "one"}}, "no"};
+    });
+    const Reply reply = ask(post(""));
+    EXPECT_EQ(reply.status, 501);
+    EXPECT_EQ(reply.body, "no");
+    EXPECT_EQ(reply.headers.at("cimerror"), "unsupported-operation");
+    EXPECT_EQ(reply.headers.at("x-other"), "one");
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 501: unsupported-operation"));
+}
+
+TEST_F(HttpServerTest, keepsAConnectionForTheNextRequest) {
+    serve();
+    HttpClient asking = client();
+    for (const char* text : {"one", "two", ""}) {
+        asking.send(post(text));
+        EXPECT_EQ(asking.receive().body, text);
+    }
+    asking.send(post("four") + post("five"));
+    EXPECT_EQ(asking.receive().body, "four");
+    EXPECT_EQ(asking.receive().body, "five");
+    EXPECT_THAT(logged(), IsEmpty());
+}
+
+TEST_F(HttpServerTest, takesABodyInChunks) {
+    serve();
+    EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n"
+                  "3\r\nfir\r\n4\r\nst, \r\n6\r\nsecond\r\n0\r\n\r\n")
+                  .body,
+              "first, second");
+}
+
+TEST_F(HttpServerTest, servesOthersWhileAHandlerTakesItsTime) {
+    Gate gate;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        if (request.body == "slow") {
+            gate.wait();
+        }
+        return echo(request, caller);
+    });
+    HttpClient slow = client();
+    slow.send(post("slow"));
+    for (int i = 0; i < 20; ++i) {
+        EXPECT_EQ(ask(post("quick")).body, "quick");
+    }
+    gate.open();
+    EXPECT_EQ(slow.receive().body, "slow");
+}
+
+TEST_F(HttpServerTest, runsNoMoreHandlersAtATimeThanItHasThreads) {
+    _settings.threads = 3;
+    std::atomic<int> running = 0;
+    std::atomic<int> most = 0;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        const int now = ++running;
+        int before = most;
+        while (before < now && !most.compare_exchange_weak(before, now)) {
+        }
+        std::this_thread::sleep_for(2ms);
+        --running;
+        return echo(request, caller);
+    });
+    std::vector<HttpClient> clients;
+    for (int i = 0; i < 30; ++i) {
+        clients.push_back(client());
+        clients.back().send(post("x"));
+    }
+    for (HttpClient& each : clients) {
+        EXPECT_EQ(each.receive().status, 200);
+    }
+    EXPECT_EQ(most, 3);
+}
+
+/* Bodies and headers. */
+
+class SizeTest : public Served {
+protected:
+    SizeTest() {
+        _settings.limits.bodyBytes = 1000;
+        _settings.limits.headerBytes = 2000;
+        serve();
+    }
+};
+
+TEST_F(SizeTest, takesABodyOfTheLargestSize) {
+    EXPECT_EQ(ask(post(std::string(1000, 'x'))).body, std::string(1000, 'x'));
+}
+
+TEST_F(SizeTest, refusesABodyThatIsLarger) {
+    const Reply reply = ask(post(std::string(1001, 'x')));
+    EXPECT_EQ(reply.status, 413);
+    EXPECT_EQ(reply.body, "the body has 1001 bytes, expected 1000 at most\n");
+    EXPECT_EQ(reply.headers.at("connection"), "close");
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 413: the body has 1001 bytes, expected 1000 at most"));
+}
+
+TEST_F(SizeTest, refusesAHugeBodyBeforeItComes) {
+    const Reply reply = ask("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 1000000000000\r\n\r\n");
+    EXPECT_EQ(reply.status, 413);
+    EXPECT_EQ(reply.body, "the body has 1000000000000 bytes, expected 1000 at most\n");
+}
+
+TEST_F(SizeTest, refusesABodyInChunksThatIsLarger) {
+    std::string request = "POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n";
+    for (int i = 0; i < 20; ++i) {
+        request += "64\r\n" + std::string(100, 'x') + "\r\n";
+    }
+    const Reply reply = ask(request + "0\r\n\r\n");
+    EXPECT_EQ(reply.status, 413);
+    EXPECT_EQ(reply.body, "the body has 2000 bytes, expected 1000 at most\n");
+}
+
+TEST_F(SizeTest, cutsOffAClientThatDoesNotStopSending) {
+    HttpClient endless = client();
+    endless.send("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n");
+    const std::string chunk = "64\r\n" + std::string(100, 'x') + "\r\n";
+    while (endless.send(chunk)) {
+    }
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: cut off: the body has more than 4000 bytes"));
+    EXPECT_EQ(ask(post("next")).body, "next");
+}
+
+TEST_F(SizeTest, takesHeadersOfTheLargestSizeAndRefusesLarger) {
+    const auto statusOf = [this](std::size_t headers) {
+        const std::string without = post("", "X: \r\n");
+        return ask(post("", "X: " + std::string(headers - without.size(), 'x') + "\r\n")).status;
+    };
+    EXPECT_EQ(statusOf(2000), 200);
+    EXPECT_EQ(statusOf(2001), 431);
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 431: the headers have 2001 bytes, expected 2000 at most"));
+    EXPECT_EQ(statusOf(200'000), 431);
+    EXPECT_EQ(logged(2).back(), "127.0.0.1: answered 431: the request is not HTTP/1.1");
+}
+
+/* Clients that are slow, gone, wrong or many. */
+
+TEST_F(HttpServerTest, refusesARequestThatDoesNotArriveInTime) {
+    _settings.limits.requestTime = 500ms;
+    serve();
+    for (const char* begun :
+         {"POST / HTTP/1.1\r\nHost:", "POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 5\r\n\r\nhal"}) {
+        HttpClient slow = client();
+        slow.send(begun);
+        EXPECT_EQ(ask(post("quick")).body, "quick");
+        EXPECT_EQ(slow.receive().status, 408) << begun;
+        EXPECT_EQ(slow.receiveAll(), "");
+    }
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 408: the request did not arrive within 0.5 s",
+                                      "127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
+}
+
+TEST_F(HttpServerTest, doesNotCountTheTimeOfTheAnswerAsTheRequests) {
+    _settings.limits.requestTime = 100ms;
+    _settings.limits.idleTime = 100ms;
+    serve([](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        std::this_thread::sleep_for(1s);
+        return echo(request, caller);
+    });
+    EXPECT_EQ(ask(post("patience")).body, "patience");
+}
+
+TEST_F(HttpServerTest, closesAnIdleConnection) {
+    _settings.limits.idleTime = 500ms;
+    serve();
+    HttpClient idle = client();
+    HttpClient served = client();
+    served.send(post("x"));
+    served.receive();
+    EXPECT_EQ(idle.receiveAll(), "");
+    EXPECT_EQ(served.receiveAll(), "");
+    EXPECT_THAT(logged(), IsEmpty());
+}
+
+TEST_F(HttpServerTest, isNotKeptWaitingByARequestLineThatComesInDrops) {
+    _settings.limits.idleTime = 500ms;
+    serve();
+    const HttpClient slow = client();
+    const auto end = std::chrono::steady_clock::now() + 20s;
+    while (slow.send("P")) {
+        std::this_thread::sleep_for(50ms);
+        ASSERT_LT(std::chrono::steady_clock::now(), end);
+    }
+}
+
+TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidAnswer) {
+    serve([](const CimXml::HttpRequest& request, const CimXml::Caller& /*caller*/) {
+        return CimXml::HttpReply{200, {}, std::string(request.body == "large" ? 50'000'000 : 5, 'x')};
+    });
+    HttpClient gone = client();
+    gone.send(post("large"));
+    EXPECT_NE(gone.receiveSome(1000), "");
+    gone.reset();
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the answer was sent"));
+    EXPECT_EQ(ask(post("")).body, "xxxxx");
+}
+
+TEST_F(HttpServerTest, survivesAClientThatGoesAwayWhileTheHandlerRuns) {
+    Gate entered;
+    Gate gate;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        if (request.body == "gone") {
+            entered.open();
+            gate.wait();
+        }
+        return echo(request, caller);
+    });
+    HttpClient gone = client();
+    gone.send(post("gone"));
+    entered.wait();
+    gone.reset();
+    EXPECT_EQ(ask(post("here")).body, "here");
+    gate.open();
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the answer was sent"));
+}
+
+TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidRequest) {
+    serve();
+    HttpClient gone = client();
+    gone.send("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 100\r\n\r\nhalf of it");
+    EXPECT_EQ(ask(post("here")).body, "here");
+    gone.reset();
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the request was here"));
+}
+
+TEST_F(HttpServerTest, refusesWhatIsNotHttp) {
+    const std::pair<const char*, const char*> requests[] = {
+        {"POST / HTTP/1.1\r\nHost: x\r\nContent-Length: much\r\n\r\n", "400"},
+        {"POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 99999999999999999999999\r\n\r\n", "413"},
+        {"POST / HTTP/1.1\r\nHost: x\r\nTransfer-Encoding: chunked\r\n\r\nno size\r\n", "400"},
+    };
+    serve();
+    std::size_t lines = 0;
+    for (const auto& [wrong, status] : requests) {
+        HttpClient asking = client();
+        asking.send(wrong);
+        EXPECT_THAT(asking.receiveAll(), StartsWith(std::string("HTTP/1.1 ") + status)) << wrong;
+        EXPECT_EQ(logged(++lines).back(),
+                  "127.0.0.1: answered " + std::string(status) + ": the request is not HTTP/1.1")
+            << wrong;
+        EXPECT_EQ(logged().size(), lines) << wrong;
+    }
+    EXPECT_EQ(ask("POST / HTTP/7.0\r\nHost: x\r\n\r\n").status, 505);
+    EXPECT_EQ(logged(++lines).back(), "Error processing request (HTTP response code is 505");
+    HttpClient asking = client();
+    asking.send("hello\r\n\r\n");
+    EXPECT_EQ(asking.receiveAll(), "");
+    EXPECT_EQ(logged().size(), lines);
+    EXPECT_EQ(ask(post("right")).body, "right");
+}
+
+TEST_F(HttpServerTest, closesTheOldestIdleConnectionForANewOne) {
+    _settings.limits.connections = 10;
+    serve();
+    std::vector<HttpClient> clients;
+    for (int i = 0; i < 11; ++i) {
+        clients.push_back(client());
+        if (i != 0) {
+            clients.back().send(post("x"));
+            EXPECT_EQ(clients.back().receive().status, 200) << i;
+        }
+    }
+    EXPECT_EQ(clients.front().receiveAll(), "");
+    for (std::size_t i = 1; i < clients.size(); ++i) {
+        clients[i].send(post("again"));
+        EXPECT_EQ(clients[i].receive().body, "again") << i;
+    }
+    EXPECT_THAT(logged(), ElementsAre("more than 10 connections: idle ones are closed, others are refused"));
+}
+
+TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
+    _settings.limits.connections = 3;
+    Gate gate;
+    std::atomic<int> entered = 0;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        ++entered;
+        gate.wait();
+        return echo(request, caller);
+    });
+    std::vector<HttpClient> clients;
+    for (int i = 1; i <= 3; ++i) {
+        clients.push_back(client());
+        clients.back().send(post("x"));
+        while (entered < i) {
+            std::this_thread::sleep_for(1ms);
+        }
+    }
+    const Reply refused = ask(post("x"));
+    EXPECT_EQ(refused.status, 503);
+    EXPECT_EQ(refused.body, "too many connections\n");
+    gate.open();
+    for (HttpClient& each : clients) {
+        EXPECT_EQ(each.receive().status, 200);
+    }
+    // An answer can be here before the server has noted that it is sent.
+    while (ask(post("later")).status == 503) {
+    }
+}
+
+TEST_F(HttpServerTest, boundsTheConnectionsOfOneClient) {
+    _settings.limits.connectionsPerAddress = 2;
+    serve();
+    HttpClient other(_server->port(), "127.0.0.1", "127.0.0.3");
+    HttpClient first(_server->port(), "127.0.0.1", "127.0.0.2");
+    HttpClient second(_server->port(), "127.0.0.1", "127.0.0.2");
+    HttpClient third(_server->port(), "127.0.0.1", "127.0.0.2");
+    EXPECT_EQ(first.receiveAll(), "");
+    for (HttpClient* each : {&other, &second, &third}) {
+        each->send(post("x"));
+        EXPECT_EQ(each->receive().status, 200);
+    }
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.2: more than 2 connections: idle ones are closed, others are refused"));
+}
+
+TEST_F(HttpServerTest, isAsQuickBesideThousandsOfIdleConnections) {
+    constexpr unsigned int many = 2000;
+    _settings.limits.connections = many + 100;
+    _settings.limits.connectionsPerAddress = many + 100;
+    serve();
+    std::vector<HttpClient> idle;
+    for (unsigned int i = 0; i < many; ++i) {
+        idle.push_back(client());
+    }
+    for (int i = 0; i < 100; ++i) {
+        EXPECT_EQ(ask(post("x")).status, 200);
+    }
+    for (HttpClient& each : idle) {
+        each.send(post("still here"));
+        EXPECT_EQ(each.receive().body, "still here");
+    }
+    EXPECT_THAT(logged(), IsEmpty());
+}
+
+/* Where it listens, and how it ends. */
+
+TEST_F(HttpServerTest, listensOnIpv6) {
+    _settings.address = "::1";
+    serve();
+    HttpClient asking(_server->port(), "::1");
+    asking.send(post("six"));
+    EXPECT_EQ(asking.receive().body, "six");
+    asking.send("POST / HTTP/1.1\r\nContent-Length: x\r\n\r\n");
+    asking.receiveAll();
+    EXPECT_THAT(logged(1), ElementsAre("::1: answered 400: the request is not HTTP/1.1"));
+}
+
+std::string problemOf(const Server::Settings& settings) {
+    try {
+        const Server::HttpServer server(settings, nullptr, nullptr, [](const std::string&) {});
+    } catch (const Server::ServerError& error) {
+        return error.what();
+    }
+    return "";
+}
+
+TEST_F(HttpServerTest, saysWhereItCannotListen) {
+    serve();
+    const std::string port = std::to_string(_server->port());
+    Server::Settings taken;
+    taken.port = _server->port();
+    EXPECT_EQ(problemOf(taken), "cannot listen on 127.0.0.1:" + port + ": Address already in use");
+    Server::Settings foreign;
+    foreign.address = "192.0.2.1";
+    EXPECT_EQ(problemOf(foreign), "cannot listen on 192.0.2.1:0: Cannot assign requested address");
+    Server::Settings name;
+    name.address = "localhost";
+    EXPECT_EQ(problemOf(name), "found the address \"localhost\", expected an IPv4 or IPv6 address in numbers");
+}
+
+TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
+    Gate entered;
+    Gate gate;
+    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        entered.open();
+        gate.wait();
+        return echo(request, caller);
+    });
+    const std::uint16_t port = _server->port();
+    HttpClient asking = client();
+    asking.send(post("before the end"));
+    entered.wait();
+    std::thread ending([this] { _server.reset(); });
+    const auto refusesConnections = [port] {
+        try {
+            const HttpClient late(port);
+        } catch (const std::system_error&) {
+            return true;
+        }
+        return false;
+    };
+    while (!refusesConnections()) {
+        std::this_thread::sleep_for(1ms);
+    }
+    gate.open();
+    EXPECT_EQ(asking.receive().body, "before the end");
+    EXPECT_EQ(asking.receiveAll(), "");
+    ending.join();
+    EXPECT_THAT(logged(), IsEmpty());
+}
+
+TEST_F(HttpServerTest, endsThoughAClientDoesNotTakeItsAnswer) {
+    _settings.stopTime = 100ms;
+    serve([](const CimXml::HttpRequest&, const CimXml::Caller&) {
+        return CimXml::HttpReply{200, {}, std::string(50'000'000, 'x')};
+    });
+    const HttpClient asking = client();
+    asking.send(post("x"));
+    asking.receiveSome(1);
+    _server.reset();
+    EXPECT_THAT(logged(), ElementsAre("stopped before all answers were sent"));
+}
+
+} // namespace
+} // namespace ServerTest

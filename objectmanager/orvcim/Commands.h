@@ -35,6 +35,9 @@ void powerStatus(Session& session);
 void powerReboot(Session& session);
 void powerShutdown(Session& session);
 
+/** Answers clients on the network until a signal ends the program. Only where it was built with the server. */
+void serve(Session& session);
+
 /** What is found of every registered provider and of the embedded agent. Throws Failure, after its answer, where
  * something is wrong. */
 void checkProviders(Session& session);

@@ -15,7 +15,6 @@ namespace ObjectManager::Orvcim {
 
 namespace {
 
-constexpr const char* serviceClass = "TALVO_PowerManagementService";
 constexpr const char* capabilitiesClass = "TALVO_PowerManagementCapabilities";
 constexpr const char* associationClass = "TALVO_AssociatedPowerManagementService";
 constexpr const char* requestMethod = "RequestPowerStateChange";
@@ -72,19 +71,18 @@ std::string stateText(const Session& session, const Instance& association) {
 
 /** The service that the command is about. */
 ObjectPath serviceOf(Session& session) {
-    // This also makes the agent say what kind of machine it stands for.
     const std::vector<ObjectPath> services = session.dispatcher().enumerateInstanceNames(
-        Session::invocation(), {{}, session.options().nameSpace, serviceClass, {}});
+        Session::invocation(), {{}, session.options().nameSpace, powerServiceClass, {}});
     if (!session.options().service.empty()) {
         ObjectPath chosen = session.instancePath(session.options().service);
         if (std::find(services.begin(), services.end(), chosen) == services.end()) {
             throw Failure(fmt::format("found no service {}, expected one of those that 'orvcim names {}' lists",
-                                      formatLocalPath(chosen), serviceClass));
+                                      formatLocalPath(chosen), powerServiceClass));
         }
         return chosen;
     }
     if (services.size() != 1) {
-        throw Failure(fmt::format("found {} instances of {}, expected one{}", services.size(), serviceClass,
+        throw Failure(fmt::format("found {} instances of {}, expected one{}", services.size(), powerServiceClass,
                                   services.empty() ? "" : ", or --service PATH to choose"));
     }
     return services.front();
@@ -92,7 +90,7 @@ ObjectPath serviceOf(Session& session) {
 
 /** Asks before a machine is acted upon that may be more than a simulation. */
 void confirm(Session& session, const PowerRequest& request, const std::string& systemName) {
-    if (session.options().yes || saysSimulated(session.log().since(0))) {
+    if (session.options().yes || session.isSimulated()) {
         return;
     }
     if (isatty(STDIN_FILENO) == 0) {
@@ -136,11 +134,11 @@ void requestPowerState(Session& session, const PowerRequest& request) {
         {{"CreationClassName", keyOf(service, "SystemCreationClassName")}, {"Name", keyOf(service, "SystemName")}}};
     confirm(session, request, plainText(keyOf(service, "SystemName"), nullptr));
 
-    const Class* known = session.catalogue().find(serviceClass);
+    const Class* known = session.catalogue().find(powerServiceClass);
     const Method* method = known == nullptr ? nullptr : known->method(requestMethod);
     if (method == nullptr) {
         throw Failure(fmt::format("found no method {} of {} in {}, expected its declaration", requestMethod,
-                                  serviceClass, session.schemaFolder().string()));
+                                  powerServiceClass, session.schemaFolder().string()));
     }
     const CallOutcome outcome = callMethod(
         session, service, *method,
@@ -173,7 +171,7 @@ void powerStatus(Session& session) {
     }
     std::cerr << fmt::format("orvcim: the power state itself is not served: {} is not registered in {}\n",
                              associationClass, session.options().nameSpace);
-    std::vector<Instance> instances = instancesOf(session, serviceClass);
+    std::vector<Instance> instances = instancesOf(session, powerServiceClass);
     rows.push_back({"SERVICE OR CAPABILITIES", "POWER STATES THAT CAN BE ASKED FOR"});
     std::vector<Instance> capabilities = instancesOf(session, capabilitiesClass);
     std::move(capabilities.begin(), capabilities.end(), std::back_inserter(instances));

@@ -1,5 +1,6 @@
 #include "orvcim/Session.h"
 
+#include "dispatch/AgentLog.h"
 #include "schema/RegistrationReader.h"
 #include "text/ObjectPathText.h"
 
@@ -85,6 +86,17 @@ PropertyList Session::propertiesOf(const ObjectPath& path) const {
         }
     }
     return properties;
+}
+
+bool Session::isSimulated() {
+    if (!saysSimulated(_log.since(0))) {
+        try {
+            _dispatcher.enumerateInstanceNames(invocation(), {{}, _options.nameSpace, powerServiceClass, {}});
+        } catch (const CimError&) {
+            return false; // where nobody knows its power services, the machine may be any
+        }
+    }
+    return saysSimulated(_log.since(0));
 }
 
 Invocation Session::invocation() {

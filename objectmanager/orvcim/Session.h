@@ -7,10 +7,13 @@
 #include "dispatch/Dispatcher.h"
 #include "dispatch/LogTap.h"
 #include "schema/Catalogue.h"
+#include "server/Settings.h"
 #include "text/Writer.h"
 
+#include <cstdint>
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -18,6 +21,24 @@
 #include <vector>
 
 namespace ObjectManager::Orvcim {
+
+/** The class whose instances are what the machine's power is managed by. */
+inline constexpr const char* powerServiceClass = "TALVO_PowerManagementService";
+
+/** What `serve` is asked for. */
+struct ServeOptions {
+    /** Its port is that of the protocol where none is asked for. */
+    Server::Settings server;
+    std::optional<std::uint16_t> port;
+    /** Empty where there is no TLS. */
+    std::filesystem::path certificate;
+    std::filesystem::path key;
+    /** Clients have to log in. */
+    bool authenticate = false;
+    Server::PamSettings pam;
+    /** Log to the system's log rather than to standard error. */
+    bool syslog = false;
+};
 
 /** The command line. */
 struct Options {
@@ -41,6 +62,7 @@ struct Options {
     AssociationFilter filter;
     /** Where to draw a picture; empty where its description is wanted. */
     std::filesystem::path picture;
+    ServeOptions serve;
 };
 
 /** A command line that cannot be done. what() is one line. */
@@ -92,6 +114,9 @@ public:
      * @throws CimError where the class has no such property.
      */
     PropertyList propertiesOf(const ObjectPath& path) const;
+
+    /** Whether the agent says that the machine is a simulated one. It does so when it is first asked for anything. */
+    bool isSimulated();
 
     /** Who asks for the operations: the user of the program. */
     static Invocation invocation();

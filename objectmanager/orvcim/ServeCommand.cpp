@@ -1,0 +1,138 @@
+#include "cimxml/Service.h"
+#include "orvcim/Commands.h"
+#include "server/HttpServer.h"
+#include "server/ListenSocket.h"
+#include "server/PamAuthenticator.h"
+
+#include <fmt/format.h>
+#include <fmt/ranges.h>
+
+#include <pthread.h>
+#include <sys/resource.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <optional>
+
+namespace ObjectManager::Orvcim {
+
+namespace {
+
+constexpr std::uint16_t httpPort = 5988;
+constexpr std::uint16_t httpsPort = 5989;
+
+/** Files that are open beside the connections, at most. */
+constexpr rlim_t otherFiles = 200;
+
+Server::Settings settingsOf(const ServeOptions& options) {
+    Server::Settings settings = options.server;
+    if (options.certificate.empty() != options.key.empty()) {
+        throw UsageError("found one of --tls-cert and --tls-key, expected both or none");
+    }
+    if (!options.certificate.empty()) {
+        settings.tls = Server::Tls{options.certificate, options.key};
+    }
+    settings.port = options.port.value_or(settings.tls ? httpsPort : httpPort);
+    return settings;
+}
+
+/** Nobody is to reach the server who should not, by oversight. */
+void requireProtection(Session& session, const Server::Settings& settings) {
+    const bool authenticated = session.options().serve.authenticate;
+    if (!Server::Address(settings.address).isLoopback() && !(settings.tls && authenticated)) {
+        throw UsageError(fmt::format("other machines can reach {}: expected --tls-cert, --tls-key and --authenticate, "
+                                     "or a loopback address",
+                                     settings.address));
+    }
+    if (!authenticated && !session.isSimulated()) {
+        const std::vector<std::string> reasons = session.log().failuresSince(0);
+        throw Failure(fmt::format("the machine is not known to be a simulated one{}{}: expected --authenticate, so "
+                                  "that not everybody on it can switch it off",
+                                  reasons.empty() ? "" : "; the agent logged: ", fmt::join(reasons, "; ")));
+    }
+}
+
+/** The system's default is made for programs that cannot have many files. */
+void allowFiles(unsigned int connections) {
+    rlimit limit{};
+    getrlimit(RLIMIT_NOFILE, &limit);
+    limit.rlim_cur = limit.rlim_max;
+    setrlimit(RLIMIT_NOFILE, &limit);
+    if (limit.rlim_cur < connections + otherFiles) {
+        throw UsageError(fmt::format("found --max-connections {}, expected {} at most: the limit of open files is {}",
+                                     connections, limit.rlim_cur - otherFiles, limit.rlim_cur));
+    }
+}
+
+Server::Log logOf(const ServeOptions& options) {
+    if (options.syslog) {
+        openlog("orvcim", LOG_PID, LOG_DAEMON);
+        return [](const std::string& line) { ::syslog(LOG_WARNING, "%s", line.c_str()); };
+    }
+    return [](const std::string& line) {
+        // In one piece, since several threads log.
+        const std::string text = "orvcim: " + line + '\n';
+        [[maybe_unused]] const ssize_t written = write(STDERR_FILENO, text.data(), text.size());
+    };
+}
+
+/** The signals that end the program. Only one thread takes them. */
+class EndSignals {
+public:
+    /** Before any other thread is made, since the others inherit what is blocked here. */
+    EndSignals() {
+        sigemptyset(&_signals);
+        sigaddset(&_signals, SIGINT);
+        sigaddset(&_signals, SIGTERM);
+        pthread_sigmask(SIG_BLOCK, &_signals, nullptr);
+        // A client that goes away is noticed otherwise.
+        std::signal(SIGPIPE, SIG_IGN);
+    }
+
+    /** Returns when one has come. The next one ends the program at once. */
+    void wait() const {
+        int signal = 0;
+        sigwait(&_signals, &signal);
+        pthread_sigmask(SIG_UNBLOCK, &_signals, nullptr);
+    }
+
+private:
+    sigset_t _signals{};
+};
+
+} // namespace
+
+void serve(Session& session) {
+    const ServeOptions& options = session.options().serve;
+    const Server::Settings settings = settingsOf(options);
+    requireProtection(session, settings);
+    allowFiles(settings.limits.connections);
+    const Server::Log log = logOf(options);
+
+    std::optional<Server::PamAuthenticator> authenticator;
+    if (options.authenticate) {
+        authenticator.emplace(options.pam);
+        for (const std::string& group : {options.pam.readGroup, options.pam.powerGroup}) {
+            if (!group.empty() && !Server::groupExists(group)) {
+                log(fmt::format("there is no group {}, so nobody is in it", group));
+            }
+        }
+    }
+
+    const EndSignals signals;
+    CimXml::Service service(session.dispatcher(), session.catalogue());
+    const auto answer = [&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        CimXml::HttpReply reply = service.answer(request, caller);
+        // What the agent logged meanwhile was of interest to this request only.
+        session.log().take();
+        return reply;
+    };
+    const Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);
+    session.out() << fmt::format("Listening on {}://{}\n", settings.tls ? "https" : "http",
+                                 Server::hostAndPort(settings.address, server.port()))
+                  << std::flush;
+    signals.wait();
+}
+
+} // namespace ObjectManager::Orvcim

@@ -64,10 +64,11 @@ std::string printable(std::string_view text) {
 }
 
 /** How the library's messages begin that say of a client what the server says itself, or need not. */
-constexpr std::array<std::string_view, 7> repetitions = {
-    "Connection socket is closed",         "Connection was closed", "Error processing request (HTTP response code is 4",
-    "Failed to parse `Content-Length'",    "Failed to send",        "Socket has been disconnected",
-    "Too large value of 'Content-Length'",
+constexpr std::array<std::string_view, 8> repetitions = {
+    "Connection socket is closed",         "Connection was closed",
+    "Error decoding basic authentication", "Error processing request (HTTP response code is 4",
+    "Failed to parse `Content-Length'",    "Failed to send",
+    "Socket has been disconnected",        "Too large value of 'Content-Length'",
 };
 
 bool isRepetition(std::string_view message) {
@@ -262,7 +263,11 @@ void HttpServer::Implementation::start(int listener) {
 }
 
 HttpServer::Implementation::~Implementation() {
-    _stopping = true;
+    {
+        const std::lock_guard lock(_mutex);
+        _stopping = true;
+    }
+    _changed.notify_all();
     close(MHD_quiesce_daemon(_daemon));
     if (!_connections.waitForAnswers(_settings.stopTime)) {
         _log("stopped before all answers were sent");
@@ -283,14 +288,14 @@ void HttpServer::Implementation::watch() {
     std::unique_lock lock(_mutex);
     while (_watching || !_failedLogIns.empty()) {
         const auto now = Clock::now();
-        while (!_failedLogIns.empty() && (!_watching || _failedLogIns.front().first <= now)) {
+        while (!_failedLogIns.empty() && (_stopping || _failedLogIns.front().first <= now)) {
             MHD_resume_connection(_failedLogIns.front().second);
             _failedLogIns.pop_front();
         }
         _connections.endOverdue();
         const auto next = now + watchInterval;
         _changed.wait_until(lock, _failedLogIns.empty() ? next : std::min(next, _failedLogIns.front().first),
-                            [this] { return !_watching; });
+                            [this] { return !_watching || (_stopping && !_failedLogIns.empty()); });
     }
 }
 

@@ -21,26 +21,27 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** Answers the question for a password, and no other. */
+/**
+ * Answers the question for a password. What PAM only says goes to nobody; modules say it also without room for an
+ * answer.
+ */
 int converse(int count, const pam_message** messages, pam_response** responses, void* data) {
-    const auto& password = *static_cast<const std::string*>(data);
+    const auto isOf = [](int style) {
+        return [style](const pam_message* message) { return message->msg_style == style; };
+    };
+    if (std::any_of(messages, messages + count, isOf(PAM_PROMPT_ECHO_ON))) {
+        return PAM_CONV_ERR;
+    }
+    if (responses == nullptr) {
+        return std::any_of(messages, messages + count, isOf(PAM_PROMPT_ECHO_OFF)) ? PAM_CONV_ERR : PAM_SUCCESS;
+    }
     auto* const answers = static_cast<pam_response*>(calloc(static_cast<std::size_t>(count), sizeof(pam_response)));
     if (answers == nullptr) {
         return PAM_BUF_ERR;
     }
     for (int i = 0; i < count; ++i) {
-        switch (messages[i]->msg_style) {
-        case PAM_PROMPT_ECHO_OFF:
-            answers[i].resp = strdup(password.c_str());
-            break;
-        case PAM_PROMPT_ECHO_ON:
-            for (int j = 0; j < i; ++j) {
-                free(answers[j].resp);
-            }
-            free(answers);
-            return PAM_CONV_ERR;
-        default: // is meant to be shown to somebody, who is not here
-            break;
+        if (messages[i]->msg_style == PAM_PROMPT_ECHO_OFF) {
+            answers[i].resp = strdup(static_cast<const std::string*>(data)->c_str());
         }
     }
     *responses = answers;

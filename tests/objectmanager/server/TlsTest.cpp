@@ -1,0 +1,90 @@
+/* The server with TLS, as a stock client sees it. */
+#include "Served.h"
+
+#include "agent/TestSupport.h"
+
+namespace ServerTest {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+class TlsTest : public Served {
+protected:
+    TlsTest() {
+        makeKey("server");
+        _settings.tls = Server::Tls{_folder / "server.pem", _folder / "server.key"};
+    }
+
+    void makeKey(const std::string& name) const {
+        const std::string base = (_folder / name).string();
+        AgentTest::linesOf("openssl req -x509 -newkey ec -pkeyopt ec_paramgen_curve:P-256 -noenc -days 2 -subj /CN=test"
+                           " -addext subjectAltName=IP:127.0.0.1 -keyout " +
+                           base + ".key -out " + base + ".pem 2>&1");
+    }
+
+    /** What curl prints, its own complaints included. */
+    std::vector<std::string> curl(const std::string& options) const {
+        return AgentTest::linesOf("curl --silent --show-error --max-time 30 " + options +
+                                  " https://127.0.0.1:" + std::to_string(_server->port()) + "/cimom 2>&1 || true");
+    }
+
+    std::string trusted() const { return "--cacert " + (_folder / "server.pem").string(); }
+
+    std::string problem() {
+        try {
+            serve();
+        } catch (const Server::ServerError& error) {
+            return error.what();
+        }
+        return "";
+    }
+
+    AgentTest::TemporaryFolder _folder;
+};
+
+TEST_F(TlsTest, servesWithItsCertificate) {
+    serve();
+    EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
+    EXPECT_THAT(curl("--data hello").front(), HasSubstr("self-signed certificate"));
+}
+
+TEST_F(TlsTest, answersALargeRequest) {
+    serve();
+    AgentTest::writeFile(_folder / "body", std::string(1'000'000, 'x'));
+    EXPECT_THAT(curl(trusted() + " --data-binary @" + (_folder / "body").string()),
+                ElementsAre(std::string(1'000'000, 'x')));
+}
+
+TEST_F(TlsTest, survivesClientsThatSpeakNoTls) {
+    serve();
+    HttpClient plain = client();
+    plain.send(post("in the clear"));
+    EXPECT_THAT(plain.receiveAll(), testing::Not(HasSubstr("HTTP")));
+    EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
+}
+
+TEST_F(TlsTest, closesAConnectionOnWhichNothingComes) {
+    _settings.limits.idleTime = 500ms;
+    serve();
+    HttpClient silent = client();
+    EXPECT_EQ(silent.receiveAll(), "");
+}
+
+TEST_F(TlsTest, doesNotStartWithoutAFile) {
+    _settings.tls->key = "/nowhere/key";
+    EXPECT_EQ(problem(), "/nowhere/key: cannot be read, expected a file in PEM");
+    _settings.tls->certificate = "/dev/null";
+    EXPECT_EQ(problem(), "/dev/null: cannot be read, expected a file in PEM");
+}
+
+TEST_F(TlsTest, doesNotStartWithAKeyOfAnotherCertificate) {
+    makeKey("other");
+    _settings.tls->key = _folder / "other.key";
+    EXPECT_THAT(problem(), StartsWith("cannot serve with the certificate " + (_folder / "server.pem").string() +
+                                      " and the key " + (_folder / "other.key").string() + ": "));
+}
+
+} // namespace
+} // namespace ServerTest

@@ -47,6 +47,15 @@ constexpr std::size_t readBeyondLimit = 4;
 /** How often it is looked for what is overdue. */
 constexpr std::chrono::milliseconds watchInterval{250};
 
+/** Threads that wait for clients. */
+constexpr unsigned int clientThreads = 2;
+
+/**
+ * Where an answer takes less, handing it to a worker would cost more than it. Clients that keep a connection ask for
+ * the same again and again: the last answer tells what the next one takes.
+ */
+constexpr std::chrono::microseconds quickAnswer{500};
+
 constexpr const char* tlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2";
 
 /** The text without what would break or forge lines of a log. */
@@ -116,6 +125,13 @@ HttpReply unauthorized(const std::string& text) {
     return reply;
 }
 
+/** What requests that take about the same time have in common: the operation that they ask for. */
+std::string_view kindOf(const CimXml::HttpRequest& request) {
+    const auto header = std::find_if(request.headers.begin(), request.headers.end(),
+                                     [](const auto& each) { return equalNames(each.first, "CIMMethod"); });
+    return header == request.headers.end() ? std::string_view() : header->second;
+}
+
 /** What a reply of the handler says about the request. */
 std::string problemOf(const HttpReply& reply) {
     const auto error = std::find_if(reply.headers.begin(), reply.headers.end(),
@@ -180,6 +196,8 @@ private:
     void logIn(Exchange& exchange, const std::string& user, const std::string& password);
     MHD_Result receive(Exchange& exchange, const char* data, std::size_t size);
     MHD_Result work(Exchange& exchange);
+    static bool isQuick(const Exchange& exchange);
+    void answer(Exchange& exchange);
     MHD_Result suspend(Exchange& exchange, Step step, Workers& workers, Workers::Task task);
     static void refuse(Exchange& exchange, unsigned int status, const std::string& problem);
     MHD_Result send(Exchange& exchange);
@@ -249,6 +267,7 @@ void HttpServer::Implementation::start(int listener) {
                                MHD_OPTION_NOTIFY_COMPLETED, &onCompleted, this,                                  //
                                MHD_OPTION_CONNECTION_MEMORY_LIMIT, 2 * limits.headerBytes,                       //
                                MHD_OPTION_CONNECTION_LIMIT, limits.connections + surplusConnections,             //
+                               MHD_OPTION_THREAD_POOL_SIZE, clientThreads,                                       //
                                MHD_OPTION_CONNECTION_TIMEOUT, static_cast<unsigned int>(answerTime.count()) + 1, //
                                MHD_OPTION_ARRAY, _settings.tls ? tlsOptions.data() : noOptions.data(),           //
                                MHD_OPTION_END);
@@ -299,7 +318,7 @@ void HttpServer::Implementation::watch() {
     }
 }
 
-/* What the library calls. It does so from one thread. */
+/* What the library calls. For a connection it does so from one thread. */
 
 Connections::Connection& HttpServer::Implementation::connectionOf(MHD_Connection* http) {
     return *static_cast<Connections::Connection*>(
@@ -474,10 +493,27 @@ MHD_Result HttpServer::Implementation::work(Exchange& exchange) {
     };
     MHD_get_connection_values(exchange.http, MHD_HEADER_KIND, take, &exchange.request.headers);
     exchange.request.body = exchange.body;
+    if (isQuick(exchange)) {
+        _connections.enter(exchange.connection, State::answering);
+        answer(exchange);
+        return send(exchange);
+    }
     return suspend(exchange, Step::working, _workers, [this, &exchange] {
-        exchange.reply = _handler(exchange.request, exchange.caller);
+        answer(exchange);
         MHD_resume_connection(exchange.http);
     });
+}
+
+bool HttpServer::Implementation::isQuick(const Exchange& exchange) {
+    const Connections::Connection& connection = exchange.connection;
+    return connection.lastAnswerTime < quickAnswer && connection.lastKind == kindOf(exchange.request);
+}
+
+void HttpServer::Implementation::answer(Exchange& exchange) {
+    const auto begin = Clock::now();
+    exchange.reply = _handler(exchange.request, exchange.caller);
+    exchange.connection.lastKind = kindOf(exchange.request);
+    exchange.connection.lastAnswerTime = Clock::now() - begin;
 }
 
 MHD_Result HttpServer::Implementation::suspend(Exchange& exchange, Step step, Workers& workers, Workers::Task task) {

@@ -136,7 +136,7 @@ std::string_view kindOf(const CimXml::HttpRequest& request) {
 std::string problemOf(const HttpReply& reply) {
     const auto error = std::find_if(reply.headers.begin(), reply.headers.end(),
                                     [](const auto& header) { return equalNames(header.first, "CIMError"); });
-    return error == reply.headers.end() ? "the request is refused" : error->second;
+    return error == reply.headers.end() ? MHD_get_reason_phrase_for(reply.status) : error->second;
 }
 
 } // namespace

@@ -8,7 +8,10 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
+#include <csignal>
 #include <system_error>
+#include <thread>
 #include <utility>
 
 namespace OrvcimTest {
@@ -88,33 +91,85 @@ std::vector<char*> pointersTo(std::vector<std::string>& texts) {
 
 } // namespace
 
-Outcome runProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
-                   const std::optional<std::string>& typed) {
-    const Descriptor out(memfd_create("out", MFD_CLOEXEC));
-    const Descriptor err(memfd_create("err", MFD_CLOEXEC));
-    const Descriptor nothing(open("/dev/null", O_RDONLY | O_CLOEXEC));
-    std::optional<Terminal> terminal;
-    if (typed) {
-        terminal.emplace(*typed);
+class RunningProcess::Files {
+public:
+    explicit Files(const std::optional<std::string>& typed) {
+        if (typed) {
+            _terminal.emplace(*typed);
+        }
     }
+
+    int input() const { return _terminal ? _terminal->screen() : _nothing.number(); }
+
+    const Descriptor out{memfd_create("out", MFD_CLOEXEC)};
+    const Descriptor err{memfd_create("err", MFD_CLOEXEC)};
+
+private:
+    const Descriptor _nothing{open("/dev/null", O_RDONLY | O_CLOEXEC)};
+    std::optional<Terminal> _terminal;
+};
+
+RunningProcess::RunningProcess(const std::vector<std::string>& arguments,
+                               const std::map<std::string, std::string>& environment,
+                               const std::optional<std::string>& typed)
+    : _files(std::make_unique<Files>(typed)) {
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_adddup2(&actions, terminal ? terminal->screen() : nothing.number(), STDIN_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, out.number(), STDOUT_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, err.number(), STDERR_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, _files->input(), STDIN_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, _files->out.number(), STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, _files->err.number(), STDERR_FILENO);
 
     std::vector<std::string> argumentTexts = arguments;
     std::vector<std::string> environmentTexts = environmentWith(environment);
-    pid_t process = -1;
-    const int error = posix_spawn(&process, arguments.front().c_str(), &actions, nullptr,
-                                  pointersTo(argumentTexts).data(), pointersTo(environmentTexts).data());
+    const int error = posix_spawnp(&_process, arguments.front().c_str(), &actions, nullptr,
+                                   pointersTo(argumentTexts).data(), pointersTo(environmentTexts).data());
     posix_spawn_file_actions_destroy(&actions);
     if (error != 0) {
         throw std::system_error(error, std::generic_category(), arguments.front());
     }
+}
+
+RunningProcess::~RunningProcess() {
+    if (_process >= 0) {
+        kill(_process, SIGKILL);
+        waitpid(_process, nullptr, 0);
+    }
+}
+
+std::string RunningProcess::firstLine() const {
+    siginfo_t ended{};
+    while (true) {
+        const bool running =
+            waitid(P_PID, static_cast<id_t>(_process), &ended, WEXITED | WNOHANG | WNOWAIT) == 0 && ended.si_pid == 0;
+        const std::string text = _files->out.content();
+        if (const std::size_t end = text.find('\n'); end != std::string::npos) {
+            return text.substr(0, end);
+        }
+        if (!running) {
+            return "";
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds{2});
+    }
+}
+
+std::string RunningProcess::err() const {
+    return _files->err.content();
+}
+
+void RunningProcess::send(int signal) const {
+    require(kill(_process, signal) == 0, "kill");
+}
+
+Outcome RunningProcess::wait() {
     int status = 0;
-    require(waitpid(process, &status, 0) == process, "waitpid");
-    return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, out.content(), err.content()};
+    require(waitpid(_process, &status, 0) == _process, "waitpid");
+    _process = -1;
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, _files->out.content(), _files->err.content()};
+}
+
+Outcome runProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
+                   const std::optional<std::string>& typed) {
+    return RunningProcess(arguments, environment, typed).wait();
 }
 
 } // namespace OrvcimTest

@@ -4,7 +4,10 @@
 #ifndef TESTS_ORVCIM_PROCESS_H
 #define TESTS_ORVCIM_PROCESS_H
 
+#include <sys/types.h>
+
 #include <map>
+#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
@@ -18,14 +21,36 @@ struct Outcome {
     std::string err;
 };
 
-/**
- * Runs a program to its end.
- *
- * @param arguments the program's file first.
- * @param environment variables that are set for it, beside those of this process.
- * @param typed what a person types at its terminal; where it is not given, standard input is no terminal and empty.
- * @throws std::system_error where it cannot be started.
- */
+/** A program that runs until it ends, by itself or because it is told to. Killed with the object. */
+class RunningProcess {
+public:
+    /**
+     * @param arguments the program's file first.
+     * @param environment variables that are set for it, beside those of this process.
+     * @param typed what a person types at its terminal; where it is not given, standard input is no terminal and empty.
+     * @throws std::system_error where it cannot be started.
+     */
+    RunningProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
+                   const std::optional<std::string>& typed = std::nullopt);
+    RunningProcess(const RunningProcess&) = delete;
+    RunningProcess& operator=(const RunningProcess&) = delete;
+    ~RunningProcess();
+
+    /** Waits until it has written a line to its standard output. @return empty where it ended before. */
+    std::string firstLine() const;
+    /** What it has written to its standard error so far. */
+    std::string err() const;
+    void send(int signal) const;
+    /** Waits for its end. */
+    Outcome wait();
+
+private:
+    class Files;
+    std::unique_ptr<Files> _files;
+    pid_t _process = -1;
+};
+
+/** Runs a program to its end, as `RunningProcess` starts it. */
 Outcome runProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
                    const std::optional<std::string>& typed = std::nullopt);
 

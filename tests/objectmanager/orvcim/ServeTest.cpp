@@ -1,0 +1,190 @@
+/* The server as a program: whom it serves where, and how it begins and ends. */
+#include "Orvcim.h"
+#include "Serving.h"
+
+#include <gmock/gmock.h>
+
+#include <cstdlib>
+#include <ostream>
+
+namespace OrvcimTest {
+namespace {
+
+using testing::EndsWith;
+using testing::HasSubstr;
+using testing::MatchesRegex;
+using testing::StartsWith;
+
+class ServeTest : public ServingTest {
+protected:
+    Outcome refused(std::vector<std::string> options) const {
+        options.emplace_back("--port=0");
+        return start(options)->wait();
+    }
+
+    std::string ask(const std::string& options) const {
+        return runProcess({"sh", "-c", "curl --silent --show-error --max-time 30 " + options}, {}).out;
+    }
+};
+
+TEST_F(ServeTest, saysWhereItListensAndEndsOnASignal) {
+    for (const int signal : {SIGTERM, SIGINT}) {
+        serve();
+        _server->send(signal);
+        const Outcome outcome = _server->wait();
+        EXPECT_EQ(outcome.status, 0);
+        EXPECT_THAT(outcome.out, MatchesRegex("Listening on http://127.0.0.1:[1-9][0-9]*\n"));
+        EXPECT_EQ(outcome.err, "");
+    }
+}
+
+TEST_F(ServeTest, listensOnIpv6) {
+    serve({"--listen", "::1"});
+    EXPECT_THAT(_server->firstLine(), StartsWith("Listening on http://[::1]:"));
+}
+
+TEST_F(ServeTest, isNotReachedByOtherMachinesWithoutTlsAndLogIns) {
+    const std::vector<std::string> tls = {"--tls-cert=/dev/null", "--tls-key=/dev/null"};
+    for (const std::string address : {"0.0.0.0", "::", "192.0.2.1", "2001:db8::1", "::ffff:127.0.0.1"}) {
+        for (std::vector<std::string> options :
+             {std::vector<std::string>{}, std::vector<std::string>{"--authenticate"}, tls}) {
+            options.push_back("--listen=" + address);
+            const Outcome outcome = refused(options);
+            EXPECT_EQ(outcome.err, "orvcim: other machines can reach " + address +
+                                       ": expected --tls-cert, --tls-key and --authenticate, or a loopback address\n");
+            EXPECT_EQ(outcome.out, "");
+            EXPECT_EQ(outcome.status, 2);
+        }
+    }
+    const Outcome both = refused({"--listen=0.0.0.0", "--authenticate", "--tls-cert=/dev/null", "--tls-key=/dev/null"});
+    EXPECT_EQ(both.err, "orvcim: there is no group orv-power, so nobody is in it\n"
+                        "orvcim: /dev/null: cannot be read, expected a file in PEM\n");
+    EXPECT_EQ(both.status, 1);
+}
+
+TEST_F(ServeTest, doesNotServeAMachineThatMayBeRealWithoutLogIns) {
+    for (const char* machine : {"real", "silent"}) {
+        const Outcome outcome = OrvcimTest::orvcim({"serve", "--port=0"}, {{"ORVCIM_TEST_MACHINE", machine}});
+        EXPECT_EQ(outcome.err, "orvcim: the machine is not known to be a simulated one: expected --authenticate, so "
+                               "that not everybody on it can switch it off\n");
+        EXPECT_EQ(outcome.out, "");
+        EXPECT_EQ(outcome.status, 1);
+    }
+    RunningProcess server({ORVCIM_PROGRAM, "--schema", ORVCIM_TEST_SCHEMA, "--provider-path", ORVCIM_TEST_LIBRARIES,
+                           "serve", "--port=0", "--authenticate", "--power-group=daemon"},
+                          {{"ORVCIM_TEST_MACHINE", "real"}});
+    EXPECT_THAT(server.firstLine(), StartsWith("Listening on http://127.0.0.1:"));
+}
+
+TEST_F(ServeTest, tellsWhyTheMachineIsNotKnown) {
+    std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
+    const Outcome outcome = refused({});
+    EXPECT_THAT(outcome.err, HasSubstr("orvcim: the machine is not known to be a simulated one; the agent logged: " +
+                                       (_folder / "agent.toml").string() + ":2: "));
+    EXPECT_EQ(outcome.status, 1);
+}
+
+struct Usage {
+    std::vector<std::string> options;
+    std::string message;
+};
+
+TEST_F(ServeTest, saysWhatIsWrongWithTheCommandLine) {
+    const Usage cases[] = {
+        {{"--tls-cert=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
+        {{"--tls-key=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
+        {{"--max-body=0"}, "orvcim: --max-body: "},
+        {{"--idle-time=0"}, "orvcim: --idle-time: "},
+        {{"--port=70000"}, "orvcim: "},
+        {{"--max-connections=1000000000"}, "orvcim: found --max-connections 1000000000, expected "},
+    };
+    for (const Usage& usage : cases) {
+        const Outcome outcome = refused(usage.options);
+        EXPECT_THAT(outcome.err, StartsWith(usage.message)) << usage.options.front();
+        EXPECT_EQ(outcome.status, 2) << usage.options.front();
+    }
+    EXPECT_THAT(refused({"--listen=localhost"}).err,
+                "orvcim: found the address \"localhost\", expected an IPv4 or IPv6 address in numbers\n");
+}
+
+TEST_F(ServeTest, saysWhereItCannotListen) {
+    serve();
+    const Outcome outcome = start({"--port", _port})->wait();
+    EXPECT_EQ(outcome.err, "orvcim: cannot listen on 127.0.0.1:" + _port + ": Address already in use\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST_F(ServeTest, logsABadRequestInOneLine) {
+    serve();
+    EXPECT_EQ(ask("--output /dev/null --write-out '%{http_code}' " + url("")), "405");
+    EXPECT_EQ(
+        ask("--data '<CIM' --header 'Content-Type: application/xml' --header 'CIMOperation: MethodCall' --output /dev/null --write-out "
+            "'%{http_code} %header{CIMError}' " +
+            url("")),
+        "400 request-not-well-formed");
+    _server->send(SIGTERM);
+    const std::string err = _server->wait().err;
+    EXPECT_EQ(err, "orvcim: 127.0.0.1: answered 405: Method Not Allowed\n"
+                   "orvcim: 127.0.0.1: answered 400: request-not-well-formed\n");
+}
+
+TEST_F(ServeTest, takesLimitsFromTheCommandLine) {
+    serve({"--max-body=100", "--max-headers=1000", "--request-time=0.3", "--idle-time=0.3"});
+    const auto statusOf = [this](const std::string& options) {
+        return ask(options + " --output /dev/null --write-out '%{http_code}' " + url(""));
+    };
+    EXPECT_EQ(statusOf("--data " + std::string(101, 'x')), "413");
+    EXPECT_EQ(statusOf("--data x --header 'X: " + std::string(1000, 'x') + "'"), "431");
+    // A body that is announced and does not come.
+    EXPECT_EQ(statusOf("--data x --header 'Content-Length: 50'"), "408");
+}
+
+/* Who may do what. */
+
+TEST_F(ServeTest, letsUsersDoWhatTheirGroupsMay) {
+    serve({"--authenticate", "--pam-folder", makeUsers(), "--power-group", "daemon"});
+    const std::string request = "RequestPowerStateChange.PowerState=5,ManagedElement=" + _system;
+    const std::string className = "root/cimv2:TALVO_ComputerSystem";
+
+    const Outcome nobody = wbemcli({"ein", url(className, "nobody:small")});
+    EXPECT_THAT(nobody.out, HasSubstr("machine.example"));
+    EXPECT_EQ(nobody.status, 0);
+    const Outcome denied = wbemcli({"cm", url(_service, "nobody:small"), request});
+    EXPECT_THAT(denied.err + denied.out, HasSubstr("CIM_ERR_ACCESS_DENIED"));
+    EXPECT_NE(denied.status, 0);
+    const Outcome done = wbemcli({"cm", url(_service, "root:top"), request});
+    EXPECT_THAT(done.out, EndsWith("RequestPowerStateChange: 0\n"));
+
+    EXPECT_THAT(wbemcli({"ein", url(className)}).err, HasSubstr("Username/password required"));
+    for (const char* user : {"nobody:large", "stranger:small"}) {
+        EXPECT_THAT(wbemcli({"ein", url(className, user)}).err, HasSubstr("Invalid username/password")) << user;
+    }
+    EXPECT_EQ(_server->err(), "orvcim: 127.0.0.1: log-in as \"nobody\" failed: Authentication failure\n"
+                              "orvcim: 127.0.0.1: log-in as \"stranger\" failed: Authentication failure\n");
+}
+
+TEST_F(ServeTest, letsOnlyAGroupReadWhereItIsToldTo) {
+    serve({"--authenticate", "--pam-folder", makeUsers(), "--power-group", "daemon", "--read-group", "bin"});
+    const Outcome denied = wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", "nobody:small")});
+    EXPECT_THAT(denied.err + denied.out, HasSubstr("CIM_ERR_ACCESS_DENIED"));
+    EXPECT_EQ(wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", "root:top")}).status, 0);
+}
+
+TEST_F(ServeTest, servesWithTls) {
+    const std::string base = (_folder / "server").string();
+    ASSERT_EQ(runProcess({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-noenc",
+                          "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost", "-keyout",
+                          base + ".key", "-out", base + ".pem"},
+                         {})
+                  .status,
+              0);
+    serve({"--tls-cert", base + ".pem", "--tls-key", base + ".key", "--authenticate", "--pam-folder", makeUsers(),
+           "--power-group=daemon", "--listen=0.0.0.0"});
+    EXPECT_THAT(_server->firstLine(), StartsWith("Listening on https://0.0.0.0:"));
+    const std::string system = url("root/cimv2:TALVO_ComputerSystem", "nobody:small", "https");
+    EXPECT_THAT(wbemcli({"ein", "-cacert", base + ".pem", system}).out, HasSubstr("machine.example"));
+    EXPECT_NE(wbemcli({"ein", system}).status, 0);
+}
+
+} // namespace
+} // namespace OrvcimTest

@@ -549,7 +549,8 @@ MHD_Result HttpServer::Implementation::send(Exchange& exchange) {
             body->size(), body->data(), [](void* text) { delete static_cast<std::string*>(text); }, body),
         &MHD_destroy_response);
     for (const auto& [name, value] : reply.headers) {
-        MHD_add_response_header(response.get(), name.c_str(), value.c_str());
+        // The library takes no empty value, for which blanks are another way of writing.
+        MHD_add_response_header(response.get(), name.c_str(), value.empty() ? " " : value.c_str());
     }
     _connections.enter(exchange.connection, State::answering);
     exchange.step = Step::answered;

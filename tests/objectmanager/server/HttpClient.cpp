@@ -134,7 +134,9 @@ Reply HttpClient::receive() {
         const std::size_t colon = _received.find(": ", at);
         std::string name = _received.substr(at, colon - at);
         std::transform(name.begin(), name.end(), name.begin(), [](unsigned char c) { return std::tolower(c); });
-        reply.headers[name] = _received.substr(colon + 2, end - colon - 2);
+        std::string& value = reply.headers[name];
+        value = _received.substr(colon + 2, end - colon - 2);
+        value.erase(value.find_last_not_of(' ') + 1);
         at = end + 2;
     }
     const std::size_t size = std::stoul(reply.headers.at("content-length"));

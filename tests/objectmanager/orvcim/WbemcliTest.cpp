@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <fstream>
 #include <regex>
 #include <sstream>
 #include <thread>
@@ -289,6 +290,39 @@ TEST_F(WbemcliTest, isToldWhyARequestIsRefused) {
         wbemcli({"cm", url(_service), "RequestPowerStateChange.PowerState=2,ManagedElement=" + _system});
     EXPECT_THAT(outcome.err + outcome.out, HasSubstr("Requested Power State change Not Supported"));
     EXPECT_NE(outcome.status, 0);
+}
+
+/** What the guide shows as typed and printed: the lines of its blocks of that kind. */
+std::vector<std::string> guide() {
+    std::ifstream file(ORVCIM_CLIENTS_GUIDE);
+    std::vector<std::string> lines;
+    bool shown = false;
+    for (std::string line; std::getline(file, line);) {
+        if (line.starts_with("```")) {
+            shown = line == "```console";
+        } else if (shown) {
+            lines.push_back(line);
+        }
+    }
+    return lines;
+}
+
+TEST_F(WbemcliTest, doesWhatTheGuideShows) {
+    configure("[[instrumentation.simulated.node]]\npath = \"system\"\n");
+    serve();
+    std::string expected;
+    std::string script = "exec 2>&1\n";
+    for (const std::string& line : guide()) {
+        expected += line + '\n';
+        if (line.starts_with("$ ")) {
+            const std::string command =
+                std::regex_replace(line.substr(2), std::regex("localhost:5988"), "localhost:" + _port);
+            script += "cat <<'TYPED'\n" + line + "\nTYPED\n" + command + '\n';
+        }
+    }
+    ASSERT_NE(expected, "");
+    const std::string shown = runProcess({"bash", "-c", script}, {{"LC_ALL", "C"}}).out;
+    EXPECT_EQ(std::regex_replace(shown, std::regex("localhost:" + _port), "localhost:5988"), expected);
 }
 
 } // namespace

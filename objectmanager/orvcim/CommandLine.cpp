@@ -2,6 +2,7 @@
 
 #include "dispatch/AgentLog.h"
 #include "orvcim/Commands.h"
+#include "orvcim/ServeOptions.h"
 #include "text/ObjectPathText.h"
 #include "text/StatusText.h"
 
@@ -10,7 +11,6 @@
 #include <fmt/ranges.h>
 
 #include <algorithm>
-#include <chrono>
 #include <iostream>
 #include <map>
 
@@ -35,19 +35,15 @@ public:
         objectCommands();
         associationCommands();
         powerCommands();
-#ifdef ORVCIM_SERVES
-        serveCommand();
-#endif
+        if constexpr (ORVCIM_SERVES != 0) {
+            addServeOptions(add(_app, "serve", "Answer WBEM clients on the network", serve), _options.serve);
+        }
         add(_app, "check", "Say which providers load and what the agent can do, and what is wrong or missing",
             checkProviders);
     }
 
-    CLI::App& app() {
-        return _app;
-    }
-    const Options& options() const {
-        return _options;
-    }
+    CLI::App& app() { return _app; }
+    const Options& options() const { return _options; }
 
     /** @throws UsageError where the command line has none. */
     Command command() const {
@@ -118,71 +114,6 @@ private:
         addPowerRequest(add(power, "reboot", "Reboot the machine", powerReboot));
         addPowerRequest(add(power, "shutdown", "Shut the machine down", powerShutdown));
     }
-
-#ifdef ORVCIM_SERVES
-    void serveCommand() {
-        ServeOptions& serveOptions = _options.serve;
-        Server::Settings& server = serveOptions.server;
-        Server::Limits& limits = server.limits;
-        CLI::App& command = add(_app, "serve", "Answer WBEM clients on the network", serve);
-        command.add_option("--listen", server.address, "Address to listen on")
-            ->type_name("ADDRESS")
-            ->capture_default_str();
-        command.add_option("--port", serveOptions.port, "Port to listen on, 0 for any (default: 5988, with TLS 5989)")
-            ->type_name("PORT");
-        command.add_option("--tls-cert", serveOptions.certificate, "Serve with TLS: file of the certificate, in PEM")
-            ->type_name("FILE");
-        command.add_option("--tls-key", serveOptions.key, "File of the certificate's key, in PEM")->type_name("FILE");
-        command.add_flag("--authenticate", serveOptions.authenticate, "Clients have to log in, as PAM decides");
-        addText(command, "--pam-service", serveOptions.pam.service, "PAM's service", "NAME");
-        command.add_option("--pam-folder", serveOptions.pam.folder, "Folder of PAM's services, not the system's")
-            ->type_name("DIR");
-        addText(command, "--read-group", serveOptions.pam.readGroup, "Whose members may read (default: who can log in)",
-                "GROUP");
-        addText(command, "--power-group", serveOptions.pam.powerGroup,
-                "Whose members may read and change the power state, beside root", "GROUP");
-        command.add_flag("--syslog", serveOptions.syslog, "Log to the system's log, not to standard error");
-        addCount(command, "--threads", server.threads, "Requests served at a time");
-        addCount(command, "--max-body", limits.bodyBytes, "Bytes of a request's body");
-        addCount(command, "--max-headers", limits.headerBytes, "Bytes of a request's headers");
-        addCount(command, "--max-connections", limits.connections, "Connections at a time");
-        addCount(command, "--max-connections-per-address", limits.connectionsPerAddress, "Connections of one client");
-        addTime(command, "--request-time", limits.requestTime, "Seconds in which a request has to arrive");
-        addTime(command, "--idle-time", limits.idleTime, "Seconds after which an idle connection is closed");
-    }
-
-    static void addText(CLI::App& subcommand, const std::string& option, std::string& value,
-                        const std::string& description, const std::string& type) {
-        subcommand.add_option(option, value, description)->type_name(type)->capture_default_str();
-    }
-
-    template <class Count>
-    static void addCount(CLI::App& subcommand, const std::string& option, Count& value,
-                         const std::string& description) {
-        constexpr int least = 1;
-        constexpr int most = 1'000'000'000;
-        subcommand.add_option(option, value, description)
-            ->check(CLI::Range(least, most).description(""))
-            ->type_name("N")
-            ->capture_default_str();
-    }
-
-    static void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milliseconds& value,
-                        const std::string& description) {
-        constexpr double least = 0.1;
-        constexpr double most = 86'400;
-        subcommand
-            .add_option_function<double>(
-                option,
-                [&value](double seconds) {
-                    value = std::chrono::round<std::chrono::milliseconds>(std::chrono::duration<double>(seconds));
-                },
-                description)
-            ->check(CLI::Range(least, most).description(""))
-            ->type_name("SECONDS")
-            ->default_str(fmt::format("{}", std::chrono::duration<double>(value).count()));
-    }
-#endif
 
     CLI::App& add(CLI::App& parent, const std::string& name, const std::string& description, Command toDo) {
         CLI::App& subcommand = *parent.add_subcommand(name, description);

@@ -6,14 +6,12 @@
 
 #include "dispatch/Dispatcher.h"
 #include "dispatch/LogTap.h"
+#include "orvcim/ServeOptions.h"
 #include "schema/Catalogue.h"
-#include "server/Settings.h"
 #include "text/Writer.h"
 
-#include <cstdint>
 #include <filesystem>
 #include <memory>
-#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -24,21 +22,6 @@ namespace ObjectManager::Orvcim {
 
 /** The class whose instances are what the machine's power is managed by. */
 inline constexpr const char* powerServiceClass = "TALVO_PowerManagementService";
-
-/** What `serve` is asked for. */
-struct ServeOptions {
-    /** Its port is that of the protocol where none is asked for. */
-    Server::Settings server;
-    std::optional<std::uint16_t> port;
-    /** Empty where there is no TLS. */
-    std::filesystem::path certificate;
-    std::filesystem::path key;
-    /** Clients have to log in. */
-    bool authenticate = false;
-    Server::PamSettings pam;
-    /** Log to the system's log rather than to standard error. */
-    bool syslog = false;
-};
 
 /** The command line. */
 struct Options {

@@ -121,29 +121,25 @@ TEST_P(MistakeTest, getsOneClearLineAndItsStatus) {
     EXPECT_EQ(outcome.status, GetParam().status);
 }
 
+const std::string noCommand =
+    "found no command, expected one of classes, names, instances, get, invoke, associators, associator-names, "
+    "references, reference-names, graph, power status, power reboot, power shutdown, " +
+    std::string(ORVCIM_SERVES ? "serve, check" : "check");
+
 INSTANTIATE_TEST_SUITE_P(
     ofTheCommandLine, MistakeTest,
-    testing::Values(
-        Mistake{
-            {},
-            2,
-            "found no command, expected one of classes, names, instances, get, invoke, associators, associator-names, "
-            "references, reference-names, graph, power status, power reboot, power shutdown, check"},
-        Mistake{
-            {"power"},
-            2,
-            "found no command, expected one of classes, names, instances, get, invoke, associators, associator-names, "
-            "references, reference-names, graph, power status, power reboot, power shutdown, check"},
-        Mistake{{"names"}, 2, "CLASS is required (orvcim --help tells what can be done)"},
-        Mistake{{"nonsense"},
-                2,
-                "The following argument was not expected: nonsense (orvcim --help tells what can be done)"},
-        Mistake{{"classes", "--format", "xml"},
-                2,
-                "--format: xml not in {json,mof,table} (orvcim --help tells what can be done)"},
-        Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
-        Mistake{
-            {"graph", "--format", "json"}, 2, "found --format, expected none: graph writes DOT, or SVG with --svg"}));
+    testing::Values(Mistake{{}, 2, noCommand}, Mistake{{"power"}, 2, noCommand},
+                    Mistake{{"names"}, 2, "CLASS is required (orvcim --help tells what can be done)"},
+                    Mistake{{"nonsense"},
+                            2,
+                            "The following argument was not expected: nonsense (orvcim --help tells what can be done)"},
+                    Mistake{{"classes", "--format", "xml"},
+                            2,
+                            "--format: xml not in {json,mof,table} (orvcim --help tells what can be done)"},
+                    Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
+                    Mistake{{"graph", "--format", "json"},
+                            2,
+                            "found --format, expected none: graph writes DOT, or SVG with --svg"}));
 
 INSTANTIATE_TEST_SUITE_P(
     ofNames, MistakeTest,

@@ -1,8 +1,8 @@
 #include "ConfigurationWatch.h"
 
+#include "CoarseClock.h"
 #include "Configuration.h"
 
-#include <ctime>
 #include <utility>
 
 #include <sys/stat.h>
@@ -12,27 +12,23 @@ namespace Norv::Agent {
 namespace {
 
 constexpr std::int64_t interval = 1000;
-
-// Coarse is exact enough, and costs a fraction.
-std::int64_t milliseconds() {
-    timespec now{};
-    clock_gettime(CLOCK_MONOTONIC_COARSE, &now);
-    return std::int64_t{now.tv_sec} * 1000 + now.tv_nsec / 1'000'000;
-}
+// More than file systems need to tell two changes apart, and less than the time until the next look.
+constexpr std::chrono::milliseconds exactness{900};
 
 } // namespace
 
 ConfigurationWatch::ConfigurationWatch()
-    : _file(configurationFile()), _next(milliseconds() + interval), _known(signature()) {}
+    : _file(configurationFile()), _next(coarseMilliseconds() + interval), _known(signature()),
+      _recent(isRecent(_known)) {}
 
 bool ConfigurationWatch::isDue() const {
-    return milliseconds() >= _next.load(std::memory_order_relaxed);
+    return coarseMilliseconds() >= _next.load(std::memory_order_relaxed);
 }
 
 bool ConfigurationWatch::look() {
-    _next.store(milliseconds() + interval, std::memory_order_relaxed);
+    _next.store(coarseMilliseconds() + interval, std::memory_order_relaxed);
     const std::optional<Signature> former = std::exchange(_known, signature());
-    return former != _known;
+    return std::exchange(_recent, isRecent(_known)) || former != _known;
 }
 
 std::optional<ConfigurationWatch::Signature> ConfigurationWatch::signature() const {
@@ -42,6 +38,10 @@ std::optional<ConfigurationWatch::Signature> ConfigurationWatch::signature() con
     }
     return Signature{status.st_dev, status.st_ino, status.st_size,
                      std::chrono::seconds(status.st_mtim.tv_sec) + std::chrono::nanoseconds(status.st_mtim.tv_nsec)};
+}
+
+bool ConfigurationWatch::isRecent(const std::optional<Signature>& signature) {
+    return signature && std::chrono::system_clock::now().time_since_epoch() - signature->modified < exactness;
 }
 
 } // namespace Norv::Agent

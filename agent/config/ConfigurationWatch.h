@@ -22,8 +22,9 @@ public:
     ConfigurationWatch();
 
     /**
-     * Has `action` act where the file has changed since the last time, or since the beginning. Only one thread at a
-     * time does so; others go on meanwhile, and so does `action` where it comes here itself.
+     * Has `action` act where the file has changed since the last time, or since the beginning, and once more where that
+     * was so recent that another change could look the same. Only one thread at a time does so; others go on meanwhile,
+     * and so does `action` where it comes here itself.
      */
     void onChange(const auto& action) {
         if (!isDue() || _looking.test_and_set(std::memory_order_acquire)) {
@@ -58,17 +59,19 @@ private:
     };
 
     bool isDue() const;
-    /** Looks at the file. @return whether it is another one than the last time. */
+    /** Looks at the file. @return whether it is, or may be, another one than the last time. */
     bool look();
     std::optional<Signature> signature() const;
+    static bool isRecent(const std::optional<Signature>& signature);
 
     const std::string _file;
     /** When to look again, in milliseconds of a clock of its own. */
     std::atomic<std::int64_t> _next;
     /** Set while a thread looks. */
     std::atomic_flag _looking;
-    /** Belongs to the thread that looks. */
+    // These belong to the thread that looks.
     std::optional<Signature> _known;
+    bool _recent;
 };
 
 } // namespace Norv::Agent

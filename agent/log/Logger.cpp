@@ -51,6 +51,7 @@ private:
     void renewThresholds() {
         try {
             const auto configuration = Norv::Agent::loadConfiguration();
+            _mistake.clear();
             const Thresholds thresholds(configuration.log);
             if (thresholds == _generations.front()) {
                 return;
@@ -59,7 +60,9 @@ private:
             _thresholds.store(&_generations.front(), std::memory_order_release);
             report(ownRecord(Norv::Agent::configurationFile() + " has changed: its thresholds hold from now on"));
         } catch (const Norv::Agent::ConfigurationError& error) {
-            report(ownRecord(std::string(error.what()) + ": the former thresholds go on to hold"));
+            if (std::exchange(_mistake, error.what()) != error.what()) {
+                report(ownRecord(_mistake + ": the former thresholds go on to hold"));
+            }
         }
     }
 
@@ -111,6 +114,8 @@ private:
     /** The newest first. Those before stay, since other threads may be reading them. */
     std::forward_list<Thresholds> _generations;
     std::atomic<const Thresholds*> _thresholds;
+    /** What was wrong in the file at the last look, and was reported; empty where nothing was. */
+    std::string _mistake;
     const RecordSocket _socket;
     const std::unique_ptr<Destination> _destination;
     Gate _gate;

@@ -1,4 +1,5 @@
 #include "config/Configuration.h"
+#include "config/ConfigurationWatch.h"
 
 #include "TestSupport.h"
 
@@ -8,6 +9,7 @@
 #include <filesystem>
 #include <sstream>
 #include <string>
+#include <thread>
 
 #include <unistd.h>
 
@@ -179,6 +181,37 @@ TEST_F(ConfigurationTest, TheBackendLogindCanBeChosenWhereItIsBuiltIn) {
         EXPECT_EQ(errorOf(text), file.string() + ":2: instrumentation.backend: \"logind\": expected \"simulated\": "
                                                  "backend logind is not built in");
     }
+}
+
+/** Whether a watch tells of a change within a few seconds. */
+bool tellsOfAChange(Norv::Agent::ConfigurationWatch& watch) {
+    bool told = false;
+    for (int i = 0; i < 300 && !told; ++i) {
+        std::this_thread::sleep_for(milliseconds{10});
+        watch.onChange([&told] { told = true; });
+    }
+    return told;
+}
+
+TEST_F(ConfigurationTest, AChangeIsToldOnce) {
+    writeFile(file, "log.level = 1");
+    std::filesystem::last_write_time(file, std::filesystem::file_time_type::clock::now() - std::chrono::hours{1});
+    Norv::Agent::ConfigurationWatch watch;
+    EXPECT_FALSE(tellsOfAChange(watch));
+    std::filesystem::last_write_time(file, std::filesystem::file_time_type::clock::now() - std::chrono::minutes{1});
+    EXPECT_TRUE(tellsOfAChange(watch));
+    EXPECT_FALSE(tellsOfAChange(watch));
+    std::filesystem::remove(file);
+    EXPECT_TRUE(tellsOfAChange(watch));
+}
+
+TEST_F(ConfigurationTest, AChangeThatLooksLikeTheOneJustBeforeIsTold) {
+    writeFile(file, "log.level = 1");
+    const auto time = std::filesystem::last_write_time(file);
+    Norv::Agent::ConfigurationWatch watch;
+    writeFile(file, "log.level = 2");
+    std::filesystem::last_write_time(file, time);
+    EXPECT_TRUE(tellsOfAChange(watch));
 }
 
 struct WrongFile {

@@ -27,7 +27,10 @@ void writeTrace(int level, const std::string& text, const std::string& category)
 }
 
 void LogProcess::configure(const std::string& text) const {
-    AgentTest::writeFile(configurationFile(), text);
+    // In one piece, for children that are watching.
+    const auto replacement = folder / "agent.toml.new";
+    AgentTest::writeFile(replacement, text);
+    std::filesystem::rename(replacement, configurationFile());
 }
 
 void LogProcess::configureFile(const std::string& more) const {

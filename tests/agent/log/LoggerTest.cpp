@@ -252,6 +252,7 @@ TEST(LoggerTest, ThresholdsMayChangeWhileThreadsWrite) {
     const LogProcess process;
     process.configureFile();
     process.run([&process] {
+        writeLog(1, "first use");
         std::atomic<bool> over = false;
         std::vector<std::thread> threads;
         for (int number = 0; number < 4; ++number) {

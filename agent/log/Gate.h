@@ -5,8 +5,6 @@
 #include <cstdint>
 #include <optional>
 
-#include <sys/types.h>
-
 namespace OrvLog {
 
 /**
@@ -40,12 +38,12 @@ public:
 private:
     void leave();
 
-    /** Threads that are in. */
-    std::atomic<int> _inside = 0;
+    /**
+     * How many threads are in, and in the upper half whose: those that were in do not come along into a child process.
+     */
+    std::atomic<std::uint64_t> _inside = 0;
     /** When a thread came in where nobody was, or got out; in milliseconds of a clock of its own. */
     std::atomic<std::int64_t> _moved = 0;
-    /** Whose threads they are: those that were in do not come along into a child process. */
-    std::atomic<pid_t> _process = 0;
 };
 
 } // namespace OrvLog

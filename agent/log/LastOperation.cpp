@@ -10,10 +10,10 @@ LastOperation& LastOperation::ofThisThread() {
 void LastOperation::remember(const Record& record) {
     _level = record.level;
     _line = record.line;
-    _category = record.category;
-    _function = record.function;
-    _file = record.file;
-    _text = record.text;
+    _category.assign(record.category);
+    _function.assign(record.function);
+    _file.assign(record.file);
+    _text.assign(record.text);
 }
 
 Record LastOperation::record() const {

@@ -44,7 +44,7 @@ private:
     template <std::size_t Capacity>
     class Beginning {
     public:
-        void operator=(std::string_view text) { _size = text.copy(_characters.data(), Capacity); }
+        void assign(std::string_view text) { _size = text.copy(_characters.data(), Capacity); }
         std::string_view view() const { return {_characters.data(), _size}; }
 
     private:

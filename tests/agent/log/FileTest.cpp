@@ -245,6 +245,7 @@ TEST(FileTest, AFileThatMayNotBeWrittenLosesRecords) {
     process.configureFile();
     AgentTest::writeFile(process.file(), "");
     fs::permissions(process.file(), fs::perms::owner_read);
+    fs::permissions(process.folder / "", fs::perms::others_exec, fs::perm_options::add);
     process.run([&process] {
         writeLog(1, "reads the configuration");
         constexpr uid_t nobody = 65534;

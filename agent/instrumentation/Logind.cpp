@@ -33,9 +33,9 @@ std::string textOf(int error) {
     return std::generic_category().message(error);
 }
 
-/** What others say of themselves, without what would break a line or change a terminal. */
+/** What others say, without what would break a line or change a terminal. Null is empty. */
 std::string printable(const char* text) {
-    std::string result(text);
+    std::string result(text == nullptr ? "" : text);
     std::ranges::replace_if(
         result, [](unsigned char character) { return character < 0x20 || character == 0x7f; }, ' ');
     return result;
@@ -50,11 +50,13 @@ public:
 
     sd_bus_error* target() { return &_error; }
 
-    bool isOneOf(const auto& names) const { return std::ranges::find(names, _error.name) != names.end(); }
+    bool isOneOf(const auto& names) const { return std::ranges::find(names, name()) != names.end(); }
 
-    std::string text() const { return std::string(_error.name) + ": " + printable(_error.message); }
+    std::string text() const { return name() + ": " + printable(_error.message); }
 
 private:
+    std::string name() const { return printable(_error.name); }
+
     sd_bus_error _error = SD_BUS_ERROR_NULL;
 };
 

@@ -115,7 +115,9 @@ std::optional<Pending> pendingOn(Logind& logind) {
     // There are others, such as "halt" and "kexec".
     const unsigned int state = transition != transitions.end() ? transition->state : goingDown;
     return Pending{state,
-                   scheduled.type + (preparing ? " is under way" : " is scheduled for " + inUtc(scheduled.time))};
+                   scheduled.type + (preparing ? " is under way"
+                                               : " is scheduled for " +
+                                                     inUtc(std::chrono::floor<std::chrono::seconds>(scheduled.time)))};
 }
 
 /** The lock on a file, held by one process and thread at a time. */
@@ -185,7 +187,7 @@ std::string carryOut(Logind& logind, const Transition& transition, std::chrono::
         }
         throw;
     }
-    return "at " + inUtc(time) + ", in " + inSeconds(delay);
+    return "at " + inUtc(std::chrono::floor<std::chrono::seconds>(time)) + ", in " + inSeconds(delay);
 }
 
 std::string adviceFor(LogindError::Kind kind) {

@@ -2,7 +2,8 @@
 
 #include <array>
 #include <charconv>
-#include <ctime>
+#include <cstddef>
+#include <cstdio>
 
 namespace Norv::Agent {
 
@@ -14,13 +15,15 @@ std::string inSeconds(std::chrono::milliseconds duration) {
     return std::string(begin, end) + " s";
 }
 
-std::string inUtc(std::chrono::system_clock::time_point time) {
-    const std::time_t seconds = std::chrono::system_clock::to_time_t(time);
-    std::tm utc{};
-    ::gmtime_r(&seconds, &utc);
-    std::array<char, 64> text{};
-    const std::size_t size = std::strftime(text.data(), text.size(), "%Y-%m-%dT%H:%M:%SZ", &utc);
-    return {text.data(), size};
+std::string inUtc(std::chrono::sys_seconds time) {
+    const auto day = std::chrono::floor<std::chrono::days>(time);
+    const std::chrono::year_month_day date(day);
+    const std::chrono::hh_mm_ss clock(time - day);
+    std::array<char, 64> text;
+    const int size = std::snprintf(text.data(), text.size(), "%04d-%02u-%02uT%02d:%02d:%02dZ", int(date.year()),
+                                   unsigned(date.month()), unsigned(date.day()), int(clock.hours().count()),
+                                   int(clock.minutes().count()), int(clock.seconds().count()));
+    return {text.data(), static_cast<std::size_t>(size)};
 }
 
 } // namespace Norv::Agent

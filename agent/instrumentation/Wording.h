@@ -13,7 +13,7 @@ namespace Norv::Agent {
 std::string inSeconds(std::chrono::milliseconds duration);
 
 /** A time in UTC: "2026-11-20T12:31:07Z". */
-std::string inUtc(std::chrono::system_clock::time_point time);
+std::string inUtc(std::chrono::sys_seconds time);
 
 /** "9 (reboot) or 12 (shutdown)", from a table of what can be asked for. */
 std::string acceptedStates(const auto& transitions) {

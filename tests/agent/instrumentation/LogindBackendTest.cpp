@@ -139,6 +139,8 @@ INSTANTIATE_TEST_SUITE_P(
                              "poweroff is scheduled for 2026-11-20T12:31:07Z"},
                     UnderWay{"SomethingElseIsScheduled", R"({"ScheduledShutdown": ["halt", 1795177867000000]})", 12,
                              "halt is scheduled for 2026-11-20T12:31:07Z"},
+                    UnderWay{"ItIsScheduledForAnotherAge", R"({"ScheduledShutdown": ["reboot", 253402300799000000]})",
+                             9, "reboot is scheduled for 9999-12-31T23:59:59Z"},
                     UnderWay{"RebootHasBegun",
                              R"({"ScheduledShutdown": ["reboot", 1795177867000000], "PreparingForShutdown": true})", 9,
                              "reboot is under way"},

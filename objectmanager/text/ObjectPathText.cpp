@@ -66,7 +66,7 @@ private:
         const auto length =
             static_cast<std::size_t>(std::find_if_not(rest.begin(), rest.end(), belongs) - rest.begin());
         if (length < rest.size() && rest[length] == ':') {
-            if (length == 0) {
+            if (length == 0 || rest.front() == '/') {
                 fail(found(), "a namespace");
             }
             _path.nameSpace = rest.substr(0, length);

@@ -119,6 +119,7 @@ TEST_F(ObjectPathTextTest, isReportedWithThePositionWhereItIsWrong) {
         {"", "position 1: found the end, expected the name of a class"},
         {"root/cimv2:", "position 12: found the end, expected the name of a class"},
         {":Thing", "position 1: found ':', expected a namespace"},
+        {"//host//root/cimv2:Thing", "position 8: found '/', expected a namespace"},
         {"//", "position 3: found the end, expected a host name"},
         {"//host", "position 7: found the end, expected '/' and a namespace"},
         {"//host/Thing", "position 13: found the end, expected ':' behind the namespace"},

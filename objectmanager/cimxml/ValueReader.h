@@ -57,7 +57,7 @@ public:
 
 private:
     ObjectPath instanceName(const pugi::xml_node& element, const std::string& nameSpace) const;
-    Value keyValue(const pugi::xml_node& keyValue, const Property* declared, const std::string& what) const;
+    Value keyValue(const pugi::xml_node& element, const Property* declared, const std::string& what) const;
     Value array(const pugi::xml_node& element, CMPIType elementType, const std::string& what) const;
     NamedValue property(const pugi::xml_node& element, const Class* declared) const;
     void requireKeys(const ObjectPath& path) const;

@@ -121,7 +121,7 @@ HttpReply textReply(unsigned int status, const std::string& text) {
 
 HttpReply unauthorized(const std::string& text) {
     HttpReply reply = textReply(MHD_HTTP_UNAUTHORIZED, text);
-    reply.headers.emplace_back(MHD_HTTP_HEADER_WWW_AUTHENTICATE, "Basic realm=\"orvcim\", charset=\"UTF-8\"");
+    reply.headers.emplace_back(MHD_HTTP_HEADER_WWW_AUTHENTICATE, R"(Basic realm="orvcim", charset="UTF-8")");
     return reply;
 }
 

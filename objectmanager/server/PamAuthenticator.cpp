@@ -54,8 +54,8 @@ void doNotSleep(int /*result*/, unsigned int /*microseconds*/, void* /*data*/) {
 /** A conversation with PAM. Every call but the constructor's gives PAM's code. */
 class Conversation {
 public:
-    Conversation(const PamSettings& settings, const std::string& user, const std::string& password)
-        : _password(password) {
+    Conversation(const PamSettings& settings, const std::string& user, std::string password)
+        : _password(std::move(password)) {
         const pam_conv conversation{converse, &_password};
         _result = pam_start_confdir(settings.service.c_str(), user.c_str(), &conversation,
                                     settings.folder.empty() ? nullptr : settings.folder.c_str(), &_handle);

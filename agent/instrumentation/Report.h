@@ -13,7 +13,7 @@ namespace Norv::Agent {
 inline constexpr const char* instrumentationCategory = "Corvane.Instrumentation";
 
 /** Levels of the instrumentation's records, beside alwaysWrittenLevel. */
-inline constexpr int informationLevel = 4000;
+inline constexpr int informationLevel = 5000;
 inline constexpr int failureLevel = 6000;
 
 /** Writes a record of kind "log" whose place is the caller's. */

@@ -16,7 +16,8 @@ namespace OrvLog {
 
 namespace {
 
-constexpr int lowestLevel = 4000;
+/** Every operation leaves records below it, which no host has asked for. */
+constexpr int lowestLevel = 5000;
 
 std::optional<int> number(std::string_view text) {
     int value = -1;

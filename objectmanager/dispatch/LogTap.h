@@ -24,7 +24,7 @@ struct LogRecord {
 std::string_view messageOf(std::string_view text);
 
 /**
- * Receives the records of the agent's log library in this process, of level 4000 and above, whatever its thresholds.
+ * Receives the records of the agent's log library in this process, of level 5000 and above, whatever its thresholds.
  *
  * The library learns from the environment variable ORV_AGENT_LOG_SOCKET where to send them, and looks only once: a tap
  * is made before any provider library is loaded, and there is one at most in a process. Records are told apart by the

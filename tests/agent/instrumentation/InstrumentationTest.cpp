@@ -235,7 +235,7 @@ protected:
 
     const TemporaryFolder folder;
     const std::string stateFile = folder / "state.json";
-    const std::string firstUse = "log 4000 Corvane.Instrumentation Power management of a simulated machine (";
+    const std::string firstUse = "log 5000 Corvane.Instrumentation Power management of a simulated machine (";
     const std::string askedByProbe = " [asked by instrumentation_probe, process N, uid N]";
     const std::string twoNodes = "[[instrumentation.simulated.node]]\npath = \"a\"\n"
                                  "[[instrumentation.simulated.node]]\npath = \"b/c\"\n";

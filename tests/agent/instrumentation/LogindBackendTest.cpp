@@ -317,7 +317,7 @@ protected:
         return ElementsAre("refused", StartsWith(notice), refused);
     }
 
-    const std::string notice = "log 4000 Corvane.Instrumentation Power management of this machine through "
+    const std::string notice = "log 5000 Corvane.Instrumentation Power management of this machine through "
                                "systemd-logind (requests take effect after ";
 };
 

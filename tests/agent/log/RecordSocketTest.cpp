@@ -62,16 +62,16 @@ class RecordSocketTest : public testing::TestWithParam<int> {};
 
 INSTANTIATE_TEST_SUITE_P(RecordSocket, RecordSocketTest, testing::Values(SOCK_SEQPACKET, SOCK_DGRAM));
 
-TEST_P(RecordSocketTest, TellsTheHostOfOperationsAndFailuresWhateverTheThresholds) {
+TEST_P(RecordSocketTest, TellsTheHostOfInformationAndFailuresWhateverTheThresholds) {
     const LogProcess process;
     process.run([] {
         const HostSocket socket(GetParam());
-        writeLog(3999, "progress");
-        writeLog(4000, "operation", "Corvane.A");
+        writeLog(4999, "operation");
+        writeLog(5000, "information", "Corvane.A");
         writeLog(6000, "failure\nof two lines", "Corvane.B");
         writeTrace(6000, "trace");
         const std::string thread = std::to_string(gettid());
-        EXPECT_THAT(socket.messages(), ElementsAre(thread + "\n4000\nCorvane.A\noperation",
+        EXPECT_THAT(socket.messages(), ElementsAre(thread + "\n5000\nCorvane.A\ninformation",
                                                    thread + "\n6000\nCorvane.B\nfailure\nof two lines"));
     });
     EXPECT_THAT(textsOf(process.standardError()), ElementsAre("failure\\nof two lines"));
@@ -82,11 +82,11 @@ TEST_P(RecordSocketTest, AHostThatDoesNotListenCostsMessagesAndNothingElse) {
     process.run([] {
         const HostSocket socket(GetParam());
         for (int record = 0; record < 10'000; ++record) {
-            writeLog(4000, "text");
+            writeLog(5000, "text");
         }
         EXPECT_FALSE(socket.messages().empty());
         EXPECT_LT(socket.messages().size(), 10'000U);
-        writeLog(4000, "there again");
+        writeLog(5000, "there again");
         EXPECT_THAT(socket.messages(), ElementsAre(testing::EndsWith("there again")));
     });
 }

@@ -254,7 +254,7 @@ TEST_F(DispatcherTest, AFailureHasTheReasonsThatWereLogged) {
 TEST_F(DispatcherTest, AllRecordsOfARequestCanBeTaken) {
     log.take();
     errorOf([&] { dispatcher.invokeMethod(invocation, path("Test_LeavesOpenAfterFailureLog"), "Format", {}); });
-    EXPECT_THAT(log.take(), ElementsAre(AllOf(Field(&LogRecord::category, "Test.Disk"), Field(&LogRecord::level, 4000),
+    EXPECT_THAT(log.take(), ElementsAre(AllOf(Field(&LogRecord::category, "Test.Disk"), Field(&LogRecord::level, 5000),
                                               Field(&LogRecord::text, "looking for disks")),
                                         Field(&LogRecord::level, 6000), Field(&LogRecord::level, 10000)));
 }

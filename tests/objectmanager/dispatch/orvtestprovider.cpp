@@ -85,7 +85,7 @@ const std::map<std::string, Behaviour> behaviours = {
     {"Test_LeavesOpen", [](const Call&) { return ok; }},
     {"Test_LeavesOpenAfterFailureLog",
      [](const Call&) {
-         logRecord(4000, "looking for disks");
+         logRecord(5000, "looking for disks");
          logRecord(6000, "MESSAGE [File: src/Disk.cpp, Line: 7]: no disk in the bay");
          logRecord(10000, "drive bay is open");
          return ok;

@@ -165,7 +165,7 @@ struct Thing {
 
     static CMPIStatus invoke(const CMPIResult* result, const std::string& method, const CMPIArgs* in, CMPIArgs* out) {
         if (method == "Refuse") {
-            log(4000, "Test", "not a reason");
+            log(5000, "Test", "not a reason");
             log(6000, "Test", "MESSAGE [File: x.cpp, Line: 5]: it is Sunday");
             log(6000, "Test", "and it rains");
             CMReturn(CMPI_RC_OK);
@@ -207,9 +207,9 @@ constexpr const char* instrumentation = "Corvane.Instrumentation";
 struct PowerService {
     static Instances instances(const CMPIObjectPath* request, const char** properties) {
         if (setting("ORVCIM_TEST_MACHINE", "simulated") == "simulated") {
-            log(4000, instrumentation, "Power management of a simulated machine: 1 node, state in nothing");
+            log(5000, instrumentation, "Power management of a simulated machine: 1 node, state in nothing");
         } else {
-            log(4000, "Somewhere.Else", "Power management of a simulated machine: another one");
+            log(5000, "Somewhere.Else", "Power management of a simulated machine: another one");
         }
         Instances result;
         for (int i = 1; i <= std::stoi(setting("ORVCIM_TEST_SERVICES", "1")); ++i) {
@@ -232,7 +232,7 @@ struct PowerService {
         const CMPIObjectPath* system = CMGetArg(in, "ManagedElement", nullptr).value.ref;
         const std::string what = std::to_string(state) + " for " + textOf(CMGetClassName(system, nullptr)) + " " +
                                  keyOf(system, "CreationClassName") + " " + keyOf(system, "Name");
-        log(4000, "Test", "called");
+        log(5000, "Test", "called");
         if (answer == "accepted" || answer == "refused") {
             log(10000, instrumentation, "Power request " + answer + ": " + what);
             return returnNumber(result, 0);

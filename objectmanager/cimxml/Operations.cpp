@@ -38,8 +38,8 @@ bool isRegistered(const Operation& operation, std::string_view className) {
     });
 }
 
-CimError unknownClass(const std::string& className) {
-    return {CMPI_RC_ERR_INVALID_CLASS, "there is no class " + className};
+CimError unknownClass(const std::string& className, CMPIrc code = CMPI_RC_ERR_INVALID_CLASS) {
+    return {code, "there is no class " + className};
 }
 
 /** Throws where nobody serves instances of the class itself, so that there is none. */
@@ -85,10 +85,11 @@ void forEachServed(const Call& call, const ObjectPath& classPath, Do doWith) {
     }
 }
 
-const Class& declaredClass(const Call& call, const std::string& className) {
+/** Throws `unknown` where there is no such class: where the class itself is asked for, DSP0200 has another code. */
+const Class& declaredClass(const Call& call, const std::string& className, CMPIrc unknown = CMPI_RC_ERR_INVALID_CLASS) {
     const Class* declared = call.catalogue().find(className);
     if (declared == nullptr) {
-        throw unknownClass(className);
+        throw unknownClass(className, unknown);
     }
     return *declared;
 }
@@ -329,7 +330,8 @@ void execQuery(const Call& call) {
 
 void getClass(const Call& call) {
     const Selection selection = selectionOfClasses(call);
-    const Class& declared = declaredClass(call, call.parameters.className("ClassName").className);
+    const Class& declared =
+        declaredClass(call, call.parameters.className("ClassName").className, CMPI_RC_ERR_NOT_FOUND);
     call.writer().raw("<IRETURNVALUE>\n");
     call.writer().classDeclaration(declared, selection);
     call.writer().raw("</IRETURNVALUE>\n");

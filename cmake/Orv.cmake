@@ -53,13 +53,24 @@ function(orv_install_manual file)
   install(FILES "${compressed}" DESTINATION "${CMAKE_INSTALL_MANDIR}/man${section}")
 endfunction()
 
-# orv_add_test(NAME SOURCES... LIBRARIES...): a GoogleTest program that ctest runs.
+# orv_add_test(NAME SOURCES... LIBRARIES... [SHARDS N]): a GoogleTest program that ctest runs; with SHARDS, N times with an
+# Nth of its tests, which runs long ones side by side.
 function(orv_add_test name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "SOURCES;LIBRARIES")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "" "SHARDS" "SOURCES;LIBRARIES")
   add_executable(${name} ${arg_SOURCES})
   target_link_libraries(${name} PRIVATE orv_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
-  add_test(NAME ${name} COMMAND ${name})
-  set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
+  if(NOT arg_SHARDS)
+    add_test(NAME ${name} COMMAND ${name})
+    set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
+    return()
+  endif()
+  math(EXPR last "${arg_SHARDS} - 1")
+  foreach(index RANGE ${last})
+    add_test(NAME ${name}_${index} COMMAND ${name})
+    set_tests_properties(${name}_${index} PROPERTIES
+      TIMEOUT 1500
+      ENVIRONMENT "GTEST_TOTAL_SHARDS=${arg_SHARDS};GTEST_SHARD_INDEX=${index}")
+  endforeach()
 endfunction()
 
 # orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema

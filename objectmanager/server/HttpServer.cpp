@@ -106,11 +106,11 @@ std::string formatMessage(const char* format, va_list arguments) {
     return printable(line.substr(0, line.find(" ('<html")));
 }
 
-/** The size that a body was announced to have; 0 where it was not. */
-std::size_t announcedSize(MHD_Connection* http) {
+/** The size that a body was announced to have, which memory may be too small for; 0 where it was not. */
+std::uint64_t announcedSize(MHD_Connection* http) {
     const char* const header = MHD_lookup_connection_value(http, MHD_HEADER_KIND, MHD_HTTP_HEADER_CONTENT_LENGTH);
     const std::string_view text = header == nullptr ? "" : header;
-    std::size_t size = 0;
+    std::uint64_t size = 0;
     std::from_chars(text.data(), text.data() + text.size(), size);
     return size;
 }
@@ -420,7 +420,7 @@ MHD_Result HttpServer::Implementation::arrive(Exchange& exchange) {
     } else if (headerSize > limits.headerBytes) {
         refuse(exchange, MHD_HTTP_REQUEST_HEADER_FIELDS_TOO_LARGE,
                fmt::format("the headers have {} bytes, expected {} at most", headerSize, limits.headerBytes));
-    } else if (const std::size_t bodySize = announcedSize(exchange.http);
+    } else if (const std::uint64_t bodySize = announcedSize(exchange.http);
                bodySize > readBeyondLimit * limits.bodyBytes) {
         refuse(exchange, MHD_HTTP_CONTENT_TOO_LARGE,
                fmt::format("the body has {} bytes, expected {} at most", bodySize, limits.bodyBytes));

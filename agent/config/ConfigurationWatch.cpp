@@ -3,9 +3,8 @@
 #include "CoarseClock.h"
 #include "Configuration.h"
 
+#include <chrono>
 #include <utility>
-
-#include <sys/stat.h>
 
 namespace Norv::Agent {
 
@@ -27,20 +26,19 @@ bool ConfigurationWatch::isDue() const {
 
 bool ConfigurationWatch::look() {
     _next.store(coarseMilliseconds() + interval, std::memory_order_relaxed);
-    const std::optional<Signature> former = std::exchange(_known, signature());
+    const std::optional<FileSignature> former = std::exchange(_known, signature());
     return std::exchange(_recent, isRecent(_known)) || former != _known;
 }
 
-std::optional<ConfigurationWatch::Signature> ConfigurationWatch::signature() const {
+std::optional<FileSignature> ConfigurationWatch::signature() const {
     struct stat status {};
     if (::stat(_file.c_str(), &status) != 0) {
         return std::nullopt;
     }
-    return Signature{status.st_dev, status.st_ino, status.st_size,
-                     std::chrono::seconds(status.st_mtim.tv_sec) + std::chrono::nanoseconds(status.st_mtim.tv_nsec)};
+    return FileSignature(status);
 }
 
-bool ConfigurationWatch::isRecent(const std::optional<Signature>& signature) {
+bool ConfigurationWatch::isRecent(const std::optional<FileSignature>& signature) {
     return signature && std::chrono::system_clock::now().time_since_epoch() - signature->modified < exactness;
 }
 

@@ -1,13 +1,12 @@
 #ifndef AGENT_CONFIGURATIONWATCH_H
 #define AGENT_CONFIGURATIONWATCH_H
 
+#include "FileSignature.h"
+
 #include <atomic>
-#include <chrono>
 #include <cstdint>
 #include <optional>
 #include <string>
-
-#include <sys/types.h>
 
 namespace Norv::Agent {
 
@@ -48,21 +47,11 @@ private:
         std::atomic_flag& _flag;
     };
 
-    /** Tells one content of the file from every other. */
-    struct Signature {
-        dev_t device;
-        ino_t inode;
-        off_t size;
-        std::chrono::nanoseconds modified;
-
-        bool operator==(const Signature&) const = default;
-    };
-
     bool isDue() const;
     /** Looks at the file. @return whether it is, or may be, another one than the last time. */
     bool look();
-    std::optional<Signature> signature() const;
-    static bool isRecent(const std::optional<Signature>& signature);
+    std::optional<FileSignature> signature() const;
+    static bool isRecent(const std::optional<FileSignature>& signature);
 
     const std::string _file;
     /** When to look again, in milliseconds of a clock of its own. */
@@ -70,7 +59,7 @@ private:
     /** Set while a thread looks. */
     std::atomic_flag _looking;
     // These belong to the thread that looks.
-    std::optional<Signature> _known;
+    std::optional<FileSignature> _known;
     bool _recent;
 };
 

@@ -172,7 +172,7 @@ private:
 StateFile::StateFile(const std::filesystem::path& file) : _file(std::filesystem::absolute(file)) {}
 
 std::shared_ptr<const PowerRequests> StateFile::read() {
-    const std::optional<Signature> signature = currentSignature();
+    const std::optional<FileSignature> signature = currentSignature();
     {
         const std::lock_guard guard(_mutex);
         if (_content.signature == signature) {
@@ -205,15 +205,10 @@ std::shared_ptr<const PowerRequests> StateFile::write(const std::string& node, c
     return requests;
 }
 
-StateFile::Signature StateFile::signatureOf(const struct stat& status) {
-    return {status.st_dev, status.st_ino, status.st_size,
-            std::chrono::seconds(status.st_mtim.tv_sec) + std::chrono::nanoseconds(status.st_mtim.tv_nsec)};
-}
-
-std::optional<StateFile::Signature> StateFile::currentSignature() const {
+std::optional<FileSignature> StateFile::currentSignature() const {
     struct stat status {};
     if (::stat(_file.c_str(), &status) == 0) {
-        return signatureOf(status);
+        return FileSignature(status);
     }
     if (errno == ENOENT) {
         return std::nullopt;
@@ -238,7 +233,7 @@ StateFile::Content StateFile::load() const {
         throw std::system_error(EINVAL, std::system_category(), _file.string() + ": is not a regular file");
     }
     Content content;
-    content.signature = signatureOf(status);
+    content.signature = FileSignature(status);
     const std::string text = readAll(file, _file);
     try {
         content.requests = std::make_shared<PowerRequests>(parse(text));
@@ -265,7 +260,7 @@ StateFile::Content StateFile::loadOrSetAside(const Lock& /*lock*/) const {
     return {};
 }
 
-void StateFile::store(const PowerRequests& requests, const std::optional<Signature>& replaced,
+void StateFile::store(const PowerRequests& requests, const std::optional<FileSignature>& replaced,
                       const Lock& /*lock*/) const {
     const std::filesystem::path replacement = withSuffix(_file, ".new");
     // A process that was killed while it wrote has left its own.

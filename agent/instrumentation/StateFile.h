@@ -11,6 +11,7 @@
 #define INSTRUMENTATION_STATEFILE_H
 
 #include "PowerTransition.h"
+#include "config/FileSignature.h"
 
 #include <chrono>
 #include <filesystem>
@@ -19,8 +20,6 @@
 #include <mutex>
 #include <optional>
 #include <string>
-
-#include <sys/stat.h>
 
 namespace Norv::Agent {
 
@@ -60,19 +59,9 @@ public:
     std::shared_ptr<const PowerRequests> write(const std::string& node, const PowerRequest& request);
 
 private:
-    /** Tells one content of the file from every other. */
-    struct Signature {
-        dev_t device;
-        ino_t inode;
-        off_t size;
-        std::chrono::nanoseconds modified;
-
-        bool operator==(const Signature&) const = default;
-    };
-
     struct Content {
         /** Not set where there is no file. */
-        std::optional<Signature> signature;
+        std::optional<FileSignature> signature;
         std::shared_ptr<const PowerRequests> requests = std::make_shared<PowerRequests>();
         /** Why the file cannot be used; empty where it can. `requests` is then empty. */
         std::string damage;
@@ -80,11 +69,10 @@ private:
 
     class Lock;
 
-    static Signature signatureOf(const struct stat& status);
-    std::optional<Signature> currentSignature() const;
+    std::optional<FileSignature> currentSignature() const;
     Content load() const;
     Content loadOrSetAside(const Lock& lock) const;
-    void store(const PowerRequests& requests, const std::optional<Signature>& replaced, const Lock& lock) const;
+    void store(const PowerRequests& requests, const std::optional<FileSignature>& replaced, const Lock& lock) const;
 
     const std::filesystem::path _file;
 

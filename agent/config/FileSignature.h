@@ -1,0 +1,27 @@
+#ifndef CONFIG_FILESIGNATURE_H
+#define CONFIG_FILESIGNATURE_H
+
+#include <chrono>
+
+#include <sys/stat.h>
+
+namespace Norv::Agent {
+
+/** Tells one content of a file from every other. */
+struct FileSignature {
+    dev_t device;
+    ino_t inode;
+    off_t size;
+    /** Since 1970 (UTC). */
+    std::chrono::nanoseconds modified;
+
+    explicit FileSignature(const struct stat& status)
+        : device(status.st_dev), inode(status.st_ino), size(status.st_size),
+          modified(std::chrono::seconds(status.st_mtim.tv_sec) + std::chrono::nanoseconds(status.st_mtim.tv_nsec)) {}
+
+    bool operator==(const FileSignature&) const = default;
+};
+
+} // namespace Norv::Agent
+
+#endif

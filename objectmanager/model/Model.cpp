@@ -14,6 +14,10 @@ char lower(char c) {
     return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
 }
 
+bool alike(char left, char right) {
+    return left == right || lower(left) == lower(right);
+}
+
 Value typed(CMPIType type, Value::Content content) {
     return Value{type, std::move(content)};
 }
@@ -46,8 +50,13 @@ struct HashOfContent {
 } // namespace
 
 bool equalNames(std::string_view left, std::string_view right) {
-    return std::equal(left.begin(), left.end(), right.begin(), right.end(),
-                      [](char a, char b) { return lower(a) == lower(b); });
+    // Most are written alike.
+    return left.size() == right.size() && (left == right || std::equal(left.begin(), left.end(), right.begin(), alike));
+}
+
+bool NameLess::operator()(std::string_view left, std::string_view right) const {
+    const auto [inLeft, inRight] = std::mismatch(left.begin(), left.end(), right.begin(), right.end(), alike);
+    return inRight != right.end() && (inLeft == left.end() || lower(*inLeft) < lower(*inRight));
 }
 
 bool operator==(const Value& left, const Value& right) {

@@ -19,6 +19,12 @@ namespace ObjectManager {
 /** Whether two CIM names (of namespaces, classes, properties, keys, methods) are the same: letter case is ignored. */
 bool equalNames(std::string_view left, std::string_view right);
 
+/** Orders CIM names, letter case ignored. */
+struct NameLess {
+    using is_transparent = void;
+    bool operator()(std::string_view left, std::string_view right) const;
+};
+
 struct ObjectPath;
 struct Instance;
 

@@ -14,10 +14,6 @@ namespace ObjectManager {
 
 namespace {
 
-char lower(char c) {
-    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
-
 /** What the qualifiers of an element become where they are declared again. */
 Qualifiers merged(const Qualifiers& inherited, Qualifiers own) {
     std::copy_if(inherited.begin(), inherited.end(), std::back_inserter(own),
@@ -115,11 +111,6 @@ private:
 };
 
 } // namespace
-
-bool NameLess::operator()(std::string_view left, std::string_view right) const {
-    return std::lexicographical_compare(left.begin(), left.end(), right.begin(), right.end(),
-                                        [](char a, char b) { return lower(a) < lower(b); });
-}
 
 Catalogue::Catalogue(std::vector<Class> declarations) {
     for (Class& whole : Completion(std::move(declarations)).classes()) {

@@ -16,12 +16,6 @@
 
 namespace ObjectManager {
 
-/** Orders CIM names without regard to letter case. */
-struct NameLess {
-    using is_transparent = void;
-    bool operator()(std::string_view left, std::string_view right) const;
-};
-
 /** Class declarations that fit together. Never changed once it is made, so several threads may use it at once. */
 class Catalogue final : public ClassInformation {
 public:

@@ -6,10 +6,10 @@ namespace {
 
 constexpr std::string_view replacement = "\xEF\xBF\xBD";
 
-/** Whether the byte is a character that stands for itself wherever it is, as most are. */
-bool isPlain(unsigned char byte) {
-    return byte >= 0x20 && byte < 0x80 && byte != '<' && byte != '>' && byte != '&' && byte != '"';
-}
+/** What does not stand for itself wherever it is, as most characters do, or is none of ASCII's. */
+constexpr ByteSet special([](unsigned char byte) {
+    return byte < 0x20 || byte >= 0x80 || byte == '<' || byte == '>' || byte == '&' || byte == '"';
+});
 
 unsigned char byteAt(std::string_view text, std::size_t position) {
     return static_cast<unsigned char>(text[position]);
@@ -60,12 +60,8 @@ std::string_view escapeOf(unsigned char byte, bool inAttribute) {
 
 void append(std::string& document, std::string_view text, bool inAttribute) {
     std::size_t written = 0;
-    for (std::size_t position = 0; position < text.size();) {
+    for (std::size_t position = special.firstIn(text, 0); position < text.size();) {
         const unsigned char byte = byteAt(text, position);
-        if (isPlain(byte)) {
-            ++position;
-            continue;
-        }
         std::string_view instead;
         std::size_t length = 1;
         if (byte < 0x80) {
@@ -80,7 +76,7 @@ void append(std::string& document, std::string_view text, bool inAttribute) {
             document.append(instead);
             written = position + length;
         }
-        position += length;
+        position = special.firstIn(text, position + length);
     }
     document.append(text, written);
 }

@@ -13,13 +13,17 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-constexpr std::string_view whiteSpace = " \t\r\n";
+constexpr std::string_view blanks = " \t\r\n";
+constexpr ByteSet whiteSpace = ByteSet::of(blanks);
+constexpr ByteSet behindNames = ByteSet::of(" \t\r\n/>=<&'\"");
+/** What stands behind the '<' of everything but a start tag. */
+constexpr ByteSet tagMarks = ByteSet::of("/!?");
+/* What ends characters that stand for themselves. */
+constexpr ByteSet behindText = ByteSet::of("<&");
+constexpr ByteSet behindDoubleQuoted = ByteSet::of("<&\"");
+constexpr ByteSet behindSingleQuoted = ByteSet::of("<&'");
 constexpr std::string_view byteOrderMark = "\xEF\xBB\xBF";
 constexpr std::array<std::string_view, 5> entities{"lt", "gt", "amp", "quot", "apos"};
-
-bool isWhiteSpace(char c) {
-    return whiteSpace.find(c) != std::string_view::npos;
-}
 
 /** Goes over a document once, from tag to tag. */
 class Check {
@@ -32,11 +36,11 @@ public:
         while (_position < _text.size()) {
             if (_text[_position] == '<') {
                 markup();
-            } else if (_open.empty() && isWhiteSpace(_text[_position])) {
+            } else if (_open.empty() && whiteSpace.contains(_text[_position])) {
                 ++_position;
             } else {
                 requireInside();
-                character();
+                characters(behindText);
             }
         }
         if (!_open.empty()) {
@@ -61,7 +65,7 @@ private:
 
     /** The XML declaration, of which only the encoding matters. */
     void declaration() {
-        if (!_text.starts_with("<?xml") || _text.size() == 5 || !isWhiteSpace(_text[5])) {
+        if (!_text.starts_with("<?xml") || _text.size() == 5 || !whiteSpace.contains(_text[5])) {
             return;
         }
         skipTo("?>", "the XML declaration");
@@ -78,7 +82,12 @@ private:
     }
 
     void markup() {
-        if (accept("<!--")) {
+        if (!tagMarks.contains(_position + 1 < _text.size() ? _text[_position + 1] : '\0')) {
+            ++_position;
+            startTag();
+        } else if (accept("</")) {
+            endTag();
+        } else if (accept("<!--")) {
             skipTo("-->", "a comment");
         } else if (accept("<![CDATA[")) {
             requireInside();
@@ -87,13 +96,8 @@ private:
             skipTo("?>", "a processing instruction");
         } else if (accept("<!DOCTYPE")) {
             documentType();
-        } else if (accept("</")) {
-            endTag();
         } else if (accept("<!")) {
             fail("found a declaration, expected none");
-        } else {
-            ++_position;
-            startTag();
         }
     }
 
@@ -163,11 +167,10 @@ private:
         if (quote != '"' && quote != '\'') {
             fail("found no quote before the value of the attribute " + std::string(attributeName));
         }
-        for (++_position; peek() != quote;) {
-            if (_position == _text.size() || peek() == '<') {
-                fail("found no end of the value of the attribute " + std::string(attributeName));
-            }
-            character();
+        ++_position;
+        characters(quote == '"' ? behindDoubleQuoted : behindSingleQuoted);
+        if (peek() != quote) {
+            fail("found no end of the value of the attribute " + std::string(attributeName));
         }
         ++_position;
     }
@@ -182,12 +185,10 @@ private:
         _open.pop_back();
     }
 
-    /** A character of text or of an attribute's value, or a reference to one. */
-    void character() {
-        if (accept("&")) {
+    /** Characters and references to some, up to what else is in `end`. */
+    void characters(const ByteSet& end) {
+        while ((_position = end.firstIn(_text, _position)) < _text.size() && accept("&")) {
             reference();
-        } else {
-            ++_position;
         }
     }
 
@@ -197,7 +198,7 @@ private:
         const std::size_t length = rest.find(';');
         const std::string_view entity = rest.substr(0, length);
         if (length == std::string_view::npos || !isKnown(entity)) {
-            fail("found '&" + std::string(entity.substr(0, entity.find_first_of(whiteSpace))) +
+            fail("found '&" + std::string(entity.substr(0, entity.find_first_of(blanks))) +
                  "', expected one of the five entities of XML or a reference to a character that it allows");
         }
         _position += length + 1;
@@ -216,7 +217,7 @@ private:
     }
 
     std::string_view name() {
-        const std::size_t end = std::min(_text.find_first_of(" \t\r\n/>=<&'\"", _position), _text.size());
+        const std::size_t end = behindNames.firstIn(_text, _position);
         if (end == _position) {
             fail("found no name");
         }
@@ -227,7 +228,7 @@ private:
 
     bool skipWhiteSpace() {
         const std::size_t start = _position;
-        _position = std::min(_text.find_first_not_of(whiteSpace, _position), _text.size());
+        _position = whiteSpace.firstNotIn(_text, _position);
         return _position != start;
     }
 
@@ -292,8 +293,8 @@ std::string textOf(const pugi::xml_node& element) {
 }
 
 std::string_view trimmed(std::string_view text) {
-    const std::size_t start = std::min(text.find_first_not_of(whiteSpace), text.size());
-    return text.substr(start, text.find_last_not_of(whiteSpace) - start + 1);
+    const std::size_t start = whiteSpace.firstNotIn(text, 0);
+    return text.substr(start, text.find_last_not_of(blanks) - start + 1);
 }
 
 } // namespace ObjectManager::CimXml

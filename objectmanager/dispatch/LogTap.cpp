@@ -103,6 +103,13 @@ std::vector<LogRecord> LogTap::take() {
     return {std::make_move_iterator(taken.mapped().begin()), std::make_move_iterator(taken.mapped().end())};
 }
 
+void LogTap::forget() {
+    const std::lock_guard lock(_mutex);
+    if (!_records.empty()) {
+        _records.erase(callingThread());
+    }
+}
+
 void LogTap::drain() {
     std::array<char, maximumDatagram> buffer;
     ssize_t received = 0;

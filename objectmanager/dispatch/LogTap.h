@@ -50,6 +50,8 @@ public:
     std::vector<std::string> failuresSince(std::uint64_t sequence);
     /** The calling thread's records, which are gone from here. */
     std::vector<LogRecord> take();
+    /** Drops the calling thread's records, but for those that nobody has looked for yet. */
+    void forget();
 
 private:
     void drain();

@@ -125,7 +125,7 @@ void serve(Session& session) {
     const auto answer = [&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
         CimXml::HttpReply reply = service.answer(request, caller);
         // What the agent logged meanwhile was of interest to this request only.
-        session.log().take();
+        session.log().forget();
         return reply;
     };
     const Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);

@@ -72,6 +72,19 @@ TEST_F(LogTapTest, KeepsTheRecordsOfOtherThreadsForThem) {
     EXPECT_THAT(tap.take(), ElementsAre(hasText("mine")));
 }
 
+TEST_F(LogTapTest, ForgetsWhatWasLookedAt) {
+    LogTap tap;
+    sendRecord(gettid(), "seen");
+    sendRecord(gettid() + 1, "of another thread");
+    const std::uint64_t point = tap.newest();
+    sendRecord(gettid(), "not seen");
+    tap.forget();
+    EXPECT_THAT(tap.since(0), ElementsAre(hasText("not seen")));
+    EXPECT_EQ(point + 1, tap.newest());
+    tap.forget();
+    EXPECT_THAT(tap.take(), IsEmpty());
+}
+
 TEST_F(LogTapTest, TellsRecordsSinceAPointInTimeAndKeepsThem) {
     LogTap tap;
     sendRecord(gettid(), "before");

@@ -11,11 +11,13 @@
 #include "OrvLog/OrvLogger.h"
 #include "OrvLog/OrvMessageBuffer.h"
 
-#include <cstdarg>
+#include <array>
+#include <charconv>
 #include <cstddef>
-#include <cstdio>
 #include <cstring>
+#include <initializer_list>
 #include <string>
+#include <string_view>
 
 namespace Norv {
 
@@ -59,13 +61,31 @@ struct Site {
 /** Size in bytes of each helper's text buffer; longer texts are cut. */
 inline constexpr std::size_t messageBufferSize = 512;
 
-/** Clears the buffer, formats into it as printf does, cutting what is too long, and returns it. */
-[[gnu::format(printf, 2, 3)]] inline char* formatMessage(char (&buffer)[messageBufferSize], const char* format, ...) {
+/** What a message is put together from: a text or a number. */
+class MessagePart {
+public:
+    /** A null text reads "(null)". */
+    MessagePart(const char* text) : _text(text != nullptr ? text : "(null)") {}
+    MessagePart(int number)
+        : _text(_digits.data(), std::to_chars(_digits.data(), _digits.data() + _digits.size(), number).ptr) {}
+    MessagePart(const MessagePart&) = delete;
+    MessagePart& operator=(const MessagePart&) = delete;
+    ~MessagePart() = default;
+
+    std::string_view text() const { return _text; }
+
+private:
+    std::array<char, 16> _digits;
+    std::string_view _text;
+};
+
+/** Clears the buffer, puts the parts into it one behind the other, cutting what is too long, and returns it. */
+inline char* formatMessage(char (&buffer)[messageBufferSize], std::initializer_list<MessagePart> parts) {
     std::memset(buffer, 0, sizeof buffer);
-    std::va_list arguments;
-    va_start(arguments, format);
-    std::vsnprintf(buffer, sizeof buffer, format, arguments);
-    va_end(arguments);
+    std::size_t size = 0;
+    for (const MessagePart& part : parts) {
+        size += part.text().copy(buffer + size, sizeof buffer - 1 - size);
+    }
     return buffer;
 }
 
@@ -80,17 +100,18 @@ inline constexpr std::size_t messageBufferSize = 512;
  */
 inline char* trace(const char* text, const char* file, unsigned int line, MessageType type) {
     static thread_local char messageBuffer[messageBufferSize];
+    const int lineNumber = static_cast<int>(line);
     switch (type) {
     case METHOD:
-        return formatMessage(messageBuffer, "METHOD: %s() was invoked in %s [Line: %d]", text, file,
-                             static_cast<int>(line));
+        return formatMessage(messageBuffer,
+                             {"METHOD: ", text, "() was invoked in ", file, " [Line: ", lineNumber, "]"});
     case MESSAGE:
-        return formatMessage(messageBuffer, "MESSAGE [File: %s, Line: %d]: %s", file, static_cast<int>(line), text);
+        return formatMessage(messageBuffer, {"MESSAGE [File: ", file, ", Line: ", lineNumber, "]: ", text});
     case EXITING:
-        return formatMessage(messageBuffer, "EXITING: %s() in %s [Line: %d]", text, file, static_cast<int>(line));
+        return formatMessage(messageBuffer, {"EXITING: ", text, "() in ", file, " [Line: ", lineNumber, "]"});
     case ENTERING:
     default:
-        return formatMessage(messageBuffer, "ENTERING: %s() in %s [Line: %d]", text, file, static_cast<int>(line));
+        return formatMessage(messageBuffer, {"ENTERING: ", text, "() in ", file, " [Line: ", lineNumber, "]"});
     }
 }
 
@@ -98,35 +119,37 @@ inline char* trace(const char* text, const char* file, unsigned int line, Messag
 inline char* tracepara(const char* text, const char* file, unsigned int line, const char* parameters,
                        MessageType type) {
     static thread_local char messageBuffer[messageBufferSize];
+    constexpr const char* parametersLabel = ",Parameters List: ";
+    const int lineNumber = static_cast<int>(line);
     switch (type) {
     case METHOD:
-        return formatMessage(messageBuffer, "METHOD: %s() was invoked in %s [Line: %d],Parameters List: %s", text, file,
-                             static_cast<int>(line), parameters);
+        return formatMessage(messageBuffer, {"METHOD: ", text, "() was invoked in ", file, " [Line: ", lineNumber, "]",
+                                             parametersLabel, parameters});
     case MESSAGE:
-        return formatMessage(messageBuffer, "MESSAGE [File: %s, Line: %d]: %s,Parameters List: %s", file,
-                             static_cast<int>(line), text, parameters);
+        return formatMessage(
+            messageBuffer, {"MESSAGE [File: ", file, ", Line: ", lineNumber, "]: ", text, parametersLabel, parameters});
     case EXITING:
-        return formatMessage(messageBuffer, "EXITING: %s() in %s [Line: %d],Parameters List: %s", text, file,
-                             static_cast<int>(line), parameters);
+        return formatMessage(messageBuffer, {"EXITING: ", text, "() in ", file, " [Line: ", lineNumber, "]",
+                                             parametersLabel, parameters});
     case ENTERING:
     default:
-        return formatMessage(messageBuffer, "ENTERING: %s() in %s [Line: %d],Parameters List: %s", text, file,
-                             static_cast<int>(line), parameters);
+        return formatMessage(messageBuffer, {"ENTERING: ", text, "() in ", file, " [Line: ", lineNumber, "]",
+                                             parametersLabel, parameters});
     }
 }
 
 /** A line about a variable that holds a text. */
 inline char* trace(const char* variable, const char* file, unsigned int line, const char* value) {
     static thread_local char messageBuffer[messageBufferSize];
-    return formatMessage(messageBuffer, "VARIABLE: '%s' has Value '%s' at line %d in %s", variable, value,
-                         static_cast<int>(line), file);
+    return formatMessage(messageBuffer, {"VARIABLE: '", variable, "' has Value '", value, "' at line ",
+                                         static_cast<int>(line), " in ", file});
 }
 
 /** A line about a variable that holds a number. */
 inline char* trace(const char* variable, const char* file, unsigned int line, unsigned int value) {
     static thread_local char messageBuffer[messageBufferSize];
-    return formatMessage(messageBuffer, "VARIABLE: '%s' has Value '%d' at line %d in %s", variable,
-                         static_cast<int>(value), static_cast<int>(line), file);
+    return formatMessage(messageBuffer, {"VARIABLE: '", variable, "' has Value '", static_cast<int>(value),
+                                         "' at line ", static_cast<int>(line), " in ", file});
 }
 
 /**

@@ -76,6 +76,13 @@ TEST(Trace, ANumberThatIsNoSignedOneIsShownAsIfItWere) {
                  "VARIABLE: 'value' has Value '-1' at line 17 in src/A.cpp");
 }
 
+TEST(Trace, ATextThatIsMissingIsShownAsSuch) {
+    EXPECT_STREQ(Norv::trace("name", "src/A.cpp", 17, nullptr),
+                 "VARIABLE: 'name' has Value '(null)' at line 17 in src/A.cpp");
+    EXPECT_STREQ(Norv::tracepara("doIt", "src/A.cpp", 17, nullptr, Norv::EXITING),
+                 "EXITING: doIt() in src/A.cpp [Line: 17],Parameters List: (null)");
+}
+
 /** The four helpers, each with a text of the caller's choice in it. */
 struct Helper {
     const char* name;

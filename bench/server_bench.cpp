@@ -1,7 +1,7 @@
 /**
  * The object manager as its clients on the network find it: requests per second and latency, over loopback and with
  * connections kept alive, and the memory of the server. Runs "orvcim serve" on simulated machines of several sizes;
- * the load comes from one thread of this program.
+ * the load comes from one thread of this program, which does not sleep while it waits for a quick answer.
  *
  * Takes of the options that the other benchmarks have --benchmark_min_time=SECONDS, for each measurement, and
  * --benchmark_filter=REGEX, of names as the table shows them.
@@ -263,6 +263,24 @@ std::size_t expectedSize(std::uint16_t port, const std::string& request, std::si
     return client.reply().size();
 }
 
+/**
+ * Waits without sleeping as long as a quick answer may take: how long the core of a virtual machine takes to wake up
+ * for this program is not the server's. The server goes first on it, though. After that this program sleeps.
+ */
+int waitForEvents(int poll, std::array<epoll_event, 64>& events) {
+    constexpr std::chrono::microseconds quickAnswer{500};
+    constexpr int asLongAsItTakes = -1;
+    const int size = static_cast<int>(events.size());
+    const auto end = Clock::now() + quickAnswer;
+    while (Clock::now() < end) {
+        if (const int ready = epoll_wait(poll, events.data(), size, 0); ready != 0) {
+            return ready;
+        }
+        std::this_thread::yield();
+    }
+    return epoll_wait(poll, events.data(), size, asLongAsItTakes);
+}
+
 Measurement measure(std::string name, const ServerProcess& server, const std::string& request, std::size_t objects,
                     unsigned int connections, double seconds) {
     const std::size_t size = expectedSize(server.port(), request, objects);
@@ -285,7 +303,7 @@ Measurement measure(std::string name, const ServerProcess& server, const std::st
     }
     std::array<epoll_event, 64> events{};
     for (std::size_t asked = connections; asked > 0;) {
-        const int ready = epoll_wait(poll, events.data(), static_cast<int>(events.size()), -1);
+        const int ready = waitForEvents(poll, events);
         for (int i = 0; i < ready; ++i) {
             Client& client = *static_cast<Client*>(events[static_cast<std::size_t>(i)].data.ptr);
             if (!client.take()) {

@@ -2,6 +2,7 @@
 
 #include "Wording.h"
 
+#include <dlfcn.h>
 #include <systemd/sd-bus.h>
 
 #include <algorithm>
@@ -41,10 +42,55 @@ std::string printable(const char* text) {
     return result;
 }
 
+/**
+ * The library that speaks to the bus. It is loaded when it is first needed, and stays: with all that it brings along it
+ * is larger than the agent, and hosts of a simulated machine never need it.
+ */
+class Libsystemd {
+public:
+    // Its functions, by their own names. NOLINTNEXTLINE(bugprone-macro-parentheses): a name is declared
+#define ORV_FUNCTION(name) decltype(&::name) name = reinterpret_cast<decltype(&::name)>(function(#name))
+    ORV_FUNCTION(sd_bus_call);
+    ORV_FUNCTION(sd_bus_close_unref);
+    ORV_FUNCTION(sd_bus_error_free);
+    ORV_FUNCTION(sd_bus_is_open);
+    ORV_FUNCTION(sd_bus_is_ready);
+    ORV_FUNCTION(sd_bus_message_append);
+    ORV_FUNCTION(sd_bus_message_enter_container);
+    ORV_FUNCTION(sd_bus_message_new_method_call);
+    ORV_FUNCTION(sd_bus_message_read);
+    ORV_FUNCTION(sd_bus_message_set_expect_reply);
+    ORV_FUNCTION(sd_bus_message_unref);
+    ORV_FUNCTION(sd_bus_open_system);
+    ORV_FUNCTION(sd_bus_process);
+    ORV_FUNCTION(sd_bus_send);
+    ORV_FUNCTION(sd_bus_wait);
+#undef ORV_FUNCTION
+
+private:
+    static void* require(void* found) {
+        if (found == nullptr) {
+            throw LogindError(Kind::noBus, std::string("the system bus cannot be reached: ") + dlerror());
+        }
+        return found;
+    }
+
+    static void* function(const char* name) {
+        static void* const library = require(dlopen("libsystemd.so.0", RTLD_NOW | RTLD_NODELETE));
+        return require(dlsym(library, name));
+    }
+};
+
+/** @throws LogindError where there is none. The next call tries again. */
+const Libsystemd& libsystemd() {
+    static const Libsystemd library;
+    return library;
+}
+
 class BusErrorText {
 public:
     BusErrorText() = default;
-    ~BusErrorText() { sd_bus_error_free(&_error); }
+    ~BusErrorText() { libsystemd().sd_bus_error_free(&_error); }
     BusErrorText(const BusErrorText&) = delete;
     BusErrorText& operator=(const BusErrorText&) = delete;
 
@@ -96,16 +142,16 @@ std::chrono::microseconds Deadline::remaining() const {
 }
 
 void Logind::Closer::operator()(sd_bus* bus) const {
-    sd_bus_close_unref(bus);
+    libsystemd().sd_bus_close_unref(bus);
 }
 
 void Logind::Unreferencer::operator()(sd_bus_message* message) const {
-    sd_bus_message_unref(message);
+    libsystemd().sd_bus_message_unref(message);
 }
 
 Logind::Logind(const Deadline& deadline) : _deadline(deadline) {
     sd_bus* bus = nullptr;
-    if (const int result = sd_bus_open_system(&bus); result < 0) {
+    if (const int result = libsystemd().sd_bus_open_system(&bus); result < 0) {
         failToConnect(textOf(-result));
     }
     _bus.reset(bus);
@@ -115,17 +161,17 @@ Logind::Logind(const Deadline& deadline) : _deadline(deadline) {
 // A first call would do this, too, but without an end where somebody listens at the address and says nothing.
 void Logind::waitUntilConnected() {
     for (;;) {
-        const int ready = sd_bus_is_ready(_bus.get());
+        const int ready = libsystemd().sd_bus_is_ready(_bus.get());
         if (ready > 0) {
             return;
         }
-        int result = ready < 0 ? ready : sd_bus_process(_bus.get(), nullptr);
+        int result = ready < 0 ? ready : libsystemd().sd_bus_process(_bus.get(), nullptr);
         if (result == 0) {
             const auto remaining = _deadline.remaining();
             if (remaining.count() == 0) {
                 failToConnect("it does not answer within " + inSeconds(_deadline.whole()));
             }
-            result = sd_bus_wait(_bus.get(), static_cast<std::uint64_t>(remaining.count()));
+            result = libsystemd().sd_bus_wait(_bus.get(), static_cast<std::uint64_t>(remaining.count()));
         }
         if (result < 0 && result != -EINTR) {
             failToConnect(textOf(-result));
@@ -135,7 +181,7 @@ void Logind::waitUntilConnected() {
 
 Logind::Message Logind::newCall(const char* interface, const char* method) {
     sd_bus_message* call = nullptr;
-    require(sd_bus_message_new_method_call(_bus.get(), &call, service, path, interface, method), method);
+    require(libsystemd().sd_bus_message_new_method_call(_bus.get(), &call, service, path, interface, method), method);
     return Message(call);
 }
 
@@ -153,7 +199,7 @@ Logind::Message Logind::send(const Message& call, const char* method) {
     }
     BusErrorText error;
     sd_bus_message* reply = nullptr;
-    const int result = sd_bus_call(_bus.get(), call.get(), remaining, error.target(), &reply);
+    const int result = libsystemd().sd_bus_call(_bus.get(), call.get(), remaining, error.target(), &reply);
     if (result >= 0) {
         return Message(reply);
     }
@@ -161,7 +207,7 @@ Logind::Message Logind::send(const Message& call, const char* method) {
         throw noAnswerInTime();
     }
     // An answer leaves the connection open.
-    if (sd_bus_is_open(_bus.get()) <= 0) {
+    if (libsystemd().sd_bus_is_open(_bus.get()) <= 0) {
         throw unanswered("the connection to the system bus was lost: " + textOf(-result));
     }
     if (error.isOneOf(unansweredErrors)) {
@@ -175,7 +221,7 @@ Logind::Message Logind::send(const Message& call, const char* method) {
 
 Logind::Message Logind::property(const char* name) {
     const Message call = newCall(propertiesInterface, "Get");
-    require(sd_bus_message_append(call.get(), "ss", managerInterface, name), name);
+    require(libsystemd().sd_bus_message_append(call.get(), "ss", managerInterface, name), name);
     return send(call, name);
 }
 
@@ -183,7 +229,7 @@ bool Logind::isPreparingForShutdown() {
     constexpr const char* name = "PreparingForShutdown";
     const Message reply = property(name);
     int preparing = 0;
-    require(sd_bus_message_read(reply.get(), "v", "b", &preparing), name);
+    require(libsystemd().sd_bus_message_read(reply.get(), "v", "b", &preparing), name);
     return preparing != 0;
 }
 
@@ -192,21 +238,21 @@ ScheduledShutdown Logind::scheduledShutdown() {
     const Message reply = property(name);
     const char* type = nullptr;
     std::uint64_t time = 0;
-    require(sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
+    require(libsystemd().sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
     return {printable(type), WallTime(std::chrono::microseconds(time))};
 }
 
 std::string Logind::can(const char* method) {
     const Message reply = send(newCall(managerInterface, method), method);
     const char* answer = nullptr;
-    require(sd_bus_message_read(reply.get(), "s", &answer), method);
+    require(libsystemd().sd_bus_message_read(reply.get(), "s", &answer), method);
     return printable(answer);
 }
 
 std::vector<Inhibitor> Logind::shutdownInhibitors() {
     constexpr const char* method = "ListInhibitors";
     const Message reply = send(newCall(managerInterface, method), method);
-    require(sd_bus_message_enter_container(reply.get(), 'a', "(ssssuu)"), method);
+    require(libsystemd().sd_bus_message_enter_container(reply.get(), 'a', "(ssssuu)"), method);
     std::vector<Inhibitor> inhibitors;
     for (;;) {
         const char* what = nullptr;
@@ -215,7 +261,8 @@ std::vector<Inhibitor> Logind::shutdownInhibitors() {
         const char* mode = nullptr;
         std::uint32_t uid = 0;
         std::uint32_t pid = 0;
-        const int result = sd_bus_message_read(reply.get(), "(ssssuu)", &what, &who, &why, &mode, &uid, &pid);
+        const int result =
+            libsystemd().sd_bus_message_read(reply.get(), "(ssssuu)", &what, &who, &why, &mode, &uid, &pid);
         require(result, method);
         if (result == 0) {
             return inhibitors;
@@ -230,7 +277,7 @@ std::vector<Inhibitor> Logind::shutdownInhibitors() {
 void Logind::shutDown(const char* method) {
     const Message call = newCall(managerInterface, method);
     constexpr int interactive = 0;
-    require(sd_bus_message_append(call.get(), "b", interactive), method);
+    require(libsystemd().sd_bus_message_append(call.get(), "b", interactive), method);
     send(call, method);
 }
 
@@ -238,17 +285,17 @@ void Logind::scheduleShutdown(const ScheduledShutdown& shutdown) {
     constexpr const char* method = "ScheduleShutdown";
     const Message call = newCall(managerInterface, method);
     const auto time = static_cast<std::uint64_t>(shutdown.time.time_since_epoch().count());
-    require(sd_bus_message_append(call.get(), "st", shutdown.type.c_str(), time), method);
+    require(libsystemd().sd_bus_message_append(call.get(), "st", shutdown.type.c_str(), time), method);
     send(call, method);
 }
 
 void Logind::cancelScheduledShutdown() noexcept {
     sd_bus_message* call = nullptr;
-    if (sd_bus_message_new_method_call(_bus.get(), &call, service, path, managerInterface, "CancelScheduledShutdown") >=
-        0) {
+    if (libsystemd().sd_bus_message_new_method_call(_bus.get(), &call, service, path, managerInterface,
+                                                    "CancelScheduledShutdown") >= 0) {
         const Message owner(call);
-        sd_bus_message_set_expect_reply(call, 0);
-        sd_bus_send(_bus.get(), call, nullptr);
+        libsystemd().sd_bus_message_set_expect_reply(call, 0);
+        libsystemd().sd_bus_send(_bus.get(), call, nullptr);
     }
 }
 

@@ -113,6 +113,18 @@ TEST_F(LogindTest, showsThatThereIsNoSystemdLogind) {
                                        "systemd-logind is not on the system bus: "));
 }
 
+TEST_F(LogindTest, showsThatTheLibraryOfSystemdIsMissing) {
+    std::filesystem::create_directory(_folder / "broken");
+    std::ofstream(_folder / "broken/libsystemd.so.0") << "no library";
+    setenv("LD_LIBRARY_PATH", (_folder / "broken").c_str(), 1);
+    const Outcome outcome = run({"power", "reboot", "--yes"});
+    unsetenv("LD_LIBRARY_PATH");
+    EXPECT_THAT(outcome.err, AllOf(StartsWith("orvcim: Power request refused: reboot of this machine, node system: the "
+                                              "system bus cannot be reached: "),
+                                   HasSubstr("/broken/libsystemd.so.0: ")));
+    EXPECT_EQ(outcome.status, 1);
+}
+
 TEST_F(LogindTest, checksWhatTheMachineCanDo) {
     _bus.startLogind(R"({"CanHibernate": "na"})");
     const Outcome outcome = run({"check"});

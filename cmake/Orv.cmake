@@ -18,6 +18,13 @@ if(ORV_SANITIZE)
   target_link_options(orv_options INTERFACE -fsanitize=${ORV_SANITIZE})
 endif()
 
+# orv_small(TARGET sources...): sources of the target in this folder whose code runs once in a process, or for a command:
+# the less of it there is in memory afterwards, the better.
+function(orv_small target)
+  set_source_files_properties(${ARGN} TARGET_DIRECTORY ${target}
+    PROPERTIES COMPILE_OPTIONS "$<$<NOT:$<CONFIG:Debug>>:-Os>")
+endfunction()
+
 # orv_shared_library(TARGET sources...): a library lib<TARGET>.so.1 that exports what the version script <TARGET>.map of
 # its folder names, and nothing else.
 function(orv_shared_library target)

@@ -66,7 +66,7 @@ std::string nameBehind(const Session& session, const Instance& instance, const c
 std::string stateText(const Session& session, const Instance& association) {
     const NamedValue* state = find(association.properties, "PowerState");
     const bool other = state != nullptr && state->value == unsignedValue(CMPI_uint16, otherPowerState);
-    return textOf(session, association, "PowerState") + (other ? ", as during a reboot" : "");
+    return textOf(session, association, "PowerState") + (other ? ", as while it reboots or shuts down" : "");
 }
 
 /** The service that the command is about. */

@@ -87,7 +87,7 @@ TEST_F(LogindTest, showsWhatTheMachineDoes) {
     _bus.startLogind();
     EXPECT_EQ(run({"power", "status"}).out, heading + "2 (On)\n");
     run({"power", "reboot", "--yes"});
-    EXPECT_EQ(run({"power", "status"}).out, heading + "1 (Other), as during a reboot\n");
+    EXPECT_EQ(run({"power", "status"}).out, heading + "1 (Other), as while it reboots or shuts down\n");
 }
 
 TEST_F(LogindTest, showsWhyTheMachineRefused) {

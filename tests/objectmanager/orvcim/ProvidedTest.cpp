@@ -165,7 +165,7 @@ TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
     };
     EXPECT_EQ(answerOf({"power", "status"}), heading + "2 (On)\n");
     EXPECT_EQ(rebootsIn("0"), heading + "2 (On)\n");
-    EXPECT_EQ(rebootsIn("3600"), heading + "1 (Other), as during a reboot\n");
+    EXPECT_EQ(rebootsIn("3600"), heading + "1 (Other), as while it reboots or shuts down\n");
 }
 
 TEST_F(ProvidedTest, offersNoServiceWhereTheConfigurationIsWrong) {

@@ -60,8 +60,9 @@ void allowFiles(unsigned int connections) {
     limit.rlim_cur = limit.rlim_max;
     setrlimit(RLIMIT_NOFILE, &limit);
     if (limit.rlim_cur < connections + otherFiles) {
-        throw UsageError(fmt::format("found --max-connections {}, expected {} at most: the limit of open files is {}",
-                                     connections, limit.rlim_cur - otherFiles, limit.rlim_cur));
+        throw UsageError(fmt::format("found a limit of {} open files, expected {} for {} connections: raise it, or "
+                                     "lower --max-connections",
+                                     limit.rlim_cur, connections + otherFiles, connections));
     }
 }
 

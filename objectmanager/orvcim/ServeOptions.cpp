@@ -1,5 +1,8 @@
 #include "orvcim/ServeOptions.h"
 
+#include "server/HttpServer.h"
+#include "server/ListenSocket.h"
+
 #include <CLI/CLI.hpp>
 #include <fmt/format.h>
 
@@ -10,15 +13,15 @@ namespace ObjectManager::Orvcim {
 
 namespace {
 
-void addText(CLI::App& subcommand, const std::string& option, std::string& value, const std::string& description,
-             const std::string& type) {
-    subcommand.add_option(option, value, description)->type_name(type)->capture_default_str();
+CLI::Option* addText(CLI::App& subcommand, const std::string& option, std::string& value,
+                     const std::string& description, const std::string& type) {
+    return subcommand.add_option(option, value, description)->type_name(type)->capture_default_str();
 }
 
 template <class Count>
-void addCount(CLI::App& subcommand, const std::string& option, Count& value, const std::string& description) {
+void addCount(CLI::App& subcommand, const std::string& option, Count& value, const std::string& description,
+              int most = 1'000'000'000) {
     constexpr int least = 1;
-    constexpr int most = 1'000'000'000;
     subcommand.add_option(option, value, description)
         ->check(CLI::Range(least, most).description(""))
         ->type_name("N")
@@ -41,27 +44,44 @@ void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milli
         ->default_str(fmt::format("{}", std::chrono::duration<double>(value).count()));
 }
 
+/** Empty where it is an address. */
+std::string problemOfAddress(const std::string& text) {
+    try {
+        const Server::Address address(text);
+        return "";
+    } catch (const Server::ServerError& error) {
+        return error.what();
+    }
+}
+
 } // namespace
 
 void addServeOptions(CLI::App& command, ServeOptions& options) {
     Server::Settings& server = options.server;
     Server::Limits& limits = server.limits;
-    command.add_option("--listen", server.address, "Address to listen on")->type_name("ADDRESS")->capture_default_str();
+    command.add_option("--listen", server.address, "Address to listen on")
+        ->check(CLI::Validator(problemOfAddress, ""))
+        ->type_name("ADDRESS")
+        ->capture_default_str();
     command.add_option("--port", options.port, "Port to listen on, 0 for any (default: 5988, with TLS 5989)")
         ->type_name("PORT");
     command.add_option("--tls-cert", options.certificate, "Serve with TLS: file of the certificate, in PEM")
         ->type_name("FILE");
     command.add_option("--tls-key", options.key, "File of the certificate's key, in PEM")->type_name("FILE");
-    command.add_flag("--authenticate", options.authenticate, "Clients have to log in, as PAM decides");
-    addText(command, "--pam-service", options.pam.service, "PAM's service", "NAME");
+    CLI::Option* const authenticate =
+        command.add_flag("--authenticate", options.authenticate, "Clients have to log in, as PAM decides");
+    addText(command, "--pam-service", options.pam.service, "PAM's service", "NAME")->needs(authenticate);
     command.add_option("--pam-folder", options.pam.folder, "Folder of PAM's services, not the system's")
-        ->type_name("DIR");
-    addText(command, "--read-group", options.pam.readGroup, "Whose members may read (default: who can log in)",
-            "GROUP");
+        ->type_name("DIR")
+        ->needs(authenticate);
+    addText(command, "--read-group", options.pam.readGroup, "Whose members may read (default: who can log in)", "GROUP")
+        ->needs(authenticate);
     addText(command, "--power-group", options.pam.powerGroup,
-            "Whose members may read and change the power state, beside root", "GROUP");
+            "Whose members may read and change the power state, beside root", "GROUP")
+        ->needs(authenticate);
     command.add_flag("--syslog", options.syslog, "Log to the system's log, not to standard error");
-    addCount(command, "--threads", server.threads, "Requests served at a time");
+    constexpr int mostThreads = 1000;
+    addCount(command, "--threads", server.threads, "Requests served at a time", mostThreads);
     addCount(command, "--max-body", limits.bodyBytes, "Bytes of a request's body");
     addCount(command, "--max-headers", limits.headerBytes, "Bytes of a request's headers");
     addCount(command, "--max-connections", limits.connections, "Connections at a time");

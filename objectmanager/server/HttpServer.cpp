@@ -87,9 +87,12 @@ bool isRepetition(std::string_view message) {
 
 std::string readPem(const std::filesystem::path& file) {
     std::ifstream stream(file, std::ios::binary);
+    if (!stream) {
+        throw ServerError(fmt::format("{}: {}", file.string(), std::generic_category().message(errno)));
+    }
     std::string content{std::istreambuf_iterator<char>(stream), {}};
-    if (!stream || content.empty()) {
-        throw ServerError(fmt::format("{}: cannot be read, expected a file in PEM", file.string()));
+    if (content.empty()) {
+        throw ServerError(fmt::format("{}: found nothing in it, expected PEM", file.string()));
     }
     return content;
 }
@@ -243,7 +246,12 @@ HttpServer::Implementation::Implementation(const Settings& settings, Handler han
     const int listener = listenOn(settings.address, settings.port);
     _port = portOf(listener);
     start(listener);
-    _watcher = std::thread([this] { watch(); });
+    try {
+        _watcher = std::thread([this] { watch(); });
+    } catch (const std::system_error&) {
+        MHD_stop_daemon(_daemon);
+        throw;
+    }
 }
 
 void HttpServer::Implementation::start(int listener) {
@@ -561,8 +569,11 @@ void HttpServer::Implementation::report(const Connections::Connection& connectio
     _log(fmt::format("{}: {}", connection.address, what));
 }
 
-HttpServer::HttpServer(const Settings& settings, Handler handler, Authenticator* authenticator, Log log)
-    : _implementation(std::make_unique<Implementation>(settings, std::move(handler), authenticator, std::move(log))) {}
+HttpServer::HttpServer(const Settings& settings, Handler handler, Authenticator* authenticator, Log log) try
+    : _implementation(std::make_unique<Implementation>(settings, std::move(handler), authenticator, std::move(log))) {
+} catch (const std::system_error& error) {
+    throw ServerError(fmt::format("cannot make the threads of the server: {}", error.code().message()));
+}
 
 HttpServer::~HttpServer() = default;
 

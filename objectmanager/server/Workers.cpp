@@ -4,7 +4,9 @@
 
 namespace ObjectManager::Server {
 
-Workers::Workers(unsigned int threads, std::size_t waiting) : _waiting(waiting) {
+Workers::Workers(std::size_t waiting) : _waiting(waiting) {}
+
+Workers::Workers(unsigned int threads, std::size_t waiting) : Workers(waiting) {
     _threads.reserve(threads);
     for (unsigned int i = 0; i < threads; ++i) {
         _threads.emplace_back([this] { work(); });

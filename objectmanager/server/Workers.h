@@ -18,7 +18,10 @@ public:
     /** Must not throw. */
     using Task = std::function<void()>;
 
-    /** @param waiting how many tasks may wait for a thread. */
+    /**
+     * @param waiting how many tasks may wait for a thread.
+     * @throws std::system_error where the system gives no more threads; those that it gave have ended then.
+     */
     Workers(unsigned int threads, std::size_t waiting);
     Workers(const Workers&) = delete;
     Workers& operator=(const Workers&) = delete;
@@ -31,6 +34,7 @@ public:
     void finish();
 
 private:
+    explicit Workers(std::size_t waiting);
     void work();
 
     const std::size_t _waiting;

@@ -58,7 +58,7 @@ TEST_F(ServeTest, isNotReachedByOtherMachinesWithoutTlsAndLogIns) {
     }
     const Outcome both = refused({"--listen=0.0.0.0", "--authenticate", "--tls-cert=/dev/null", "--tls-key=/dev/null"});
     EXPECT_EQ(both.err, "orvcim: there is no group orv-power, so nobody is in it\n"
-                        "orvcim: /dev/null: cannot be read, expected a file in PEM\n");
+                        "orvcim: /dev/null: found nothing in it, expected PEM\n");
     EXPECT_EQ(both.status, 1);
 }
 
@@ -96,15 +96,42 @@ TEST_F(ServeTest, saysWhatIsWrongWithTheCommandLine) {
         {{"--max-body=0"}, "orvcim: --max-body: "},
         {{"--idle-time=0"}, "orvcim: --idle-time: "},
         {{"--port=70000"}, "orvcim: "},
-        {{"--max-connections=1000000000"}, "orvcim: found --max-connections 1000000000, expected "},
+        {{"--max-connections=1000000000"}, "orvcim: found a limit of "},
+        {{"--threads=1001"}, "orvcim: --threads: "},
+        {{"--listen=localhost"},
+         "orvcim: --listen: found the address \"localhost\", expected an IPv4 or IPv6 address in numbers"},
+        {{"--pam-service=orvcim"}, "orvcim: --pam-service requires --authenticate"},
+        {{"--pam-folder=/etc/pam.d"}, "orvcim: --pam-folder requires --authenticate"},
+        {{"--read-group=daemon"}, "orvcim: --read-group requires --authenticate"},
+        {{"--power-group=daemon"}, "orvcim: --power-group requires --authenticate"},
     };
     for (const Usage& usage : cases) {
         const Outcome outcome = refused(usage.options);
         EXPECT_THAT(outcome.err, StartsWith(usage.message)) << usage.options.front();
         EXPECT_EQ(outcome.status, 2) << usage.options.front();
     }
-    EXPECT_THAT(refused({"--listen=localhost"}).err,
-                "orvcim: found the address \"localhost\", expected an IPv4 or IPv6 address in numbers\n");
+}
+
+TEST_F(ServeTest, saysThatTheSystemGivesTooLittle) {
+    const auto limitedTo = [](const std::string& limit, const std::string& options) {
+        return runProcess({"sh", "-c",
+                           "ulimit " + limit +
+                               " && exec " ORVCIM_PROGRAM " --schema " ORVCIM_TEST_SCHEMA
+                               " --provider-path " ORVCIM_TEST_LIBRARIES " serve --port=0 " +
+                               options},
+                          {});
+    };
+    const Outcome files = limitedTo("-n 100", "");
+    EXPECT_EQ(files.err,
+              "orvcim: found a limit of 100 open files, expected 1200 for 1000 connections: raise it, or lower "
+              "--max-connections\n");
+    EXPECT_EQ(files.status, 2);
+#ifndef __SANITIZE_ADDRESS__ // which takes more
+    constexpr const char* kilobytes = "2000000";
+    const Outcome threads = limitedTo(std::string("-v ") + kilobytes, "--threads=1000");
+    EXPECT_EQ(threads.err, "orvcim: cannot make the threads of the server: Resource temporarily unavailable\n");
+    EXPECT_EQ(threads.status, 1);
+#endif
 }
 
 TEST_F(ServeTest, saysWhereItCannotListen) {

@@ -74,9 +74,9 @@ TEST_F(TlsTest, closesAConnectionOnWhichNothingComes) {
 
 TEST_F(TlsTest, doesNotStartWithoutAFile) {
     _settings.tls->key = "/nowhere/key";
-    EXPECT_EQ(problem(), "/nowhere/key: cannot be read, expected a file in PEM");
+    EXPECT_EQ(problem(), "/nowhere/key: No such file or directory");
     _settings.tls->certificate = "/dev/null";
-    EXPECT_EQ(problem(), "/dev/null: cannot be read, expected a file in PEM");
+    EXPECT_EQ(problem(), "/dev/null: found nothing in it, expected PEM");
 }
 
 TEST_F(TlsTest, doesNotStartWithAKeyOfAnotherCertificate) {

@@ -344,13 +344,26 @@ void print(const Measurement& result) {
     std::fflush(stdout);
 }
 
-std::string option(int argc, char** argv, std::string_view name, const char* otherwise) {
-    for (int i = 1; i < argc; ++i) {
-        if (std::string_view(argv[i]).starts_with(name)) {
-            return argv[i] + name.size();
+struct Options {
+    double seconds = 2;
+    std::string filter;
+};
+
+Options optionsOf(const std::vector<std::string_view>& arguments) {
+    constexpr std::string_view time = "--benchmark_min_time=";
+    constexpr std::string_view filter = "--benchmark_filter=";
+    Options options;
+    for (const std::string_view argument : arguments) {
+        if (argument.starts_with(time)) {
+            options.seconds = std::stod(std::string(argument.substr(time.size())));
+        } else if (argument.starts_with(filter)) {
+            options.filter = argument.substr(filter.size());
+        } else {
+            throw std::runtime_error("found " + std::string(argument) + ", expected " + std::string(time) +
+                                     "SECONDS or " + std::string(filter) + "REGEX");
         }
     }
-    return otherwise;
+    return options;
 }
 
 void run(double seconds, const std::regex& filter) {
@@ -396,8 +409,8 @@ void run(double seconds, const std::regex& filter) {
 
 int main(int argc, char** argv) {
     try {
-        run(std::stod(option(argc, argv, "--benchmark_min_time=", "2")),
-            std::regex(option(argc, argv, "--benchmark_filter=", "")));
+        const Options options = optionsOf({argv + 1, argv + argc});
+        run(options.seconds, std::regex(options.filter));
     } catch (const std::exception& error) {
         std::fprintf(stderr, "server_bench: %s\n", error.what());
         return 1;

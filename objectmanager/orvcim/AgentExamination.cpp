@@ -26,6 +26,10 @@ std::string problemOf(const LogSettings& log) {
     }
     const bool exists = access(log.file.c_str(), F_OK) == 0;
     const std::filesystem::path written = exists ? log.file : log.file.parent_path();
+    if (std::error_code error; !exists && !std::filesystem::exists(written, error) && !error) {
+        return fmt::format("the log {} cannot be written: there is no folder {}: make it, or name another log.file",
+                           log.file.string(), written.string());
+    }
     if (access(written.c_str(), W_OK) == 0) {
         return "";
     }

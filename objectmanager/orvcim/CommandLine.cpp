@@ -59,6 +59,8 @@ public:
     }
 
 private:
+    static constexpr const char* footer = "The options that 'orvcim --help' shows may be given here too.";
+
     void generalOptions() {
         _app.add_option("--namespace", _options.nameSpace, "Namespace of the classes")->capture_default_str();
         _app.add_option_function<std::string>(
@@ -110,6 +112,7 @@ private:
     void powerCommands() {
         CLI::App& power = *_app.add_subcommand("power", "See and change the machine's power state");
         power.fallthrough();
+        power.footer(footer);
         add(power, "status", "Show the power states", powerStatus);
         addPowerRequest(add(power, "reboot", "Reboot the machine", powerReboot));
         addPowerRequest(add(power, "shutdown", "Shut the machine down", powerShutdown));
@@ -118,7 +121,7 @@ private:
     CLI::App& add(CLI::App& parent, const std::string& name, const std::string& description, Command toDo) {
         CLI::App& subcommand = *parent.add_subcommand(name, description);
         subcommand.fallthrough();
-        subcommand.footer("The options that 'orvcim --help' shows may be given here too.");
+        subcommand.footer(footer);
         const std::string words = &parent == &_app ? name : parent.get_name() + " " + name;
         _names.push_back(words);
         subcommand.callback([this, words, toDo] {

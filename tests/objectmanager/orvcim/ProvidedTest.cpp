@@ -50,7 +50,8 @@ TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
     std::ofstream(_folder / "agent.toml") << "[log]\ndestination = \"file\"\nfile = \"/nowhere/agent.log\"\n";
     EXPECT_THAT(
         orvcim({"check", "--format", "json"}).out,
-        HasSubstr("the log /nowhere/agent.log cannot be written: /nowhere: No such file or directory: let uid "));
+        HasSubstr(
+            "the log /nowhere/agent.log cannot be written: there is no folder /nowhere: make it, or name another "));
 }
 
 TEST_F(ProvidedTest, namesTheService) {

@@ -12,6 +12,7 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <array>
 #include <csignal>
 #include <optional>
 
@@ -21,6 +22,13 @@ namespace {
 
 constexpr std::uint16_t httpPort = 5988;
 constexpr std::uint16_t httpsPort = 5989;
+
+/** What asks the machine nothing but what it is. */
+constexpr std::array<const char*, 11> readingMethods = {
+    "AssociatorNames",    "Associators", "EnumerateClassNames", "EnumerateClasses", "EnumerateInstanceNames",
+    "EnumerateInstances", "GetClass",    "GetInstance",         "GetProperty",      "ReferenceNames",
+    "References",
+};
 
 /** Files that are open beside the connections, at most. */
 constexpr rlim_t otherFiles = 200;
@@ -34,6 +42,10 @@ Server::Settings settingsOf(const ServeOptions& options) {
         settings.tls = Server::Tls{options.certificate, options.key};
     }
     settings.port = options.port.value_or(settings.tls ? httpsPort : httpPort);
+    if (!options.authenticate) {
+        // The machine is a simulated one then, which never waits for anybody else.
+        settings.promptMethods.assign(readingMethods.begin(), readingMethods.end());
+    }
     return settings;
 }
 

@@ -43,9 +43,6 @@ public:
         std::string address;
         /** There was no room for it. */
         bool surplus = false;
-        /** Of the last request that was answered; the server's own notes. */
-        std::string lastKind{};
-        Clock::duration lastAnswerTime = Clock::duration::max();
         State state = State::idle;
         Clock::time_point since;
         /** Where it is in the list of its state. */

@@ -1,6 +1,7 @@
 #include "server/HttpServer.h"
 
 #include "server/ListenSocket.h"
+#include "server/PromptMethods.h"
 #include "server/Workers.h"
 
 #include <fmt/format.h>
@@ -15,6 +16,7 @@
 #include <condition_variable>
 #include <cstdarg>
 #include <cstdio>
+#include <ctime>
 #include <fstream>
 #include <iterator>
 #include <list>
@@ -49,12 +51,6 @@ constexpr std::chrono::milliseconds watchInterval{250};
 
 /** Threads that wait for clients. */
 constexpr unsigned int clientThreads = 2;
-
-/**
- * Where an answer takes less, handing it to a worker would cost more than it. Clients that keep a connection ask for
- * the same again and again: the last answer tells what the next one takes.
- */
-constexpr std::chrono::microseconds quickAnswer{500};
 
 constexpr const char* tlsPriorities = "NORMAL:-VERS-ALL:+VERS-TLS1.3:+VERS-TLS1.2";
 
@@ -128,11 +124,11 @@ HttpReply unauthorized(const std::string& text) {
     return reply;
 }
 
-/** What requests that take about the same time have in common: the operation that they ask for. */
-std::string_view kindOf(const CimXml::HttpRequest& request) {
-    const auto header = std::find_if(request.headers.begin(), request.headers.end(),
-                                     [](const auto& each) { return equalNames(each.first, "CIMMethod"); });
-    return header == request.headers.end() ? std::string_view() : header->second;
+/** Of the calling thread so far. */
+std::chrono::nanoseconds processorTime() {
+    timespec time{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+    return std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec);
 }
 
 /** What a reply of the handler says about the request. */
@@ -172,6 +168,8 @@ private:
         Connections::Connection& connection;
         Step step = Step::arriving;
         CimXml::HttpRequest request{};
+        /** Null where it asks for none that may be prompt. */
+        PromptMethods::Method* method = nullptr;
         std::string body{};
         /** Of what came, also where it is not kept. */
         std::size_t bodySize = 0;
@@ -199,7 +197,6 @@ private:
     void logIn(Exchange& exchange, const std::string& user, const std::string& password);
     MHD_Result receive(Exchange& exchange, const char* data, std::size_t size);
     MHD_Result work(Exchange& exchange);
-    static bool isQuick(const Exchange& exchange);
     void answer(Exchange& exchange);
     MHD_Result suspend(Exchange& exchange, Step step, Workers& workers, Workers::Task task);
     static void refuse(Exchange& exchange, unsigned int status, const std::string& problem);
@@ -215,6 +212,7 @@ private:
     std::uint16_t _port = 0;
     Connections _connections;
     RecentLogIns _recentLogIns;
+    PromptMethods _promptMethods;
     Workers _workers;
     Workers _logInWorkers;
     std::atomic<bool> _stopping = false;
@@ -235,7 +233,7 @@ private:
 HttpServer::Implementation::Implementation(const Settings& settings, Handler handler, Authenticator* authenticator,
                                            Log log)
     : _settings(settings), _handler(std::move(handler)), _authenticator(authenticator), _log(std::move(log)),
-      _connections(settings.limits, settings.tls.has_value(), _log),
+      _connections(settings.limits, settings.tls.has_value(), _log), _promptMethods(settings.promptMethods),
       // Every connection has one request at a time, so no more can wait.
       _workers(settings.threads, settings.limits.connections + surplusConnections),
       _logInWorkers(authenticator == nullptr ? 0 : logInThreads, waitingLogIns) {
@@ -501,7 +499,8 @@ MHD_Result HttpServer::Implementation::work(Exchange& exchange) {
     };
     MHD_get_connection_values(exchange.http, MHD_HEADER_KIND, take, &exchange.request.headers);
     exchange.request.body = exchange.body;
-    if (isQuick(exchange)) {
+    exchange.method = _promptMethods.find(exchange.request);
+    if (exchange.method != nullptr && exchange.method->isPrompt(Clock::now())) {
         _connections.enter(exchange.connection, State::answering);
         answer(exchange);
         return send(exchange);
@@ -512,16 +511,12 @@ MHD_Result HttpServer::Implementation::work(Exchange& exchange) {
     });
 }
 
-bool HttpServer::Implementation::isQuick(const Exchange& exchange) {
-    const Connections::Connection& connection = exchange.connection;
-    return connection.lastAnswerTime < quickAnswer && connection.lastKind == kindOf(exchange.request);
-}
-
 void HttpServer::Implementation::answer(Exchange& exchange) {
-    const auto begin = Clock::now();
+    const auto begin = processorTime();
     exchange.reply = _handler(exchange.request, exchange.caller);
-    exchange.connection.lastKind = kindOf(exchange.request);
-    exchange.connection.lastAnswerTime = Clock::now() - begin;
+    if (exchange.method != nullptr) {
+        exchange.method->took(processorTime() - begin, Clock::now());
+    }
 }
 
 MHD_Result HttpServer::Implementation::suspend(Exchange& exchange, Step step, Workers& workers, Workers::Task task) {

@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace ObjectManager::Server {
 
@@ -40,6 +41,8 @@ struct Settings {
     std::optional<Tls> tls;
     /** Requests that are served at a time. */
     unsigned int threads = 8;
+    /** Values of the header CIMMethod of requests whose answers wait for nothing but the processor. */
+    std::vector<std::string> promptMethods;
     Limits limits;
     /** After which a failed log-in is answered. */
     std::chrono::milliseconds failedLogInDelay = std::chrono::seconds{2};

@@ -77,6 +77,7 @@ TEST_F(StressTest, everyClientGetsItsOwnReplies) {
     Doorkeeper doorkeeper;
     Server::Settings settings;
     settings.threads = 8;
+    settings.promptMethods = {"GetInstance", "EnumerateInstanceNames", "Associators"};
     const Server::HttpServer server(
         settings,
         [](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {

@@ -398,11 +398,13 @@ void run(double seconds, const std::regex& filter) {
                 }
             }
         }
+        std::this_thread::sleep_for(std::chrono::seconds{1});
         std::array<char, 100> line{};
-        std::snprintf(line.data(), line.size(), "| %u | %.1f | %.1f |\n", nodes, atRest, server.memory("VmHWM:"));
+        std::snprintf(line.data(), line.size(), "| %u | %.1f | %.1f | %.1f |\n", nodes, atRest, server.memory("VmHWM:"),
+                      server.memory("VmRSS:"));
         memory += line.data();
     }
-    std::printf("\n| nodes | MB at rest | MB at the peak |\n|---|---|---|\n%s", memory.c_str());
+    std::printf("\n| nodes | MB at rest | MB at the peak | MB afterwards |\n|---|---|---|---|\n%s", memory.c_str());
 }
 
 } // namespace

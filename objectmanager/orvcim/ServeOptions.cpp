@@ -28,10 +28,19 @@ void addCount(CLI::App& subcommand, const std::string& option, Count& value, con
         ->capture_default_str();
 }
 
-void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milliseconds& value,
-             const std::string& description) {
+/** Empty where it is one. */
+std::string problemOfTime(const std::string& text) {
     constexpr double least = 0.1;
     constexpr double most = 86'400;
+    double seconds = 0;
+    // What is no number at all is in no range either.
+    return CLI::detail::lexical_cast(text, seconds) && seconds >= least && seconds <= most
+               ? std::string()
+               : fmt::format("found {}, expected seconds from {} to {}", text, least, most);
+}
+
+void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milliseconds& value,
+             const std::string& description) {
     subcommand
         .add_option_function<double>(
             option,
@@ -39,7 +48,7 @@ void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milli
                 value = std::chrono::round<std::chrono::milliseconds>(std::chrono::duration<double>(seconds));
             },
             description)
-        ->check(CLI::Range(least, most).description(""))
+        ->check(CLI::Validator(problemOfTime, ""))
         ->type_name("SECONDS")
         ->default_str(fmt::format("{}", std::chrono::duration<double>(value).count()));
 }

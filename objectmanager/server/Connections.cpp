@@ -78,8 +78,8 @@ void Connections::endOverdue() {
     List& receiving = listOf(State::receiving);
     while (!receiving.empty() && receiving.front().since + _limits.requestTime <= now) {
         Connection& connection = receiving.front();
-        _log(fmt::format("{}: answered 408: the request did not arrive within {} s", connection.address,
-                         seconds(_limits.requestTime)));
+        _log(fmt::format("{}: {}: the request did not arrive within {} s", connection.address,
+                         _encrypted ? "closed" : "answered 408", seconds(_limits.requestTime)));
         // Nothing of an answer has been written, and the library would close the connection without any.
         if (!_encrypted) {
             send(connection.socket, requestTimeout.data(), requestTimeout.size(), MSG_DONTWAIT | MSG_NOSIGNAL);

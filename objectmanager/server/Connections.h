@@ -43,6 +43,8 @@ public:
         std::string address;
         /** There was no room for it. */
         bool surplus = false;
+        /** The first line of a request has come. */
+        bool asked = false;
         State state = State::idle;
         Clock::time_point since;
         /** Where it is in the list of its state. */

@@ -7,6 +7,10 @@
 #include <fmt/format.h>
 #include <microhttpd.h>
 
+#include <linux/tcp.h>
+#include <malloc.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -49,6 +53,9 @@ constexpr std::size_t readBeyondLimit = 4;
 /** How often it is looked for what is overdue. */
 constexpr std::chrono::milliseconds watchInterval{250};
 
+/** What was taken for an answer of this size is given back to the system, which would not be so by itself. */
+constexpr std::size_t largeAnswer = std::size_t{1024} * 1024;
+
 /** Threads that wait for clients. */
 constexpr unsigned int clientThreads = 2;
 
@@ -70,11 +77,17 @@ std::string printable(std::string_view text) {
 
 /** How the library's messages begin that say of a client what the server says itself, or need not. */
 constexpr std::array<std::string_view, 8> repetitions = {
-    "Connection socket is closed",         "Connection was closed",
-    "Error decoding basic authentication", "Error processing request (HTTP response code is 4",
-    "Failed to parse `Content-Length'",    "Failed to send",
-    "Socket has been disconnected",        "Too large value of 'Content-Length'",
+    "Connection socket is closed",
+    "Connection was closed",
+    "Error: received handshake",
+    "Failed to parse `Content-Length'",
+    "Failed to send",
+    "Not enough memory in pool to allocate header",
+    "Socket has been disconnected",
+    "Too large value of 'Content-Length'",
 };
+/** How the one begins that tells the status with which the library has refused a request by itself. */
+constexpr std::string_view refusalMessage = "Error processing request (HTTP response code is ";
 
 bool isRepetition(std::string_view message) {
     return std::any_of(repetitions.begin(), repetitions.end(),
@@ -105,10 +118,15 @@ std::string formatMessage(const char* format, va_list arguments) {
     return printable(line.substr(0, line.find(" ('<html")));
 }
 
+/** Empty where there is none. */
+std::string_view headerOf(MHD_Connection* http, const char* name) {
+    const char* const value = MHD_lookup_connection_value(http, MHD_HEADER_KIND, name);
+    return value == nullptr ? std::string_view() : value;
+}
+
 /** The size that a body was announced to have, which memory may be too small for; 0 where it was not. */
 std::uint64_t announcedSize(MHD_Connection* http) {
-    const char* const header = MHD_lookup_connection_value(http, MHD_HEADER_KIND, MHD_HTTP_HEADER_CONTENT_LENGTH);
-    const std::string_view text = header == nullptr ? "" : header;
+    const std::string_view text = headerOf(http, MHD_HTTP_HEADER_CONTENT_LENGTH);
     std::uint64_t size = 0;
     std::from_chars(text.data(), text.data() + text.size(), size);
     return size;
@@ -131,11 +149,51 @@ std::chrono::nanoseconds processorTime() {
     return std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec);
 }
 
-/** What a reply of the handler says about the request. */
+/** What a reply of the handler says about the request: in the words of DSP0200, or else in its own. */
 std::string problemOf(const HttpReply& reply) {
     const auto error = std::find_if(reply.headers.begin(), reply.headers.end(),
                                     [](const auto& header) { return equalNames(header.first, "CIMError"); });
-    return error == reply.headers.end() ? MHD_get_reason_phrase_for(reply.status) : error->second;
+    return error == reply.headers.end() ? reply.body.substr(0, reply.body.find('\n')) : error->second;
+}
+
+/** Whether anything came from the client. The end of the connection counts as one byte. */
+bool hasReceived(int socket) {
+    tcp_info info{};
+    socklen_t size = sizeof info;
+    return getsockopt(socket, IPPROTO_TCP, TCP_INFO, &info, &size) == 0 && info.tcpi_bytes_received > 1;
+}
+
+/**
+ * The refusal of a request that tells the end of its body in a way that others may read differently (RFC 9112, section
+ * 6.3); nothing where it does not.
+ */
+std::optional<HttpReply> framingRefusal(MHD_Connection* http) {
+    struct Framing {
+        std::string_view length;
+        std::string_view coding;
+        bool contradictory = false;
+    };
+    Framing framing;
+    const auto take = [](void* data, MHD_ValueKind, const char* name, const char* value) {
+        Framing& found = *static_cast<Framing*>(data);
+        const std::string_view text = value == nullptr ? "" : value;
+        const bool isLength = equalNames(name, MHD_HTTP_HEADER_CONTENT_LENGTH);
+        if (isLength || equalNames(name, MHD_HTTP_HEADER_TRANSFER_ENCODING)) {
+            std::string_view& known = isLength ? found.length : found.coding;
+            found.contradictory |= !known.empty() && known != text;
+            known = text;
+        }
+        return MHD_YES;
+    };
+    MHD_get_connection_values(http, MHD_HEADER_KIND, take, &framing);
+    if (framing.contradictory || (!framing.length.empty() && !framing.coding.empty())) {
+        return textReply(MHD_HTTP_BAD_REQUEST, "found several lengths of the body, expected one");
+    }
+    if (!framing.coding.empty() && !equalNames(framing.coding, "chunked")) {
+        return textReply(MHD_HTTP_NOT_IMPLEMENTED,
+                         fmt::format("found the Transfer-Encoding \"{}\", expected chunked", framing.coding));
+    }
+    return std::nullopt;
 }
 
 } // namespace
@@ -179,6 +237,18 @@ private:
         std::string problem{};
     };
 
+    /** Of an answer, until it is sent. */
+    struct Body {
+        std::string text;
+        std::atomic<bool>& largeAnswerSent;
+
+        ~Body() {
+            if (text.size() >= largeAnswer) {
+                largeAnswerSent = true;
+            }
+        }
+    };
+
     static MHD_Result onRequest(void* self, MHD_Connection* http, const char* url, const char* method,
                                 const char* version, const char* data, std::size_t* size, void** exchange);
     static void onCompleted(void* self, MHD_Connection* http, void** exchange, MHD_RequestTerminationCode reason);
@@ -200,6 +270,8 @@ private:
     void answer(Exchange& exchange);
     MHD_Result suspend(Exchange& exchange, Step step, Workers& workers, Workers::Task task);
     static void refuse(Exchange& exchange, unsigned int status, const std::string& problem);
+    /** The connection ends with it. */
+    static void refuse(Exchange& exchange, HttpReply reply);
     MHD_Result send(Exchange& exchange);
     void report(const Connections::Connection& connection, const std::string& what);
 
@@ -216,10 +288,15 @@ private:
     Workers _workers;
     Workers _logInWorkers;
     std::atomic<bool> _stopping = false;
+    /** Since the watcher looked for it. */
+    std::atomic<bool> _largeAnswerSent = false;
 
     /** What the library said while it started. */
     std::string _startMessages;
     std::atomic<bool> _started = false;
+    /** With which status the library has refused what it read last in this thread, until that is reported; 0 if none.
+     */
+    static thread_local unsigned int _refusal;
     MHD_Daemon* _daemon = nullptr;
 
     std::mutex _mutex;
@@ -229,6 +306,8 @@ private:
     std::list<std::pair<Clock::time_point, MHD_Connection*>> _failedLogIns;
     std::thread _watcher;
 };
+
+thread_local unsigned int HttpServer::Implementation::_refusal = 0;
 
 HttpServer::Implementation::Implementation(const Settings& settings, Handler handler, Authenticator* authenticator,
                                            Log log)
@@ -318,6 +397,11 @@ void HttpServer::Implementation::watch() {
             _failedLogIns.pop_front();
         }
         _connections.endOverdue();
+        if (_largeAnswerSent.exchange(false)) {
+            lock.unlock();
+            malloc_trim(0);
+            lock.lock();
+        }
         const auto next = now + watchInterval;
         _changed.wait_until(lock, _failedLogIns.empty() ? next : std::min(next, _failedLogIns.front().first),
                             [this] { return !_watching || (_stopping && !_failedLogIns.empty()); });
@@ -334,12 +418,12 @@ Connections::Connection& HttpServer::Implementation::connectionOf(MHD_Connection
 void HttpServer::Implementation::onMessage(void* self, const char* format, va_list arguments) {
     auto& server = *static_cast<Implementation*>(self);
     const std::string line = formatMessage(format, arguments);
-    if (server._started) {
-        if (!isRepetition(line)) {
-            server._log(line);
-        }
-    } else {
+    if (!server._started) {
         server._startMessages += (server._startMessages.empty() ? "" : "; ") + line;
+    } else if (line.starts_with(refusalMessage)) {
+        std::from_chars(line.data() + refusalMessage.size(), line.data() + line.size(), _refusal);
+    } else if (!isRepetition(line)) {
+        server._log(line);
     }
 }
 
@@ -350,13 +434,21 @@ void HttpServer::Implementation::onConnection(void* self, MHD_Connection* http, 
         const int socket = MHD_get_connection_info(http, MHD_CONNECTION_INFO_CONNECTION_FD)->connect_fd;
         const sockaddr* address = MHD_get_connection_info(http, MHD_CONNECTION_INFO_CLIENT_ADDRESS)->client_addr;
         *connection = &server._connections.opened(socket, textOf(*address));
-    } else {
-        server._connections.closed(*static_cast<Connections::Connection*>(*connection));
+        return;
     }
+    auto& closed = *static_cast<Connections::Connection*>(*connection);
+    if (const unsigned int status = std::exchange(_refusal, 0); status != 0) {
+        server.report(closed, fmt::format("answered {}: {}", status, MHD_get_reason_phrase_for(status)));
+    } else if (!closed.asked && hasReceived(closed.socket)) {
+        server.report(closed, "closed: what it sent is no request of HTTP");
+    }
+    server._connections.closed(closed);
 }
 
 void* HttpServer::Implementation::onRequestLine(void* self, const char* /*url*/, MHD_Connection* http) {
-    static_cast<Implementation*>(self)->_connections.enter(connectionOf(http), State::receiving);
+    Connections::Connection& connection = connectionOf(http);
+    connection.asked = true;
+    static_cast<Implementation*>(self)->_connections.enter(connection, State::receiving);
     return nullptr;
 }
 
@@ -386,7 +478,9 @@ void HttpServer::Implementation::onCompleted(void* self, MHD_Connection* http, v
         server.report(connection, "gone before the answer was sent");
     } else if (const MHD_ConnectionInfo* answer = MHD_get_connection_info(http, MHD_CONNECTION_INFO_HTTP_STATUS);
                answer != nullptr && answer->http_status != 0) {
-        server.report(connection, fmt::format("answered {}: the request is not HTTP/1.1", answer->http_status));
+        _refusal = 0;
+        server.report(connection, fmt::format("answered {}: {}", answer->http_status,
+                                              MHD_get_reason_phrase_for(answer->http_status)));
     } else {
         server.report(connection, "gone before the request was here");
     }
@@ -430,6 +524,8 @@ MHD_Result HttpServer::Implementation::arrive(Exchange& exchange) {
                bodySize > readBeyondLimit * limits.bodyBytes) {
         refuse(exchange, MHD_HTTP_CONTENT_TOO_LARGE,
                fmt::format("the body has {} bytes, expected {} at most", bodySize, limits.bodyBytes));
+    } else if (std::optional<HttpReply> refusal = framingRefusal(exchange.http)) {
+        refuse(exchange, *std::move(refusal));
     } else if (_authenticator != nullptr) {
         return authenticate(exchange);
     }
@@ -441,24 +537,20 @@ MHD_Result HttpServer::Implementation::arrive(Exchange& exchange) {
 }
 
 MHD_Result HttpServer::Implementation::authenticate(Exchange& exchange) {
-    char* passwordGiven = nullptr;
-    const std::unique_ptr<char, decltype(&MHD_free)> userGiven(
-        MHD_basic_auth_get_username_password(exchange.http, &passwordGiven), &MHD_free);
-    const std::unique_ptr<char, decltype(&MHD_free)> owner(passwordGiven, &MHD_free);
-    if (userGiven == nullptr || passwordGiven == nullptr) {
+    const std::optional<Credentials> given = credentialsOf(headerOf(exchange.http, MHD_HTTP_HEADER_AUTHORIZATION));
+    if (!given) {
         // How clients learn that they should log in.
         exchange.reply = unauthorized("log in with a user name and password");
         return send(exchange);
     }
-    const std::string user = userGiven.get();
-    const std::string password = passwordGiven;
+    const auto& [user, password] = *given;
     if (auto caller = _recentLogIns.find(user, password)) {
         exchange.caller = *std::move(caller);
         exchange.step = Step::receiving;
         return MHD_YES;
     }
     return suspend(exchange, Step::loggingIn, _logInWorkers,
-                   [this, &exchange, user, password] { logIn(exchange, user, password); });
+                   [this, &exchange, given = *given] { logIn(exchange, given.user, given.password); });
 }
 
 void HttpServer::Implementation::logIn(Exchange& exchange, const std::string& user, const std::string& password) {
@@ -533,8 +625,12 @@ MHD_Result HttpServer::Implementation::suspend(Exchange& exchange, Step step, Wo
 }
 
 void HttpServer::Implementation::refuse(Exchange& exchange, unsigned int status, const std::string& problem) {
-    exchange.problem = problem;
-    exchange.reply = textReply(status, problem);
+    refuse(exchange, textReply(status, problem));
+}
+
+void HttpServer::Implementation::refuse(Exchange& exchange, HttpReply reply) {
+    exchange.problem = problemOf(reply);
+    exchange.reply = std::move(reply);
     exchange.reply->headers.emplace_back(MHD_HTTP_HEADER_CONNECTION, "close");
 }
 
@@ -546,10 +642,10 @@ MHD_Result HttpServer::Implementation::send(Exchange& exchange) {
     if (!exchange.problem.empty()) {
         report(exchange.connection, fmt::format("answered {}: {}", reply.status, printable(exchange.problem)));
     }
-    auto* const body = new std::string(std::move(reply.body));
+    auto* const body = new Body{std::move(reply.body), _largeAnswerSent};
     const std::unique_ptr<MHD_Response, decltype(&MHD_destroy_response)> response(
         MHD_create_response_from_buffer_with_free_callback_cls(
-            body->size(), body->data(), [](void* text) { delete static_cast<std::string*>(text); }, body),
+            body->text.size(), body->text.data(), [](void* sent) { delete static_cast<Body*>(sent); }, body),
         &MHD_destroy_response);
     for (const auto& [name, value] : reply.headers) {
         // The library takes no empty value, for which blanks are another way of writing.

@@ -26,7 +26,8 @@ public:
 /**
  * Serves from when it is made until it ends.
  *
- * Clients are served by threads of its own: two wait for them, some run the handler, some ask the authenticator. What a client does wrong, and what it is refused, is logged in one line.
+ * Clients are served by threads of its own: two wait for them, some run the handler, some ask the authenticator. What a
+ * client does wrong, and what it is refused, is logged in one line.
  */
 class HttpServer {
 public:

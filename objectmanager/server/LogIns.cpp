@@ -3,6 +3,7 @@
 #include <gnutls/crypto.h>
 #include <gnutls/gnutls.h>
 
+#include <memory>
 #include <stdexcept>
 
 namespace ObjectManager::Server {
@@ -15,7 +16,33 @@ void require(int status, const char* what) {
     }
 }
 
+struct GnutlsFree {
+    void operator()(unsigned char* data) const { gnutls_free(data); }
+};
+
 } // namespace
+
+std::optional<Credentials> credentialsOf(std::string_view authorization) {
+    constexpr std::string_view scheme = "Basic ";
+    if (!equalNames(authorization.substr(0, scheme.size()), scheme)) {
+        return std::nullopt;
+    }
+    std::string encoded(authorization.substr(scheme.size()));
+    std::erase(encoded, ' ');
+    const gnutls_datum_t base64{reinterpret_cast<unsigned char*>(encoded.data()),
+                                static_cast<unsigned int>(encoded.size())};
+    gnutls_datum_t decoded{};
+    if (gnutls_base64_decode2(&base64, &decoded) != GNUTLS_E_SUCCESS) {
+        return std::nullopt;
+    }
+    const std::unique_ptr<unsigned char, GnutlsFree> owner(decoded.data);
+    const std::string_view text(reinterpret_cast<const char*>(decoded.data), decoded.size);
+    const std::size_t colon = text.find(':');
+    if (colon == std::string_view::npos || text.find('\0') != std::string_view::npos) {
+        return std::nullopt;
+    }
+    return Credentials{std::string(text.substr(0, colon)), std::string(text.substr(colon + 1))};
+}
 
 RecentLogIns::RecentLogIns() {
     require(gnutls_rnd(GNUTLS_RND_KEY, _secret.data(), _secret.size()), "random key");

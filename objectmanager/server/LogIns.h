@@ -10,6 +10,7 @@
 #include <mutex>
 #include <optional>
 #include <string>
+#include <string_view>
 
 namespace ObjectManager::Server {
 
@@ -19,6 +20,17 @@ struct LogIn {
     /** Why it failed, for the person who runs the server. */
     std::string problem;
 };
+
+struct Credentials {
+    std::string user;
+    std::string password;
+};
+
+/**
+ * What the value of the header Authorization gives for HTTP's scheme Basic (RFC 7617); nothing where it is of another
+ * scheme or wrong, or has a character that no log-in can have.
+ */
+std::optional<Credentials> credentialsOf(std::string_view authorization);
 
 /** Decides on log-ins. Used by several threads at once. */
 class Authenticator {

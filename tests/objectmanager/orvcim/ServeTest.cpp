@@ -94,7 +94,8 @@ TEST_F(ServeTest, saysWhatIsWrongWithTheCommandLine) {
         {{"--tls-cert=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
         {{"--tls-key=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
         {{"--max-body=0"}, "orvcim: --max-body: "},
-        {{"--idle-time=0"}, "orvcim: --idle-time: "},
+        {{"--idle-time=0"}, "orvcim: --idle-time: found 0, expected seconds from 0.1 to 86400"},
+        {{"--request-time=nan"}, "orvcim: --request-time: found nan, expected seconds from 0.1 to 86400"},
         {{"--port=70000"}, "orvcim: "},
         {{"--max-connections=1000000000"}, "orvcim: found a limit of "},
         {{"--threads=1001"}, "orvcim: --threads: "},
@@ -151,7 +152,7 @@ TEST_F(ServeTest, logsABadRequestInOneLine) {
         "400 request-not-well-formed");
     _server->send(SIGTERM);
     const std::string err = _server->wait().err;
-    EXPECT_EQ(err, "orvcim: 127.0.0.1: answered 405: Method Not Allowed\n"
+    EXPECT_EQ(err, "orvcim: 127.0.0.1: answered 405: found the HTTP method GET, expected POST or M-POST\n"
                    "orvcim: 127.0.0.1: answered 400: request-not-well-formed\n");
 }
 

@@ -167,7 +167,7 @@ TEST_F(SizeTest, takesHeadersOfTheLargestSizeAndRefusesLarger) {
     EXPECT_EQ(statusOf(2001), 431);
     EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 431: the headers have 2001 bytes, expected 2000 at most"));
     EXPECT_EQ(statusOf(200'000), 431);
-    EXPECT_EQ(logged(2).back(), "127.0.0.1: answered 431: the request is not HTTP/1.1");
+    EXPECT_EQ(logged(2).back(), "127.0.0.1: answered 431: Request Header Fields Too Large");
 }
 
 /* Clients that are slow, gone, wrong or many. */
@@ -260,30 +260,41 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidRequest) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the request was here"));
 }
 
-TEST_F(HttpServerTest, refusesWhatIsNotHttp) {
-    const std::pair<const char*, const char*> requests[] = {
-        {"POST / HTTP/1.1\r\nHost: x\r\nContent-Length: much\r\n\r\n", "400"},
-        {"POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 99999999999999999999999\r\n\r\n", "413"},
-        {"POST / HTTP/1.1\r\nHost: x\r\nTransfer-Encoding: chunked\r\n\r\nno size\r\n", "400"},
+TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
+    const std::string host = "POST / HTTP/1.1\r\nHost: x\r\n";
+    const std::string several = "400: found several lengths of the body, expected one";
+    const std::pair<std::string, std::string> requests[] = {
+        {host + "Content-Length: much\r\n\r\n", "400: Bad Request"},
+        {host + "Content-Length: 99999999999999999999999\r\n\r\n", "413: Content Too Large"},
+        {host + "Transfer-Encoding: chunked\r\n\r\nno size\r\n", "400: Bad Request"},
+        {host + "Content-Length: 1\r\nContent-Length: 2\r\n\r\nx", several},
+        {host + "Content-Length: 5\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n", several},
+        {host + "Transfer-Encoding: gzip\r\n\r\n", "501: found the Transfer-Encoding \"gzip\", expected chunked"},
+        {"POST / HTTP/7.0\r\nHost: x\r\n\r\n", "505: HTTP Version Not Supported"},
+        {"POST /" + std::string(50'000, 'a') + " HTTP/1.1\r\nHost: x\r\n\r\n", "414: URI Too Long"},
+        {host + "X: " + std::string(100'000, 'x') + "\r\n\r\n", "431: Request Header Fields Too Large"},
     };
     serve();
     std::size_t lines = 0;
-    for (const auto& [wrong, status] : requests) {
+    for (const auto& [wrong, refusal] : requests) {
         HttpClient asking = client();
         asking.send(wrong);
-        EXPECT_THAT(asking.receiveAll(), StartsWith(std::string("HTTP/1.1 ") + status)) << wrong;
-        EXPECT_EQ(logged(++lines).back(),
-                  "127.0.0.1: answered " + std::string(status) + ": the request is not HTTP/1.1")
-            << wrong;
-        EXPECT_EQ(logged().size(), lines) << wrong;
+        EXPECT_THAT(asking.receiveAll(), StartsWith("HTTP/1.1 " + refusal.substr(0, 3))) << refusal;
+        EXPECT_EQ(logged(++lines).back(), "127.0.0.1: answered " + refusal);
+        EXPECT_EQ(logged().size(), lines) << refusal;
     }
-    EXPECT_EQ(ask("POST / HTTP/7.0\r\nHost: x\r\n\r\n").status, 505);
-    EXPECT_EQ(logged(++lines).back(), "Error processing request (HTTP response code is 505");
-    HttpClient asking = client();
-    asking.send("hello\r\n\r\n");
-    EXPECT_EQ(asking.receiveAll(), "");
-    EXPECT_EQ(logged().size(), lines);
+    for (const char* text : {"hello\r\n\r\n", "\x16\x03\x01"}) {
+        client().send(text);
+        EXPECT_EQ(logged(++lines).back(), "127.0.0.1: closed: what it sent is no request of HTTP");
+    }
+    client();
     EXPECT_EQ(ask(post("right")).body, "right");
+    EXPECT_EQ(logged().size(), lines);
+}
+
+TEST_F(HttpServerTest, takesALengthThatIsToldTwice) {
+    serve();
+    EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 4\r\nContent-Length: 4\r\n\r\ntwin").body, "twin");
 }
 
 TEST_F(HttpServerTest, closesTheOldestIdleConnectionForANewOne) {
@@ -378,7 +389,7 @@ TEST_F(HttpServerTest, listensOnIpv6) {
     EXPECT_EQ(asking.receive().body, "six");
     asking.send("POST / HTTP/1.1\r\nContent-Length: x\r\n\r\n");
     asking.receiveAll();
-    EXPECT_THAT(logged(1), ElementsAre("::1: answered 400: the request is not HTTP/1.1"));
+    EXPECT_THAT(logged(1), ElementsAre("::1: answered 400: Bad Request"));
 }
 
 std::string problemOf(const Server::Settings& settings) {

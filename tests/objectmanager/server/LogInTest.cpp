@@ -174,6 +174,39 @@ TEST_F(LogInTest, isAnsweredAtOnceWhereTheServerEnds) {
     EXPECT_EQ(failing.receive().status, 401);
 }
 
+/* What clients send. */
+
+struct Sent {
+    const char* header;
+    std::optional<Server::Credentials> credentials;
+};
+
+TEST(CredentialsTest, areReadAsHttpSaysThem) {
+    // "dXNlcjpwYXNz" is "user:pass".
+    const Sent cases[] = {
+        {"Basic dXNlcjpwYXNz", Server::Credentials{"user", "pass"}},
+        {"basic dXNlcjpwYXNz", Server::Credentials{"user", "pass"}},
+        {"BASIC   dXNlcjpwYXNz ", Server::Credentials{"user", "pass"}},
+        {"Basic dTpwOnE=", Server::Credentials{"u", "p:q"}},
+        {"Basic Og==", Server::Credentials{"", ""}},
+        {"Basic dXNlcg==", std::nullopt},         // "user"
+        {"Basic dXNlcjpwYQBzcw==", std::nullopt}, // "user:pa\0ss"
+        {"Basic !", std::nullopt},
+        {"Basic ", std::nullopt},
+        {"Basic", std::nullopt},
+        {"Bearer dXNlcjpwYXNz", std::nullopt},
+        {"", std::nullopt},
+    };
+    for (const Sent& sent : cases) {
+        const auto credentials = Server::credentialsOf(sent.header);
+        ASSERT_EQ(credentials.has_value(), sent.credentials.has_value()) << sent.header;
+        if (credentials) {
+            EXPECT_EQ(credentials->user, sent.credentials->user) << sent.header;
+            EXPECT_EQ(credentials->password, sent.credentials->password) << sent.header;
+        }
+    }
+}
+
 /* What is remembered. */
 
 using Clock = Server::RecentLogIns::Clock;

@@ -468,10 +468,18 @@ void callMethod(const Operation& operation) {
     if (method == nullptr) {
         throw CimError(CMPI_RC_ERR_METHOD_NOT_FOUND, declared->name + " has no method " + message.method());
     }
+    if (isClass && !hasFlag(method->qualifiers, "Static")) {
+        throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, "found the class " + declared->name + " as the target of " +
+                                                          method->name +
+                                                          ", expected an instance: the method is not static");
+    }
     const std::vector<NamedValue> arguments = argumentsOf(operation, *method);
     requireServed(operation, path.className);
     Invocation invocation;
     invocation.principal = operation.caller.user;
+    if (!isClass) {
+        operation.dispatcher.requireInstance(invocation, path);
+    }
     LogTap* log = operation.dispatcher.log();
     const std::uint64_t before = log != nullptr ? log->newest() : 0;
     const MethodResult result = operation.dispatcher.invokeMethod(invocation, path, method->name, arguments);

@@ -231,6 +231,21 @@ void Dispatcher::execQuery(const Invocation& invocation, const ObjectPath& class
         [&](const Result& result) { passInstances(result, sink); });
 }
 
+void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath& path) {
+    const std::vector<const Registration*> served = _registry.all(path.nameSpace, ProviderKind::instance);
+    if (std::none_of(served.begin(), served.end(), [&](const Registration* registration) {
+            return equalNames(registration->className, path.className);
+        })) {
+        return;
+    }
+    bool found = false;
+    enumerateInstanceNames(invocation, {{}, path.nameSpace, path.className, {}},
+                           [&](const ObjectPath& name) { found = found || name == path; });
+    if (!found) {
+        throw noInstance();
+    }
+}
+
 MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                                       const std::vector<NamedValue>& arguments) {
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::method);

@@ -59,6 +59,12 @@ public:
     void deleteInstance(const Invocation& invocation, const ObjectPath& path) override;
     void execQuery(const Invocation& invocation, const ObjectPath& classPath, const std::string& query,
                    const std::string& language, const InstanceSink& sink) override;
+    /**
+     * Throws CMPI_RC_ERR_NOT_FOUND where the provider of the path's class does not name that instance among its own.
+     * Of a class that has no provider of instances it is not known, and taken to be there. A provider of methods may
+     * act whatever instance it is asked for, so a client's path is checked by this before.
+     */
+    void requireInstance(const Invocation& invocation, const ObjectPath& path);
     /** A refusal is a CimError with `refused` set. */
     MethodResult invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                               const std::vector<NamedValue>& arguments) override;

@@ -79,6 +79,7 @@ void invokeMethod(Session& session) {
     const ObjectPath path = session.instancePath(session.options().target);
     const Method& method = methodOf(session, path);
     const auto arguments = parseArguments(session.options().arguments, method, session.catalogue(), path.nameSpace);
+    session.dispatcher().requireInstance(Session::invocation(), path);
     const MethodResult result = callMethod(session, path, method, arguments).result;
     session.writer().methodResult(method, result.returnValue, result.outArguments);
 }

@@ -139,6 +139,21 @@ TEST_F(DispatcherTest, InvokesMethods) {
     EXPECT_EQ(stringValue("Format"), result.outArguments[2].value);
 }
 
+TEST_F(DispatcherTest, KnowsWhetherThereIsAnInstance) {
+    dispatcher.requireInstance(invocation, disk("b"));
+    dispatcher.requireInstance(invocation, {"host", "ROOT/cimv2", "TEST_DISK", {{"NAME", stringValue("b")}}});
+    for (const ObjectPath& wrong : {disk("c"), disk("B"), path("Test_Disk")}) {
+        EXPECT_THAT(errorOf([&] { dispatcher.requireInstance(invocation, wrong); }),
+                    isError(CMPI_RC_ERR_NOT_FOUND, "there is no such instance"));
+    }
+}
+
+TEST_F(DispatcherTest, TakesAnInstanceToBeThereThatNobodyServes) {
+    dispatcher.requireInstance(invocation, path("Test_Tape", {{"Name", stringValue("t")}}));
+    EXPECT_THAT(errorOf([&] { dispatcher.requireInstance(invocation, path("Test_Fails")); }),
+                isError(CMPI_RC_ERR_ACCESS_DENIED, "not for you"));
+}
+
 TEST_F(DispatcherTest, GivesTheProviderItsOwnSpellingOfTheClass) {
     EXPECT_THAT(enumerationFailure("TEST_FAILS"), isError(CMPI_RC_ERR_ACCESS_DENIED, "not for you"));
 }

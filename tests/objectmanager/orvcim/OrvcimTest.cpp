@@ -204,6 +204,9 @@ INSTANTIATE_TEST_SUITE_P(
                 1,
                 "Subtract: CIM_ERR_METHOD_NOT_FOUND (17): Test_Thing has no method Subtract; it has Add, Refuse, "
                 "Throw, Absent"},
+        Mistake{{"invoke", "Test_Thing.Name=\"three\"", "Add", "Left=1"},
+                1,
+                "Add: CIM_ERR_NOT_FOUND (6): there is no such instance"},
         Mistake{{"invoke", "Nothing.Name=\"x\"", "Add"},
                 1,
                 "Add: CIM_ERR_INVALID_CLASS (5): no provider is registered for class \"Nothing\" in namespace "

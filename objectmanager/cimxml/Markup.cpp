@@ -193,12 +193,13 @@ private:
     }
 
     void reference() {
-        constexpr std::size_t longest = 10;
-        const std::string_view rest = _text.substr(_position, longest);
-        const std::size_t length = rest.find(';');
+        const std::string_view rest = _text.substr(_position);
+        const std::size_t length = rest.find(';'); // far off, with any number of leading zeros
         const std::string_view entity = rest.substr(0, length);
         if (length == std::string_view::npos || !isKnown(entity)) {
-            fail("found '&" + std::string(entity.substr(0, entity.find_first_of(blanks))) +
+            constexpr std::size_t longestQuoted = 10;
+            const std::string_view quoted = entity.substr(0, longestQuoted);
+            fail("found '&" + std::string(quoted.substr(0, quoted.find_first_of(blanks))) +
                  "', expected one of the five entities of XML or a reference to a character that it allows");
         }
         _position += length + 1;

@@ -35,6 +35,7 @@ TEST(Markup, givesTheTextOfAnElement) {
               " <x> <\xE2\x82\xAC"
               "A ");
     EXPECT_EQ(read("<A/>"), "");
+    EXPECT_EQ(read("<A>&#00000000065;&#x" + repeated("0", 1000) + "41;</A>"), "AA");
 }
 
 struct Malformed {
@@ -74,6 +75,14 @@ INSTANTIATE_TEST_SUITE_P(
                                      "a character that it allows"},
         Malformed{"<A>&#99999999999;</A>", "5, found '&#999999999', expected one of the five entities of XML or a "
                                            "reference to a character that it allows"},
+        Malformed{"<A>&#" + repeated("9", 1000) + ";</A>",
+                  "5, found '&#999999999', expected one of the five entities of XML or a reference to a character that "
+                  "it allows"},
+        Malformed{"<A>&#00000000000;</A>",
+                  "5, found '&#000000000', expected one of the five entities of XML or a reference to a character that "
+                  "it allows"},
+        Malformed{"<A>&#;</A>", "5, found '&#', expected one of the five entities of XML or a reference to a character "
+                                "that it allows"},
         Malformed{"<A>& b</A>", "5, found '&', expected one of the five entities of XML or a reference to a character "
                                 "that it allows"},
         Malformed{"<!DOCTYPE A [<!ENTITY e \"x\">]><A>&e;</A>",

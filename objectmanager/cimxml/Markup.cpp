@@ -178,9 +178,13 @@ private:
     void endTag() {
         const std::string_view element = name();
         skipWhiteSpace();
-        if (!accept(">") || _open.empty() || _open.back() != element) {
+        const bool ended = accept(">");
+        if (_open.empty() || _open.back() != element) {
             fail("found the end of " + std::string(element) + ", expected that of " +
                  (_open.empty() ? "nothing" : std::string(_open.back())));
+        }
+        if (!ended) {
+            fail("found no '>' behind the end of " + std::string(element));
         }
         _open.pop_back();
     }

@@ -72,7 +72,10 @@ std::string nameSpaceOf(const pugi::xml_node& localNameSpacePath) {
 
 Message::Message(std::string_view body) {
     parseMarkup(body, _document);
-    const pugi::xml_node root = requiredChild(_document, {"CIM"});
+    const pugi::xml_node root = _document.document_element();
+    if (std::string_view(root.name()) != "CIM") {
+        throw notLooselyValid(std::string("found the root ") + root.name() + ", expected CIM");
+    }
     requireVersion(requiredAttribute(root, "CIMVERSION"), "2.", "CIMVERSION", "unsupported-cim-version");
     requireVersion(requiredAttribute(root, "DTDVERSION"), "2.", "DTDVERSION", "unsupported-dtd-version");
     const pugi::xml_node message = requiredChild(root, {"MESSAGE"});

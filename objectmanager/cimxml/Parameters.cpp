@@ -111,13 +111,13 @@ PropertyList Parameters::propertyList() const {
 }
 
 Instance Parameters::instance(std::string_view name) const {
-    return _reader.instance(required(name, {"INSTANCE"}));
+    return _reader.instance(required(name, {"INSTANCE"}), CMPI_RC_ERR_INVALID_PARAMETER);
 }
 
 Instance Parameters::namedInstance(std::string_view name) const {
     const pugi::xml_node found = required(name, {"VALUE.NAMEDINSTANCE"});
     ObjectPath path = _reader.instanceName(requiredChild(found, {"INSTANCENAME"}));
-    Instance instance = _reader.instance(requiredChild(found, {"INSTANCE"}));
+    Instance instance = _reader.instance(requiredChild(found, {"INSTANCE"}), CMPI_RC_ERR_NO_SUCH_PROPERTY);
     if (!equalNames(instance.path.className, path.className)) {
         invalid("found an instance of " + instance.path.className + " under the name of one of " + path.className);
     }

@@ -39,7 +39,7 @@ public:
     ObjectPath objectName(std::string_view name) const;
     PropertyList propertyList() const;
     Instance instance(std::string_view name) const;
-    /** An instance, with its own name as its path. */
+    /** An instance, with its own name as its path. A property that its class lacks is CMPI_RC_ERR_NO_SUCH_PROPERTY. */
     Instance namedInstance(std::string_view name) const;
     /** The value of a property, null where the parameter is missing. */
     Value value(std::string_view name, CMPIType type) const;

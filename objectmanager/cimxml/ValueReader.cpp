@@ -223,12 +223,12 @@ Value ValueReader::array(const pugi::xml_node& element, CMPIType elementType, co
     return arrayValue(elementType, std::move(elements));
 }
 
-NamedValue ValueReader::property(const pugi::xml_node& element, const Class* declared) const {
+NamedValue ValueReader::property(const pugi::xml_node& element, const Class* declared, CMPIrc unknown) const {
     const std::string_view kind = element.name();
     const std::string name = requiredAttribute(element, "NAME");
     const Property* known = declared == nullptr ? nullptr : declared->property(name);
     if (declared != nullptr && known == nullptr) {
-        throw CimError(CMPI_RC_ERR_NO_SUCH_PROPERTY, declared->name + " has no property " + name);
+        throw CimError(unknown, declared->name + " has no property " + name);
     }
     CMPIType type = CMPI_ref;
     if (known != nullptr) {
@@ -242,7 +242,7 @@ NamedValue ValueReader::property(const pugi::xml_node& element, const Class* dec
     return {known == nullptr ? name : known->name, content ? value(content, type, name) : nullValue(type)};
 }
 
-Instance ValueReader::instance(const pugi::xml_node& element) const {
+Instance ValueReader::instance(const pugi::xml_node& element, CMPIrc unknownProperty) const {
     Instance instance;
     instance.path.nameSpace = _nameSpace;
     instance.path.className = requiredAttribute(element, "CLASSNAME");
@@ -255,7 +255,7 @@ Instance ValueReader::instance(const pugi::xml_node& element) const {
         if (kind != "PROPERTY" && kind != "PROPERTY.ARRAY" && kind != "PROPERTY.REFERENCE") {
             continue;
         }
-        NamedValue read = property(child, declared);
+        NamedValue read = property(child, declared, unknownProperty);
         if (find(instance.properties, read.name) != nullptr) {
             invalid("found the property " + read.name + " twice, expected it once");
         }

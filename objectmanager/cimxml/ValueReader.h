@@ -52,14 +52,17 @@ public:
      */
     Value argument(const pugi::xml_node& element, const Parameter& parameter) const;
 
-    /** An INSTANCE. Its path has the keys that are among its properties. */
-    Instance instance(const pugi::xml_node& element) const;
+    /**
+     * An INSTANCE. Its path has the keys that are among its properties. For a property that its class lacks, DSP0200
+     * has a code with one operation that it has not with another: it is `unknownProperty`.
+     */
+    Instance instance(const pugi::xml_node& element, CMPIrc unknownProperty) const;
 
 private:
     ObjectPath instanceName(const pugi::xml_node& element, const std::string& nameSpace) const;
     Value keyValue(const pugi::xml_node& element, const Property* declared, const std::string& what) const;
     Value array(const pugi::xml_node& element, CMPIType elementType, const std::string& what) const;
-    NamedValue property(const pugi::xml_node& element, const Class* declared) const;
+    NamedValue property(const pugi::xml_node& element, const Class* declared, CMPIrc unknown) const;
     void requireKeys(const ObjectPath& path) const;
 
     const Catalogue& _catalogue;

@@ -8,6 +8,9 @@ namespace ObjectManager {
 
 namespace {
 
+/** A class with fewer references links nothing. */
+constexpr std::size_t fewestReferences = 2;
+
 const ObjectPath& pathOf(const ObjectPath& path) {
     return path;
 }
@@ -50,6 +53,10 @@ AssociationWalk::AssociationWalk(const Registry& registry, const ClassInformatio
     _source.className = *declared;
     requireDeclared(filter.associationClass, "association class");
     requireDeclared(filter.resultClass, "result class");
+    if (!filter.associationClass.empty() && classes->references(filter.associationClass).size() < fewestReferences) {
+        throw CimError(CMPI_RC_ERR_INVALID_PARAMETER,
+                       "the class \"" + filter.associationClass + "\" is no association");
+    }
     for (const Registration* registration : registrations) {
         if (!filter.associationClass.empty() && !classes->isA(registration->className, filter.associationClass)) {
             continue;
@@ -75,7 +82,7 @@ void AssociationWalk::requireDeclared(const std::string& className, const char* 
  */
 std::vector<ReferenceEnd> AssociationWalk::farEndsOf(const Registration& registration) const {
     const std::span<const ReferenceEnd> ends = _classes->references(registration.className);
-    if (ends.size() < 2) {
+    if (ends.size() < fewestReferences) {
         throw CimError(CMPI_RC_ERR_FAILED, "the registered association class \"" + registration.className +
                                                "\" is declared with " + std::to_string(ends.size()) +
                                                " references, expected two or more");

@@ -33,8 +33,9 @@ public:
      * `classes` may be null, which knows no class. It and the registry outlive the walk.
      *
      * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE, CMPI_RC_ERR_INVALID_CLASS where the source's class is not
-     * declared, CMPI_RC_ERR_INVALID_PARAMETER where a class of the filter is not, CMPI_RC_ERR_FAILED where a registered
-     * association class has not two references, so that nobody knows what it links.
+     * declared, CMPI_RC_ERR_INVALID_PARAMETER where a class of the filter is not, or its association class is no
+     * association, CMPI_RC_ERR_FAILED where a registered association class has not two references, so that nobody knows
+     * what it links.
      */
     AssociationWalk(const Registry& registry, const ClassInformation* classes, const ObjectPath& source,
                     const AssociationFilter& filter);

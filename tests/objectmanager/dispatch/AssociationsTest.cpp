@@ -20,6 +20,7 @@ class CIM_Device { [Key] string Name; };
 class CIM_Disk : CIM_Device {};
 class Test_Disk : CIM_Disk { string Vendor; uint32 Size; };
 class Test_Tape : CIM_Device {};
+class Test_Mirrored : CIM_Device { CIM_Disk REF Mirror; };
 class Test_Host { [Key] string Name; };
 [Association] class CIM_Has { [Key] Test_Host REF Host; [Key] CIM_Device REF Disk; };
 [Association] class Test_HasDisk : CIM_Has { [Override("Disk")] Test_Disk REF Disk; string Since; };
@@ -232,6 +233,11 @@ TEST_F(AssociationsTest, RefuseWhatIsNotDeclaredOrServed) {
                 isError(CMPI_RC_ERR_INVALID_PARAMETER, "the association class \"Test_Lends\" is not declared"));
     EXPECT_THAT(failure(host, {"", "Test_Guest", "", ""}),
                 isError(CMPI_RC_ERR_INVALID_PARAMETER, "the result class \"Test_Guest\" is not declared"));
+    for (const char* noAssociation : {"Test_Tape", "Test_Mirrored"}) {
+        EXPECT_THAT(failure(host, {noAssociation, "", "", ""}),
+                    isError(CMPI_RC_ERR_INVALID_PARAMETER,
+                            "the class \"" + std::string(noAssociation) + "\" is no association"));
+    }
     ObjectPath elsewhere = host;
     elsewhere.nameSpace = "root/elsewhere";
     EXPECT_EQ(CMPI_RC_ERR_INVALID_NAMESPACE, failure(elsewhere, {}).code);

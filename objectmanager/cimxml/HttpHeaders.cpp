@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <charconv>
+#include <iterator>
 #include <optional>
 #include <utility>
 
@@ -60,16 +61,17 @@ bool takesApplicationXml(std::string_view accept) {
     return accepts(accept, {"application/xml", "application/*", "*/*"});
 }
 
-/** The two digits that an extension declaration such as '"URI" ; ns=73' gives to CIM's headers. */
-std::optional<std::string> numberOf(std::string_view declarations) {
-    for (const std::string_view declaration : split(declarations, ',')) {
-        const std::string_view number = parameterOf(declaration, "ns").value_or("");
-        const bool digits = number.size() == 2 && number.find_first_not_of("0123456789") == std::string_view::npos;
-        if (digits && unquoted(split(declaration, ';').front()).starts_with(extension)) {
-            return std::string(number);
-        }
-    }
-    return std::nullopt;
+/** The extension that a declaration such as '"URI" ; ns=73' is about. */
+std::string_view extensionOf(std::string_view declaration) {
+    return unquoted(split(declaration, ';').front());
+}
+
+/** The two digits that a declaration gives to CIM's headers; nothing where it is about another extension. */
+std::optional<std::string> numberOf(std::string_view declaration) {
+    const std::string_view number = parameterOf(declaration, "ns").value_or("");
+    const bool digits = number.size() == 2 && number.find_first_not_of("0123456789") == std::string_view::npos;
+    return digits && extensionOf(declaration).starts_with(extension) ? std::optional<std::string>(number)
+                                                                     : std::nullopt;
 }
 
 /** Resolves the "%41" in a header value. */
@@ -93,6 +95,18 @@ std::string decoded(std::string_view value, std::string_view header) {
     return text;
 }
 
+/** A request must not be answered without an extension that it calls mandatory. */
+void requireOwnOnly(const std::vector<std::string_view>& mandatory) {
+    const auto foreign = std::find_if(mandatory.begin(), mandatory.end(), [](std::string_view declaration) {
+        return !extensionOf(declaration).starts_with(extension);
+    });
+    if (foreign != mandatory.end()) {
+        throw ProtocolError(Http::notExtended, nullptr,
+                            "found the mandatory extension " + std::string(extensionOf(*foreign)) + ", expected " +
+                                std::string(extension) + "0 only");
+    }
+}
+
 /** What a reply to M-POST declares. */
 std::vector<std::pair<std::string, std::string>> extensionHeaders(const std::string& prefix) {
     if (prefix.empty()) {
@@ -110,17 +124,33 @@ RequestHeaders::RequestHeaders(const HttpRequest& request) : _request(request), 
         throw ProtocolError(Http::methodNotAllowed, nullptr,
                             "found the HTTP method " + request.method + ", expected POST or M-POST");
     }
-    for (const char* declaration : {"Man", "Opt"}) {
-        const std::string* declared = find(declaration);
-        const auto number = declared == nullptr ? std::nullopt : numberOf(*declared);
-        if (number && _prefix.empty()) {
-            _prefix = *number + '-';
+    for (const char* header : {"Man", "Opt"}) {
+        for (const std::string_view declaration : listOf(header)) {
+            const auto number = numberOf(declaration);
+            if (number && _prefix.empty()) {
+                _prefix = *number + '-';
+            }
         }
     }
     if (_extended && _prefix.empty()) {
         throw ProtocolError(Http::notExtended, nullptr,
                             "found no header Man with " + std::string(extension) + "0, expected it with M-POST");
     }
+    if (_extended) {
+        requireOwnOnly(listOf("Man"));
+    }
+}
+
+std::vector<std::string_view> RequestHeaders::listOf(std::string_view name) const {
+    std::vector<std::string_view> list;
+    for (const auto& [header, value] : _request.headers) {
+        if (equalNames(header, name)) {
+            const std::vector<std::string_view> entries = split(value, ',');
+            std::copy_if(entries.begin(), entries.end(), std::back_inserter(list),
+                         [](std::string_view entry) { return !entry.empty(); });
+        }
+    }
+    return list;
 }
 
 const std::string* RequestHeaders::find(std::string_view name) const {

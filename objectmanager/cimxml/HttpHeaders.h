@@ -8,13 +8,15 @@
 
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 namespace ObjectManager::CimXml {
 
 /**
  * The headers of a request. Requests are made with POST, or with M-POST after RFC 2774: there the header Man declares
  * the number that the names of CIM's headers begin with, as in "73-CIMOperation". It is taken from the header Opt too,
- * and with POST.
+ * and with POST. Where M-POST declares another extension in Man, it is refused.
  *
  * The functions throw ProtocolError where the request cannot be answered.
  */
@@ -41,6 +43,8 @@ public:
 
 private:
     const std::string* find(std::string_view name) const;
+    /** The entries of all headers of that name, whose values are lists. */
+    std::vector<std::string_view> listOf(std::string_view name) const;
     /** One of CIM's own, which may be there once only. */
     const std::string* findOwn(std::string_view name) const;
     std::string prefixed(std::string_view name) const { return _prefix + std::string(name); }

@@ -372,7 +372,9 @@ HttpServer::Implementation::~Implementation() {
         _stopping = true;
     }
     _changed.notify_all();
-    close(MHD_quiesce_daemon(_daemon));
+    // The library's threads may be about to use it until they end.
+    const int listener = MHD_quiesce_daemon(_daemon);
+    shutdown(listener, SHUT_RDWR);
     if (!_connections.waitForAnswers(_settings.stopTime)) {
         _log("stopped before all answers were sent");
     }
@@ -386,6 +388,7 @@ HttpServer::Implementation::~Implementation() {
     _changed.notify_all();
     _watcher.join();
     MHD_stop_daemon(_daemon);
+    close(listener);
 }
 
 void HttpServer::Implementation::watch() {

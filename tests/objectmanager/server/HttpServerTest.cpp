@@ -283,8 +283,10 @@ TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
         EXPECT_EQ(logged(++lines).back(), "127.0.0.1: answered " + refusal);
         EXPECT_EQ(logged().size(), lines) << refusal;
     }
-    for (const char* text : {"hello\r\n\r\n", "\x16\x03\x01"}) {
-        client().send(text);
+    for (const char* text : {"hello\r\n\r\n", "\x16\x03\x01\r\n\r\n"}) {
+        HttpClient asking = client();
+        asking.send(text);
+        EXPECT_EQ(asking.receiveAll(), "");
         EXPECT_EQ(logged(++lines).back(), "127.0.0.1: closed: what it sent is no request of HTTP");
     }
     client();

@@ -222,11 +222,33 @@ ProviderLibrary& Providers::library(const std::string& location) {
     return *library;
 }
 
+namespace {
+
+/** Calls the factory of each kind of provider that is registered; `report` gives the place for its report. */
+template <class Report>
+void callFactories(ProviderLibrary& library, const Registration& registration, Report report) {
+    const auto call = [&]<class MI>(bool registered, const MI*) {
+        if (registered) {
+            library.provider<MI>(registration.provider, report());
+        }
+    };
+    call(registration.instance, static_cast<CMPIInstanceMI*>(nullptr));
+    call(registration.method, static_cast<CMPIMethodMI*>(nullptr));
+    call(registration.association, static_cast<CMPIAssociationMI*>(nullptr));
+}
+
+} // namespace
+
 template <class MI>
 MI& Providers::provider(const Registration& registration) {
     const std::lock_guard lock(_mutex);
+    ProviderLibrary& loaded = library(registration.location);
     FactoryReport report;
-    MI* mi = library(registration.location).provider<MI>(registration.provider, report);
+    // Factories of one provider may write what its operations read: none is called once an operation can be running.
+    if (_begun.insert(&registration).second) {
+        callFactories(loaded, registration, [&]() -> FactoryReport& { return report = FactoryReport(); });
+    }
+    MI* mi = loaded.provider<MI>(registration.provider, report = FactoryReport());
     if (mi == nullptr) {
         throw CimError(CMPI_RC_ERR_FAILED, report.problem);
     }
@@ -251,14 +273,7 @@ ProviderReport Providers::check(const Registration& registration) {
     try {
         ProviderLibrary& loaded = library(registration.location);
         report.library = loaded.file();
-        const auto checkKind = [&]<class MI>(bool registered, const MI*) {
-            if (registered) {
-                loaded.provider<MI>(registration.provider, report.factories.emplace_back());
-            }
-        };
-        checkKind(registration.instance, static_cast<CMPIInstanceMI*>(nullptr));
-        checkKind(registration.method, static_cast<CMPIMethodMI*>(nullptr));
-        checkKind(registration.association, static_cast<CMPIAssociationMI*>(nullptr));
+        callFactories(loaded, registration, [&]() -> FactoryReport& { return report.factories.emplace_back(); });
         if (registration.property || registration.indication) {
             report.problem = "property and indication providers are not served";
         }

@@ -9,6 +9,7 @@
 #include <map>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -41,9 +42,9 @@ struct ProviderReport {
 class ProviderLibrary;
 
 /**
- * Loads provider libraries when they are first needed and keeps them, with the function tables that their factories
- * gave, until it ends; then every provider's cleanup is called and the libraries are unloaded, but for those that
- * object to it. Used by several threads at once.
+ * Loads provider libraries when they are first needed, calls all factories of a provider before its first operation,
+ * and keeps both, with the function tables that the factories gave, until it ends; then every provider's cleanup is
+ * called and the libraries are unloaded, but for those that object to it. Used by several threads at once.
  */
 class Providers {
 public:
@@ -53,8 +54,8 @@ public:
     Providers& operator=(const Providers&) = delete;
     ~Providers();
 
-    /* A registered provider of one kind. Throws CimError with CMPI_RC_ERR_FAILED where it cannot be had: one line that
-       says which library or factory, and what is wrong with it. */
+    /* A registered provider of one kind; the registration outlives this. Throws CimError with CMPI_RC_ERR_FAILED where
+       it cannot be had: one line that says which library or factory, and what is wrong with it. */
 
     CMPIInstanceMI& instanceProvider(const Registration& registration);
     CMPIMethodMI& methodProvider(const Registration& registration);
@@ -73,6 +74,8 @@ private:
     /** Recursive, since a factory may ask the object manager for something on its own. */
     std::recursive_mutex _mutex;
     std::map<std::string, std::unique_ptr<ProviderLibrary>> _libraries;
+    /** Those of which a provider was asked for. */
+    std::set<const Registration*> _begun;
 };
 
 } // namespace ObjectManager

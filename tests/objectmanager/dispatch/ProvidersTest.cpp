@@ -8,6 +8,7 @@
 namespace ObjectManager {
 namespace {
 
+using testing::Contains;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -40,6 +41,14 @@ TEST_F(ProvidersTest, CleanupIsCalledAtTheEndAndItsFailureTold) {
     }
     EXPECT_THAT(messages, ElementsAre("instance: terminating",
                                       "TestProvider_Create_MethodMI: cleanup threw an exception: no cleaning today"));
+}
+
+TEST_F(ProvidersTest, AllKindsOfAProviderAreMadeBeforeItsFirstOperation) {
+    {
+        Providers providers(broker, {testProviders});
+        providers.instanceProvider(testRegistration("Test_Disk"));
+    }
+    EXPECT_THAT(messages, Contains("TestProvider_Create_MethodMI: cleanup threw an exception: no cleaning today"));
 }
 
 TEST_F(ProvidersTest, CheckTellsWhatIsThere) {

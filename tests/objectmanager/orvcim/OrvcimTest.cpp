@@ -273,6 +273,12 @@ TEST(Orvcim, tellsHowItIsUsed) {
     EXPECT_EQ(help.status, 0);
     EXPECT_THAT(help.out, AllOf(HasSubstr("--provider-path"), HasSubstr("invoke"), HasSubstr("check")));
     EXPECT_THAT(orvcim({"invoke", "--help"}).out, HasSubstr("NAME=VALUE"));
+    for (const std::vector<std::string>& words : {std::vector<std::string>{"power"}, {"power", "status"}, {"check"}}) {
+        std::vector<std::string> command = words;
+        command.emplace_back("--help");
+        EXPECT_THAT(orvcim(command).out, HasSubstr("The options that 'orvcim --help' shows may be given here too."))
+            << words.back();
+    }
     EXPECT_THAT(orvcim({"--version"}).out, StartsWith("orvcim 1."));
 }
 

@@ -82,6 +82,9 @@ private:
     unsigned short _requestedPowerState = 0;
 };
 
+/** Records by the text that names them to clients. */
+using Records = std::map<std::string, PowerStateManagement>;
+
 /**
  * Reads the power-management nodes of the instrumentation tree.
  *
@@ -92,8 +95,7 @@ private:
  * @return 0 when the whole tree was read; 1 when it has no power-management node, or when reading it failed: then the
  *         reason is written to standard error, and the records of the nodes before are in the map.
  */
-unsigned short getPowerStateManagementInstances(std::map<std::string, PowerStateManagement>& instances,
-                                                std::string keyProperty);
+unsigned short getPowerStateManagementInstances(Records& instances, std::string keyProperty);
 
 } // namespace PowerStateManagementServiceProvider
 } // namespace Norv

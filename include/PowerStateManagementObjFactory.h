@@ -55,7 +55,7 @@ public:
     unsigned short getNumberOfInstances();
 
     /** A copy of the elements by key. */
-    std::map<std::string, PowerStateManagement> getPowerStateManagementMap();
+    Records getPowerStateManagementMap();
 
     /** Appends the path of each service. Returns done, nothingFound, or pathCreationFailed after some of the paths. */
     unsigned short getAllPMCMPIObjPaths(const CMPIBroker* broker, const CMPIObjectPath* ref,
@@ -119,7 +119,7 @@ public:
                                                      CMPIStatus* rc);
 
 private:
-    std::map<std::string, PowerStateManagement> _powerStateManagementMap;
+    Records _powerStateManagementMap;
 };
 
 } // namespace Norv::PowerStateManagementServiceProvider

@@ -2,7 +2,7 @@
  * TALVO_PowerManagementCapabilities: the power states and power changes that each service advertises
  * (CIM_PowerManagementCapabilities, DMTF DSP1027).
  */
-#include "ProviderSupport.h"
+#include "ElementOperations.h"
 
 namespace Norv::PowerStateManagementServiceProvider {
 
@@ -20,24 +20,7 @@ static const ElementProvider provider = {
     "getAllPMCapCMPIInstances Failed",
 };
 
-ORV_FIXED_INSTANCE_OPERATIONS(PowerManagementCapabilities)
-
-static CMPIStatus PowerManagementCapabilities_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext*,
-                                                                const CMPIResult* result,
-                                                                const CMPIObjectPath* objectPath) {
-    return enumInstanceNames(provider, broker, result, objectPath);
-}
-
-static CMPIStatus PowerManagementCapabilities_EnumInstances(CMPIInstanceMI*, const CMPIContext*,
-                                                            const CMPIResult* result, const CMPIObjectPath* objectPath,
-                                                            char const** properties) {
-    return enumInstances(provider, broker, result, objectPath, properties);
-}
-
-static CMPIStatus PowerManagementCapabilities_GetInstance(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
-                                                          const CMPIObjectPath* objectPath, char const** properties) {
-    return getInstance(provider, broker, result, objectPath, properties);
-}
+ORV_ELEMENT_OPERATIONS(PowerManagementCapabilities)
 
 CMInstanceMIStub(PowerManagementCapabilities_, PowerManagementCapabilitiesProvider, broker, CMNoHook)
 

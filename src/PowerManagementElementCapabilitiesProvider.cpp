@@ -2,7 +2,7 @@
  * TALVO_PowerManagementElementCapabilities: ties each service to each capabilities object (CIM_ElementCapabilities,
  * DMTF DSP1027). Neither end is a computer system, so nothing is asked of the object manager.
  */
-#include "ProviderSupport.h"
+#include "AssociationOperations.h"
 
 namespace Norv::PowerStateManagementServiceProvider {
 
@@ -24,9 +24,17 @@ static void onNamesPathFailed(const CMPIBroker* mb, CMPIStatus* status) {
     CMTraceMessage(mb, CMPI_LEV_INFO, "PowerManagementElementCapabilitiesProvider", associationPathFailed, nullptr);
 }
 
+static unsigned short PowerManagementElementCapabilities(const CMPIObjectPath* ref, const char** properties,
+                                                         std::vector<CMPIInstance*>& instances);
+
 static const AssociationProvider provider = {
     .category = loggerPowerElementCapabilities,
     .className = powerManagementElementCapabilitiesClass,
+    .build =
+        [](const CMPIObjectPath* ref, char const** properties, const CMPIContext*,
+           std::vector<CMPIInstance*>& instances) {
+            return PowerManagementElementCapabilities(ref, properties, instances);
+        },
     .first =
         {
             .className = powerManagementServiceClass,
@@ -80,63 +88,15 @@ static const AssociationProvider provider = {
             .references = targetNullTexts.references,
         },
     .onNamesPathFailed = onNamesPathFailed,
+    .referencesOfKeysOnly = true,
 };
-
-ORV_FIXED_INSTANCE_OPERATIONS(PowerManagementElementCapabilities)
-ORV_FIXED_ASSOCIATION_OPERATIONS(PowerManagementElementCapabilities)
 
 static unsigned short PowerManagementElementCapabilities(const CMPIObjectPath* ref, const char** properties,
                                                          std::vector<CMPIInstance*>& instances) {
     return buildAssociations(provider, broker, nullptr, ref, properties, instances);
 }
 
-static CMPIStatus PowerManagementElementCapabilities_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext* ctx,
-                                                                       const CMPIResult* rslt,
-                                                                       const CMPIObjectPath* ref) {
-    return enumAssociationNames(provider, broker, ctx, rslt, ref);
-}
-
-static CMPIStatus PowerManagementElementCapabilities_EnumInstances(CMPIInstanceMI*, const CMPIContext*,
-                                                                   const CMPIResult* rslt, const CMPIObjectPath* ref,
-                                                                   const char** properties) {
-    return enumAssociations(provider, rslt, [=](std::vector<CMPIInstance*>& instances) {
-        return PowerManagementElementCapabilities(ref, properties, instances);
-    });
-}
-
-static CMPIStatus PowerManagementElementCapabilities_GetInstance(CMPIInstanceMI*, const CMPIContext*,
-                                                                 const CMPIResult* rslt, const CMPIObjectPath* ref,
-                                                                 const char** properties) {
-    return getAssociation(provider, rslt, ref, [=](std::vector<CMPIInstance*>& instances) {
-        return PowerManagementElementCapabilities(ref, properties, instances);
-    });
-}
-
-static CMPIStatus PowerManagementElementCapabilities_Associators(CMPIAssociationMI*, const CMPIContext* ctx,
-                                                                 const CMPIResult* rslt, const CMPIObjectPath* op,
-                                                                 const char* assocClass, const char* resultClass,
-                                                                 const char*, const char*, const char** properties) {
-    return associators(provider, broker, ctx, rslt, op, assocClass, resultClass, properties);
-}
-
-static CMPIStatus PowerManagementElementCapabilities_AssociatorNames(CMPIAssociationMI*, const CMPIContext* ctx,
-                                                                     const CMPIResult* rslt, const CMPIObjectPath* op,
-                                                                     const char* assocClass, const char* resultClass,
-                                                                     const char*, const char*) {
-    return associatorNames(provider, broker, ctx, rslt, op, assocClass, resultClass);
-}
-
-static CMPIStatus PowerManagementElementCapabilities_References(CMPIAssociationMI*, const CMPIContext* ctx,
-                                                                const CMPIResult* rslt, const CMPIObjectPath* op,
-                                                                const char*, const char*, const char**) {
-    return references(provider, broker, ctx, rslt, op, true);
-}
-
-static CMPIStatus PowerManagementElementCapabilities_ReferenceNames(CMPIAssociationMI*, const CMPIContext* ctx,
-                                                                    const CMPIResult* rslt, const CMPIObjectPath* op,
-                                                                    const char*, const char*) {
-    return referenceNames(provider, broker, ctx, rslt, op);
-}
+ORV_ASSOCIATION_OPERATIONS(PowerManagementElementCapabilities)
 
 CMInstanceMIStub(PowerManagementElementCapabilities_, PowerManagementElementCapabilitiesProvider, broker, CMNoHook)
 CMAssociationMIStub(PowerManagementElementCapabilities_, PowerManagementElementCapabilitiesProvider, broker, CMNoHook)

@@ -2,7 +2,9 @@
  * TALVO_PowerManagementService: one instance for each power-managed element, and the method RequestPowerStateChange,
  * which reboots the machine or shuts it down (CIM_PowerManagementService, DMTF DSP1027).
  */
-#include "ProviderSupport.h"
+#include "BrokerObjects.h"
+#include "ElementOperations.h"
+#include "Operation.h"
 
 #include "Norv/Instrumentation.h"
 
@@ -23,22 +25,7 @@ static const ElementProvider provider = {
     "getAllPMCMPIInstances Failed",
 };
 
-ORV_FIXED_INSTANCE_OPERATIONS(PowerManagementService)
-
-static CMPIStatus PowerManagementService_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext*,
-                                                           const CMPIResult* result, const CMPIObjectPath* objectPath) {
-    return enumInstanceNames(provider, broker, result, objectPath);
-}
-
-static CMPIStatus PowerManagementService_EnumInstances(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
-                                                       const CMPIObjectPath* objectPath, char const** properties) {
-    return enumInstances(provider, broker, result, objectPath, properties);
-}
-
-static CMPIStatus PowerManagementService_GetInstance(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
-                                                     const CMPIObjectPath* objectPath, char const** properties) {
-    return getInstance(provider, broker, result, objectPath, properties);
-}
+ORV_ELEMENT_OPERATIONS(PowerManagementService)
 
 /** A power state that a client can ask for, and the write to the instrumentation tree that brings it about. */
 struct PowerStateChange {

@@ -107,8 +107,7 @@ std::vector<unsigned short> PowerStateManagement::getPowerChangeCapabilities() {
     return grow(_powerChangeCapabilities, {3, 4, 8});
 }
 
-unsigned short getPowerStateManagementInstances(std::map<std::string, PowerStateManagement>& instances,
-                                                std::string keyProperty) {
+unsigned short getPowerStateManagementInstances(Records& instances, std::string keyProperty) {
     try {
         Instrumentation cursor;
         cursor.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);

@@ -1,6 +1,7 @@
 #include "PowerStateManagementObjFactory.h"
 
-#include "ProviderSupport.h"
+#include "BrokerObjects.h"
+#include "Operation.h"
 
 #include "Norv/Common.h"
 #include "Norv/Locale.h"
@@ -213,7 +214,7 @@ unsigned short PowerStateManagementObjFactory::getNumberOfInstances() {
     return static_cast<unsigned short>(_powerStateManagementMap.size());
 }
 
-std::map<std::string, PowerStateManagement> PowerStateManagementObjFactory::getPowerStateManagementMap() {
+Records PowerStateManagementObjFactory::getPowerStateManagementMap() {
     return _powerStateManagementMap;
 }
 

@@ -1,130 +1,13 @@
-#include "ProviderSupport.h"
+#include "AssociationOperations.h"
+
+#include "BrokerObjects.h"
+#include "Operation.h"
 
 #include "Norv/Common.h"
 
+#include <map>
+
 namespace Norv::PowerStateManagementServiceProvider {
-
-void logMessage(const std::string& category, int level, const char* text, const Site& site) {
-    writeRecord(category, level, site, [&] { return trace(text, site.file, site.line, MESSAGE); });
-}
-
-void logVariable(const std::string& category, const char* variable, const char* value, const Site& site) {
-    writeRecord(category, operationLevel, site, [&] { return trace(variable, site.file, site.line, value); });
-}
-
-void logVariable(const std::string& category, const char* variable, unsigned int value, const Site& site) {
-    writeRecord(category, operationLevel, site, [&] { return trace(variable, site.file, site.line, value); });
-}
-
-CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, const char* className,
-                             CMPIStatus* status) {
-    CMPIObjectPath* const path = CMNewObjectPath(broker, nameSpace, className, status);
-    if (CMIsNullObject(path)) {
-        return nullptr;
-    }
-    CMSetNameSpace(path, nameSpace);
-    CMSetHostname(path, getSystemName().c_str());
-    return path;
-}
-
-namespace {
-
-/** Visits the objects in order until a visit returns false; whether none did. Objects are counted in 16 bits. */
-template <typename Object, typename Visit>
-bool forEach(const std::vector<Object*>& objects, Visit visit) {
-    const auto count = static_cast<unsigned short>(objects.size());
-    for (unsigned short i = 0; i < count; ++i) {
-        if (!visit(objects.at(i))) {
-            return false;
-        }
-    }
-    return true;
-}
-
-void returnAll(const CMPIResult* result, const std::vector<CMPIObjectPath*>& paths) {
-    forEach(paths, [result](const CMPIObjectPath* path) {
-        CMReturnObjectPath(result, path);
-        return true;
-    });
-}
-
-void returnAll(const CMPIResult* result, const std::vector<CMPIInstance*>& instances) {
-    forEach(instances, [result](const CMPIInstance* instance) {
-        CMReturnInstance(result, instance);
-        return true;
-    });
-}
-
-/** Returns the first of the instances whose path equals the requested one under `flag`, if there is one. */
-void returnFirstMatch(const CMPIResult* result, const std::vector<CMPIInstance*>& instances,
-                      const CMPIObjectPath* objectPath, bool flag, CMPIStatus* status) {
-    forEach(instances, [&](const CMPIInstance* instance) {
-        if (CMIsNullObject(instance)) {
-            return true;
-        }
-        const CMPIObjectPath* const path = CMGetObjectPath(instance, status);
-        if (!isObjPathsEqual(objectPath, path, flag)) {
-            return true;
-        }
-        CMReturnInstance(result, instance);
-        return false;
-    });
-}
-
-} // namespace
-
-CMPIStatus enumInstanceNames(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
-                             const CMPIObjectPath* objectPath, const Site& site) {
-    Operation operation(provider.category, site);
-    PowerStateManagementObjFactory factory(provider.key);
-    std::vector<CMPIObjectPath*> paths;
-    paths.reserve(factory.getNumberOfInstances());
-    if ((factory.*provider.allObjectPaths)(broker, objectPath, paths, &operation.status) != 0) {
-        return operation.fail("***Can't get ObjectPaths.                     Exiting EnumerateInstanceNames***");
-    }
-    returnAll(result, paths);
-    return operation.complete(result);
-}
-
-CMPIStatus enumInstances(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
-                         const CMPIObjectPath* objectPath, char const** properties, const Site& site) {
-    Operation operation(provider.category, site);
-    PowerStateManagementObjFactory factory(provider.key);
-    std::vector<CMPIInstance*> instances;
-    instances.reserve(factory.getNumberOfInstances());
-    if ((factory.*provider.allInstances)(broker, objectPath, properties, false, instances, &operation.status) != 0) {
-        return operation.fail("***Could not get instances,                      exiting EnumerateInstance***");
-    }
-    returnAll(result, instances);
-    return operation.complete(result);
-}
-
-CMPIStatus getInstance(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
-                       const CMPIObjectPath* objectPath, char const** properties, const Site& site) {
-    Operation operation(provider.category, site);
-    if (CMGetKeyCount(objectPath, &operation.status) == 0) {
-        operation.report("At least one key should be passed");
-        return operation.complete(result);
-    }
-
-    CMPIString* const key = stringOf(CMGetKey(objectPath, provider.key, &operation.status));
-    PowerStateManagementObjFactory factory(provider.key);
-    std::vector<CMPIInstance*> instances;
-    instances.reserve(factory.getNumberOfInstances());
-    if (!CMIsNullObject(key)) {
-        if ((factory.*provider.oneInstance)(broker, objectPath, key, properties, instances, &operation.status) != 0) {
-            return operation.fail(provider.lookupFailed);
-        }
-        returnAll(result, instances);
-    } else {
-        if ((factory.*provider.allInstances)(broker, objectPath, properties, false, instances, &operation.status) !=
-            0) {
-            return operation.fail(provider.scanFailed);
-        }
-        returnFirstMatch(result, instances, objectPath, false, &operation.status);
-    }
-    return operation.complete(result);
-}
 
 namespace {
 
@@ -443,19 +326,19 @@ CMPIStatus enumAssociationNames(const AssociationProvider& provider, const CMPIB
     return operation.status;
 }
 
-CMPIStatus enumAssociations(const AssociationProvider& provider, const CMPIResult* result,
-                            const AssociationBuilder& build, const Site& site) {
+CMPIStatus enumAssociations(const AssociationProvider& provider, const CMPIContext* context, const CMPIResult* result,
+                            const CMPIObjectPath* ref, char const** properties, const Site& site) {
     const Operation operation(provider.category, site);
     const PowerStateManagementObjFactory factory(srcKey);
     std::vector<CMPIInstance*> instances;
-    if (build(instances) == CMPI_RC_OK) {
+    if (provider.build(ref, properties, context, instances) == CMPI_RC_OK) {
         returnAll(result, instances);
     }
     return operation.complete(result);
 }
 
-CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIResult* result, const CMPIObjectPath* ref,
-                          const AssociationBuilder& build, const Site& site) {
+CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIContext* context, const CMPIResult* result,
+                          const CMPIObjectPath* ref, char const** properties, const Site& site) {
     Operation operation(provider.category, site);
     const PowerStateManagementObjFactory factory(srcKey);
     if (CMGetKeyCount(ref, &operation.status) == 0) {
@@ -463,7 +346,7 @@ CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIResult*
         return operation.complete(result);
     }
     std::vector<CMPIInstance*> instances;
-    if (build(instances) == CMPI_RC_OK) {
+    if (provider.build(ref, properties, context, instances) == CMPI_RC_OK) {
         returnFirstMatch(result, instances, ref, true, &operation.status);
     }
     return operation.complete(result);
@@ -563,7 +446,7 @@ bool fillReference(const AssociationRequest& request, const CMPIInstance* refere
 } // namespace
 
 CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
-                      const CMPIResult* result, const CMPIObjectPath* op, bool keysOnly, const Site& site) {
+                      const CMPIResult* result, const CMPIObjectPath* op, char const** properties, const Site& site) {
     AssociationRequest request(provider, broker, context, op, site);
     CMPIStatus& status = request.operation.status;
     if (!request.resolveReference()) {
@@ -585,6 +468,7 @@ CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* bro
             }
         };
         const char* const notAvailable = end->notAvailable.references;
+        const bool keysOnly = provider.referencesOfKeysOnly || properties != nullptr;
         const bool delivered = end->source == ObjectSource::objectManager
                                    ? request.forEachFarPath(*end, notAvailable, deliver)
                                    : request.forEachFarInstance(*end, nullptr, keysOnly, notAvailable, deliverPathOf);

@@ -1,0 +1,91 @@
+/**
+ * One run of a provider's operation, and what it writes to the log.
+ */
+#ifndef OPERATION_H
+#define OPERATION_H
+
+#include "Trace.h"
+
+#include "cmpidt.h"
+#include "cmpift.h"
+#include "cmpimacs.h"
+
+#include <string>
+#include <tuple>
+
+namespace Norv::PowerStateManagementServiceProvider {
+
+/** Writes a free text under the caller's category. */
+void logMessage(const std::string& category, int level, const char* text, const Site& site = Site::here());
+
+/** Writes a variable's value at the level of operations. */
+void logVariable(const std::string& category, const char* variable, const char* value, const Site& site = Site::here());
+void logVariable(const std::string& category, const char* variable, unsigned int value,
+                 const Site& site = Site::here());
+
+/**
+ * The entry and exit records of a call with parameters. The parts are labels and values in turn: pointers are written
+ * as addresses, and a null text ends the list.
+ */
+template <typename... Parts>
+class CallTrace {
+public:
+    explicit CallTrace(const std::string& category, Parts... parts) : _category(category), _parts(parts...) {}
+
+    void entering(const Site& site = Site::here()) const { write(ENTERING, site); }
+    void exiting(const Site& site = Site::here()) const { write(EXITING, site); }
+
+private:
+    void write(MessageType type, const Site& site) const {
+        OrvLog::OrvMessageBuffer buffer;
+        std::ostream& stream = buffer;
+        std::apply([&](const Parts&... parts) { (stream << ... << parts); }, _parts);
+        const std::string& parameters = OrvLog::OrvMessageBuffer::str(stream);
+        writeRecord(_category, progressLevel, site,
+                    [&] { return tracepara(site.function, site.file, site.line, parameters.c_str(), type); });
+    }
+
+    const std::string& _category;
+    std::tuple<Parts...> _parts;
+};
+
+/**
+ * One run of a provider's operation: marked as entered when it is made. What it reports carries the place where the
+ * provider's file entered it, since the work may be done in code that providers share.
+ */
+class Operation {
+public:
+    Operation(const std::string& category, const Site& site) : _category(category), _site(site) {
+        markProviderEntry(_category, _site.function, _site.file, _site.line);
+    }
+
+    /** What the operation returns: handed to every call of the broker and the factory, which write it. */
+    CMPIStatus status{CMPI_RC_OK, nullptr};
+
+    const Site& site() const { return _site; }
+
+    void report(const char* failure) const { logMessage(_category, failureLevel, failure, _site); }
+
+    void markExit() const { markProviderExit(_category, _site.function, _site.file, _site.line); }
+
+    /** Ends the operation as failed: the result stays open and no exit is marked. */
+    CMPIStatus fail(const char* failure) const {
+        report(failure);
+        return status;
+    }
+
+    /** Ends the operation with its result closed. */
+    CMPIStatus complete(const CMPIResult* result) const {
+        CMReturnDone(result);
+        markExit();
+        return status;
+    }
+
+private:
+    const std::string& _category;
+    Site _site;
+};
+
+} // namespace Norv::PowerStateManagementServiceProvider
+
+#endif

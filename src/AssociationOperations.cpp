@@ -263,7 +263,7 @@ private:
 
 /** The association class that a request asks for: where it names none, the provider's own. */
 const char* requestedClass(const AssociationProvider& provider, const char* assocClass) {
-    return assocClass == nullptr || *assocClass == '\0' ? provider.className : assocClass;
+    return assocClass == nullptr ? provider.className : assocClass;
 }
 
 } // namespace

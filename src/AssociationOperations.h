@@ -150,7 +150,7 @@ CMPIStatus enumAssociations(const AssociationProvider& provider, const CMPIConte
 CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIContext* context, const CMPIResult* result,
                           const CMPIObjectPath* ref, char const** properties, const Site& site = Site::here());
 
-/** An association class that is null or empty asks for this provider's own. */
+/** An association class that is null asks for this provider's own; an empty one is a name that no class has. */
 CMPIStatus associatorNames(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                            const CMPIResult* result, const CMPIObjectPath* op, const char* assocClass,
                            const char* resultClass, const Site& site = Site::here());

@@ -316,22 +316,20 @@ TEST_P(Traversal, RolesDoNotMatter) {
 
 TEST_P(Traversal, WithoutAnAssociationClassThisOneIsMeant) {
     haveFarObjects(2);
-    for (const char* none : {static_cast<const char*>(nullptr), ""}) {
-        transcript.clear();
-        expectOk(associatorNames(none));
-        EXPECT_TRUE(
-            sameLines(lines(opened("AssociatorNames"), associatorNamesReturned(), exit("AssociatorNames")), calls()));
-        transcript.clear();
-        expectOk(associators(none));
-        EXPECT_TRUE(sameLines(lines(opened("Associators"), associatorsReturned(), exit("Associators")), calls()));
-    }
+    transcript.clear();
+    expectOk(associatorNames(nullptr));
+    EXPECT_TRUE(
+        sameLines(lines(opened("AssociatorNames"), associatorNamesReturned(), exit("AssociatorNames")), calls()));
+    transcript.clear();
+    expectOk(associators(nullptr));
+    EXPECT_TRUE(sameLines(lines(opened("Associators"), associatorsReturned(), exit("Associators")), calls()));
 }
 
-TEST_P(Traversal, AForeignAssociationClassHasNoTarget) {
+TEST_P(Traversal, AForeignOrEmptyAssociationClassHasNoTarget) {
     haveFarObjects(2);
     std::string upper = className();
     std::transform(upper.begin(), upper.end(), upper.begin(), [](unsigned char c) { return std::toupper(c); });
-    for (const std::string& foreign : {std::string("CIM_Dependency"), upper, near.className}) {
+    for (const std::string& foreign : {std::string("CIM_Dependency"), upper, near.className, std::string()}) {
         transcript.clear();
         expectOk(associatorNames(foreign.c_str()));
         EXPECT_TRUE(sameLines(lines(entry("AssociatorNames"), discovery(), targetFound(foreign, nullptr, ""),

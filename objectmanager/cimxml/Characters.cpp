@@ -1,18 +1,35 @@
 #include "cimxml/Characters.h"
 
+#include <array>
+#include <cstddef>
+#include <cstdint>
+
 namespace ObjectManager::CimXml {
 
 namespace {
 
 constexpr std::string_view replacement = "\xEF\xBF\xBD";
 
-/** What does not stand for itself wherever it is, as most characters do, or is none of ASCII's. */
-constexpr ByteSet special([](unsigned char byte) {
-    return byte < 0x20 || byte >= 0x80 || byte == '<' || byte == '>' || byte == '&' || byte == '"';
-});
+/** Whether a byte does not stand for itself wherever it is, as most characters do, or belongs to no character of ASCII.
+ */
+constexpr std::array<bool, 256> special = [] {
+    std::array<bool, 256> bytes{};
+    for (unsigned int byte = 0; byte < bytes.size(); ++byte) {
+        bytes[byte] = byte < 0x20 || byte >= 0x80 || byte == '<' || byte == '>' || byte == '&' || byte == '"';
+    }
+    return bytes;
+}();
 
 unsigned char byteAt(std::string_view text, std::size_t position) {
     return static_cast<unsigned char>(text[position]);
+}
+
+/** The position of the first special byte at or behind `position`, or the end of the text. */
+std::size_t nextSpecial(std::string_view text, std::size_t position) {
+    while (position < text.size() && !special[byteAt(text, position)]) {
+        ++position;
+    }
+    return position;
 }
 
 /** The first byte of a character of several. */
@@ -34,6 +51,32 @@ Lead leadOf(unsigned char byte) {
         return {4, byte & 0x07U, 0x10000};
     }
     return {0, 0, 0};
+}
+
+/** Whether a document may contain the character. */
+bool isXmlCharacter(std::uint32_t code) {
+    return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code <= 0xD7FF) ||
+           (code >= 0xE000 && code <= 0xFFFD) || (code >= 0x10000 && code <= 0x10FFFF);
+}
+
+/**
+ * How many bytes the character of several bytes at `position` has; 0 where there is none in UTF-8, or one that XML does
+ * not allow.
+ */
+std::size_t characterLength(std::string_view text, std::size_t position) {
+    const Lead lead = leadOf(byteAt(text, position));
+    if (lead.length == 0 || text.size() - position < lead.length) {
+        return 0;
+    }
+    std::uint32_t code = lead.bits;
+    for (std::size_t i = 1; i < lead.length; ++i) {
+        const unsigned char byte = byteAt(text, position + i);
+        if ((byte & 0xC0U) != 0x80) {
+            return 0;
+        }
+        code = (code << 6U) | (byte & 0x3FU);
+    }
+    return code >= lead.least && isXmlCharacter(code) ? lead.length : 0;
 }
 
 /** How the character of one byte is written; empty where it stands for itself. */
@@ -60,7 +103,7 @@ std::string_view escapeOf(unsigned char byte, bool inAttribute) {
 
 void append(std::string& document, std::string_view text, bool inAttribute) {
     std::size_t written = 0;
-    for (std::size_t position = special.firstIn(text, 0); position < text.size();) {
+    for (std::size_t position = nextSpecial(text, 0); position < text.size();) {
         const unsigned char byte = byteAt(text, position);
         std::string_view instead;
         std::size_t length = 1;
@@ -76,37 +119,12 @@ void append(std::string& document, std::string_view text, bool inAttribute) {
             document.append(instead);
             written = position + length;
         }
-        position = special.firstIn(text, position + length);
+        position = nextSpecial(text, position + length);
     }
     document.append(text, written);
 }
 
 } // namespace
-
-bool isXmlCharacter(std::uint32_t code) {
-    return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code <= 0xD7FF) ||
-           (code >= 0xE000 && code <= 0xFFFD) || (code >= 0x10000 && code <= 0x10FFFF);
-}
-
-std::size_t specialCharacterLength(std::string_view text, std::size_t position) {
-    const unsigned char first = byteAt(text, position);
-    if (first < 0x80) {
-        return isXmlCharacter(first) ? 1 : 0;
-    }
-    const Lead lead = leadOf(first);
-    if (lead.length == 0 || text.size() - position < lead.length) {
-        return 0;
-    }
-    std::uint32_t code = lead.bits;
-    for (std::size_t i = 1; i < lead.length; ++i) {
-        const unsigned char byte = byteAt(text, position + i);
-        if ((byte & 0xC0U) != 0x80) {
-            return 0;
-        }
-        code = (code << 6U) | (byte & 0x3FU);
-    }
-    return code >= lead.least && isXmlCharacter(code) ? lead.length : 0;
-}
 
 void appendText(std::string& document, std::string_view text) {
     append(document, text, false);

@@ -257,8 +257,8 @@ void RequestHeaders::checkObject(const Message& message) const {
     std::string expected = message.nameSpace();
     bool same = object != nullptr && equalNames(nameSpace, expected);
     if (!message.isIntrinsic()) {
-        const std::string target = requiredAttribute(
-            message.target(), std::string_view(message.target().name()) == "CLASSNAME" ? "NAME" : "CLASSNAME");
+        const std::string target =
+            requiredAttribute(message.target(), message.target().name == "CLASSNAME" ? "NAME" : "CLASSNAME");
         same = same && equalNames(className, target);
         expected += ':' + target;
     }

@@ -1,304 +1,245 @@
 #include "cimxml/Markup.h"
 
-#include "cimxml/Characters.h"
 #include "cimxml/ProtocolError.h"
 #include "model/Model.h"
 
+#include <expat.h>
+
 #include <algorithm>
 #include <array>
-#include <charconv>
-#include <vector>
+#include <exception>
+#include <limits>
+#include <memory>
+#include <new>
 
 namespace ObjectManager::CimXml {
 
 namespace {
 
 constexpr std::string_view blanks = " \t\r\n";
-constexpr ByteSet whiteSpace = ByteSet::of(blanks);
-constexpr ByteSet behindNames = ByteSet::of(" \t\r\n/>=<&'\"");
-/** What stands behind the '<' of everything but a start tag. */
-constexpr ByteSet tagMarks = ByteSet::of("/!?");
-/* What ends characters that stand for themselves. */
-constexpr ByteSet behindText = ByteSet::of("<&");
-constexpr ByteSet behindDoubleQuoted = ByteSet::of("<&\"");
-constexpr ByteSet behindSingleQuoted = ByteSet::of("<&'");
-constexpr std::string_view byteOrderMark = "\xEF\xBB\xBF";
 constexpr std::array<std::string_view, 5> entities{"lt", "gt", "amp", "quot", "apos"};
+constexpr const char* knownReference = "one of the five entities of XML or a reference to a character that it allows";
 
-/** Goes over a document once, from tag to tag. */
-class Check {
+/** What would have been right where expat gives up with an error. */
+struct Expectation {
+    XML_Error error;
+    const char* expected;
+};
+
+constexpr Expectation expectations[] = {
+    {XML_ERROR_SYNTAX, "the root, and at most one document type before it"},
+    {XML_ERROR_INVALID_TOKEN, "what XML allows there"},
+    {XML_ERROR_UNCLOSED_TOKEN, "the end of what begins there"},
+    {XML_ERROR_PARTIAL_CHAR, "a whole character of UTF-8"},
+    {XML_ERROR_DUPLICATE_ATTRIBUTE, "every attribute of an element once"},
+    {XML_ERROR_JUNK_AFTER_DOC_ELEMENT, "nothing behind the root"},
+    {XML_ERROR_UNDEFINED_ENTITY, knownReference},
+    {XML_ERROR_BAD_CHAR_REF, knownReference},
+    {XML_ERROR_UNCLOSED_CDATA_SECTION, "the end of a CDATA section"},
+    {XML_ERROR_MISPLACED_XML_PI, "the XML declaration at the beginning only"},
+    {XML_ERROR_XML_DECL, "an XML declaration with a version"},
+};
+
+/** What stands at a position of a text, cut short, as a message can quote it. */
+std::string quoted(std::string_view text, std::size_t position) {
+    if (position >= text.size()) {
+        return "the end of the document";
+    }
+    constexpr std::size_t longest = 20;
+    const std::string_view rest = text.substr(position, longest);
+    const auto* const end = std::find_if(rest.begin(), rest.end(), [](char c) { return c < ' ' || c > '~'; });
+    if (end != rest.begin()) {
+        return '\'' + std::string(rest.begin(), end) + '\'';
+    }
+    constexpr std::string_view digits = "0123456789ABCDEF";
+    const auto byte = static_cast<unsigned char>(rest.front());
+    return std::string("the byte 0x") + digits[byte >> 4U] + digits[byte & 0xFU];
+}
+
+/** Makes the elements of one document from what expat finds in it. */
+class Builder {
 public:
-    explicit Check(std::string_view text) : _text(text) {}
+    explicit Builder(std::string_view text) : _text(text), _parser(XML_ParserCreate("UTF-8"), XML_ParserFree) {
+        if (_parser == nullptr) {
+            throw std::bad_alloc();
+        }
+        XML_SetUserData(_parser.get(), this);
+        XML_SetXmlDeclHandler(_parser.get(), onDeclaration);
+        XML_SetStartDoctypeDeclHandler(_parser.get(), onDocumentType);
+        XML_SetSkippedEntityHandler(_parser.get(), onSkippedEntity);
+        XML_SetElementHandler(_parser.get(), onStart, onEnd);
+        XML_SetCharacterDataHandler(_parser.get(), onText);
+    }
 
-    void run() {
-        checkCharacters();
-        declaration();
-        while (_position < _text.size()) {
-            if (_text[_position] == '<') {
-                markup();
-            } else if (_open.empty() && whiteSpace.contains(_text[_position])) {
-                ++_position;
-            } else {
-                requireInside();
-                characters(behindText);
-            }
+    XmlElement build() {
+        if (_text.size() > static_cast<std::size_t>(std::numeric_limits<int>::max())) {
+            throw notWellFormed("the body is no XML: found " + std::to_string(_text.size()) + " bytes, expected less");
         }
-        if (!_open.empty()) {
-            fail("the end of the element " + std::string(_open.back()) + " is missing");
+        // Expat recognises UTF-16 whatever it is told. A document in it has zeros, which UTF-8 has for no character.
+        if (const std::size_t zero = _text.find('\0'); zero != std::string_view::npos) {
+            throw malformed(zero, "found " + quoted(_text, zero) + ", expected a character of UTF-8 that XML allows");
         }
-        if (!_rootSeen) {
-            fail("there is no element");
+        const XML_Status status =
+            XML_Parse(_parser.get(), _text.data(), static_cast<int>(_text.size()), /*isFinal=*/XML_TRUE);
+        if (_failure) {
+            std::rethrow_exception(_failure);
         }
+        if (status != XML_STATUS_OK) {
+            throw error();
+        }
+        return std::move(_root);
     }
 
 private:
-    void checkCharacters() {
-        for (std::size_t position = 0; position < _text.size();) {
-            const std::size_t length = characterLength(_text, position);
-            if (length == 0) {
-                _position = position;
-                fail("there is a byte that is not UTF-8, or a character that XML does not allow");
-            }
-            position += length;
-        }
-    }
-
-    /** The XML declaration, of which only the encoding matters. */
-    void declaration() {
-        if (!_text.starts_with("<?xml") || _text.size() == 5 || !whiteSpace.contains(_text[5])) {
+    /**
+     * Does what a handler has to do. No exception may go through expat: it is kept until the parser has stopped, which
+     * may call some handlers before it does.
+     */
+    template <class Do>
+    static void handle(void* self, Do doWith) {
+        auto& builder = *static_cast<Builder*>(self);
+        if (builder._failure) {
             return;
         }
-        skipTo("?>", "the XML declaration");
-        const std::string_view whole = _text.substr(0, _position);
-        const std::size_t start = whole.find("encoding");
-        const std::size_t quote = whole.find_first_of("'\"", start == std::string_view::npos ? whole.size() : start);
-        if (quote != std::string_view::npos) {
-            const std::string_view encoding = whole.substr(quote + 1, whole.find(whole[quote], quote + 1) - quote - 1);
-            if (!equalNames(encoding, "utf-8") && !equalNames(encoding, "us-ascii")) {
+        try {
+            doWith(builder);
+        } catch (...) {
+            builder._failure = std::current_exception();
+            XML_StopParser(builder._parser.get(), XML_FALSE);
+        }
+    }
+
+    static void onDeclaration(void* self, const XML_Char*, const XML_Char* encoding, int) {
+        handle(self, [&](Builder&) {
+            if (encoding != nullptr && !equalNames(encoding, "utf-8") && !equalNames(encoding, "us-ascii")) {
                 throw ProtocolError(Http::unsupportedMediaType, nullptr,
-                                    "found the encoding \"" + std::string(encoding) + "\", expected utf-8");
+                                    std::string("found the encoding \"") + encoding + "\", expected utf-8");
             }
-        }
+        });
     }
 
-    void markup() {
-        if (!tagMarks.contains(_position + 1 < _text.size() ? _text[_position + 1] : '\0')) {
-            ++_position;
-            startTag();
-        } else if (accept("</")) {
-            endTag();
-        } else if (accept("<!--")) {
-            skipTo("-->", "a comment");
-        } else if (accept("<![CDATA[")) {
-            requireInside();
-            skipTo("]]>", "a CDATA section");
-        } else if (accept("<?")) {
-            skipTo("?>", "a processing instruction");
-        } else if (accept("<!DOCTYPE")) {
-            documentType();
-        } else if (accept("<!")) {
-            fail("found a declaration, expected none");
-        }
-    }
-
-    /** A document type may be named. What it would declare here are entities, which nothing needs. */
-    void documentType() {
-        if (_rootSeen) {
-            fail("found a document type, expected it before the root");
-        }
-        char quote = '\0';
-        for (; _position < _text.size(); ++_position) {
-            const char c = _text[_position];
-            if (quote != '\0') {
-                quote = c == quote ? '\0' : quote;
-            } else if (c == '"' || c == '\'') {
-                quote = c;
-            } else if (c == '>') {
-                ++_position;
-                return;
-            } else if (c == '[' || c == '<') {
-                fail("found declarations in the document type, expected none");
+    static void onDocumentType(void* self, const XML_Char*, const XML_Char*, const XML_Char*, int declares) {
+        handle(self, [&](Builder& builder) {
+            if (declares != 0) {
+                throw builder.malformed("found declarations in the document type, expected none");
             }
-        }
-        fail("the end of the document type is missing");
+            builder._documentTypeSeen = true;
+        });
     }
 
-    void startTag() {
-        if (_open.empty() && _rootSeen) {
-            fail("found a second root, expected one");
-        }
-        _rootSeen = true;
-        const std::string_view element = name();
+    /** Expat passes over an entity that could be declared in a document type that it does not read. */
+    static void onSkippedEntity(void* self, const XML_Char* entity, int) {
+        handle(self, [&](Builder& builder) { throw builder.unknownEntity(entity); });
+    }
+
+    static void onStart(void* self, const XML_Char* name, const XML_Char** attributes) {
+        handle(self, [&](Builder& builder) { builder.start(name, attributes); });
+    }
+
+    static void onEnd(void* self, const XML_Char*) {
+        handle(self, [](Builder& builder) { builder._open.pop_back(); });
+    }
+
+    static void onText(void* self, const XML_Char* text, int length) {
+        handle(self,
+               [&](Builder& builder) { builder._open.back()->text.append(text, static_cast<std::size_t>(length)); });
+    }
+
+    void start(const char* name, const char** attributes) {
         if (_open.size() == maximumDepth) {
-            fail("found more than " + std::to_string(maximumDepth) + " elements within each other");
+            throw malformed("found more than " + std::to_string(maximumDepth) + " elements within each other");
         }
-        _attributes.clear();
-        while (true) {
-            const bool separated = skipWhiteSpace();
-            if (accept("/>")) {
-                return;
+        if (_count == maximumElements) {
+            throw malformed("found more than " + std::to_string(maximumElements) + " elements");
+        }
+        ++_count;
+        if (_documentTypeSeen) {
+            checkEntitiesOfTag();
+        }
+        // An element that is open stays where it is: its parent gets no other child meanwhile.
+        XmlElement& element = _open.empty() ? _root : _open.back()->children.emplace_back();
+        element.name = name;
+        for (; *attributes != nullptr; attributes += 2) {
+            if (element.attributes.size() == maximumAttributes) {
+                throw malformed("found more than " + std::to_string(maximumAttributes) + " attributes");
             }
-            if (accept(">")) {
-                _open.push_back(element);
-                return;
+            element.attributes.emplace_back(attributes[0], attributes[1]);
+        }
+        _open.push_back(&element);
+    }
+
+    /** Of entities that expat passes over, it tells of none where they stand in an attribute's value. */
+    void checkEntitiesOfTag() const {
+        const std::string_view tag =
+            _text.substr(position(), static_cast<std::size_t>(XML_GetCurrentByteCount(_parser.get())));
+        for (std::size_t found = tag.find('&'); found != std::string_view::npos; found = tag.find('&', found + 1)) {
+            const std::string_view entity = tag.substr(found + 1, tag.find(';', found) - found - 1);
+            if (!entity.starts_with('#') && std::find(entities.begin(), entities.end(), entity) == entities.end()) {
+                throw unknownEntity(entity);
             }
-            if (!separated) {
-                fail("found no end of the tag " + std::string(element));
-            }
-            attribute();
         }
     }
 
-    void attribute() {
-        const std::string_view attributeName = name();
-        if (std::find(_attributes.begin(), _attributes.end(), attributeName) != _attributes.end()) {
-            fail("found the attribute " + std::string(attributeName) + " twice");
-        }
-        if (_attributes.size() == maximumAttributes) {
-            fail("found more than " + std::to_string(maximumAttributes) + " attributes");
-        }
-        _attributes.push_back(attributeName);
-        skipWhiteSpace();
-        if (!accept("=")) {
-            fail("found no '=' behind the attribute " + std::string(attributeName));
-        }
-        skipWhiteSpace();
-        const char quote = peek();
-        if (quote != '"' && quote != '\'') {
-            fail("found no quote before the value of the attribute " + std::string(attributeName));
-        }
-        ++_position;
-        characters(quote == '"' ? behindDoubleQuoted : behindSingleQuoted);
-        if (peek() != quote) {
-            fail("found no end of the value of the attribute " + std::string(attributeName));
-        }
-        ++_position;
+    /** Of what the parser is at. */
+    std::size_t position() const {
+        const XML_Index index = XML_GetCurrentByteIndex(_parser.get());
+        return index < 0 ? 0 : static_cast<std::size_t>(index);
     }
 
-    void endTag() {
-        const std::string_view element = name();
-        skipWhiteSpace();
-        const bool ended = accept(">");
-        if (_open.empty() || _open.back() != element) {
-            fail("found the end of " + std::string(element) + ", expected that of " +
-                 (_open.empty() ? "nothing" : std::string(_open.back())));
+    ProtocolError malformed(const std::string& message) const { return malformed(position(), message); }
+
+    static ProtocolError malformed(std::size_t position, const std::string& message) {
+        return notWellFormed("the body is no XML: at byte " + std::to_string(position + 1) + ", " + message);
+    }
+
+    ProtocolError unknownEntity(std::string_view entity) const {
+        return malformed("found '&" + std::string(entity) + ";', expected " + knownReference);
+    }
+
+    /** What expat did not take, and why. */
+    ProtocolError error() const {
+        const XML_Error code = XML_GetErrorCode(_parser.get());
+        if (code == XML_ERROR_NO_MEMORY) {
+            throw std::bad_alloc();
         }
-        if (!ended) {
-            fail("found no '>' behind the end of " + std::string(element));
+        const std::string found = "found " + quoted(_text, position()) + ", expected ";
+        if (code == XML_ERROR_NO_ELEMENTS) {
+            return malformed(found + (_open.empty() ? "an element" : "the end of the element " + _open.back()->name));
         }
-        _open.pop_back();
-    }
-
-    /** Characters and references to some, up to what else is in `end`. */
-    void characters(const ByteSet& end) {
-        while ((_position = end.firstIn(_text, _position)) < _text.size() && accept("&")) {
-            reference();
+        if (code == XML_ERROR_TAG_MISMATCH) {
+            return malformed(found + "the end of the element " + _open.back()->name);
         }
-    }
-
-    void reference() {
-        const std::string_view rest = _text.substr(_position);
-        const std::size_t length = rest.find(';'); // far off, with any number of leading zeros
-        const std::string_view entity = rest.substr(0, length);
-        if (length == std::string_view::npos || !isKnown(entity)) {
-            constexpr std::size_t longestQuoted = 10;
-            const std::string_view quoted = entity.substr(0, longestQuoted);
-            fail("found '&" + std::string(quoted.substr(0, quoted.find_first_of(blanks))) +
-                 "', expected one of the five entities of XML or a reference to a character that it allows");
-        }
-        _position += length + 1;
-    }
-
-    static bool isKnown(std::string_view entity) {
-        if (!entity.starts_with('#')) {
-            return std::find(entities.begin(), entities.end(), entity) != entities.end();
-        }
-        const bool hexadecimal = entity.starts_with("#x");
-        const std::string_view digits = entity.substr(hexadecimal ? 2 : 1);
-        std::uint32_t code = 0;
-        const auto [end, error] =
-            std::from_chars(digits.data(), digits.data() + digits.size(), code, hexadecimal ? 16 : 10);
-        return error == std::errc() && end == digits.data() + digits.size() && isXmlCharacter(code);
-    }
-
-    std::string_view name() {
-        const std::size_t end = behindNames.firstIn(_text, _position);
-        if (end == _position) {
-            fail("found no name");
-        }
-        const std::string_view found = _text.substr(_position, end - _position);
-        _position = end;
-        return found;
-    }
-
-    bool skipWhiteSpace() {
-        const std::size_t start = _position;
-        _position = whiteSpace.firstNotIn(_text, _position);
-        return _position != start;
-    }
-
-    void skipTo(std::string_view end, const std::string& what) {
-        const std::size_t found = _text.find(end, _position);
-        if (found == std::string_view::npos) {
-            fail("the end of " + what + " is missing");
-        }
-        _position = found + end.size();
-    }
-
-    bool accept(std::string_view expected) {
-        const bool there = _text.substr(_position).starts_with(expected);
-        _position += there ? expected.size() : 0;
-        return there;
-    }
-
-    char peek() const { return _position < _text.size() ? _text[_position] : '\0'; }
-
-    void requireInside() {
-        if (_open.empty()) {
-            fail("found text outside the root");
-        }
-    }
-
-    [[noreturn]] void fail(const std::string& message) const {
-        throw notWellFormed("the body is no XML: at byte " + std::to_string(_position + 1) + ", " + message);
+        const auto* const known = std::find_if(std::begin(expectations), std::end(expectations),
+                                               [&](const Expectation& entry) { return entry.error == code; });
+        return malformed(known == std::end(expectations) ? std::string(XML_ErrorString(code))
+                                                         : found + known->expected);
     }
 
     std::string_view _text;
-    std::size_t _position = 0;
+    std::unique_ptr<XML_ParserStruct, decltype(&XML_ParserFree)> _parser;
+    XmlElement _root;
     /** The elements that have begun and not ended. */
-    std::vector<std::string_view> _open;
-    /** Of the tag that is being read. */
-    std::vector<std::string_view> _attributes;
-    bool _rootSeen = false;
+    std::vector<XmlElement*> _open;
+    std::size_t _count = 0;
+    bool _documentTypeSeen = false;
+    /** What a handler threw. */
+    std::exception_ptr _failure;
 };
 
 } // namespace
 
-void parseMarkup(std::string_view text, pugi::xml_document& document) {
-    if (text.starts_with(byteOrderMark)) {
-        text.remove_prefix(byteOrderMark.size());
-    }
-    Check(text).run();
-    const pugi::xml_parse_result result = document.load_buffer(
-        text.data(), text.size(), pugi::parse_default | pugi::parse_ws_pcdata, pugi::encoding_utf8);
-    if (!result) {
-        throw notWellFormed("the body is no XML: at byte " + std::to_string(result.offset + 1) + ", " +
-                            result.description());
-    }
+const std::string* XmlElement::attribute(std::string_view attributeName) const {
+    const auto found = std::find_if(attributes.begin(), attributes.end(),
+                                    [&](const auto& attribute) { return attribute.first == attributeName; });
+    return found == attributes.end() ? nullptr : &found->second;
 }
 
-std::string textOf(const pugi::xml_node& element) {
-    std::string text;
-    for (const pugi::xml_node& part : element) {
-        if (part.type() == pugi::node_pcdata || part.type() == pugi::node_cdata) {
-            text += part.value();
-        }
-    }
-    return text;
+XmlElement parseMarkup(std::string_view text) {
+    return Builder(text).build();
 }
 
 std::string_view trimmed(std::string_view text) {
-    const std::size_t start = whiteSpace.firstNotIn(text, 0);
+    const std::size_t start = std::min(text.find_first_not_of(blanks), text.size());
     return text.substr(start, text.find_last_not_of(blanks) - start + 1);
 }
 

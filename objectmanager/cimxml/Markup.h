@@ -2,29 +2,38 @@
 #ifndef CIMXML_MARKUP_H
 #define CIMXML_MARKUP_H
 
-#include <pugixml.hpp>
-
 #include <cstddef>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 namespace ObjectManager::CimXml {
 
-/** How many elements may stand within each other, and how many attributes an element may have. */
+/* How much a document may have: elements within each other, attributes of one element, elements altogether. */
 constexpr std::size_t maximumDepth = 100;
 constexpr std::size_t maximumAttributes = 50;
+constexpr std::size_t maximumElements = 100'000;
+
+/** An element of a document, with everything that stands in it. */
+struct XmlElement {
+    std::string name;
+    std::vector<std::pair<std::string, std::string>> attributes;
+    /** The text that stands in the element itself and not in one of its children, white space included. */
+    std::string text;
+    std::vector<XmlElement> children;
+
+    /** The value of an attribute; null where the element has no attribute of that name. */
+    const std::string* attribute(std::string_view attributeName) const;
+};
 
 /**
- * Reads a document. It is checked first for what the parser lets pass: that it is UTF-8 with the characters that XML
- * allows, has one root and matching tags, names no attribute twice, refers to no entity but the five of XML itself and
- * declares none.
+ * Reads a document in UTF-8 and gives its root. A document may name a document type, of which nothing is read, and must
+ * not declare anything; the only entities are the five of XML itself.
  *
- * @throws ProtocolError where it is not well-formed, too deep, or in another encoding.
+ * @throws ProtocolError where the document is not well-formed, beyond one of the limits above, or in another encoding.
  */
-void parseMarkup(std::string_view text, pugi::xml_document& document);
-
-/** The text that stands in an element itself, white space included. */
-std::string textOf(const pugi::xml_node& element);
+XmlElement parseMarkup(std::string_view text);
 
 /** The text without the white space at its ends. */
 std::string_view trimmed(std::string_view text);

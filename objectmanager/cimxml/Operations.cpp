@@ -444,8 +444,8 @@ std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& me
     for (const Parameter& parameter : method.parameters) {
         const auto argument = std::find_if(given.begin(), given.end(),
                                            [&](const Argument& a) { return equalNames(a.name, parameter.name); });
-        if (argument != given.end() && argument->content) {
-            arguments.push_back({parameter.name, reader.argument(argument->content, parameter)});
+        if (argument != given.end() && argument->content != nullptr) {
+            arguments.push_back({parameter.name, reader.argument(*argument->content, parameter)});
         } else if (hasFlag(parameter.qualifiers, "Required")) {
             throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, "found no argument " + parameter.name +
                                                               ", expected it since " + method.name + " requires it");
@@ -458,7 +458,7 @@ std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& me
 void callMethod(const Operation& operation) {
     const Message& message = operation.message;
     const ValueReader reader(operation.catalogue, message.nameSpace());
-    const bool isClass = std::string_view(message.target().name()) == "CLASSNAME";
+    const bool isClass = message.target().name == "CLASSNAME";
     const ObjectPath path = isClass ? reader.className(message.target()) : reader.instanceName(message.target());
     const Class* declared = operation.catalogue.find(path.className);
     if (declared == nullptr) {

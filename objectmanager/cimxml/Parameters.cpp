@@ -33,40 +33,41 @@ Parameters::Parameters(const Message& message, const Catalogue& catalogue, const
     }
 }
 
-pugi::xml_node Parameters::optional(std::string_view name, std::initializer_list<std::string_view> elements) const {
+const XmlElement* Parameters::optional(std::string_view name, std::initializer_list<std::string_view> elements) const {
     const auto& arguments = _message.arguments();
     const auto found = std::find_if(arguments.begin(), arguments.end(),
                                     [&](const Argument& argument) { return equalNames(argument.name, name); });
-    if (found == arguments.end() || !found->content) {
-        return {};
+    if (found == arguments.end() || found->content == nullptr) {
+        return nullptr;
     }
-    if (std::find(elements.begin(), elements.end(), std::string_view(found->content.name())) == elements.end()) {
-        invalid(std::string("found a ") + found->content.name() + " for the parameter " + std::string(name) +
-                ", expected a " + std::string(*elements.begin()));
+    if (std::find(elements.begin(), elements.end(), found->content->name) == elements.end()) {
+        invalid("found a " + found->content->name + " for the parameter " + std::string(name) + ", expected a " +
+                std::string(*elements.begin()));
     }
     return found->content;
 }
 
-pugi::xml_node Parameters::required(std::string_view name, std::initializer_list<std::string_view> elements) const {
-    const pugi::xml_node found = optional(name, elements);
-    if (!found) {
+const XmlElement& Parameters::required(std::string_view name, std::initializer_list<std::string_view> elements) const {
+    const XmlElement* const found = optional(name, elements);
+    if (found == nullptr) {
         invalid("found no parameter " + std::string(name) + ", expected it with " + _message.method());
     }
-    return found;
+    return *found;
 }
 
 bool Parameters::flag(std::string_view name, bool otherwise) const {
-    const pugi::xml_node found = optional(name, {"VALUE"});
-    return found ? std::get<bool>(_reader.value(found, CMPI_boolean, std::string(name)).content) : otherwise;
+    const XmlElement* const found = optional(name, {"VALUE"});
+    return found == nullptr ? otherwise
+                            : std::get<bool>(_reader.value(*found, CMPI_boolean, std::string(name)).content);
 }
 
 std::string Parameters::text(std::string_view name) const {
-    return textOf(required(name, {"VALUE"}));
+    return required(name, {"VALUE"}).text;
 }
 
 std::string Parameters::optionalText(std::string_view name) const {
-    const pugi::xml_node found = optional(name, {"VALUE"});
-    return found ? textOf(found) : std::string();
+    const XmlElement* const found = optional(name, {"VALUE"});
+    return found == nullptr ? std::string() : found->text;
 }
 
 ObjectPath Parameters::className(std::string_view name) const {
@@ -74,8 +75,8 @@ ObjectPath Parameters::className(std::string_view name) const {
 }
 
 std::string Parameters::optionalClassName(std::string_view name) const {
-    const pugi::xml_node found = optional(name, {"CLASSNAME"});
-    return found ? _reader.className(found).className : std::string();
+    const XmlElement* const found = optional(name, {"CLASSNAME"});
+    return found == nullptr ? std::string() : _reader.className(*found).className;
 }
 
 ObjectPath Parameters::instanceName(std::string_view name) const {
@@ -83,18 +84,18 @@ ObjectPath Parameters::instanceName(std::string_view name) const {
 }
 
 ObjectPath Parameters::objectName(std::string_view name) const {
-    const pugi::xml_node found = required(name, {"INSTANCENAME", "CLASSNAME"});
-    return std::string_view(found.name()) == "CLASSNAME" ? _reader.className(found) : _reader.instanceName(found);
+    const XmlElement& found = required(name, {"INSTANCENAME", "CLASSNAME"});
+    return found.name == "CLASSNAME" ? _reader.className(found) : _reader.instanceName(found);
 }
 
 PropertyList Parameters::propertyList() const {
     constexpr std::string_view name = "PropertyList";
-    const pugi::xml_node found = optional(name, {"VALUE.ARRAY"});
-    if (!found) {
+    const XmlElement* const found = optional(name, {"VALUE.ARRAY"});
+    if (found == nullptr) {
         return std::nullopt;
     }
     PropertyList properties(std::in_place);
-    const Value value = _reader.value(found, CMPI_stringA, std::string(name));
+    const Value value = _reader.value(*found, CMPI_stringA, std::string(name));
     for (const Value& element : std::get<Value::Array>(value.content)) {
         const auto* property = std::get_if<std::string>(&element.content);
         if (property == nullptr || std::any_of(properties->begin(), properties->end(), [&](const std::string& other) {
@@ -115,7 +116,7 @@ Instance Parameters::instance(std::string_view name) const {
 }
 
 Instance Parameters::namedInstance(std::string_view name) const {
-    const pugi::xml_node found = required(name, {"VALUE.NAMEDINSTANCE"});
+    const XmlElement& found = required(name, {"VALUE.NAMEDINSTANCE"});
     ObjectPath path = _reader.instanceName(requiredChild(found, {"INSTANCENAME"}));
     Instance instance = _reader.instance(requiredChild(found, {"INSTANCE"}), CMPI_RC_ERR_NO_SUCH_PROPERTY);
     if (!equalNames(instance.path.className, path.className)) {
@@ -126,8 +127,8 @@ Instance Parameters::namedInstance(std::string_view name) const {
 }
 
 Value Parameters::value(std::string_view name, CMPIType type) const {
-    const pugi::xml_node found = optional(name, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE"});
-    return found ? _reader.value(found, type, std::string(name)) : nullValue(type);
+    const XmlElement* const found = optional(name, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE"});
+    return found == nullptr ? nullValue(type) : _reader.value(*found, type, std::string(name));
 }
 
 } // namespace ObjectManager::CimXml

@@ -45,8 +45,8 @@ public:
     Value value(std::string_view name, CMPIType type) const;
 
 private:
-    pugi::xml_node optional(std::string_view name, std::initializer_list<std::string_view> elements) const;
-    pugi::xml_node required(std::string_view name, std::initializer_list<std::string_view> elements) const;
+    const XmlElement* optional(std::string_view name, std::initializer_list<std::string_view> elements) const;
+    const XmlElement& required(std::string_view name, std::initializer_list<std::string_view> elements) const;
 
     const Message& _message;
     ValueReader _reader;

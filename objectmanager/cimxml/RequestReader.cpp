@@ -28,41 +28,43 @@ std::string namesOf(std::initializer_list<std::string_view> names) {
 
 } // namespace
 
-pugi::xml_node optionalChild(const pugi::xml_node& element, std::initializer_list<std::string_view> names) {
-    pugi::xml_node found;
-    for (const pugi::xml_node& child : element) {
-        if (std::find(names.begin(), names.end(), std::string_view(child.name())) == names.end()) {
+const XmlElement* optionalChild(const XmlElement& element, std::initializer_list<std::string_view> names) {
+    const XmlElement* found = nullptr;
+    for (const XmlElement& child : element.children) {
+        if (std::find(names.begin(), names.end(), child.name) == names.end()) {
             continue;
         }
-        if (found) {
-            throw notLooselyValid(std::string("found ") + found.name() + " and " + child.name() + " in " +
-                                  element.name() + ", expected one of " + namesOf(names));
+        if (found != nullptr) {
+            throw notLooselyValid("found " + found->name + " and " + child.name + " in " + element.name +
+                                  ", expected one of " + namesOf(names));
         }
-        found = child;
+        found = &child;
     }
     return found;
 }
 
-pugi::xml_node requiredChild(const pugi::xml_node& element, std::initializer_list<std::string_view> names) {
-    pugi::xml_node found = optionalChild(element, names);
-    if (!found) {
-        throw notLooselyValid(std::string("found nothing in ") + element.name() + ", expected " + namesOf(names));
+const XmlElement& requiredChild(const XmlElement& element, std::initializer_list<std::string_view> names) {
+    const XmlElement* found = optionalChild(element, names);
+    if (found == nullptr) {
+        throw notLooselyValid("found nothing in " + element.name + ", expected " + namesOf(names));
     }
-    return found;
+    return *found;
 }
 
-std::string requiredAttribute(const pugi::xml_node& element, const char* name) {
-    const pugi::xml_attribute attribute = element.attribute(name);
-    if (!attribute) {
-        throw notLooselyValid(std::string("found no attribute ") + name + " of " + element.name());
+const std::string& requiredAttribute(const XmlElement& element, std::string_view name) {
+    const std::string* attribute = element.attribute(name);
+    if (attribute == nullptr) {
+        throw notLooselyValid("found no attribute " + std::string(name) + " of " + element.name);
     }
-    return attribute.value();
+    return *attribute;
 }
 
-std::string nameSpaceOf(const pugi::xml_node& localNameSpacePath) {
+std::string nameSpaceOf(const XmlElement& localNameSpacePath) {
     std::string path;
-    for (const pugi::xml_node& part : localNameSpacePath.children("NAMESPACE")) {
-        path += (path.empty() ? "" : "/") + requiredAttribute(part, "NAME");
+    for (const XmlElement& part : localNameSpacePath.children) {
+        if (part.name == "NAMESPACE") {
+            path += (path.empty() ? "" : "/") + requiredAttribute(part, "NAME");
+        }
     }
     if (path.empty()) {
         throw notLooselyValid("found no NAMESPACE in LOCALNAMESPACEPATH");
@@ -70,34 +72,30 @@ std::string nameSpaceOf(const pugi::xml_node& localNameSpacePath) {
     return path;
 }
 
-Message::Message(std::string_view body) {
-    parseMarkup(body, _document);
-    const pugi::xml_node root = _document.document_element();
-    if (std::string_view(root.name()) != "CIM") {
-        throw notLooselyValid(std::string("found the root ") + root.name() + ", expected CIM");
+Message::Message(std::string_view body) : _root(parseMarkup(body)) {
+    if (_root.name != "CIM") {
+        throw notLooselyValid("found the root " + _root.name + ", expected CIM");
     }
-    requireVersion(requiredAttribute(root, "CIMVERSION"), "2.", "CIMVERSION", "unsupported-cim-version");
-    requireVersion(requiredAttribute(root, "DTDVERSION"), "2.", "DTDVERSION", "unsupported-dtd-version");
-    const pugi::xml_node message = requiredChild(root, {"MESSAGE"});
+    requireVersion(requiredAttribute(_root, "CIMVERSION"), "2.", "CIMVERSION", "unsupported-cim-version");
+    requireVersion(requiredAttribute(_root, "DTDVERSION"), "2.", "DTDVERSION", "unsupported-dtd-version");
+    const XmlElement& message = requiredChild(_root, {"MESSAGE"});
     _id = requiredAttribute(message, "ID");
     _protocolVersion = requiredAttribute(message, "PROTOCOLVERSION");
     requireVersion(_protocolVersion, "1.", "PROTOCOLVERSION", "unsupported-protocol-version");
-    const pugi::xml_node request = requiredChild(message, {"SIMPLEREQ", "MULTIREQ", "SIMPLEEXPREQ", "MULTIEXPREQ"});
-    readOperation(request);
+    readOperation(requiredChild(message, {"SIMPLEREQ", "MULTIREQ", "SIMPLEEXPREQ", "MULTIEXPREQ"}));
 }
 
-void Message::readOperation(const pugi::xml_node& request) {
-    const std::string_view kind = request.name();
-    if (kind == "MULTIREQ") {
+void Message::readOperation(const XmlElement& request) {
+    if (request.name == "MULTIREQ") {
         throw ProtocolError(Http::notImplemented, "multiple-requests-unsupported",
                             "found several operations in one request, expected one");
     }
-    if (kind != "SIMPLEREQ") {
+    if (request.name != "SIMPLEREQ") {
         throw ProtocolError(Http::notImplemented, "unsupported-operation", "found an export, expected an operation");
     }
-    const pugi::xml_node call = requiredChild(request, {"IMETHODCALL", "METHODCALL"});
+    const XmlElement& call = requiredChild(request, {"IMETHODCALL", "METHODCALL"});
     _method = requiredAttribute(call, "NAME");
-    _intrinsic = std::string_view(call.name()) == "IMETHODCALL";
+    _intrinsic = call.name == "IMETHODCALL";
     if (_intrinsic) {
         _nameSpace = nameSpaceOf(requiredChild(call, {"LOCALNAMESPACEPATH"}));
         readArguments(call, "IPARAMVALUE");
@@ -106,16 +104,19 @@ void Message::readOperation(const pugi::xml_node& request) {
     }
 }
 
-void Message::readMethodCall(const pugi::xml_node& call) {
-    const pugi::xml_node path = requiredChild(call, {"LOCALINSTANCEPATH", "LOCALCLASSPATH"});
+void Message::readMethodCall(const XmlElement& call) {
+    const XmlElement& path = requiredChild(call, {"LOCALINSTANCEPATH", "LOCALCLASSPATH"});
     _nameSpace = nameSpaceOf(requiredChild(path, {"LOCALNAMESPACEPATH"}));
-    const bool instance = std::string_view(path.name()) == "LOCALINSTANCEPATH";
-    _target = instance ? requiredChild(path, {"INSTANCENAME"}) : requiredChild(path, {"CLASSNAME"});
+    const bool instance = path.name == "LOCALINSTANCEPATH";
+    _target = &requiredChild(path, {instance ? "INSTANCENAME" : "CLASSNAME"});
     readArguments(call, "PARAMVALUE");
 }
 
-void Message::readArguments(const pugi::xml_node& call, const char* element) {
-    for (const pugi::xml_node& parameter : call.children(element)) {
+void Message::readArguments(const XmlElement& call, std::string_view element) {
+    for (const XmlElement& parameter : call.children) {
+        if (parameter.name != element) {
+            continue;
+        }
         _arguments.push_back({requiredAttribute(parameter, "NAME"),
                               optionalChild(parameter, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE", "VALUE.REFARRAY",
                                                         "CLASSNAME", "INSTANCENAME", "CLASS", "INSTANCE",

@@ -2,7 +2,7 @@
 #ifndef CIMXML_REQUESTREADER_H
 #define CIMXML_REQUESTREADER_H
 
-#include <pugixml.hpp>
+#include "cimxml/Markup.h"
 
 #include <initializer_list>
 #include <string>
@@ -14,8 +14,8 @@ namespace ObjectManager::CimXml {
 /** An IPARAMVALUE or PARAMVALUE. */
 struct Argument {
     std::string name;
-    /** What it holds; null where it is null. */
-    pugi::xml_node content;
+    /** What it holds; null where it is null. Belongs to the message. */
+    const XmlElement* content;
 };
 
 /** One operation, as far as it can be read without knowing which. */
@@ -33,36 +33,37 @@ public:
     const std::string& method() const { return _method; }
     /** For example "root/cimv2". */
     const std::string& nameSpace() const { return _nameSpace; }
-    /** The CLASSNAME or INSTANCENAME whose method is called; null for intrinsic methods. */
-    const pugi::xml_node& target() const { return _target; }
+    /** The CLASSNAME or INSTANCENAME whose method is called. Not for intrinsic methods. */
+    const XmlElement& target() const { return *_target; }
     /** In the order of the document. */
     const std::vector<Argument>& arguments() const { return _arguments; }
 
 private:
-    void readOperation(const pugi::xml_node& request);
-    void readMethodCall(const pugi::xml_node& call);
-    void readArguments(const pugi::xml_node& call, const char* element);
+    void readOperation(const XmlElement& request);
+    void readMethodCall(const XmlElement& call);
+    void readArguments(const XmlElement& call, std::string_view element);
 
-    pugi::xml_document _document;
+    XmlElement _root;
     std::string _id;
     std::string _protocolVersion;
     bool _intrinsic = false;
     std::string _method;
     std::string _nameSpace;
-    pugi::xml_node _target;
+    /** Null for intrinsic methods. */
+    const XmlElement* _target = nullptr;
     std::vector<Argument> _arguments;
 };
 
 /* Elements that nobody knows are passed over. All throw ProtocolError. */
 
 /** The one child with one of these names, or null where there is none. */
-pugi::xml_node optionalChild(const pugi::xml_node& element, std::initializer_list<std::string_view> names);
+const XmlElement* optionalChild(const XmlElement& element, std::initializer_list<std::string_view> names);
 /** The one child with one of these names. */
-pugi::xml_node requiredChild(const pugi::xml_node& element, std::initializer_list<std::string_view> names);
+const XmlElement& requiredChild(const XmlElement& element, std::initializer_list<std::string_view> names);
 /** The value of an attribute that must be there. */
-std::string requiredAttribute(const pugi::xml_node& element, const char* name);
+const std::string& requiredAttribute(const XmlElement& element, std::string_view name);
 /** The namespace that a LOCALNAMESPACEPATH names. */
-std::string nameSpaceOf(const pugi::xml_node& localNameSpacePath);
+std::string nameSpaceOf(const XmlElement& localNameSpacePath);
 
 } // namespace ObjectManager::CimXml
 

@@ -40,21 +40,25 @@ std::optional<std::string> integerLiteral(std::string_view text) {
 }
 
 /** The type that an attribute names; nothing where it is not there. */
-std::optional<CMPIType> typeOfAttribute(const pugi::xml_node& element, const char* attribute) {
-    const std::string name = element.attribute(attribute).value();
-    const auto type = typeByName(name);
-    if (!name.empty() && !type && !equalNames(name, "reference")) {
-        invalid("found the type \"" + name + "\", expected one of CIM's");
+std::optional<CMPIType> typeOfAttribute(const XmlElement& element, std::string_view attribute) {
+    const std::string* const name = element.attribute(attribute);
+    if (name == nullptr) {
+        return std::nullopt;
+    }
+    const auto type = typeByName(*name);
+    if (!name->empty() && !type && !equalNames(*name, "reference")) {
+        invalid("found the type \"" + *name + "\", expected one of CIM's");
     }
     return type;
 }
 
 /** The value of a key that no class declares. */
-Value untypedKey(const pugi::xml_node& keyValue, const std::string& text) {
+Value untypedKey(const XmlElement& keyValue, const std::string& text) {
     if (const auto type = typeOfAttribute(keyValue, "TYPE")) {
         return valueOfWireText(text, *type);
     }
-    const std::string_view kind = keyValue.attribute("VALUETYPE").as_string("string");
+    const std::string* const given = keyValue.attribute("VALUETYPE");
+    const std::string_view kind = given == nullptr ? std::string_view("string") : *given;
     if (kind == "boolean") {
         return valueOfWireText(text, CMPI_boolean);
     }
@@ -81,7 +85,7 @@ Value valueOfWireText(const std::string& text, CMPIType type) {
     }
 }
 
-ObjectPath ValueReader::className(const pugi::xml_node& element) const {
+ObjectPath ValueReader::className(const XmlElement& element) const {
     ObjectPath path;
     path.nameSpace = _nameSpace;
     path.className = requiredAttribute(element, "NAME");
@@ -91,11 +95,11 @@ ObjectPath ValueReader::className(const pugi::xml_node& element) const {
     return path;
 }
 
-ObjectPath ValueReader::instanceName(const pugi::xml_node& element) const {
+ObjectPath ValueReader::instanceName(const XmlElement& element) const {
     return instanceName(element, _nameSpace);
 }
 
-ObjectPath ValueReader::instanceName(const pugi::xml_node& element, const std::string& nameSpace) const {
+ObjectPath ValueReader::instanceName(const XmlElement& element, const std::string& nameSpace) const {
     ObjectPath path;
     path.nameSpace = nameSpace;
     path.className = requiredAttribute(element, "CLASSNAME");
@@ -103,7 +107,10 @@ ObjectPath ValueReader::instanceName(const pugi::xml_node& element, const std::s
     if (declared != nullptr) {
         path.className = declared->name;
     }
-    for (const pugi::xml_node& binding : element.children("KEYBINDING")) {
+    for (const XmlElement& binding : element.children) {
+        if (binding.name != "KEYBINDING") {
+            continue;
+        }
         std::string name = requiredAttribute(binding, "NAME");
         const Property* key = declared == nullptr ? nullptr : declared->property(name);
         if (declared != nullptr && (key == nullptr || !key->isKey())) {
@@ -117,14 +124,14 @@ ObjectPath ValueReader::instanceName(const pugi::xml_node& element, const std::s
         path.keys.push_back({name, keyValue(requiredChild(binding, {"KEYVALUE", "VALUE.REFERENCE"}), key, name)});
     }
     // The key of a class that has one only needs no name.
-    const pugi::xml_node single = optionalChild(element, {"KEYVALUE", "VALUE.REFERENCE"});
-    if (single && path.keys.empty()) {
+    const XmlElement* const single = optionalChild(element, {"KEYVALUE", "VALUE.REFERENCE"});
+    if (single != nullptr && path.keys.empty()) {
         const auto names = _catalogue.keyNames(path.className);
         if (names.size() != 1) {
             invalid("found a key without a name in a name of the class " + path.className +
                     ", expected it only where the class has one key");
         }
-        path.keys.push_back({names.front(), keyValue(single, declared->property(names.front()), names.front())});
+        path.keys.push_back({names.front(), keyValue(*single, declared->property(names.front()), names.front())});
     }
     requireKeys(path);
     return path;
@@ -138,42 +145,39 @@ void ValueReader::requireKeys(const ObjectPath& path) const {
     }
 }
 
-Value ValueReader::keyValue(const pugi::xml_node& element, const Property* declared, const std::string& what) const {
-    const bool isReference = std::string_view(element.name()) == "VALUE.REFERENCE";
+Value ValueReader::keyValue(const XmlElement& element, const Property* declared, const std::string& what) const {
+    const bool isReference = element.name == "VALUE.REFERENCE";
     if (declared != nullptr && isReference != (declared->type == CMPI_ref)) {
-        invalid("found a " + std::string(element.name()) + " for " + what + ", expected a " + typeName(declared->type));
+        invalid("found a " + element.name + " for " + what + ", expected a " + typeName(declared->type));
     }
     if (isReference) {
         return referenceValue(reference(element));
     }
-    const std::string text = textOf(element);
-    return declared == nullptr ? untypedKey(element, text) : valueOfWireText(text, declared->type);
+    return declared == nullptr ? untypedKey(element, element.text) : valueOfWireText(element.text, declared->type);
 }
 
-ObjectPath ValueReader::reference(const pugi::xml_node& valueReference) const {
-    const pugi::xml_node element = requiredChild(valueReference, {"INSTANCEPATH", "LOCALINSTANCEPATH", "INSTANCENAME",
-                                                                  "CLASSPATH", "LOCALCLASSPATH", "CLASSNAME"});
-    const std::string_view kind = element.name();
-    pugi::xml_node local = element;
+ObjectPath ValueReader::reference(const XmlElement& valueReference) const {
+    const XmlElement& element = requiredChild(valueReference, {"INSTANCEPATH", "LOCALINSTANCEPATH", "INSTANCENAME",
+                                                               "CLASSPATH", "LOCALCLASSPATH", "CLASSNAME"});
+    const std::string_view kind = element.name;
+    const XmlElement* local = &element;
     std::string host;
     if (kind == "INSTANCEPATH" || kind == "CLASSPATH") {
-        local = requiredChild(element, {"NAMESPACEPATH"});
-        host = textOf(requiredChild(local, {"HOST"}));
+        local = &requiredChild(element, {"NAMESPACEPATH"});
+        host = requiredChild(*local, {"HOST"}).text;
     }
     const bool isName = kind == "INSTANCENAME" || kind == "CLASSNAME";
-    const std::string nameSpace = isName ? _nameSpace : nameSpaceOf(requiredChild(local, {"LOCALNAMESPACEPATH"}));
+    const std::string nameSpace = isName ? _nameSpace : nameSpaceOf(requiredChild(*local, {"LOCALNAMESPACEPATH"}));
     const bool isClass = kind == "CLASSPATH" || kind == "LOCALCLASSPATH" || kind == "CLASSNAME";
-    const pugi::xml_node name = isName    ? element
-                                : isClass ? requiredChild(element, {"CLASSNAME"})
-                                          : requiredChild(element, {"INSTANCENAME"});
+    const XmlElement& name = isName ? element : requiredChild(element, {isClass ? "CLASSNAME" : "INSTANCENAME"});
     ObjectPath path = isClass ? className(name) : instanceName(name, nameSpace);
     path.nameSpace = nameSpace;
     path.host = trimmed(host);
     return path;
 }
 
-Value ValueReader::value(const pugi::xml_node& element, CMPIType type, const std::string& what) const {
-    const std::string_view kind = element.name();
+Value ValueReader::value(const XmlElement& element, CMPIType type, const std::string& what) const {
+    const std::string_view kind = element.name;
     const auto elementType = static_cast<CMPIType>(type & ~CMPI_ARRAY);
     const bool isArray = (type & CMPI_ARRAY) != 0;
     const std::string_view expected = elementType == CMPI_ref ? (isArray ? "VALUE.REFARRAY" : "VALUE.REFERENCE")
@@ -185,17 +189,17 @@ Value ValueReader::value(const pugi::xml_node& element, CMPIType type, const std
     try {
         return isArray            ? array(element, elementType, what)
                : type == CMPI_ref ? referenceValue(reference(element))
-                                  : valueOfWireText(textOf(element), type);
+                                  : valueOfWireText(element.text, type);
     } catch (const CimError& error) {
         invalid(what + ": " + error.what());
     }
 }
 
-Value ValueReader::argument(const pugi::xml_node& element, const Parameter& parameter) const {
+Value ValueReader::argument(const XmlElement& element, const Parameter& parameter) const {
     Value read;
-    if (parameter.type == CMPI_ref && std::string_view(element.name()) == "VALUE") {
+    if (parameter.type == CMPI_ref && element.name == "VALUE") {
         try {
-            read = referenceValue(parseObjectPath(trimmed(textOf(element)), _catalogue, _nameSpace));
+            read = referenceValue(parseObjectPath(trimmed(element.text), _catalogue, _nameSpace));
         } catch (const ObjectPathError& error) {
             invalid(parameter.name + ": " + error.what());
         }
@@ -210,10 +214,10 @@ Value ValueReader::argument(const pugi::xml_node& element, const Parameter& para
     return read;
 }
 
-Value ValueReader::array(const pugi::xml_node& element, CMPIType elementType, const std::string& what) const {
+Value ValueReader::array(const XmlElement& element, CMPIType elementType, const std::string& what) const {
     Value::Array elements;
-    for (const pugi::xml_node& child : element) {
-        const std::string_view kind = child.name();
+    for (const XmlElement& child : element.children) {
+        const std::string_view kind = child.name;
         if (kind == "VALUE.NULL") {
             elements.push_back(nullValue(elementType));
         } else if (kind == "VALUE" || kind == "VALUE.REFERENCE") {
@@ -223,8 +227,8 @@ Value ValueReader::array(const pugi::xml_node& element, CMPIType elementType, co
     return arrayValue(elementType, std::move(elements));
 }
 
-NamedValue ValueReader::property(const pugi::xml_node& element, const Class* declared, CMPIrc unknown) const {
-    const std::string_view kind = element.name();
+NamedValue ValueReader::property(const XmlElement& element, const Class* declared, CMPIrc unknown) const {
+    const std::string_view kind = element.name;
     const std::string name = requiredAttribute(element, "NAME");
     const Property* known = declared == nullptr ? nullptr : declared->property(name);
     if (declared != nullptr && known == nullptr) {
@@ -238,11 +242,11 @@ NamedValue ValueReader::property(const pugi::xml_node& element, const Class* dec
         const auto named = typeOfAttribute(element, "TYPE");
         type = static_cast<CMPIType>(named.value_or(CMPI_string) | (kind == "PROPERTY.ARRAY" ? CMPI_ARRAY : 0));
     }
-    const pugi::xml_node content = optionalChild(element, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE"});
-    return {known == nullptr ? name : known->name, content ? value(content, type, name) : nullValue(type)};
+    const XmlElement* const content = optionalChild(element, {"VALUE", "VALUE.ARRAY", "VALUE.REFERENCE"});
+    return {known == nullptr ? name : known->name, content == nullptr ? nullValue(type) : value(*content, type, name)};
 }
 
-Instance ValueReader::instance(const pugi::xml_node& element, CMPIrc unknownProperty) const {
+Instance ValueReader::instance(const XmlElement& element, CMPIrc unknownProperty) const {
     Instance instance;
     instance.path.nameSpace = _nameSpace;
     instance.path.className = requiredAttribute(element, "CLASSNAME");
@@ -250,8 +254,8 @@ Instance ValueReader::instance(const pugi::xml_node& element, CMPIrc unknownProp
     if (declared != nullptr) {
         instance.path.className = declared->name;
     }
-    for (const pugi::xml_node& child : element) {
-        const std::string_view kind = child.name();
+    for (const XmlElement& child : element.children) {
+        const std::string_view kind = child.name;
         if (kind != "PROPERTY" && kind != "PROPERTY.ARRAY" && kind != "PROPERTY.REFERENCE") {
             continue;
         }

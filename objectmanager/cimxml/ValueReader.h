@@ -2,10 +2,9 @@
 #ifndef CIMXML_VALUEREADER_H
 #define CIMXML_VALUEREADER_H
 
+#include "cimxml/Markup.h"
 #include "model/CimError.h"
 #include "schema/Catalogue.h"
-
-#include <pugixml.hpp>
 
 #include <string>
 #include <string_view>
@@ -37,32 +36,32 @@ public:
         : _catalogue(catalogue), _nameSpace(nameSpace) {}
 
     /** A CLASSNAME. */
-    ObjectPath className(const pugi::xml_node& element) const;
+    ObjectPath className(const XmlElement& element) const;
     /** An INSTANCENAME; of a known class, with every key. */
-    ObjectPath instanceName(const pugi::xml_node& element) const;
+    ObjectPath instanceName(const XmlElement& element) const;
     /** What a VALUE.REFERENCE holds. */
-    ObjectPath reference(const pugi::xml_node& valueReference) const;
+    ObjectPath reference(const XmlElement& valueReference) const;
 
     /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY of a type; `what` it is the value of. */
-    Value value(const pugi::xml_node& element, CMPIType type, const std::string& what) const;
+    Value value(const XmlElement& element, CMPIType type, const std::string& what) const;
 
     /**
      * What a PARAMVALUE holds, as the value of the parameter. A reference may also come as a text, in the form in which
      * people write object paths.
      */
-    Value argument(const pugi::xml_node& element, const Parameter& parameter) const;
+    Value argument(const XmlElement& element, const Parameter& parameter) const;
 
     /**
      * An INSTANCE. Its path has the keys that are among its properties. For a property that its class lacks, DSP0200
      * has a code with one operation that it has not with another: it is `unknownProperty`.
      */
-    Instance instance(const pugi::xml_node& element, CMPIrc unknownProperty) const;
+    Instance instance(const XmlElement& element, CMPIrc unknownProperty) const;
 
 private:
-    ObjectPath instanceName(const pugi::xml_node& element, const std::string& nameSpace) const;
-    Value keyValue(const pugi::xml_node& element, const Property* declared, const std::string& what) const;
-    Value array(const pugi::xml_node& element, CMPIType elementType, const std::string& what) const;
-    NamedValue property(const pugi::xml_node& element, const Class* declared, CMPIrc unknown) const;
+    ObjectPath instanceName(const XmlElement& element, const std::string& nameSpace) const;
+    Value keyValue(const XmlElement& element, const Property* declared, const std::string& what) const;
+    Value array(const XmlElement& element, CMPIType elementType, const std::string& what) const;
+    NamedValue property(const XmlElement& element, const Class* declared, CMPIrc unknown) const;
     void requireKeys(const ObjectPath& path) const;
 
     const Catalogue& _catalogue;

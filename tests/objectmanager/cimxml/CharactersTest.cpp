@@ -33,29 +33,27 @@ TEST(Characters, thatXmlCannotSayAreReplaced) {
     EXPECT_EQ(inText("\xE2\x82"), "|" + replacement + replacement);
 }
 
-struct Sequence {
-    std::string_view bytes;
-    std::size_t length;
-};
-
-TEST(Characters, haveTheLengthOfTheirUtf8) {
-    const Sequence sequences[] = {
-        {"a", 1},
-        {"\n", 1},
-        {"\x0B", 0},
-        {"\xC2\x80", 2},
-        {"\xC1\xBF", 0},     // too long a form
-        {"\xE0\x9F\xBF", 0}, // too long a form
-        {"\xED\xA0\x80", 0}, // half of a surrogate pair
-        {"\xEF\xBF\xBE", 0}, // no character
-        {"\xEF\xBF\xBD", 3},
-        {"\xF0\x8F\xBF\xBF", 0}, // too long a form
-        {"\xF4\x8F\xBF\xBF", 4},
-        {"\xF4\x90\x80\x80", 0}, // beyond the last
-        {"\x80", 0},
+TEST(Characters, areThoseOfUtf8AndXml) {
+    for (const std::string_view character :
+         {"a", "\n", "\xC2\x80", "\xEF\xBF\xBD", "\xF0\x90\x80\x80", "\xF4\x8F\xBF\xBF"}) {
+        EXPECT_EQ(inText(character), "|" + std::string(character)) << testing::PrintToString(character);
+    }
+    const std::string_view wrong[] = {
+        "\x0B",
+        "\x80",
+        "\xC1\xBF",         // too long a form
+        "\xE0\x9F\xBF",     // too long a form
+        "\xED\xA0\x80",     // half of a surrogate pair
+        "\xEF\xBF\xBE",     // no character
+        "\xF0\x8F\xBF\xBF", // too long a form
+        "\xF4\x90\x80\x80", // beyond the last
     };
-    for (const Sequence& sequence : sequences) {
-        EXPECT_EQ(characterLength(sequence.bytes, 0), sequence.length) << testing::PrintToString(sequence.bytes);
+    for (const std::string_view bytes : wrong) {
+        std::string replaced = "|";
+        for (std::size_t i = 0; i < bytes.size(); ++i) {
+            replaced += "\xEF\xBF\xBD";
+        }
+        EXPECT_EQ(inText(bytes), replaced) << testing::PrintToString(bytes);
     }
 }
 

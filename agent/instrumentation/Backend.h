@@ -61,6 +61,9 @@ class Backend {
 public:
     virtual ~Backend() = default;
 
+    /** Whether nothing real happens whatever is asked of it. */
+    virtual bool isSimulated() const = 0;
+
     /** The machine, for people, as it completes "Power management of". */
     virtual std::string machine() const = 0;
 

@@ -1,4 +1,5 @@
 #include "Norv/Instrumentation.h"
+#include "Norv/Machine.h"
 
 #include "Backend.h"
 #include "Report.h"
@@ -22,9 +23,10 @@ std::unique_ptr<Backend> createBackend() {
         const Configuration configuration = loadConfiguration();
         auto backend = makeBackend(configuration);
         if (configuration.source.empty()) {
-            report(failureLevel, "No configuration file: power management of " + backend->machine());
+            report(failureLevel, "No configuration file: power management of " + backend->machine(),
+                   OrvLog::MACHINE_RECORD);
         } else {
-            report(informationLevel, "Power management of " + backend->machine());
+            report(informationLevel, "Power management of " + backend->machine(), OrvLog::MACHINE_RECORD);
         }
         return backend;
     } catch (const ConfigurationError&) {
@@ -45,10 +47,14 @@ Backend* processBackend() {
     return backend;
 }
 
-/** Who asks, as far as a library can know: whom a client of the host is, only the host knows. */
+/** What the thread gave to orvInstrumentationOnBehalfOf1. */
+constinit thread_local const char* principal = nullptr;
+
+/** Who asks, as far as a library can know: on whose behalf the host acts, only the host can tell. */
 std::string requester() {
     return std::string(" [asked by ") + program_invocation_short_name + ", process " + std::to_string(getpid()) +
-           ", uid " + std::to_string(geteuid()) + ']';
+           ", uid " + std::to_string(geteuid()) +
+           (principal == nullptr ? "" : std::string(", on behalf of ") + principal) + ']';
 }
 
 } // namespace
@@ -131,9 +137,23 @@ bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int
 
 bool Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
     const PowerRequestOutcome outcome = _implementation->write(property, value);
-    report(alwaysWrittenLevel, (outcome.accepted ? "Power request accepted: " : "Power request refused: ") +
-                                   outcome.description + requester());
+    report(alwaysWrittenLevel,
+           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description +
+               requester(),
+           outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD);
     return outcome.accepted;
 }
 
 } // namespace Norv
+
+int orvInstrumentationMachine1() {
+    const Norv::Backend* const backend = Norv::processBackend();
+    if (backend == nullptr) {
+        return Norv::NO_MACHINE;
+    }
+    return backend->isSimulated() ? Norv::SIMULATED_MACHINE : Norv::REAL_MACHINE;
+}
+
+void orvInstrumentationOnBehalfOf1(const char* whom) {
+    Norv::principal = whom;
+}

@@ -22,6 +22,7 @@ public:
      */
     LogindBackend(const LogindSettings& settings, std::filesystem::path lockFile);
 
+    bool isSimulated() const override { return false; }
     std::string machine() const override;
     std::unique_ptr<NodeSelection> selectPowerManagementNodes() override;
     MachineReport examine() override;

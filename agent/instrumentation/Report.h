@@ -4,6 +4,7 @@
 #ifndef INSTRUMENTATION_REPORT_H
 #define INSTRUMENTATION_REPORT_H
 
+#include "OrvLog/Observer.h"
 #include "OrvLog/OrvLogger.h"
 
 #include <string>
@@ -17,9 +18,10 @@ inline constexpr int informationLevel = 5000;
 inline constexpr int failureLevel = 6000;
 
 /** Writes a record of kind "log" whose place is the caller's. */
-inline void report(int level, const std::string& text, const char* function = __builtin_FUNCTION(),
-                   const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
-    OrvLog::OrvLogger::logLevelMessage(function, file, line, instrumentationCategory, level, nullptr, 0, 0, text);
+inline void report(int level, const std::string& text, OrvLog::RecordKind kind = OrvLog::ORDINARY_RECORD,
+                   const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
+                   int line = __builtin_LINE()) {
+    OrvLog::OrvLogger::logLevelMessage(function, file, line, instrumentationCategory, level, nullptr, kind, 0, text);
 }
 
 } // namespace Norv::Agent

@@ -20,6 +20,7 @@ public:
 
     explicit SimulatedBackend(SimulatedSettings settings, Clock clock = wallClock);
 
+    bool isSimulated() const override { return true; }
     std::string machine() const override;
     std::unique_ptr<NodeSelection> selectPowerManagementNodes() override;
     MachineReport examine() override;

@@ -4,8 +4,8 @@
 #include "Gate.h"
 #include "LastOperation.h"
 #include "Line.h"
+#include "Observation.h"
 #include "Record.h"
-#include "RecordSocket.h"
 #include "Thresholds.h"
 
 #include "config/Configuration.h"
@@ -31,11 +31,11 @@ public:
     /** `watch` was made before the settings were read. */
     Log(const Norv::Agent::LogSettings& settings, std::unique_ptr<Norv::Agent::ConfigurationWatch> watch)
         : _watch(std::move(watch)), _generations{Thresholds(settings)}, _thresholds(&_generations.front()),
-          _socket(RecordSocket::fromEnvironment()), _destination(destinationFor(settings)) {}
+          _destination(destinationFor(settings)) {}
 
     void report(const Record& record) {
         _watch->onChange([this] { renewThresholds(); });
-        _socket.send(record);
+        showToObserver(record);
         if (_thresholds.load(std::memory_order_acquire)->passes(record.kind, record.category, record.level)) {
             if (LastOperation::isNeededFor(record)) {
                 writeLastOperation(record.category);
@@ -116,7 +116,6 @@ private:
     std::atomic<const Thresholds*> _thresholds;
     /** What was wrong in the file at the last look, and was reported; empty where nothing was. */
     std::string _mistake;
-    const RecordSocket _socket;
     const std::unique_ptr<Destination> _destination;
     Gate _gate;
     std::atomic<std::size_t> _lost = 0;
@@ -136,13 +135,13 @@ std::unique_ptr<Log> makeLog() {
 }
 
 void report(Kind kind, const char* function, const char* file, int line, const std::string& category, int level,
-            const std::string& text) {
+            int toldKind, const std::string& text) {
     constexpr auto textOf = [](const char* nullable) { return std::string_view(nullable == nullptr ? "" : nullable); };
     const int error = errno;
     try {
         // Never destroyed, see the build's -z nodelete.
         static Log& log = *makeLog().release();
-        log.report({kind, level, category, textOf(function), textOf(file), line, text});
+        log.report({kind, level, category, textOf(function), textOf(file), line, text, toldKind});
     } catch (const std::exception&) {
         // Nothing but memory can be short here, and there is nowhere to say so.
     }
@@ -152,13 +151,13 @@ void report(Kind kind, const char* function, const char* file, int line, const s
 } // namespace
 
 void OrvLogger::logLevelMessage(const char* function, const char* file, int line, const std::string& category,
-                                int level, char*, int, int, const std::string& message) {
-    report(Kind::log, function, file, line, category, level, message);
+                                int level, char*, int recordKind, int, const std::string& message) {
+    report(Kind::log, function, file, line, category, level, recordKind, message);
 }
 
 void OrvLogger::traceLevelMessage(const char* function, const char* file, int line, const std::string& category,
                                   int level, char*, int, int, const std::string& message) {
-    report(Kind::trace, function, file, line, category, level, message);
+    report(Kind::trace, function, file, line, category, level, ORDINARY_RECORD, message);
 }
 
 } // namespace OrvLog

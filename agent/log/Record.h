@@ -1,6 +1,8 @@
 #ifndef LOG_RECORD_H
 #define LOG_RECORD_H
 
+#include "OrvLog/Observer.h"
+
 #include "config/Configuration.h"
 
 #include <string_view>
@@ -18,6 +20,8 @@ struct Record {
     std::string_view file;
     int line = 0;
     std::string_view text;
+    /** A RecordKind, as the caller gave it. */
+    int toldKind = ORDINARY_RECORD;
 };
 
 /** A record of the log about itself, made where this is called. The text is the caller's. */

@@ -91,7 +91,11 @@ enum class Dispatcher::Answer { paths, instances, value, nothing };
 
 Dispatcher::Dispatcher(Registry registry, const Settings& settings)
     : _registry(std::move(registry)), _log(settings.log), _broker(this, settings.classes),
-      _providers(_broker, settings.folders) {}
+      _providers(_broker, settings.folders, [log = settings.log](void* library) {
+          if (log != nullptr) {
+              log->attach(library);
+          }
+      }) {}
 
 /**
  * Does one operation: `call` calls the provider with context, result and path, `take` takes what it returned.

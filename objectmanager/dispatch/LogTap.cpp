@@ -1,42 +1,56 @@
 #include "dispatch/LogTap.h"
 
 #include <algorithm>
-#include <array>
-#include <cerrno>
-#include <charconv>
-#include <cstdlib>
-#include <sys/socket.h>
-#include <system_error>
-#include <unistd.h>
+#include <deque>
+#include <dlfcn.h>
+#include <iterator>
+#include <new>
+#include <utility>
 
 namespace ObjectManager {
 
 namespace {
 
-constexpr const char* variable = "ORV_AGENT_LOG_SOCKET";
+constexpr int lowestLevel = 5000;
 
-/** What a burst of records may take up until it is read, as far as the system allows. */
-constexpr int bufferBytes = 4 * 1024 * 1024;
+struct ThreadRecords {
+    /** The tap that they are of. */
+    std::uint64_t tap = 0;
+    std::uint64_t newest = 0;
+    std::deque<LogRecord> records;
+};
 
-/** Longer texts are cut. */
-constexpr std::size_t maximumDatagram = std::size_t{64} * 1024;
+/** Set when the thread's records are gone, while other destructors of the thread may still log. */
+constinit thread_local bool isEnding = false;
 
-std::int64_t callingThread() {
-    return gettid();
+struct EndingThreadRecords : ThreadRecords {
+    EndingThreadRecords() = default;
+    EndingThreadRecords(const EndingThreadRecords&) = delete;
+    EndingThreadRecords& operator=(const EndingThreadRecords&) = delete;
+    ~EndingThreadRecords() { isEnding = true; }
+};
+
+/** The calling thread's records of a tap. */
+ThreadRecords& recordsOf(std::uint64_t tap) {
+    thread_local EndingThreadRecords own;
+    if (own.tap != tap) {
+        static_cast<ThreadRecords&>(own) = {.tap = tap, .newest = 0, .records = {}};
+    }
+    return own;
 }
 
-/** The characters up to the next line end, which are taken off `text`. */
-std::string_view takeLine(std::string_view& text) {
-    const std::size_t end = std::min(text.find('\n'), text.size());
-    const std::string_view line = text.substr(0, end);
-    text.remove_prefix(std::min(end + 1, text.size()));
-    return line;
+std::uint64_t nextNumber() {
+    static std::atomic<std::uint64_t> taps = 0;
+    return ++taps;
 }
 
-template <class Number>
-bool parse(std::string_view text, Number& number) {
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    return error == std::errc{} && end == text.data() + text.size();
+bool isOrdinary(const LogRecord& record) {
+    return record.kind == OrvLog::ORDINARY_RECORD;
+}
+
+template <typename Function>
+Function* functionOf(void* library, const char* name) {
+    return reinterpret_cast<Function*>(dlsym(library, name));
 }
 
 } // namespace
@@ -48,45 +62,63 @@ std::string_view messageOf(std::string_view text) {
     return text.starts_with(frame) && end != std::string_view::npos ? text.substr(end + frameEnd.size()) : text;
 }
 
-LogTap::LogTap() {
-    std::array<int, 2> sockets{};
-    if (socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, sockets.data()) != 0) {
-        throw std::system_error(errno, std::generic_category(), "socket for the agent's log records");
-    }
-    _receiver = sockets[0];
-    _sender = sockets[1];
-    setsockopt(_sender, SOL_SOCKET, SO_SNDBUF, &bufferBytes, sizeof bufferBytes);
-    setenv(variable, std::to_string(_sender).c_str(), 1);
-}
+LogTap::LogTap()
+    : _observer{.lowestLevel = lowestLevel, .record = &LogTap::keep, .context = this}, _number(nextNumber()) {}
 
 LogTap::~LogTap() {
-    unsetenv(variable);
-    close(_sender);
-    close(_receiver);
-}
-
-std::uint64_t LogTap::newest() {
-    const std::lock_guard lock(_mutex);
-    drain();
-    return _newest;
-}
-
-std::vector<LogRecord> LogTap::since(std::uint64_t sequence) {
-    const std::lock_guard lock(_mutex);
-    drain();
-    std::vector<LogRecord> records;
-    if (const auto found = _records.find(callingThread()); found != _records.end()) {
-        std::copy_if(found->second.begin(), found->second.end(), std::back_inserter(records),
-                     [&](const LogRecord& record) { return record.sequence > sequence; });
+    for (const Heard& heard : _heard) {
+        heard.observe(nullptr);
+        dlclose(heard.library);
     }
-    return records;
 }
 
-std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) {
+void LogTap::attach(void* library) {
+    if (auto* const machine = functionOf<Norv::Machine1>(library, Norv::machine1Name)) {
+        _machine = machine;
+    }
+    auto* const observe = functionOf<OrvLog::Observe1>(library, OrvLog::observe1Name);
+    const std::lock_guard lock(_mutex);
+    if (observe == nullptr || std::ranges::find(_heard, observe, &Heard::observe) != _heard.end()) {
+        return;
+    }
+    Dl_info found{};
+    if (dladdr(reinterpret_cast<void*>(observe), &found) != 0) {
+        if (void* const own = dlopen(found.dli_fname, RTLD_NOW | RTLD_NOLOAD)) {
+            _heard.push_back({observe, own});
+            observe(&_observer);
+        }
+    }
+}
+
+bool LogTap::isAttached() const {
+    const std::lock_guard lock(_mutex);
+    return !_heard.empty();
+}
+
+bool LogTap::isSimulated() const {
+    Norv::Machine1* const machine = _machine;
+    return machine != nullptr && machine() == Norv::SIMULATED_MACHINE;
+}
+
+std::uint64_t LogTap::newest() const {
+    return recordsOf(_number).newest;
+}
+
+std::vector<LogRecord> LogTap::since(std::uint64_t sequence) const {
+    const std::deque<LogRecord>& records = recordsOf(_number).records;
+    const auto first =
+        std::ranges::find_if(records, [sequence](const LogRecord& record) { return record.sequence > sequence; });
+    return {first, records.end()};
+}
+
+std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     constexpr int failureLevel = 6000;
     std::vector<std::string> failures;
     for (const LogRecord& record : since(sequence)) {
-        if (record.level >= failureLevel) {
+        // What the agent says of the machine, and of requests that it accepted, is no failure, whatever its level.
+        const bool isNews =
+            record.kind == OrvLog::MACHINE_RECORD || record.kind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD;
+        if (record.level >= failureLevel && !isNews) {
             failures.emplace_back(messageOf(record.text));
         }
     }
@@ -94,50 +126,34 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) {
 }
 
 std::vector<LogRecord> LogTap::take() {
-    const std::lock_guard lock(_mutex);
-    drain();
-    const auto taken = _records.extract(callingThread());
-    if (taken.empty()) {
-        return {};
-    }
-    return {std::make_move_iterator(taken.mapped().begin()), std::make_move_iterator(taken.mapped().end())};
+    std::deque<LogRecord> taken = std::exchange(recordsOf(_number).records, {});
+    return {std::make_move_iterator(taken.begin()), std::make_move_iterator(taken.end())};
 }
 
 void LogTap::forget() {
-    const std::lock_guard lock(_mutex);
-    if (!_records.empty()) {
-        _records.erase(callingThread());
-    }
+    recordsOf(_number).records.clear();
 }
 
-void LogTap::drain() {
-    std::array<char, maximumDatagram> buffer;
-    ssize_t received = 0;
-    while ((received = recv(_receiver, buffer.data(), buffer.size(), MSG_DONTWAIT)) > 0) {
-        keep({buffer.data(), static_cast<std::size_t>(received)});
+void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept {
+    if (isEnding) {
+        return;
     }
-}
-
-/** A datagram is "<thread>\n<level>\n<category>\n<text>". */
-void LogTap::keep(std::string_view datagram) {
-    std::int64_t thread = 0;
-    LogRecord record;
-    if (!parse(takeLine(datagram), thread) || !parse(takeLine(datagram), record.level)) {
-        return; // not from the agent's log library
+    try {
+        ThreadRecords& own = recordsOf(static_cast<const LogTap*>(context)->_number);
+        if (own.records.size() >= recordsPerThread) {
+            if (const auto oldest = std::ranges::find_if(own.records, isOrdinary); oldest != own.records.end()) {
+                own.records.erase(oldest);
+            }
+        }
+        own.records.push_back({record->kind,
+                               {record->category, record->categorySize},
+                               record->level,
+                               {record->text, record->textSize},
+                               own.newest + 1});
+        ++own.newest;
+    } catch (const std::bad_alloc&) {
+        // Nobody hears of the record. A power request of which nobody heard that it was accepted counts as refused.
     }
-    record.category = takeLine(datagram);
-    record.text = datagram;
-    record.sequence = ++_newest;
-    if (_records.size() == threads && !_records.contains(thread)) {
-        _records.erase(std::min_element(_records.begin(), _records.end(), [](const auto& left, const auto& right) {
-            return left.second.back().sequence < right.second.back().sequence;
-        }));
-    }
-    std::deque<LogRecord>& records = _records[thread];
-    if (records.size() == recordsPerThread) {
-        records.pop_front();
-    }
-    records.push_back(std::move(record));
 }
 
 } // namespace ObjectManager

@@ -88,6 +88,7 @@ public:
 
     /** With every symbolic link resolved. */
     const std::filesystem::path& file() const { return _file; }
+    void* handle() const { return _handle; }
 
     /** Calls the factory where it was not called yet; the provider, null where `report` tells a problem. */
     template <class MI>
@@ -209,8 +210,8 @@ bool ProviderReport::usable() const {
                                           [](const FactoryReport& factory) { return factory.problem.empty(); });
 }
 
-Providers::Providers(const Broker& broker, std::vector<std::filesystem::path> folders)
-    : _broker(broker), _folders(std::move(folders)) {}
+Providers::Providers(const Broker& broker, std::vector<std::filesystem::path> folders, Loaded loaded)
+    : _broker(broker), _folders(std::move(folders)), _loaded(std::move(loaded)) {}
 
 Providers::~Providers() = default;
 
@@ -218,6 +219,7 @@ ProviderLibrary& Providers::library(const std::string& location) {
     std::unique_ptr<ProviderLibrary>& library = _libraries[location];
     if (library == nullptr) {
         library = std::make_unique<ProviderLibrary>(_broker, location, _folders);
+        _loaded(library->handle());
     }
     return *library;
 }

@@ -6,6 +6,7 @@
 #include "dispatch/Registry.h"
 
 #include <filesystem>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -48,8 +49,12 @@ class ProviderLibrary;
  */
 class Providers {
 public:
+    /** What is done with each library, as dlopen gave it, before anything in it is called. */
+    using Loaded = std::function<void(void* library)>;
+
     /** Libraries are looked for in `folders`, in that order, as lib<location>.so.1, then as lib<location>.so. */
-    Providers(const Broker& broker, std::vector<std::filesystem::path> folders);
+    Providers(
+        const Broker& broker, std::vector<std::filesystem::path> folders, Loaded loaded = [](void* /*library*/) {});
     Providers(const Providers&) = delete;
     Providers& operator=(const Providers&) = delete;
     ~Providers();
@@ -71,6 +76,7 @@ private:
 
     const Broker& _broker;
     std::vector<std::filesystem::path> _folders;
+    Loaded _loaded;
     /** Recursive, since a factory may ask the object manager for something on its own. */
     std::recursive_mutex _mutex;
     std::map<std::string, std::unique_ptr<ProviderLibrary>> _libraries;

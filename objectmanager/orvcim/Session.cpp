@@ -1,6 +1,5 @@
 #include "orvcim/Session.h"
 
-#include "dispatch/AgentLog.h"
 #include "schema/RegistrationReader.h"
 #include "text/ObjectPathText.h"
 
@@ -89,14 +88,14 @@ PropertyList Session::propertiesOf(const ObjectPath& path) const {
 }
 
 bool Session::isSimulated() {
-    if (!saysSimulated(_log.since(0))) {
+    if (!_log.isSimulated()) {
         try {
             _dispatcher.enumerateInstanceNames(invocation(), {{}, _options.nameSpace, powerServiceClass, {}});
         } catch (const CimError&) {
             return false; // where nobody knows its power services, the machine may be any
         }
     }
-    return saysSimulated(_log.since(0));
+    return _log.isSimulated();
 }
 
 Invocation Session::invocation() {

@@ -98,7 +98,7 @@ public:
      */
     PropertyList propertiesOf(const ObjectPath& path) const;
 
-    /** Whether the agent says that the machine is a simulated one. It does so when it is first asked for anything. */
+    /** Whether the agent says that the machine is a simulated one. Loads the provider that knows the agent. */
     bool isSimulated();
 
     /** Who asks for the operations: the user of the program. */
@@ -108,7 +108,6 @@ private:
     const Options& _options;
     std::filesystem::path _schemaFolder;
     Catalogue _catalogue;
-    /** Made before the first provider library is loaded. */
     LogTap _log;
     Dispatcher _dispatcher;
     std::ostream& _out;

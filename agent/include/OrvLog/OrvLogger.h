@@ -24,7 +24,8 @@ public:
      * @param level the higher, the more important: 3000 progress, 4000 operations, 6000 failures.
      * @param message the text, one line.
      *
-     * The three arguments without a name are not used.
+     * Of the three arguments without a name, the first number is a RecordKind of OrvLog/Observer.h; the others are not
+     * used.
      */
     static void logLevelMessage(const char* function, const char* file, int line, const std::string& category,
                                 int level, char*, int, int, const std::string& message);

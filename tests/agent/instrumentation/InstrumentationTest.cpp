@@ -1,4 +1,6 @@
 #include "Norv/Instrumentation.h"
+#include "Norv/Machine.h"
+#include "OrvLog/Observer.h"
 
 #include "RecordedLog.h"
 #include "TestSupport.h"
@@ -11,6 +13,7 @@
 #include <thread>
 #include <type_traits>
 
+#include <dlfcn.h>
 #include <unistd.h>
 
 namespace {
@@ -20,6 +23,7 @@ using AgentTest::takeLog;
 using AgentTest::TemporaryFolder;
 using AgentTest::writeFile;
 using testing::ElementsAre;
+using testing::EndsWith;
 using testing::IsEmpty;
 using testing::StartsWith;
 using testing::UnorderedElementsAre;
@@ -32,18 +36,23 @@ constexpr auto powerNodes = NodeLexicon::POWER_MANAGEMENT_NODE;
 constexpr auto powerState = NodeLexicon::POWER_STATE;
 constexpr auto powerStateList = NodeLexicon::POWER_STATE_LIST;
 
-TEST(InstrumentationLibrary, ExportsItsMembersAndNothingElse) {
+TEST(InstrumentationLibrary, ExportsItsMembersTheOptionalFunctionsAndNothingElse) {
     EXPECT_THAT(
         AgentTest::exportedSymbols(ORV_INSTRUMENTATION_LIBRARY),
         UnorderedElementsAre(
-            "_ZN4Norv15InstrumentationC1Ev", "_ZN4Norv15InstrumentationC2Ev", "_ZN4Norv15InstrumentationD1Ev",
-            "_ZN4Norv15InstrumentationD2Ev", "_ZN4Norv15Instrumentation10selectNodeENS_11NodeLexicon8NodeTypeE",
-            "_ZN4Norv15InstrumentationcvbEv", "_ZN4Norv15InstrumentationppEv",
-            "_ZN4Norv15Instrumentation13getPathToNodeB5cxx11Ev",
+            "orvInstrumentationMachine1", "orvInstrumentationOnBehalfOf1", "_ZN4Norv15InstrumentationC1Ev",
+            "_ZN4Norv15InstrumentationC2Ev", "_ZN4Norv15InstrumentationD1Ev", "_ZN4Norv15InstrumentationD2Ev",
+            "_ZN4Norv15Instrumentation10selectNodeENS_11NodeLexicon8NodeTypeE", "_ZN4Norv15InstrumentationcvbEv",
+            "_ZN4Norv15InstrumentationppEv", "_ZN4Norv15Instrumentation13getPathToNodeB5cxx11Ev",
             "_ZN4Norv15Instrumentation19convertPathToStringERKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE",
             "_ZN4Norv15Instrumentation11getPropertyENS_11NodeLexicon10PropertiesERSt6vectorIjSaIjEE",
             "_ZN4Norv15Instrumentation11getPropertyENS_11NodeLexicon10PropertiesERj",
             "_ZN4Norv15Instrumentation11setPropertyENS_11NodeLexicon10PropertiesERj"));
+}
+
+TEST(InstrumentationLibrary, HasTheOptionalFunctionsUnderTheNamesThatTheHeaderGives) {
+    EXPECT_EQ(dlsym(RTLD_DEFAULT, machine1Name), reinterpret_cast<void*>(&orvInstrumentationMachine1));
+    EXPECT_EQ(dlsym(RTLD_DEFAULT, onBehalfOf1Name), reinterpret_cast<void*>(&orvInstrumentationOnBehalfOf1));
 }
 
 /** Who asks for what this process does. */
@@ -181,6 +190,37 @@ TEST_F(Cursor, WritesThePowerStateAndReadsItBack) {
                                        askedByThis));
 }
 
+TEST_F(Cursor, TellsRefusalAndAcceptanceByTheKindOfTheirRecords) {
+    cursor.selectNode(powerNodes);
+    AgentTest::takeRecordKinds();
+    for (unsigned int state : {12U, 5U}) {
+        cursor.setProperty(powerState, state);
+    }
+    takeLog();
+    EXPECT_THAT(AgentTest::takeRecordKinds(),
+                ElementsAre(OrvLog::POWER_REQUEST_ACCEPTED_RECORD, OrvLog::POWER_REQUEST_REFUSED_RECORD));
+}
+
+TEST_F(Cursor, NamesOnWhoseBehalfTheThreadActs) {
+    cursor.selectNode(powerNodes);
+    unsigned int state = 5;
+    const std::string whom = "alice from 192.0.2.7";
+    orvInstrumentationOnBehalfOf1(whom.c_str());
+    cursor.setProperty(powerState, state);
+    std::thread([&] {
+        Instrumentation own;
+        own.setProperty(powerState, state);
+    }).join();
+    orvInstrumentationOnBehalfOf1(nullptr);
+    cursor.setProperty(powerState, state);
+    const std::string askedForAlice = askedByThis.substr(0, askedByThis.size() - 1) + ", on behalf of " + whom + ']';
+    EXPECT_THAT(takeLog(), ElementsAre(EndsWith(askedForAlice), EndsWith(askedByThis), EndsWith(askedByThis)));
+}
+
+TEST_F(Cursor, IsOneOfASimulatedMachine) {
+    EXPECT_EQ(orvInstrumentationMachine1(), SIMULATED_MACHINE);
+}
+
 TEST_F(Cursor, RefusesWhatIsNoPowerRequest) {
     cursor.selectNode(powerNodes);
     unsigned int value = 5;
@@ -247,6 +287,13 @@ TEST_F(Processes, SayOnceWhichMachineIsManaged) {
                                               firstUse + "2 nodes, state in " + stateFile + ")"));
     configureSimulated("", "10");
     EXPECT_THAT(run("list"), ElementsAre("system 1 2 5 8", firstUse + "1 node, state in " + stateFile + ")"));
+}
+
+TEST_F(Processes, TellWhichMachineIsManagedBeforeAnythingElse) {
+    configureSimulated(twoNodes, "10");
+    EXPECT_THAT(run("machine"), ElementsAre("simulated", StartsWith(firstUse)));
+    configure("[instrumentation]\nbackend = \"abacus\"\n");
+    EXPECT_THAT(run("machine"), ElementsAre("none", StartsWith("trace 6000")));
 }
 
 TEST_F(Processes, SeeEachOthersRequests) {

@@ -337,6 +337,11 @@ TEST_F(Processes, SeeEachOthersRequests) {
                                   testing::EndsWith(" [asked by instrumentation_probe, process N, uid N]"))));
 }
 
+TEST_F(Processes, TellThatTheMachineIsRealWithoutAskingTheBus) {
+    configure("");
+    EXPECT_THAT(run("machine"), ElementsAre("real", StartsWith(notice)));
+}
+
 struct Failure {
     const char* name;
     /** Of systemd-logind; null where there is none. "BUS" is the number of the bus's process. */

@@ -10,6 +10,7 @@ namespace {
 
 std::mutex mutex;
 std::vector<std::string> records;
+std::vector<int> recordKinds;
 
 void keep(const std::string& kind, int level, const std::string& category, const std::string& text) {
     const std::lock_guard guard(mutex);
@@ -25,6 +26,11 @@ std::vector<std::string> takeLog() {
     return std::exchange(records, {});
 }
 
+std::vector<int> takeRecordKinds() {
+    const std::lock_guard guard(mutex);
+    return std::exchange(recordKinds, {});
+}
+
 void maskRequester(std::vector<std::string>& lines) {
     static const std::regex numbers("process [0-9]+, uid [0-9]+\\]$");
     for (std::string& line : lines) {
@@ -36,9 +42,11 @@ void maskRequester(std::vector<std::string>& lines) {
 
 namespace OrvLog {
 
-void OrvLogger::logLevelMessage(const char*, const char*, int, const std::string& category, int level, char*, int, int,
-                                const std::string& message) {
+void OrvLogger::logLevelMessage(const char*, const char*, int, const std::string& category, int level, char*,
+                                int recordKind, int, const std::string& message) {
     keep("log", level, category, message);
+    const std::lock_guard guard(mutex);
+    recordKinds.push_back(recordKind);
 }
 
 void OrvLogger::traceLevelMessage(const char*, const char*, int, const std::string& category, int level, char*, int,

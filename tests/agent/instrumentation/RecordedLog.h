@@ -12,6 +12,9 @@ namespace AgentTest {
 /** The records since the last call, each as "<kind> <level> <category> <text>". */
 std::vector<std::string> takeLog();
 
+/** The kinds of the records of kind "log" since the last call, as OrvLog/Observer.h numbers them. */
+std::vector<int> takeRecordKinds();
+
 /** Takes the numbers out of who asked for a power request: "[asked by PROGRAM, process N, uid N]". */
 void maskRequester(std::vector<std::string>& lines);
 

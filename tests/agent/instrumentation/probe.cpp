@@ -4,13 +4,16 @@
  *
  *     list               each node: its text, property 123, property 125
  *     write NODE VALUE   writes property 123 of a node
+ *     machine            which machine it is
  *
  * and prints what they give, then the log records that were written meanwhile.
  */
 #include "RecordedLog.h"
 
 #include "Norv/Instrumentation.h"
+#include "Norv/Machine.h"
 
+#include <array>
 #include <cstdlib>
 #include <iostream>
 #include <span>
@@ -20,6 +23,9 @@
 using namespace Norv;
 
 namespace {
+
+/** As Norv::Machine numbers them. */
+constexpr std::array machineNames = {"none", "simulated", "real"};
 
 void list() {
     Instrumentation node;
@@ -57,6 +63,8 @@ int main(int count, char** values) {
         } else if (command == "write" && i + 2 < arguments.size()) {
             write(arguments[i + 1], static_cast<unsigned int>(std::stoul(arguments[i + 2])));
             i += 2;
+        } else if (command == "machine") {
+            std::cout << machineNames.at(static_cast<std::size_t>(orvInstrumentationMachine1())) << '\n';
         } else {
             std::cerr << "unknown command " << command << '\n';
             return EXIT_FAILURE;

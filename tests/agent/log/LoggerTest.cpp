@@ -352,10 +352,11 @@ TEST(LoggerTest, NoRecordAllocatesMemory) {
     EXPECT_THAT(process.standardError(), SizeIs(101));
 }
 
-TEST(LoggerTest, TheLibraryExportsItsInterfaceAndNothingElse) {
+TEST(LoggerTest, TheLibraryExportsItsInterfaceTheOptionalFunctionAndNothingElse) {
     EXPECT_THAT(AgentTest::linesOf("nm -DC --defined-only --format=just-symbols '" ORV_LOG_LIBRARY "' | sort -u"),
                 testing::UnorderedElementsAre(
-                    "OrvLog::OrvMessageBuffer::OrvMessageBuffer()", "OrvLog::OrvMessageBuffer::~OrvMessageBuffer()",
+                    "orvLogObserve1", "OrvLog::OrvMessageBuffer::OrvMessageBuffer()",
+                    "OrvLog::OrvMessageBuffer::~OrvMessageBuffer()",
                     "OrvLog::OrvMessageBuffer::operator<<(char const*)",
                     "OrvLog::OrvMessageBuffer::operator std::ostream&()",
                     "OrvLog::OrvMessageBuffer::str[abi:cxx11](OrvLog::OrvMessageBuffer&)",

@@ -1,15 +1,14 @@
 #include "dispatch/LogTap.h"
 
-#include <gmock/gmock.h>
+#include "TestProviders.h"
 
-#include <cstdlib>
-#include <sys/socket.h>
+#include <dlfcn.h>
 #include <thread>
-#include <unistd.h>
 
 namespace ObjectManager {
 namespace {
 
+using testing::Each;
 using testing::ElementsAre;
 using testing::Field;
 using testing::IsEmpty;
@@ -17,112 +16,143 @@ using testing::SizeIs;
 
 class LogTapTest : public testing::Test {
 protected:
-    /** Where the agent's log library would send to; -1 where nobody listens. */
-    static int sender() {
-        const char* variable = std::getenv("ORV_AGENT_LOG_SOCKET");
-        return variable != nullptr ? std::stoi(variable) : -1;
-    }
+    ~LogTapTest() override { dlclose(library); }
 
-    static bool sendText(const std::string& datagram) {
-        return send(sender(), datagram.data(), datagram.size(), MSG_DONTWAIT | MSG_NOSIGNAL) > 0;
-    }
-
-    static bool sendRecord(std::int64_t thread, const std::string& text) {
-        return sendText(std::to_string(thread) + "\n6000\nTest\n" + text);
+    /** Logs in the calling thread. */
+    void log(const std::string& text, int level = 6000, int kind = OrvLog::ORDINARY_RECORD) const {
+        using Log = void(int kind, int level, const char* text);
+        reinterpret_cast<Log*>(dlsym(library, "TestProvider_log"))(kind, level, text.c_str());
     }
 
     static auto hasText(const std::string& text) { return Field(&LogRecord::text, text); }
+
+    /** Uses an agent that can be listened to. */
+    void* const library = dlopen((testProviders / "liborvtestprovider.so").c_str(), RTLD_NOW | RTLD_LOCAL);
 };
 
-TEST_F(LogTapTest, IsAnnouncedToTheAgentWhileItLives) {
+TEST_F(LogTapTest, ListensToTheAgentOfALibraryWhileItLives) {
     {
-        const LogTap tap;
-        EXPECT_GE(sender(), 0);
+        LogTap tap;
+        EXPECT_FALSE(tap.isAttached());
+        tap.attach(library);
+        EXPECT_TRUE(tap.isAttached());
+        log("text");
+        EXPECT_THAT(tap.take(), ElementsAre(hasText("text")));
     }
-    EXPECT_EQ(-1, sender());
+    log("nobody listens");
+    LogTap another;
+    another.attach(library);
+    EXPECT_THAT(another.take(), IsEmpty());
 }
 
-TEST_F(LogTapTest, ReadsRecords) {
+TEST_F(LogTapTest, IsNotAttachedByALibraryWhoseAgentCannotBeListenedTo) {
+    void* const other = dlopen((testProviders / "liborvbrokenprovider.so").c_str(), RTLD_NOW | RTLD_LOCAL);
     LogTap tap;
-    sendText(std::to_string(gettid()) + "\n10000\nCorvane.Instrumentation\nPower request accepted:\nreboot");
+    tap.attach(other);
+    EXPECT_FALSE(tap.isAttached());
+    EXPECT_FALSE(tap.isSimulated());
+    dlclose(other);
+}
+
+TEST_F(LogTapTest, MayOutliveTheLibrary) {
+    const auto tap = std::make_unique<LogTap>();
+    void* const again = dlopen((testProviders / "liborvtestprovider.so").c_str(), RTLD_NOW | RTLD_LOCAL);
+    tap->attach(again);
+    dlclose(again);
+    log("still there");
+    EXPECT_THAT(tap->take(), ElementsAre(hasText("still there")));
+}
+
+TEST_F(LogTapTest, KeepsWholeRecords) {
+    LogTap tap;
+    tap.attach(library);
+    log("Power request accepted:\nreboot", 10000, OrvLog::POWER_REQUEST_ACCEPTED_RECORD);
     const std::vector<LogRecord> records = tap.take();
     ASSERT_THAT(records, SizeIs(1));
+    EXPECT_EQ(OrvLog::POWER_REQUEST_ACCEPTED_RECORD, records[0].kind);
     EXPECT_EQ(10000, records[0].level);
-    EXPECT_EQ("Corvane.Instrumentation", records[0].category);
+    EXPECT_EQ("Test.Disk", records[0].category);
     EXPECT_EQ("Power request accepted:\nreboot", records[0].text);
     EXPECT_THAT(tap.take(), IsEmpty());
 }
 
-TEST_F(LogTapTest, IgnoresWhatIsNoRecord) {
+TEST_F(LogTapTest, LeavesOutWhatEveryOperationLogs) {
     LogTap tap;
-    for (const char* text : {"x", "1", "1\nx\nTest\ntext", "x\n6000\nTest\ntext", "\n\n\n"}) {
-        sendText(text);
-    }
-    sendRecord(gettid(), "");
-    EXPECT_THAT(tap.take(), ElementsAre(hasText("")));
+    tap.attach(library);
+    log("operation", 4999);
+    log("information", 5000);
+    EXPECT_THAT(tap.take(), ElementsAre(hasText("information")));
 }
 
-TEST_F(LogTapTest, KeepsTheRecordsOfOtherThreadsForThem) {
+TEST_F(LogTapTest, KeepsTheRecordsOfAnyNumberOfThreadsForThem) {
     LogTap tap;
-    sendRecord(gettid(), "mine");
-    std::thread([&] {
-        sendRecord(gettid(), "yours");
-        EXPECT_THAT(tap.take(), ElementsAre(hasText("yours")));
-    }).join();
+    tap.attach(library);
+    log("mine");
+    constexpr int count = 200;
+    std::vector<std::thread> threads;
+    threads.reserve(count);
+    for (int number = 0; number < count; ++number) {
+        threads.emplace_back([&, text = std::to_string(number)] {
+            constexpr std::size_t records = 100;
+            for (std::size_t record = 0; record < records; ++record) {
+                log(text);
+            }
+            const std::vector<LogRecord> own = tap.take();
+            EXPECT_THAT(own, SizeIs(records));
+            EXPECT_THAT(own, Each(hasText(text)));
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
     EXPECT_THAT(tap.take(), ElementsAre(hasText("mine")));
 }
 
-TEST_F(LogTapTest, ForgetsWhatWasLookedAt) {
+TEST_F(LogTapTest, ForgetsTheRecordsOfTheThread) {
     LogTap tap;
-    sendRecord(gettid(), "seen");
-    sendRecord(gettid() + 1, "of another thread");
+    tap.attach(library);
+    log("forgotten");
     const std::uint64_t point = tap.newest();
-    sendRecord(gettid(), "not seen");
     tap.forget();
-    EXPECT_THAT(tap.since(0), ElementsAre(hasText("not seen")));
+    EXPECT_THAT(tap.since(0), IsEmpty());
+    log("new");
     EXPECT_EQ(point + 1, tap.newest());
-    tap.forget();
-    EXPECT_THAT(tap.take(), IsEmpty());
+    EXPECT_THAT(tap.since(0), ElementsAre(hasText("new")));
 }
 
 TEST_F(LogTapTest, TellsRecordsSinceAPointInTimeAndKeepsThem) {
     LogTap tap;
-    sendRecord(gettid(), "before");
+    tap.attach(library);
+    log("before");
     const std::uint64_t point = tap.newest();
     EXPECT_THAT(tap.since(point), IsEmpty());
-    sendRecord(gettid(), "after");
+    log("after");
     EXPECT_THAT(tap.since(point), ElementsAre(hasText("after")));
     EXPECT_THAT(tap.take(), ElementsAre(hasText("before"), hasText("after")));
 }
 
-TEST_F(LogTapTest, KeepsTheNewestRecordsOfAThreadThatDoesNotTakeThem) {
+TEST_F(LogTapTest, CountsNeitherTheMachineNorAnAcceptedRequestAsAFailure) {
     LogTap tap;
+    tap.attach(library);
+    log("of a simulated machine", 6000, OrvLog::MACHINE_RECORD);
+    log("accepted", 10000, OrvLog::POWER_REQUEST_ACCEPTED_RECORD);
+    log("refused", 10000, OrvLog::POWER_REQUEST_REFUSED_RECORD);
+    log("information", 5000);
+    log("MESSAGE [File: a.cpp, Line: 1]: failure");
+    EXPECT_THAT(tap.failuresSince(0), ElementsAre("refused", "failure"));
+}
+
+TEST_F(LogTapTest, KeepsTheNewestRecordsOfAThreadThatDoesNotTakeThemAndWhatIsToldOfThePowerRequest) {
+    LogTap tap;
+    tap.attach(library);
+    log("accepted", 10000, OrvLog::POWER_REQUEST_ACCEPTED_RECORD);
     for (std::size_t i = 0; i < LogTap::recordsPerThread + 5; ++i) {
-        ASSERT_TRUE(sendRecord(gettid(), std::to_string(i)));
-        tap.newest();
+        log(std::to_string(i));
     }
     const std::vector<LogRecord> records = tap.take();
     ASSERT_THAT(records, SizeIs(LogTap::recordsPerThread));
-    EXPECT_EQ("5", records.front().text);
-}
-
-TEST_F(LogTapTest, ForgetsTheThreadThatWasSilentLongest) {
-    LogTap tap;
-    sendRecord(gettid(), "forgotten");
-    for (std::size_t i = 0; i < LogTap::threads; ++i) {
-        ASSERT_TRUE(sendRecord(-1 - static_cast<std::int64_t>(i), "other"));
-        tap.newest();
-    }
-    EXPECT_THAT(tap.take(), IsEmpty());
-}
-
-TEST_F(LogTapTest, ABurstOfRecordsIsHeldUntilItIsRead) {
-    LogTap tap;
-    constexpr int burst = 100;
-    for (int i = 0; i < burst; ++i) {
-        ASSERT_TRUE(sendRecord(gettid(), "record"));
-    }
-    EXPECT_THAT(tap.take(), SizeIs(burst));
+    EXPECT_EQ("accepted", records[0].text);
+    EXPECT_EQ("6", records[1].text);
 }
 
 TEST(MessageTest, LosesItsFrame) {

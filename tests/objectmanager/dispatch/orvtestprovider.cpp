@@ -2,15 +2,16 @@
  * A provider that behaves as the class says for which it is asked: Test_Disk well, most others in the one wrong way
  * that their name tells.
  */
+#include "OrvLog/Observer.h"
 #include "cmpimacs.h"
 
 #include <array>
 #include <cstdlib>
+#include <cstring>
 #include <map>
 #include <stdexcept>
 #include <string>
-#include <sys/socket.h>
-#include <unistd.h>
+#include <string_view>
 
 namespace {
 
@@ -49,13 +50,29 @@ CMPIInstance* disk(const Call& call, const char* name) {
     return instance;
 }
 
-/** As the agent's log library does it. */
-void logRecord(int level, const std::string& text) {
-    const char* socket = std::getenv("ORV_AGENT_LOG_SOCKET");
-    if (socket != nullptr) {
-        const std::string record = std::to_string(gettid()) + '\n' + std::to_string(level) + "\nTest.Disk\n" + text;
-        send(std::atoi(socket), record.data(), record.size(), MSG_DONTWAIT | MSG_NOSIGNAL); // NOLINT(cert-err34-c)
+const OrvLog::Observer1* observer = nullptr;
+
+} // namespace
+
+/* As the agent's log library does it. */
+
+void orvLogObserve1(const OrvLog::Observer1* given) {
+    observer = given;
+}
+
+/** Logs a record; for the tests as well. */
+extern "C" void TestProvider_log(int kind, int level, const char* text) {
+    constexpr std::string_view category = "Test.Disk";
+    const OrvLog::ObservedRecord1 record{kind, level, category.data(), category.size(), text, std::strlen(text)};
+    if (observer != nullptr && level >= observer->lowestLevel) {
+        observer->record(observer->context, &record);
     }
+}
+
+namespace {
+
+void logRecord(int level, const char* text) {
+    TestProvider_log(OrvLog::ORDINARY_RECORD, level, text);
 }
 
 using Behaviour = CMPIStatus (*)(const Call&);

@@ -6,10 +6,9 @@
  *     ORVCIM_TEST_MACHINE    simulated, real, or silent: an agent whose log cannot be heard (simulated)
  *     ORVCIM_TEST_ANSWER     accepted, refused, nothing, or the number that the method returns (accepted)
  */
+#include "Norv/Machine.h"
+#include "OrvLog/Observer.h"
 #include "cmpimacs.h"
-
-#include <sys/socket.h>
-#include <unistd.h>
 
 #include <cstdint>
 #include <cstdlib>
@@ -28,13 +27,13 @@ std::string setting(const char* name, const char* otherwise) {
     return value == nullptr ? otherwise : value;
 }
 
+const OrvLog::Observer1* observer = nullptr;
+
 /** Writes a record as the agent's log library does. */
-void log(int level, const std::string& category, const std::string& text) {
-    const char* socket = std::getenv("ORV_AGENT_LOG_SOCKET");
-    if (socket != nullptr && setting("ORVCIM_TEST_MACHINE", "simulated") != "silent") {
-        const std::string record =
-            std::to_string(gettid()) + "\n" + std::to_string(level) + "\n" + category + "\n" + text;
-        send(std::atoi(socket), record.data(), record.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
+void log(int level, const std::string& category, const std::string& text, int kind = OrvLog::ORDINARY_RECORD) {
+    if (observer != nullptr && setting("ORVCIM_TEST_MACHINE", "simulated") != "silent") {
+        const OrvLog::ObservedRecord1 record{kind, level, category.data(), category.size(), text.data(), text.size()};
+        observer->record(observer->context, &record);
     }
 }
 
@@ -206,11 +205,7 @@ constexpr const char* instrumentation = "Corvane.Instrumentation";
 
 struct PowerService {
     static Instances instances(const CMPIObjectPath* request, const char** properties) {
-        if (setting("ORVCIM_TEST_MACHINE", "simulated") == "simulated") {
-            log(5000, instrumentation, "Power management of a simulated machine: 1 node, state in nothing");
-        } else {
-            log(5000, "Somewhere.Else", "Power management of a simulated machine: another one");
-        }
+        log(5000, instrumentation, "Power management of a machine: 1 node", OrvLog::MACHINE_RECORD);
         Instances result;
         for (int i = 1; i <= std::stoi(setting("ORVCIM_TEST_SERVICES", "1")); ++i) {
             const std::string name = "service" + std::to_string(i);
@@ -234,7 +229,8 @@ struct PowerService {
                                  keyOf(system, "CreationClassName") + " " + keyOf(system, "Name");
         log(5000, "Test", "called");
         if (answer == "accepted" || answer == "refused") {
-            log(10000, instrumentation, "Power request " + answer + ": " + what);
+            log(10000, instrumentation, "Power request " + answer + ": " + what,
+                answer == "accepted" ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD);
             return returnNumber(result, 0);
         }
         return returnNumber(result, answer == "nothing" ? 0 : static_cast<CMPIUint32>(std::stoul(answer)));
@@ -272,6 +268,14 @@ struct PowerAssociation {
 };
 
 } // namespace
+
+void orvLogObserve1(const OrvLog::Observer1* given) {
+    observer = given;
+}
+
+int orvInstrumentationMachine1() {
+    return setting("ORVCIM_TEST_MACHINE", "simulated") == "simulated" ? Norv::SIMULATED_MACHINE : Norv::REAL_MACHINE;
+}
 
 #define INSTANCE_FACTORY(P)                                                                                            \
     CMPI_EXTERN_C CMPIInstanceMI* P##_Create_InstanceMI(const CMPIBroker* given, const CMPIContext*, CMPIStatus*) {    \

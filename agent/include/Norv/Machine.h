@@ -1,0 +1,51 @@
+/**
+ * What a program that serves others needs to know of, and tell, the instrumentation: optional functions of
+ * liborvinstrumentation.so.1.
+ *
+ * The library of another agent need not have them. A program therefore does not link them: it asks dlsym(3) for the
+ * names that stand here, of a library that it loaded and that uses the instrumentation, and does without where there
+ * are none.
+ */
+#ifndef NORV_MACHINE_H
+#define NORV_MACHINE_H
+
+namespace Norv {
+
+/** Whose power the process manages. The numbers are fixed. */
+enum Machine : int {
+    /** Nobody's: the configuration cannot be used. */
+    NO_MACHINE = 0,
+    /** That of a simulated machine. Whatever is asked of it happens in a file. */
+    SIMULATED_MACHINE = 1,
+    /** That of a real machine. */
+    REAL_MACHINE = 2,
+};
+
+/**
+ * Tells whose power the process manages; asks nothing of the machine. May be called from any thread.
+ *
+ * @return a Machine, the same one for the life of the process.
+ */
+using Machine1 = int();
+
+/**
+ * Says on whose behalf the calling thread acts from now on: the record of a power request in the log names him.
+ *
+ * @param whom a text for people, such as "alice from 192.0.2.7"; null for nobody but the process itself. It stays the
+ *             caller's, and is valid until the thread gives another one.
+ */
+using OnBehalfOf1 = void(const char* whom);
+
+/** The names of the functions. */
+inline constexpr const char* machine1Name = "orvInstrumentationMachine1";
+inline constexpr const char* onBehalfOf1Name = "orvInstrumentationOnBehalfOf1";
+
+} // namespace Norv
+
+/** The embedded agent's function of type Norv::Machine1. */
+extern "C" int orvInstrumentationMachine1();
+
+/** The embedded agent's function of type Norv::OnBehalfOf1. */
+extern "C" void orvInstrumentationOnBehalfOf1(const char* whom);
+
+#endif

@@ -4,7 +4,7 @@
  */
 #include "WireCase.h"
 #include "cimxml/Markup.h"
-#include "schema/RegistrationReader.h"
+#include "registry/RegistrationReader.h"
 
 #include <cstdint>
 #include <cstdlib>

@@ -6,9 +6,9 @@
  * FOLDER/NAME.reg for object managers that read such files, the embedded one among them, and FOLDER/pg/NAME.mof for
  * those that take instances of PG_ProviderModule, PG_Provider and PG_ProviderCapabilities.
  */
-#include "schema/Files.h"
-#include "schema/RegistrationReader.h"
-#include "schema/RegistrationWriter.h"
+#include "classes/Files.h"
+#include "registry/RegistrationReader.h"
+#include "registry/RegistrationWriter.h"
 
 #include <cstdlib>
 #include <exception>

@@ -153,12 +153,6 @@ std::vector<std::string_view> RequestHeaders::listOf(std::string_view name) cons
     return list;
 }
 
-const std::string* RequestHeaders::find(std::string_view name) const {
-    const auto found = std::find_if(_request.headers.begin(), _request.headers.end(),
-                                    [&](const auto& header) { return equalNames(header.first, name); });
-    return found == _request.headers.end() ? nullptr : &found->second;
-}
-
 const std::string* RequestHeaders::findOwn(std::string_view name) const {
     const std::string whole = prefixed(name);
     const std::string* found = nullptr;
@@ -200,7 +194,7 @@ void RequestHeaders::check() const {
 }
 
 void RequestHeaders::checkTypes() const {
-    const std::string* type = find("Content-Type");
+    const std::string* type = _request.header("Content-Type");
     const std::string_view media = type == nullptr ? std::string_view() : split(*type, ';').front();
     const std::string_view charset =
         type == nullptr ? std::string_view() : parameterOf(*type, "charset").value_or("utf-8");
@@ -210,17 +204,17 @@ void RequestHeaders::checkTypes() const {
                             "found the Content-Type \"" + (type == nullptr ? "" : *type) +
                                 "\", expected application/xml or text/xml in utf-8");
     }
-    const std::string* encoding = find("Content-Encoding");
+    const std::string* encoding = _request.header("Content-Encoding");
     if (encoding != nullptr && !equalNames(trimmed(*encoding), "identity")) {
         throw ProtocolError(Http::unsupportedMediaType, nullptr,
                             "found the Content-Encoding \"" + *encoding + "\", expected none");
     }
-    const std::string* accept = find("Accept");
+    const std::string* accept = _request.header("Accept");
     if (accept != nullptr && !takesApplicationXml(*accept) && !accepts(*accept, {"text/xml", "text/*"})) {
         throw ProtocolError(Http::notAcceptable, nullptr,
                             "found the Accept \"" + *accept + "\", expected application/xml or text/xml in it");
     }
-    const std::string* charsets = find("Accept-Charset");
+    const std::string* charsets = _request.header("Accept-Charset");
     if (charsets != nullptr && !accepts(*charsets, {"utf-8", "*"})) {
         throw ProtocolError(Http::notAcceptable, nullptr,
                             "found the Accept-Charset \"" + *charsets + "\", expected utf-8 in it");
@@ -270,13 +264,13 @@ void RequestHeaders::checkObject(const Message& message) const {
 }
 
 const char* RequestHeaders::replyType() const {
-    const std::string* accept = find("Accept");
+    const std::string* accept = _request.header("Accept");
     return accept == nullptr || takesApplicationXml(*accept) ? "application/xml; charset=\"utf-8\""
                                                              : "text/xml; charset=\"utf-8\"";
 }
 
 std::string RequestHeaders::host() const {
-    const std::string* host = find("Host");
+    const std::string* host = _request.header("Host");
     return host == nullptr ? std::string() : *host;
 }
 

@@ -42,7 +42,6 @@ public:
     std::vector<std::pair<std::string, std::string>> ofAnswer() const;
 
 private:
-    const std::string* find(std::string_view name) const;
     /** The entries of all headers of that name, whose values are lists. */
     std::vector<std::string_view> listOf(std::string_view name) const;
     /** One of CIM's own, which may be there once only. */

@@ -1,7 +1,7 @@
 #include "cimxml/Operations.h"
 
+#include "agentlog/AgentLog.h"
 #include "cimxml/Parameters.h"
-#include "dispatch/AgentLog.h"
 
 #include <algorithm>
 #include <array>

@@ -2,9 +2,9 @@
 #ifndef CIMXML_PARAMETERS_H
 #define CIMXML_PARAMETERS_H
 
-#include "broker/Operations.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/ValueReader.h"
+#include "model/Operations.h"
 
 #include <array>
 #include <optional>

@@ -1,7 +1,7 @@
 #include "cimxml/ResponseWriter.h"
 
 #include "cimxml/Characters.h"
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 
 #include <algorithm>
 #include <array>

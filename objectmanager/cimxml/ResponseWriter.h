@@ -2,8 +2,8 @@
 #ifndef CIMXML_RESPONSEWRITER_H
 #define CIMXML_RESPONSEWRITER_H
 
-#include "broker/Operations.h"
-#include "schema/Catalogue.h"
+#include "classes/Catalogue.h"
+#include "model/Operations.h"
 
 #include <string>
 #include <string_view>

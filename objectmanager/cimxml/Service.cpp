@@ -1,11 +1,11 @@
 #include "cimxml/Service.h"
 
+#include "agentlog/AgentLog.h"
 #include "cimxml/HttpHeaders.h"
 #include "cimxml/Operations.h"
 #include "cimxml/ProtocolError.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/ResponseWriter.h"
-#include "dispatch/AgentLog.h"
 
 #include <unistd.h>
 
@@ -16,10 +16,11 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
+/** @param problem what the log says of it. */
 HttpReply failure(unsigned int status, std::vector<std::pair<std::string, std::string>> headers,
-                  const std::string& message) {
+                  const std::string& message, const std::string& problem) {
     headers.emplace_back("Content-Type", "text/plain; charset=\"utf-8\"");
-    return {status, std::move(headers), message + '\n'};
+    return {status, std::move(headers), message + '\n', problem};
 }
 
 /** The host's name for those who were asked by none. */
@@ -75,9 +76,10 @@ HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
         headers.checkAgainst(message);
         return {Http::ok, headers.ofAnswer(), documentOf(_dispatcher, _catalogue, message, caller, headers.host())};
     } catch (const ProtocolError& error) {
-        return failure(error.status(), headersOfFailure(error, prefix), error.what());
+        return failure(error.status(), headersOfFailure(error, prefix), error.what(),
+                       error.cimError() == nullptr ? error.what() : error.cimError());
     } catch (const std::exception& error) {
-        return failure(Http::internalServerError, {}, error.what());
+        return failure(Http::internalServerError, {}, error.what(), error.what());
     }
 }
 

@@ -2,35 +2,15 @@
 #ifndef CIMXML_SERVICE_H
 #define CIMXML_SERVICE_H
 
+#include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
-#include "schema/Catalogue.h"
-
-#include <string>
-#include <string_view>
-#include <utility>
-#include <vector>
+#include "server/HttpMessage.h"
 
 namespace ObjectManager::CimXml {
 
-/** A request as it came in. Header names are compared without regard to letter case. */
-struct HttpRequest {
-    std::string method;
-    std::vector<std::pair<std::string, std::string>> headers;
-    std::string_view body;
-};
-
-struct HttpReply {
-    unsigned int status;
-    std::vector<std::pair<std::string, std::string>> headers;
-    std::string body;
-};
-
-/** Who asks, and what he may do. */
-struct Caller {
-    std::string user;
-    bool mayRead;
-    bool mayChangePower;
-};
+using Server::Caller;
+using Server::HttpReply;
+using Server::HttpRequest;
 
 class Service {
 public:

@@ -3,7 +3,7 @@
 #include "cimxml/Markup.h"
 #include "cimxml/ProtocolError.h"
 #include "cimxml/RequestReader.h"
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 #include "text/ObjectPathText.h"
 
 #include <algorithm>

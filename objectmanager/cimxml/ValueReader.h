@@ -3,8 +3,8 @@
 #define CIMXML_VALUEREADER_H
 
 #include "cimxml/Markup.h"
+#include "classes/Catalogue.h"
 #include "model/CimError.h"
-#include "schema/Catalogue.h"
 
 #include <string>
 #include <string_view>

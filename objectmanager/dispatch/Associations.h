@@ -3,7 +3,7 @@
 #define DISPATCH_ASSOCIATIONS_H
 
 #include "broker/Broker.h"
-#include "dispatch/Registry.h"
+#include "registry/Registry.h"
 
 #include <string>
 #include <vector>

@@ -2,13 +2,13 @@
 #ifndef DISPATCH_DISPATCHER_H
 #define DISPATCH_DISPATCHER_H
 
+#include "agentlog/LogTap.h"
 #include "broker/Broker.h"
 #include "broker/Request.h"
 #include "broker/Result.h"
 #include "dispatch/Associations.h"
-#include "dispatch/LogTap.h"
 #include "dispatch/Providers.h"
-#include "dispatch/Registry.h"
+#include "registry/Registry.h"
 
 #include <filesystem>
 #include <functional>

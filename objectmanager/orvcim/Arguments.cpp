@@ -1,8 +1,8 @@
 #include "orvcim/Arguments.h"
 
+#include "classes/Literals.h"
 #include "model/CimError.h"
 #include "orvcim/Session.h"
-#include "schema/Literals.h"
 #include "text/ObjectPathText.h"
 
 #include <fmt/format.h>

@@ -4,8 +4,8 @@
 #ifndef ORVCIM_ARGUMENTS_H
 #define ORVCIM_ARGUMENTS_H
 
+#include "classes/Catalogue.h"
 #include "model/Model.h"
-#include "schema/Catalogue.h"
 
 #include <string>
 #include <string_view>

@@ -1,6 +1,6 @@
 #include "orvcim/CommandLine.h"
 
-#include "dispatch/AgentLog.h"
+#include "agentlog/AgentLog.h"
 #include "orvcim/Commands.h"
 #include "orvcim/ServeOptions.h"
 #include "text/ObjectPathText.h"

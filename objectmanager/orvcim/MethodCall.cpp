@@ -1,6 +1,6 @@
 #include "orvcim/MethodCall.h"
 
-#include "dispatch/AgentLog.h"
+#include "agentlog/AgentLog.h"
 
 #include <utility>
 

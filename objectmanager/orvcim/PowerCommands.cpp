@@ -1,4 +1,4 @@
-#include "dispatch/AgentLog.h"
+#include "agentlog/AgentLog.h"
 #include "orvcim/Commands.h"
 #include "orvcim/MethodCall.h"
 #include "text/ObjectPathText.h"

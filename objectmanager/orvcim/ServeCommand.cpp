@@ -135,8 +135,8 @@ void serve(Session& session) {
 
     const EndSignals signals;
     CimXml::Service service(session.dispatcher(), session.catalogue());
-    const auto answer = [&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
-        CimXml::HttpReply reply = service.answer(request, caller);
+    const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
+        Server::HttpReply reply = service.answer(request, caller);
         // What the agent logged meanwhile was of interest to this request only.
         session.log().forget();
         return reply;

@@ -1,6 +1,6 @@
 #include "orvcim/Session.h"
 
-#include "schema/RegistrationReader.h"
+#include "registry/RegistrationReader.h"
 #include "text/ObjectPathText.h"
 
 #include <fmt/format.h>

@@ -4,10 +4,10 @@
 #ifndef ORVCIM_SESSION_H
 #define ORVCIM_SESSION_H
 
+#include "agentlog/LogTap.h"
+#include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
-#include "dispatch/LogTap.h"
 #include "orvcim/ServeOptions.h"
-#include "schema/Catalogue.h"
 #include "text/Writer.h"
 
 #include <filesystem>

@@ -39,9 +39,6 @@ namespace {
 
 using Clock = Connections::Clock;
 using State = Connections::State;
-using CimXml::Caller;
-using CimXml::HttpReply;
-
 /** Log-ins that are checked at a time, and those that may wait for it. */
 constexpr unsigned int logInThreads = 4;
 constexpr std::size_t waitingLogIns = 64;
@@ -134,12 +131,15 @@ std::uint64_t announcedSize(MHD_Connection* http) {
     return size;
 }
 
-HttpReply textReply(unsigned int status, const std::string& text) {
-    return {status, {{MHD_HTTP_HEADER_CONTENT_TYPE, "text/plain; charset=utf-8"}}, text + "\n"};
+/** The refusal of a request. */
+HttpReply refusal(unsigned int status, const std::string& problem) {
+    return {status, {{MHD_HTTP_HEADER_CONTENT_TYPE, "text/plain; charset=utf-8"}}, problem + "\n", problem};
 }
 
 HttpReply unauthorized(const std::string& text) {
-    HttpReply reply = textReply(MHD_HTTP_UNAUTHORIZED, text);
+    HttpReply reply = refusal(MHD_HTTP_UNAUTHORIZED, text);
+    // What is wrong with a log-in has been logged, and a client's first request without one is usual.
+    reply.problem.clear();
     reply.headers.emplace_back(MHD_HTTP_HEADER_WWW_AUTHENTICATE, R"(Basic realm="orvcim", charset="UTF-8")");
     return reply;
 }
@@ -149,13 +149,6 @@ std::chrono::nanoseconds processorTime() {
     timespec time{};
     clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
     return std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec);
-}
-
-/** What a reply of the handler says about the request: in the words of DSP0200, or else in its own. */
-std::string problemOf(const HttpReply& reply) {
-    const auto error = std::find_if(reply.headers.begin(), reply.headers.end(),
-                                    [](const auto& header) { return equalNames(header.first, "CIMError"); });
-    return error == reply.headers.end() ? reply.body.substr(0, reply.body.find('\n')) : error->second;
 }
 
 /** Whether anything came from the client. The end of the connection counts as one byte. */
@@ -179,8 +172,8 @@ std::optional<HttpReply> framingRefusal(MHD_Connection* http) {
     const auto take = [](void* data, MHD_ValueKind, const char* name, const char* value) {
         Framing& found = *static_cast<Framing*>(data);
         const std::string_view text = value == nullptr ? "" : value;
-        const bool isLength = equalNames(name, MHD_HTTP_HEADER_CONTENT_LENGTH);
-        if (isLength || equalNames(name, MHD_HTTP_HEADER_TRANSFER_ENCODING)) {
+        const bool isLength = equalTokens(name, MHD_HTTP_HEADER_CONTENT_LENGTH);
+        if (isLength || equalTokens(name, MHD_HTTP_HEADER_TRANSFER_ENCODING)) {
             std::string_view& known = isLength ? found.length : found.coding;
             found.contradictory |= !known.empty() && known != text;
             known = text;
@@ -189,11 +182,11 @@ std::optional<HttpReply> framingRefusal(MHD_Connection* http) {
     };
     MHD_get_connection_values(http, MHD_HEADER_KIND, take, &framing);
     if (framing.contradictory || (!framing.length.empty() && !framing.coding.empty())) {
-        return textReply(MHD_HTTP_BAD_REQUEST, "found several lengths of the body, expected one");
+        return refusal(MHD_HTTP_BAD_REQUEST, "found several lengths of the body, expected one");
     }
-    if (!framing.coding.empty() && !equalNames(framing.coding, "chunked")) {
-        return textReply(MHD_HTTP_NOT_IMPLEMENTED,
-                         fmt::format("found the Transfer-Encoding \"{}\", expected chunked", framing.coding));
+    if (!framing.coding.empty() && !equalTokens(framing.coding, "chunked")) {
+        return refusal(MHD_HTTP_NOT_IMPLEMENTED,
+                       fmt::format("found the Transfer-Encoding \"{}\", expected chunked", framing.coding));
     }
     return std::nullopt;
 }
@@ -227,7 +220,7 @@ private:
         MHD_Connection* http;
         Connections::Connection& connection;
         Step step = Step::arriving;
-        CimXml::HttpRequest request{};
+        HttpRequest request{};
         /** Null where it asks for none that may be prompt. */
         PromptMethods::Method* method = nullptr;
         std::string body{};
@@ -236,7 +229,6 @@ private:
         Caller caller{"", true, true};
         std::optional<HttpReply> reply{};
         /** What is wrong with the request, for the log; empty where nothing is. */
-        std::string problem{};
     };
 
     /** Of an answer, until it is sent. */
@@ -630,22 +622,18 @@ MHD_Result HttpServer::Implementation::suspend(Exchange& exchange, Step step, Wo
 }
 
 void HttpServer::Implementation::refuse(Exchange& exchange, unsigned int status, const std::string& problem) {
-    refuse(exchange, textReply(status, problem));
+    refuse(exchange, refusal(status, problem));
 }
 
 void HttpServer::Implementation::refuse(Exchange& exchange, HttpReply reply) {
-    exchange.problem = problemOf(reply);
     exchange.reply = std::move(reply);
     exchange.reply->headers.emplace_back(MHD_HTTP_HEADER_CONNECTION, "close");
 }
 
 MHD_Result HttpServer::Implementation::send(Exchange& exchange) {
     HttpReply& reply = *exchange.reply;
-    if (reply.status >= MHD_HTTP_BAD_REQUEST && exchange.problem.empty() && reply.status != MHD_HTTP_UNAUTHORIZED) {
-        exchange.problem = problemOf(reply);
-    }
-    if (!exchange.problem.empty()) {
-        report(exchange.connection, fmt::format("answered {}: {}", reply.status, printable(exchange.problem)));
+    if (!reply.problem.empty()) {
+        report(exchange.connection, fmt::format("answered {}: {}", reply.status, printable(reply.problem)));
     }
     auto* const body = new Body{std::move(reply.body), _largeAnswerSent};
     const std::unique_ptr<MHD_Response, decltype(&MHD_destroy_response)> response(

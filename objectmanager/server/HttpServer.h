@@ -2,8 +2,8 @@
 #ifndef SERVER_HTTPSERVER_H
 #define SERVER_HTTPSERVER_H
 
-#include "cimxml/Service.h"
 #include "server/Connections.h"
+#include "server/HttpMessage.h"
 #include "server/LogIns.h"
 #include "server/Settings.h"
 
@@ -15,7 +15,7 @@
 namespace ObjectManager::Server {
 
 /** Called by several threads at once; must not throw. */
-using Handler = std::function<CimXml::HttpReply(const CimXml::HttpRequest&, const CimXml::Caller&)>;
+using Handler = std::function<HttpReply(const HttpRequest&, const Caller&)>;
 
 /** A server that cannot be started. what() is one line. */
 class ServerError : public std::runtime_error {

@@ -24,7 +24,7 @@ struct GnutlsFree {
 
 std::optional<Credentials> credentialsOf(std::string_view authorization) {
     constexpr std::string_view scheme = "Basic ";
-    if (!equalNames(authorization.substr(0, scheme.size()), scheme)) {
+    if (!equalTokens(authorization.substr(0, scheme.size()), scheme)) {
         return std::nullopt;
     }
     std::string encoded(authorization.substr(scheme.size()));
@@ -48,15 +48,14 @@ RecentLogIns::RecentLogIns() {
     require(gnutls_rnd(GNUTLS_RND_KEY, _secret.data(), _secret.size()), "random key");
 }
 
-std::optional<CimXml::Caller> RecentLogIns::find(const std::string& user, const std::string& password,
-                                                 Clock::time_point now) {
+std::optional<Caller> RecentLogIns::find(const std::string& user, const std::string& password, Clock::time_point now) {
     const Digest digest = digestOf(user, password);
     const std::lock_guard lock(_mutex);
     const auto found = _entries.find(digest);
     return found == _entries.end() || found->second.until <= now ? std::nullopt : std::optional(found->second.caller);
 }
 
-void RecentLogIns::remember(const std::string& user, const std::string& password, const CimXml::Caller& caller,
+void RecentLogIns::remember(const std::string& user, const std::string& password, const Caller& caller,
                             Clock::time_point now) {
     const Digest digest = digestOf(user, password);
     const std::lock_guard lock(_mutex);

@@ -2,7 +2,7 @@
 #ifndef SERVER_LOGINS_H
 #define SERVER_LOGINS_H
 
-#include "cimxml/Service.h"
+#include "server/HttpMessage.h"
 
 #include <array>
 #include <chrono>
@@ -16,7 +16,7 @@ namespace ObjectManager::Server {
 
 struct LogIn {
     /** Nothing where the log-in failed. */
-    std::optional<CimXml::Caller> caller;
+    std::optional<Caller> caller;
     /** Why it failed, for the person who runs the server. */
     std::string problem;
 };
@@ -56,16 +56,16 @@ public:
 
     RecentLogIns();
 
-    std::optional<CimXml::Caller> find(const std::string& user, const std::string& password,
-                                       Clock::time_point now = Clock::now());
-    void remember(const std::string& user, const std::string& password, const CimXml::Caller& caller,
+    std::optional<Caller> find(const std::string& user, const std::string& password,
+                               Clock::time_point now = Clock::now());
+    void remember(const std::string& user, const std::string& password, const Caller& caller,
                   Clock::time_point now = Clock::now());
 
 private:
     using Digest = std::array<unsigned char, 32>;
 
     struct Entry {
-        CimXml::Caller caller;
+        Caller caller;
         Clock::time_point until;
     };
 

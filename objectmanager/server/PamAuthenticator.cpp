@@ -167,7 +167,7 @@ LogIn PamAuthenticator::logIn(const std::string& user, const std::string& passwo
     const User known = userNamed(name);
     const bool mayChangePower = known.root || known.isIn(_settings.powerGroup);
     const bool mayRead = mayChangePower || _settings.readGroup.empty() || known.isIn(_settings.readGroup);
-    return {CimXml::Caller{name, mayRead, mayChangePower}, ""};
+    return {Caller{name, mayRead, mayChangePower}, ""};
 }
 
 bool groupExists(const std::string& name) {

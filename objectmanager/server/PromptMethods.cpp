@@ -17,14 +17,13 @@ void PromptMethods::Method::took(Clock::duration processorTime, Clock::time_poin
     _start.compare_exchange_strong(never, now, std::memory_order_relaxed);
 }
 
-PromptMethods::Method* PromptMethods::find(const CimXml::HttpRequest& request) {
-    const auto header = std::find_if(request.headers.begin(), request.headers.end(),
-                                     [](const auto& each) { return equalNames(each.first, "CIMMethod"); });
-    if (header == request.headers.end()) {
+PromptMethods::Method* PromptMethods::find(const HttpRequest& request) {
+    const std::string* const name = request.header("CIMMethod");
+    if (name == nullptr) {
         return nullptr;
     }
     const auto method = std::find_if(_methods.begin(), _methods.end(),
-                                     [&](const Method& each) { return equalNames(each.name(), header->second); });
+                                     [&](const Method& each) { return equalTokens(each.name(), *name); });
     return method == _methods.end() ? nullptr : &*method;
 }
 

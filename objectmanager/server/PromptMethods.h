@@ -2,7 +2,7 @@
 #ifndef SERVER_PROMPTMETHODS_H
 #define SERVER_PROMPTMETHODS_H
 
-#include "cimxml/Service.h"
+#include "server/HttpMessage.h"
 
 #include <atomic>
 #include <chrono>
@@ -50,7 +50,7 @@ public:
     explicit PromptMethods(const std::vector<std::string>& names) : _methods(names.begin(), names.end()) {}
 
     /** The method that the request asks for; null where it is none of these. */
-    Method* find(const CimXml::HttpRequest& request);
+    Method* find(const HttpRequest& request);
 
 private:
     std::deque<Method> _methods;

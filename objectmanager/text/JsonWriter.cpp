@@ -1,4 +1,4 @@
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 #include "text/ObjectPathText.h"
 #include "text/Writers.h"
 

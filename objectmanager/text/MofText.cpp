@@ -1,6 +1,6 @@
 #include "text/MofText.h"
 
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 #include "text/Layout.h"
 #include "text/ObjectPathText.h"
 

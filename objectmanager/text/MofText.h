@@ -4,8 +4,8 @@
 #ifndef TEXT_MOFTEXT_H
 #define TEXT_MOFTEXT_H
 
+#include "classes/Class.h"
 #include "model/Model.h"
-#include "schema/Class.h"
 
 #include <string>
 

@@ -1,6 +1,6 @@
 #include "text/ObjectPathText.h"
 
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 #include "text/MofText.h"
 
 #include <fmt/format.h>

@@ -9,8 +9,8 @@
 #ifndef TEXT_OBJECTPATHTEXT_H
 #define TEXT_OBJECTPATHTEXT_H
 
+#include "classes/Catalogue.h"
 #include "model/Model.h"
-#include "schema/Catalogue.h"
 
 #include <stdexcept>
 #include <string>

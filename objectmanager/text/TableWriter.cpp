@@ -1,4 +1,4 @@
-#include "schema/Literals.h"
+#include "classes/Literals.h"
 #include "text/Layout.h"
 #include "text/MofText.h"
 #include "text/ObjectPathText.h"

@@ -4,9 +4,9 @@
 #ifndef TEXT_WRITER_H
 #define TEXT_WRITER_H
 
-#include "broker/Operations.h"
+#include "classes/Catalogue.h"
 #include "model/Model.h"
-#include "schema/Catalogue.h"
+#include "model/Operations.h"
 
 #include <memory>
 #include <ostream>

@@ -1,6 +1,6 @@
 #include "cimxml/ResponseWriter.h"
 
-#include "schema/MofReader.h"
+#include "classes/MofReader.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

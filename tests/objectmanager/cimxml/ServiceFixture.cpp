@@ -1,6 +1,6 @@
 #include "ServiceFixture.h"
 
-#include "schema/RegistrationReader.h"
+#include "registry/RegistrationReader.h"
 
 #include <cerrno>
 #include <cstdlib>

@@ -1,8 +1,8 @@
 /* Walks over associations, from a host to its disks and its tape. */
 #include "TestProviders.h"
 
-#include "schema/Catalogue.h"
-#include "schema/MofReader.h"
+#include "classes/Catalogue.h"
+#include "classes/MofReader.h"
 
 #include <optional>
 #include <ostream>

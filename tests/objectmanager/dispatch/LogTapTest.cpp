@@ -1,4 +1,4 @@
-#include "dispatch/LogTap.h"
+#include "agentlog/LogTap.h"
 
 #include "TestProviders.h"
 

@@ -2,9 +2,8 @@
 #ifndef TESTS_OBJECTMANAGER_DISPATCH_TESTPROVIDERS_H
 #define TESTS_OBJECTMANAGER_DISPATCH_TESTPROVIDERS_H
 
+#include "CimErrors.h"
 #include "dispatch/Dispatcher.h"
-
-#include <gmock/gmock.h>
 
 #include <string>
 #include <utility>
@@ -44,23 +43,6 @@ inline Registration brokenRegistration(const std::string& provider) {
     registration.nameSpaces = {"root/cimv2"};
     registration.instance = true;
     return registration;
-}
-
-/** The code and text of the CimError that `call` throws; a failure of the test where it throws none. */
-template <class Call>
-CimError errorOf(Call call) {
-    try {
-        call();
-    } catch (const CimError& error) {
-        return error;
-    }
-    ADD_FAILURE() << "no CimError";
-    return {CMPI_RC_OK, ""};
-}
-
-inline auto isError(CMPIrc code, const std::string& message) {
-    return testing::AllOf(testing::Field("code", &CimError::code, code),
-                          testing::Property("what()", &CimError::what, testing::StrEq(message)));
 }
 
 } // namespace ObjectManager

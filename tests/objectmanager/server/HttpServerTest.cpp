@@ -17,7 +17,7 @@ using HttpServerTest = Served;
 TEST_F(HttpServerTest, handsTheWholeRequestToTheHandler) {
     std::vector<std::pair<std::string, std::string>> headers;
     std::string method;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         headers = request.headers;
         method = request.method;
         EXPECT_EQ(caller.user, "");
@@ -36,15 +36,15 @@ TEST_F(HttpServerTest, handsTheWholeRequestToTheHandler) {
 }
 
 TEST_F(HttpServerTest, sendsWhatTheHandlerGives) {
-    serve([](const CimXml::HttpRequest&, const CimXml::Caller&) {
-        return CimXml::HttpReply{501, {{"CIMError", "unsupported-operation"}, {"Ext", ""}}, "no"};
+    serve([](const Server::HttpRequest&, const Server::Caller&) {
+        return Server::HttpReply{501, {{"CIMError", "unsupported-operation"}, {"Ext", ""}}, "no", "not supported"};
     });
     const Reply reply = ask(post(""));
     EXPECT_EQ(reply.status, 501);
     EXPECT_EQ(reply.body, "no");
     EXPECT_EQ(reply.headers.at("cimerror"), "unsupported-operation");
     EXPECT_EQ(reply.headers.at("ext"), "");
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 501: unsupported-operation"));
+    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 501: not supported"));
 }
 
 TEST_F(HttpServerTest, keepsAConnectionForTheNextRequest) {
@@ -70,7 +70,7 @@ TEST_F(HttpServerTest, takesABodyInChunks) {
 
 TEST_F(HttpServerTest, servesOthersWhileAHandlerTakesItsTime) {
     Gate gate;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         if (request.body == "slow") {
             gate.wait();
         }
@@ -89,7 +89,7 @@ TEST_F(HttpServerTest, runsNoMoreHandlersAtATimeThanItHasThreads) {
     _settings.threads = 3;
     std::atomic<int> running = 0;
     std::atomic<int> most = 0;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         const int now = ++running;
         int before = most;
         while (before < now && !most.compare_exchange_weak(before, now)) {
@@ -190,7 +190,7 @@ TEST_F(HttpServerTest, refusesARequestThatDoesNotArriveInTime) {
 TEST_F(HttpServerTest, doesNotCountTheTimeOfTheAnswerAsTheRequests) {
     _settings.limits.requestTime = 100ms;
     _settings.limits.idleTime = 100ms;
-    serve([](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
         std::this_thread::sleep_for(1s);
         return echo(request, caller);
     });
@@ -221,8 +221,8 @@ TEST_F(HttpServerTest, isNotKeptWaitingByARequestLineThatComesInDrops) {
 }
 
 TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidAnswer) {
-    serve([](const CimXml::HttpRequest& request, const CimXml::Caller& /*caller*/) {
-        return CimXml::HttpReply{200, {}, std::string(request.body == "large" ? 50'000'000 : 5, 'x')};
+    serve([](const Server::HttpRequest& request, const Server::Caller& /*caller*/) {
+        return Server::HttpReply{200, {}, std::string(request.body == "large" ? 50'000'000 : 5, 'x')};
     });
     HttpClient gone = client();
     gone.send(post("large"));
@@ -235,7 +235,7 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidAnswer) {
 TEST_F(HttpServerTest, survivesAClientThatGoesAwayWhileTheHandlerRuns) {
     Gate entered;
     Gate gate;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         if (request.body == "gone") {
             entered.open();
             gate.wait();
@@ -322,7 +322,7 @@ TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
     _settings.limits.connections = 3;
     Gate gate;
     std::atomic<int> entered = 0;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         ++entered;
         gate.wait();
         return echo(request, caller);
@@ -420,7 +420,7 @@ TEST_F(HttpServerTest, saysWhereItCannotListen) {
 TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
     Gate entered;
     Gate gate;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         entered.open();
         gate.wait();
         return echo(request, caller);
@@ -450,8 +450,8 @@ TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
 
 TEST_F(HttpServerTest, endsThoughAClientDoesNotTakeItsAnswer) {
     _settings.stopTime = 100ms;
-    serve([](const CimXml::HttpRequest&, const CimXml::Caller&) {
-        return CimXml::HttpReply{200, {}, std::string(50'000'000, 'x')};
+    serve([](const Server::HttpRequest&, const Server::Caller&) {
+        return Server::HttpReply{200, {}, std::string(50'000'000, 'x')};
     });
     const HttpClient asking = client();
     asking.send(post("x"));

@@ -19,7 +19,7 @@ public:
         if (before) {
             before(user);
         }
-        return password == "right" ? Server::LogIn{CimXml::Caller{user, true, user == "admin"}, ""}
+        return password == "right" ? Server::LogIn{Server::Caller{user, true, user == "admin"}, ""}
                                    : Server::LogIn{std::nullopt, "no such luck"};
     }
 
@@ -32,7 +32,7 @@ protected:
     LogInTest() {
         _settings.failedLogInDelay = 1ms;
         serve(
-            [this](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+            [this](const Server::HttpRequest& request, const Server::Caller& caller) {
                 const std::lock_guard lock(_callerMutex);
                 _caller = caller;
                 return echo(request, caller);
@@ -50,7 +50,7 @@ protected:
 
     Doorkeeper _doorkeeper;
     std::mutex _callerMutex;
-    CimXml::Caller _caller{"", false, false};
+    Server::Caller _caller{"", false, false};
 };
 
 TEST_F(LogInTest, isAskedOfAClientThatDoesNotTry) {

@@ -16,7 +16,7 @@ using testing::NotNull;
 
 const PromptMethods::Clock::time_point now = PromptMethods::Clock::now();
 
-CimXml::HttpRequest requestFor(const std::string& method) {
+Server::HttpRequest requestFor(const std::string& method) {
     return {"POST", {{"Host", "x"}, {"cimmethod", method}}, ""};
 }
 
@@ -56,14 +56,14 @@ protected:
     }
 
     /** Which thread answers. */
-    static CimXml::HttpReply thread(const CimXml::HttpRequest& /*request*/, const CimXml::Caller& /*caller*/) {
+    static Server::HttpReply thread(const Server::HttpRequest& /*request*/, const Server::Caller& /*caller*/) {
         return {200, {}, std::to_string(gettid())};
     }
 };
 
 TEST_F(PromptServerTest, answersQuickMethodsWithoutAWorkerUntilTheyTakeMuch) {
     _settings.threads = 1;
-    serve([](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
         if (request.body == "much") {
             const std::clock_t begin = std::clock();
             while (std::clock() - begin < CLOCKS_PER_SEC / 100) {
@@ -89,7 +89,7 @@ TEST_F(PromptServerTest, answersQuickMethodsWithoutAWorkerUntilTheyTakeMuch) {
 TEST_F(PromptServerTest, keepsNobodyWaitingForAMethodThatMayWait) {
     Gate gate;
     _settings.threads = 20;
-    serve([&](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         if (request.body == "waits") {
             gate.wait();
         }

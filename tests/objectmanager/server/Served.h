@@ -25,7 +25,7 @@ using namespace std::chrono_literals;
 class Served : public testing::Test {
 protected:
     /** What the server answers where a test serves nothing else: the request's body. */
-    static CimXml::HttpReply echo(const CimXml::HttpRequest& request, const CimXml::Caller& /*caller*/) {
+    static Server::HttpReply echo(const Server::HttpRequest& request, const Server::Caller& /*caller*/) {
         return {200, {{"Content-Type", "text/plain"}}, std::string(request.body)};
     }
 

@@ -25,7 +25,7 @@ class Doorkeeper : public Server::Authenticator {
 public:
     Server::LogIn logIn(const std::string& user, const std::string& /*password*/,
                         const std::string& /*address*/) override {
-        return {CimXml::Caller{user, user != "stranger", user == "operator"}, ""};
+        return {Server::Caller{user, user != "stranger", user == "operator"}, ""};
     }
 };
 
@@ -80,7 +80,7 @@ TEST_F(StressTest, everyClientGetsItsOwnReplies) {
     settings.promptMethods = {"GetInstance", "EnumerateInstanceNames", "Associators"};
     const Server::HttpServer server(
         settings,
-        [](const CimXml::HttpRequest& request, const CimXml::Caller& caller) {
+        [](const Server::HttpRequest& request, const Server::Caller& caller) {
             return service().answer(request, caller);
         },
         &doorkeeper, [](const std::string&) {});

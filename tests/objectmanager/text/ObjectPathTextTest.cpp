@@ -1,5 +1,5 @@
 #include "text/ObjectPathText.h"
-#include "schema/MofReader.h"
+#include "classes/MofReader.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

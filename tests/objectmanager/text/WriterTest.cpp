@@ -1,5 +1,5 @@
 #include "text/Writer.h"
-#include "schema/MofReader.h"
+#include "classes/MofReader.h"
 #include "text/MofText.h"
 
 #include <gmock/gmock.h>

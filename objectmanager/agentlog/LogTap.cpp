@@ -1,0 +1,159 @@
+#include "agentlog/LogTap.h"
+
+#include <algorithm>
+#include <deque>
+#include <dlfcn.h>
+#include <iterator>
+#include <new>
+#include <utility>
+
+namespace ObjectManager {
+
+namespace {
+
+constexpr int lowestLevel = 5000;
+
+struct ThreadRecords {
+    /** The tap that they are of. */
+    std::uint64_t tap = 0;
+    std::uint64_t newest = 0;
+    std::deque<LogRecord> records;
+};
+
+/** Set when the thread's records are gone, while other destructors of the thread may still log. */
+constinit thread_local bool isEnding = false;
+
+struct EndingThreadRecords : ThreadRecords {
+    EndingThreadRecords() = default;
+    EndingThreadRecords(const EndingThreadRecords&) = delete;
+    EndingThreadRecords& operator=(const EndingThreadRecords&) = delete;
+    ~EndingThreadRecords() { isEnding = true; }
+};
+
+/** The calling thread's records of a tap. */
+ThreadRecords& recordsOf(std::uint64_t tap) {
+    thread_local EndingThreadRecords own;
+    if (own.tap != tap) {
+        static_cast<ThreadRecords&>(own) = {.tap = tap, .newest = 0, .records = {}};
+    }
+    return own;
+}
+
+std::uint64_t nextNumber() {
+    static std::atomic<std::uint64_t> taps = 0;
+    return ++taps;
+}
+
+bool isOrdinary(const LogRecord& record) {
+    return record.kind == OrvLog::ORDINARY_RECORD;
+}
+
+template <typename Function>
+Function* functionOf(void* library, const char* name) {
+    return reinterpret_cast<Function*>(dlsym(library, name));
+}
+
+} // namespace
+
+std::string_view messageOf(std::string_view text) {
+    constexpr std::string_view frame = "MESSAGE [File: ";
+    constexpr std::string_view frameEnd = "]: ";
+    const std::size_t end = text.find(frameEnd);
+    return text.starts_with(frame) && end != std::string_view::npos ? text.substr(end + frameEnd.size()) : text;
+}
+
+LogTap::LogTap()
+    : _observer{.lowestLevel = lowestLevel, .record = &LogTap::keep, .context = this}, _number(nextNumber()) {}
+
+LogTap::~LogTap() {
+    for (const Heard& heard : _heard) {
+        heard.observe(nullptr);
+        dlclose(heard.library);
+    }
+}
+
+void LogTap::attach(void* library) {
+    if (auto* const machine = functionOf<Norv::Machine1>(library, Norv::machine1Name)) {
+        _machine = machine;
+    }
+    auto* const observe = functionOf<OrvLog::Observe1>(library, OrvLog::observe1Name);
+    const std::lock_guard lock(_mutex);
+    if (observe == nullptr || std::ranges::find(_heard, observe, &Heard::observe) != _heard.end()) {
+        return;
+    }
+    Dl_info found{};
+    if (dladdr(reinterpret_cast<void*>(observe), &found) != 0) {
+        if (void* const own = dlopen(found.dli_fname, RTLD_NOW | RTLD_NOLOAD)) {
+            _heard.push_back({observe, own});
+            observe(&_observer);
+        }
+    }
+}
+
+bool LogTap::isAttached() const {
+    const std::lock_guard lock(_mutex);
+    return !_heard.empty();
+}
+
+bool LogTap::isSimulated() const {
+    Norv::Machine1* const machine = _machine;
+    return machine != nullptr && machine() == Norv::SIMULATED_MACHINE;
+}
+
+std::uint64_t LogTap::newest() const {
+    return recordsOf(_number).newest;
+}
+
+std::vector<LogRecord> LogTap::since(std::uint64_t sequence) const {
+    const std::deque<LogRecord>& records = recordsOf(_number).records;
+    const auto first =
+        std::ranges::find_if(records, [sequence](const LogRecord& record) { return record.sequence > sequence; });
+    return {first, records.end()};
+}
+
+std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
+    constexpr int failureLevel = 6000;
+    std::vector<std::string> failures;
+    for (const LogRecord& record : since(sequence)) {
+        // What the agent says of the machine, and of requests that it accepted, is no failure, whatever its level.
+        const bool isNews =
+            record.kind == OrvLog::MACHINE_RECORD || record.kind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD;
+        if (record.level >= failureLevel && !isNews) {
+            failures.emplace_back(messageOf(record.text));
+        }
+    }
+    return failures;
+}
+
+std::vector<LogRecord> LogTap::take() {
+    std::deque<LogRecord> taken = std::exchange(recordsOf(_number).records, {});
+    return {std::make_move_iterator(taken.begin()), std::make_move_iterator(taken.end())};
+}
+
+void LogTap::forget() {
+    recordsOf(_number).records.clear();
+}
+
+void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept {
+    if (isEnding) {
+        return;
+    }
+    try {
+        ThreadRecords& own = recordsOf(static_cast<const LogTap*>(context)->_number);
+        if (own.records.size() >= recordsPerThread) {
+            if (const auto oldest = std::ranges::find_if(own.records, isOrdinary); oldest != own.records.end()) {
+                own.records.erase(oldest);
+            }
+        }
+        own.records.push_back({record->kind,
+                               {record->category, record->categorySize},
+                               record->level,
+                               {record->text, record->textSize},
+                               own.newest + 1});
+        ++own.newest;
+    } catch (const std::bad_alloc&) {
+        // Nobody hears of the record. A power request of which nobody heard that it was accepted counts as refused.
+    }
+}
+
+} // namespace ObjectManager

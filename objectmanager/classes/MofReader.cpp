@@ -1,0 +1,271 @@
+#include "classes/MofReader.h"
+
+#include "classes/Literals.h"
+
+#include <fmt/format.h>
+
+#include <utility>
+
+namespace ObjectManager {
+
+namespace {
+
+class Parser {
+public:
+    Parser(std::string_view text, std::string_view file) : _file(file), _tokens(tokensOfMof(text, file)) {}
+
+    std::vector<Class> classes() {
+        std::vector<Class> result;
+        while (peek().kind != Token::Kind::end) {
+            result.push_back(classDeclaration());
+        }
+        return result;
+    }
+
+private:
+    Class classDeclaration() {
+        Class declared;
+        declared.qualifiers = qualifierList();
+        declared.place = placeOf(_file, peek().line);
+        expectWord("class", "a class declaration");
+        declared.name = identifier("the name of the class");
+        if (accept(":")) {
+            declared.superClass = identifier("the name of the superclass");
+        }
+        expect("{", declared.superClass.empty() ? "':' and a superclass, or '{'" : "'{'");
+        while (!accept("}")) {
+            feature(declared);
+        }
+        expect(";", "';' behind the class declaration");
+        return declared;
+    }
+
+    /** A property, a reference or a method. */
+    void feature(Class& declared) {
+        Element element = typedElement("a property, a method or '}'");
+        if (accept("(")) {
+            declared.methods.push_back(method(std::move(element)));
+            return;
+        }
+        if (declared.property(element.name) != nullptr) {
+            failBefore(fmt::format("a second property {} of {}", element.name, declared.name), "every name once");
+        }
+        Property property{std::move(element), {}};
+        arrayBrackets(property);
+        property.defaultValue = accept("=") ? initializer(property.type) : nullValue(property.type);
+        expect(";", fmt::format("';' behind the property {}", property.name));
+        declared.properties.push_back(std::move(property));
+    }
+
+    Method method(Element element) {
+        Method result{std::move(element), {}};
+        if (!accept(")")) {
+            do {
+                Parameter parameter{typedElement("a parameter")};
+                arrayBrackets(parameter);
+                result.parameters.push_back(std::move(parameter));
+            } while (accept(","));
+            expect(")", "',' or ')' behind a parameter");
+        }
+        expect(";", fmt::format("';' behind the method {}", result.name));
+        return result;
+    }
+
+    /** Qualifiers, type and name. */
+    Element typedElement(const char* expected) {
+        Element element;
+        element.qualifiers = qualifierList();
+        const Token type = peek();
+        const std::string name = identifier(expected);
+        if (peek().kind == Token::Kind::identifier && equalNames(peek().text, "ref")) {
+            ++_next;
+            element.type = CMPI_ref;
+            element.referenceClass = name;
+        } else if (const auto found = typeByName(name)) {
+            element.type = *found;
+        } else {
+            fail(type, "the name of a type, or of a class and REF");
+        }
+        element.name = identifier("a name");
+        return element;
+    }
+
+    void arrayBrackets(Element& element) {
+        if (accept("[")) {
+            if (peek().kind == Token::Kind::number) {
+                ++_next;
+            }
+            expect("]", "']'");
+            element.type = static_cast<CMPIType>(element.type | CMPI_ARRAY);
+        }
+    }
+
+    Qualifiers qualifierList() {
+        Qualifiers result;
+        if (!accept("[")) {
+            return result;
+        }
+        do {
+            const std::string name = identifier("the name of a qualifier");
+            result.push_back({name, qualifierValue()});
+            if (accept(":")) {
+                do {
+                    identifier("a flavor");
+                } while (peek().kind == Token::Kind::identifier);
+            }
+        } while (accept(","));
+        expect("]", "',' or ']' behind a qualifier");
+        return result;
+    }
+
+    Value qualifierValue() {
+        if (accept("(")) {
+            Value value = untypedLiteral();
+            expect(")", "')'");
+            return value;
+        }
+        return peekIs("{") ? untypedArray() : booleanValue(true);
+    }
+
+    Value untypedArray() {
+        expect("{", "'{'");
+        Value::Array elements;
+        if (!accept("}")) {
+            do {
+                const Token& token = peek();
+                elements.push_back(untypedLiteral());
+                if (elements.back().type != elements.front().type) {
+                    fail(token, fmt::format("a {} like the elements before", typeName(elements.front().type)));
+                }
+            } while (accept(","));
+            expect("}", "',' or '}' behind an element");
+        }
+        const CMPIType type = elements.empty() ? CMPIType{CMPI_string} : elements.front().type;
+        return arrayValue(type, std::move(elements));
+    }
+
+    /** A literal where no type is declared. */
+    Value untypedLiteral() {
+        const Token& token = peek();
+        ++_next;
+        if (token.kind == Token::Kind::string) {
+            return stringValue(token.text);
+        }
+        if (token.kind == Token::Kind::character) {
+            return characterOf(token);
+        }
+        if (isNull(token)) {
+            return nullValue(CMPI_null);
+        }
+        const bool plain = token.kind == Token::Kind::identifier || token.kind == Token::Kind::number;
+        if (auto value = plain ? valueOfUntypedText(token.text) : std::nullopt) {
+            return std::move(*value);
+        }
+        fail(token, "a string, a character, a number, TRUE, FALSE or NULL");
+    }
+
+    Value initializer(CMPIType type) {
+        const auto elementType = static_cast<CMPIType>(type & ~CMPI_ARRAY);
+        if (isNull(peek())) {
+            ++_next;
+            return nullValue(type);
+        }
+        if ((type & CMPI_ARRAY) == 0) {
+            return literal(type);
+        }
+        expect("{", "'{' and the elements of the array, or NULL");
+        Value::Array elements;
+        if (!accept("}")) {
+            do {
+                elements.push_back(literal(elementType));
+            } while (accept(","));
+            expect("}", "',' or '}' behind an element");
+        }
+        return arrayValue(elementType, std::move(elements));
+    }
+
+    /** A literal of a declared type. */
+    Value literal(CMPIType type) {
+        const Token& token = peek();
+        ++_next;
+        const bool quotedType = type == CMPI_string || type == CMPI_dateTime;
+        const Token::Kind expected = quotedType                        ? Token::Kind::string
+                                     : type == CMPI_char16             ? Token::Kind::character
+                                     : isInteger(type) || isReal(type) ? Token::Kind::number
+                                                                       : Token::Kind::identifier;
+        if (token.kind != expected || type == CMPI_ref) {
+            fail(token, type == CMPI_ref ? "NULL" : fmt::format("a {}", typeName(type)));
+        }
+        try {
+            return valueOfText(token.text, type);
+        } catch (const LiteralError& error) {
+            throw SchemaError(placeOf(_file, token.line), error.what());
+        }
+    }
+
+    Value characterOf(const Token& token) {
+        try {
+            return valueOfText(token.text, CMPI_char16);
+        } catch (const LiteralError& error) {
+            throw SchemaError(placeOf(_file, token.line), error.what());
+        }
+    }
+
+    static bool isNull(const Token& token) {
+        return token.kind == Token::Kind::identifier && equalNames(token.text, "null");
+    }
+
+    const Token& peek() const { return _tokens[_next]; }
+
+    bool peekIs(std::string_view punctuation) const {
+        return peek().kind == Token::Kind::punctuation && peek().text == punctuation;
+    }
+
+    bool accept(std::string_view punctuation) {
+        const bool found = peekIs(punctuation);
+        _next += found ? 1 : 0;
+        return found;
+    }
+
+    void expect(std::string_view punctuation, const std::string& expected) {
+        if (!accept(punctuation)) {
+            fail(peek(), expected);
+        }
+    }
+
+    void expectWord(std::string_view word, const std::string& expected) {
+        if (peek().kind != Token::Kind::identifier || !equalNames(peek().text, word)) {
+            fail(peek(), expected);
+        }
+        ++_next;
+    }
+
+    std::string identifier(const std::string& expected) {
+        if (peek().kind != Token::Kind::identifier) {
+            fail(peek(), expected);
+        }
+        return _tokens[_next++].text;
+    }
+
+    [[noreturn]] void fail(const Token& token, const std::string& expected) const {
+        throw SchemaError(placeOf(_file, token.line), fmt::format("found {}, expected {}", describe(token), expected));
+    }
+
+    /** Reports what stands before the next token. */
+    [[noreturn]] void failBefore(const std::string& found, const std::string& expected) const {
+        throw SchemaError(placeOf(_file, _tokens[_next - 1].line),
+                          fmt::format("found {}, expected {}", found, expected));
+    }
+
+    std::string_view _file;
+    std::vector<Token> _tokens;
+    std::size_t _next = 0;
+};
+
+} // namespace
+
+std::vector<Class> readMof(std::string_view text, std::string_view file) {
+    return Parser(text, file).classes();
+}
+
+} // namespace ObjectManager

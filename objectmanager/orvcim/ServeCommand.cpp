@@ -1,5 +1,6 @@
 #include "cimxml/Service.h"
 #include "orvcim/Commands.h"
+#include "orvcim/ServiceManager.h"
 #include "server/HttpServer.h"
 #include "server/ListenSocket.h"
 #include "server/PamAuthenticator.h"
@@ -9,10 +10,13 @@
 
 #include <pthread.h>
 #include <sys/resource.h>
+#include <sys/socket.h>
 #include <syslog.h>
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <optional>
 
@@ -90,6 +94,31 @@ Server::Log logOf(const ServeOptions& options) {
     };
 }
 
+timespec timespecOf(std::chrono::microseconds time) {
+    const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
+    return {static_cast<time_t>(seconds.count()), static_cast<long>(std::chrono::nanoseconds(time - seconds).count())};
+}
+
+/** Whether the server takes a connection and, since that asks for nothing, closes it again. */
+bool isServing(const Server::Address& address, std::chrono::microseconds time) {
+    const int client = socket(address.get()->sa_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    if (client < 0) {
+        // Too many open files, for example: that says nothing against the server.
+        return true;
+    }
+    const timespec limit = timespecOf(time);
+    const timeval timeout{limit.tv_sec, limit.tv_nsec / 1000};
+    setsockopt(client, SOL_SOCKET, SO_SNDTIMEO, &timeout, sizeof timeout);
+    setsockopt(client, SOL_SOCKET, SO_RCVTIMEO, &timeout, sizeof timeout);
+    bool closed = false;
+    if (connect(client, address.get(), address.size()) == 0 && shutdown(client, SHUT_WR) == 0) {
+        char answer = 0;
+        closed = recv(client, &answer, sizeof answer, 0) >= 0 || errno == ECONNRESET;
+    }
+    close(client);
+    return closed;
+}
+
 /** The signals that end the program. Only one thread takes them. */
 class EndSignals {
 public:
@@ -103,11 +132,20 @@ public:
         std::signal(SIGPIPE, SIG_IGN);
     }
 
-    /** Returns when one has come. The next one ends the program at once. */
-    void wait() const {
-        int signal = 0;
-        sigwait(&_signals, &signal);
+    /**
+     * Waits for one.
+     *
+     * @param time without it, there is no end to that.
+     * @return true when one has come, after which the next one ends the program at once.
+     */
+    bool waitFor(std::optional<std::chrono::microseconds> time) const {
+        const timespec limit = timespecOf(time.value_or(std::chrono::microseconds{0}));
+        const int signal = time ? sigtimedwait(&_signals, nullptr, &limit) : sigwaitinfo(&_signals, nullptr);
+        if (signal < 0) {
+            return false;
+        }
         pthread_sigmask(SIG_UNBLOCK, &_signals, nullptr);
+        return true;
     }
 
 private:
@@ -133,6 +171,7 @@ void serve(Session& session) {
         }
     }
 
+    const ServiceManager manager;
     const EndSignals signals;
     CimXml::Service service(session.dispatcher(), session.catalogue());
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -142,10 +181,19 @@ void serve(Session& session) {
         return reply;
     };
     const Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);
-    session.out() << fmt::format("Listening on {}://{}\n", settings.tls ? "https" : "http",
-                                 Server::hostAndPort(settings.address, server.port()))
-                  << std::flush;
-    signals.wait();
+    const std::string listening = fmt::format("Listening on {}://{}\n", settings.tls ? "https" : "http",
+                                              Server::hostAndPort(settings.address, server.port()));
+    session.out() << listening << std::flush;
+    manager.tell("READY=1\nSTATUS=" + listening);
+
+    const Server::Address self(settings.address, server.port());
+    const auto interval = manager.watchdogInterval();
+    while (!signals.waitFor(interval)) {
+        if (interval && isServing(self, *interval / 2)) {
+            manager.tell("WATCHDOG=1");
+        }
+    }
+    manager.tell("STOPPING=1");
 }
 
 } // namespace ObjectManager::Orvcim

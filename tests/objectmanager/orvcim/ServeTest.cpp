@@ -4,8 +4,16 @@
 
 #include <gmock/gmock.h>
 
+#include <sys/socket.h>
+#include <sys/time.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <array>
 #include <cstdlib>
+#include <cstring>
 #include <ostream>
+#include <system_error>
 
 namespace OrvcimTest {
 namespace {
@@ -22,6 +30,19 @@ protected:
         return start(options)->wait();
     }
 
+    /** For the name localhost. @return the file that has it and its key. */
+    std::string makeCertificate() const {
+        const std::string file = (_folder / "server.pem").string();
+        const Outcome made =
+            runProcess({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-noenc",
+                        "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost", "-keyout",
+                        file + ".key", "-out", file + ".certificate"},
+                       {});
+        EXPECT_EQ(made.status, 0) << made.err;
+        std::ofstream(file) << std::ifstream(file + ".certificate").rdbuf() << std::ifstream(file + ".key").rdbuf();
+        return file;
+    }
+
     std::string ask(const std::string& options) const {
         return runProcess({"sh", "-c", "curl --silent --show-error --max-time 30 " + options}, {}).out;
     }
@@ -35,6 +56,69 @@ TEST_F(ServeTest, saysWhereItListensAndEndsOnASignal) {
         EXPECT_EQ(outcome.status, 0);
         EXPECT_THAT(outcome.out, MatchesRegex("Listening on http://127.0.0.1:[1-9][0-9]*\n"));
         EXPECT_EQ(outcome.err, "");
+    }
+}
+
+/** A service manager's end of the protocol of sd_notify(3). */
+class NotifySocket {
+public:
+    /** @param name a file, or a name outside of the file system behind an at sign. */
+    explicit NotifySocket(const std::string& name) : _socket(socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0)) {
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        std::memcpy(&address.sun_path, name.data(), name.size());
+        if (name.front() == '@') {
+            address.sun_path[0] = '\0';
+        }
+        const auto size = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + name.size());
+        const timeval patience{60, 0};
+        if (bind(_socket, reinterpret_cast<const sockaddr*>(&address), size) != 0 ||
+            setsockopt(_socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience) != 0) {
+            throw std::system_error(errno, std::generic_category(), name);
+        }
+    }
+    ~NotifySocket() { close(_socket); }
+    NotifySocket(const NotifySocket&) = delete;
+    NotifySocket& operator=(const NotifySocket&) = delete;
+
+    /** Waits for the next message. */
+    std::string next() const {
+        std::array<char, 1024> message{};
+        const ssize_t size = recv(_socket, message.data(), message.size(), 0);
+        return size < 0 ? "nothing within a minute" : std::string(message.data(), static_cast<std::size_t>(size));
+    }
+
+private:
+    const int _socket;
+};
+
+TEST_F(ServeTest, tellsTheServiceManagerWhenItListensAndWhenItEnds) {
+    for (const std::string& name : {(_folder / "notify").string(), "@orv-test-" + std::to_string(getpid())}) {
+        const NotifySocket manager(name);
+        const RunningProcess server({ORVCIM_PROGRAM, "serve", "--port=0"},
+                                    {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"NOTIFY_SOCKET", name}});
+        EXPECT_EQ(manager.next(), "READY=1\nSTATUS=" + server.firstLine() + "\n");
+        server.send(SIGTERM);
+        EXPECT_EQ(manager.next(), "STOPPING=1");
+    }
+}
+
+TEST_F(ServeTest, tellsTheServiceManagerAgainAndAgainThatItServes) {
+    const std::string certificate = makeCertificate();
+    for (const std::vector<std::string>& options :
+         {std::vector<std::string>{}, {"--listen=::1"}, {"--tls-cert=" + certificate, "--tls-key=" + certificate}}) {
+        const NotifySocket manager((_folder / "notify").string());
+        std::vector<std::string> arguments = {ORVCIM_PROGRAM, "serve", "--port=0"};
+        arguments.insert(arguments.end(), options.begin(), options.end());
+        RunningProcess server(arguments, {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
+                                          {"NOTIFY_SOCKET", (_folder / "notify").string()},
+                                          {"WATCHDOG_USEC", "400000"}});
+        EXPECT_THAT(manager.next(), StartsWith("READY=1\n"));
+        EXPECT_EQ(manager.next(), "WATCHDOG=1");
+        EXPECT_EQ(manager.next(), "WATCHDOG=1");
+        server.send(SIGTERM);
+        EXPECT_EQ(server.wait().err, "") << "it looks at itself in silence";
+        std::filesystem::remove(_folder / "notify");
     }
 }
 
@@ -199,18 +283,12 @@ TEST_F(ServeTest, letsOnlyAGroupReadWhereItIsToldTo) {
 }
 
 TEST_F(ServeTest, servesWithTls) {
-    const std::string base = (_folder / "server").string();
-    ASSERT_EQ(runProcess({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-noenc",
-                          "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost", "-keyout",
-                          base + ".key", "-out", base + ".pem"},
-                         {})
-                  .status,
-              0);
-    serve({"--tls-cert", base + ".pem", "--tls-key", base + ".key", "--authenticate", "--pam-folder", makeUsers(),
+    const std::string certificate = makeCertificate();
+    serve({"--tls-cert", certificate, "--tls-key", certificate, "--authenticate", "--pam-folder", makeUsers(),
            "--power-group=daemon", "--listen=0.0.0.0"});
     EXPECT_THAT(_server->firstLine(), StartsWith("Listening on https://0.0.0.0:"));
     const std::string system = url("root/cimv2:TALVO_ComputerSystem", "nobody:small", "https");
-    EXPECT_THAT(wbemcli({"ein", "-cacert", base + ".pem", system}).out, HasSubstr("machine.example"));
+    EXPECT_THAT(wbemcli({"ein", "-cacert", certificate, system}).out, HasSubstr("machine.example"));
     EXPECT_NE(wbemcli({"ein", system}).status, 0);
 }
 

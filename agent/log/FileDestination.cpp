@@ -21,8 +21,18 @@ namespace {
 /** An open file; negative where it could not be opened. */
 class Descriptor {
 public:
-    explicit Descriptor(const std::string& path)
-        : _number(open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOCTTY | O_NONBLOCK, 0640)) {}
+    explicit Descriptor(const std::string& path) : _number(open(path.c_str(), flags)) {
+        if (_number >= 0 || errno != ENOENT) {
+            return;
+        }
+        _number = open(path.c_str(), flags | O_CREAT | O_EXCL, mode);
+        if (_number >= 0) {
+            giveToOwnerOfFolder(path);
+        } else if (errno == EEXIST) {
+            // Somebody else has just made it, or the name is a link to a file that is missing.
+            _number = open(path.c_str(), flags | O_CREAT, mode);
+        }
+    }
     ~Descriptor() {
         if (_number >= 0) {
             close(_number);
@@ -34,6 +44,18 @@ public:
     int number() const { return _number; }
 
 private:
+    static constexpr int flags = O_WRONLY | O_APPEND | O_CLOEXEC | O_NOCTTY | O_NONBLOCK;
+    static constexpr mode_t mode = 0640;
+
+    // A service with a user of its own has the folder. It could not go on writing to a file that root made there.
+    void giveToOwnerOfFolder(const std::string& path) const {
+        struct stat folder {};
+        if (geteuid() == 0 && stat(path.substr(0, path.rfind('/') + 1).c_str(), &folder) == 0) {
+            // Where it stays root's, root's records are written all the same.
+            [[maybe_unused]] const int result = fchown(_number, folder.st_uid, folder.st_gid);
+        }
+    }
+
     int _number;
 };
 

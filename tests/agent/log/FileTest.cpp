@@ -57,6 +57,38 @@ std::vector<std::string> allTexts(const LogProcess& process) {
     return texts;
 }
 
+TEST(FileTest, AFileThatRootMakesBelongsToWhomTheFolderBelongs) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root can make files for others";
+    }
+    constexpr uid_t owner = 64998;
+    constexpr gid_t group = 64999;
+    const LogProcess process;
+    process.configureFile("rotate-size = 1");
+    ASSERT_EQ(chown(process.file().parent_path().c_str(), owner, group), 0);
+    process.run([] {
+        writeLog(6000, "in the first file");
+        writeLog(6000, "in the next one");
+    });
+    for (const std::string& name : process.folder.filesThatBegin("agent.log")) {
+        struct stat status {};
+        ASSERT_EQ(stat((process.folder / name).c_str(), &status), 0) << name;
+        EXPECT_EQ(status.st_uid, owner) << name;
+        EXPECT_EQ(status.st_gid, group) << name;
+        EXPECT_EQ(status.st_mode & 07777U, 0640U) << name;
+    }
+    EXPECT_EQ(process.folder.filesThatBegin("agent.log").size(), 2U);
+}
+
+TEST(FileTest, ALinkToAFileThatIsMissingLeadsToANewOne) {
+    const LogProcess process;
+    process.configureFile();
+    const fs::path target = process.folder / "elsewhere.log";
+    fs::create_symlink(target, process.file());
+    process.run([] { writeLog(6000, "over there"); });
+    EXPECT_THAT(textsOf(linesOfFile(target)), ElementsAre("over there"));
+}
+
 TEST(FileTest, ThreadsWriteWholeLinesIntoOneFile) {
     constexpr int threadCount = 8;
     constexpr int records = 500;

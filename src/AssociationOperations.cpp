@@ -22,15 +22,13 @@ Records recordsFor(PowerStates powerStates, PowerStateManagementObjFactory& fact
 
 void setEnds(const AssociationProvider& provider, const CMPIInstance* association, const CMPIObjectPath* first,
              const CMPIObjectPath* second) {
-    CMSetProperty(association, provider.first.role, &first, CMPI_ref);
-    CMSetProperty(association, provider.second.role, &second, CMPI_ref);
+    setProperty(association, provider.first.role, first);
+    setProperty(association, provider.second.role, second);
 }
 
 void setPowerStates(const CMPIInstance* association, PowerStateManagement& record) {
-    const CMPIUint16 powerState = record.getPowerState();
-    const CMPIUint16 requestedPowerState = record.getRequestedPowerState();
-    CMSetProperty(association, "PowerState", &powerState, CMPI_uint16);
-    CMSetProperty(association, "RequestedPowerState", &requestedPowerState, CMPI_uint16);
+    setProperty(association, "PowerState", record.getPowerState());
+    setProperty(association, "RequestedPowerState", record.getRequestedPowerState());
 }
 
 /** Whether two names of classes are the same: letter case is ignored, whatever the process's locale. */
@@ -88,7 +86,7 @@ public:
     /** Finds the far end of a traversal; false where source and association do not belong together. */
     bool resolve(const char* assocClass, const char* resultClass) {
         _target = factory.get_assoc_targetClass_ObjectPath(_broker, _ref, assocClass, resultClass, &operation.status);
-        return !CMIsNullObject(_target);
+        return !isNull(_target);
     }
 
     /** Finds the far end of a reference. The association is always this provider's own, whatever is asked for. */
@@ -110,7 +108,7 @@ public:
     /** Visits the path of each object at the far end; false, with `notAvailable` reported, where they can't be had. */
     template <typename Visit>
     bool forEachFarPath(const AssociationEnd& end, const char* notAvailable, Visit visit) {
-        return forEachPath(end, _target, notAvailable, [&](const CMPIObjectPath* path) {
+        return forEachPath(end, _target, notAvailable, [&](CMPIObjectPath* path) {
             visit(path);
             return true;
         });
@@ -125,7 +123,8 @@ public:
             return true;
         };
         if (end.source == ObjectSource::objectManager) {
-            const CMPIEnumeration* const all = CBEnumInstances(_broker, _context, _target, nullptr, &operation.status);
+            const CMPIEnumeration* const all =
+                _broker->bft->enumerateInstances(_broker, _context, _target, nullptr, &operation.status);
             return forEachEnumerated(
                 all, notAvailable, [](const CMPIData& data) { return data.value.inst; }, visitOne);
         }
@@ -143,7 +142,7 @@ public:
     /** An association of the far end's class without properties; null where the broker cannot make it. */
     const CMPIInstance* newReference() {
         const CMPIInstance* const reference = CMNewInstance(_broker, _referencePath, &operation.status);
-        return CMIsNullObject(reference) ? nullptr : reference;
+        return isNull(reference) ? nullptr : reference;
     }
 
     /** Makes an association refer to the source and to an object at the far end. */
@@ -153,14 +152,14 @@ public:
     }
 
     /** Puts a path into the namespace of the request and on the managed system. */
-    void place(const CMPIObjectPath* path) {
+    void place(CMPIObjectPath* path) {
         CMSetNameSpace(path, nameSpace());
         CMSetHostname(path, getSystemName().c_str());
     }
 
 private:
     bool isUsable(const CMPIObjectPath* path, const char* failure) const {
-        const bool usable = !CMIsNullObject(path);
+        const bool usable = !isNull(path);
         if (!usable) {
             operation.report(failure);
         }
@@ -219,12 +218,12 @@ private:
             operation.report(notAvailable);
             return false;
         }
-        if (CMIsNullObject(enumeration)) {
+        if (isNull(enumeration)) {
             return true;
         }
         while (CMHasNext(enumeration, &operation.status)) {
             auto* const object = get(CMGetNext(enumeration, &operation.status));
-            if (!CMIsNullObject(object) && !visit(object)) {
+            if (!isNull(object) && !visit(object)) {
                 return false;
             }
         }
@@ -280,7 +279,7 @@ unsigned short buildAssociations(const AssociationProvider& provider, const CMPI
                 return false;
             }
             CMPIInstance* const instance = CMNewInstance(broker, path, nullptr);
-            if (!CMIsNullObject(instance)) {
+            if (!isNull(instance)) {
                 CMSetPropertyFilter(instance, properties, provider.filterKeys);
                 setEnds(provider, instance, first, second);
                 if (!records.empty()) {
@@ -302,19 +301,20 @@ CMPIStatus enumAssociationNames(const AssociationProvider& provider, const CMPIB
                                 const Site& site) {
     AssociationRequest request(provider, broker, context, ref, site);
     Operation& operation = request.operation;
-    const bool complete = request.forEachPair(provider.names, [&](CMPIObjectPath* first, CMPIObjectPath* second) {
-        const CMPIObjectPath* const path = request.newAssociationPath(provider.names);
-        if (path == nullptr) {
-            if (provider.onNamesPathFailed != nullptr) {
-                provider.onNamesPathFailed(broker, &operation.status);
+    const bool complete =
+        request.forEachPair(provider.names, [&](const CMPIObjectPath* first, const CMPIObjectPath* second) {
+            CMPIObjectPath* const path = request.newAssociationPath(provider.names);
+            if (path == nullptr) {
+                if (provider.onNamesPathFailed != nullptr) {
+                    provider.onNamesPathFailed(broker, &operation.status);
+                }
+                return false;
             }
-            return false;
-        }
-        CMAddKey(path, provider.first.role, &first, CMPI_ref);
-        CMAddKey(path, provider.second.role, &second, CMPI_ref);
-        CMReturnObjectPath(result, path);
-        return true;
-    });
+            addKey(path, provider.first.role, first);
+            addKey(path, provider.second.role, second);
+            CMReturnObjectPath(result, path);
+            return true;
+        });
     if (!complete) {
         return operation.status;
     }
@@ -360,7 +360,7 @@ CMPIStatus associatorNames(const AssociationProvider& provider, const CMPIBroker
         return request.operation.fail(provider.targetNull.associatorNames);
     }
     if (const AssociationEnd* const end = request.farEnd()) {
-        const auto deliver = [&](const CMPIObjectPath* path) {
+        const auto deliver = [&](CMPIObjectPath* path) {
             if (end->placedByAssociatorNames) {
                 request.place(path);
             }
@@ -401,7 +401,7 @@ CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker*
         return request.operation.fail(provider.targetNull.referenceNames);
     }
     if (const AssociationEnd* const end = request.farEnd()) {
-        const auto deliver = [&](const CMPIObjectPath* far) {
+        const auto deliver = [&](CMPIObjectPath* far) {
             const CMPIInstance* const reference = request.newReference();
             if (reference == nullptr) {
                 return;
@@ -410,8 +410,8 @@ CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker*
                 request.place(far);
             }
             request.setReferenceEnds(reference, *end, far);
-            const CMPIObjectPath* const path = CMGetObjectPath(reference, &status);
-            if (!CMIsNullObject(path)) {
+            CMPIObjectPath* const path = CMGetObjectPath(reference, &status);
+            if (!isNull(path)) {
                 CMSetNameSpace(path, request.nameSpace());
                 CMReturnObjectPath(result, path);
             }
@@ -461,8 +461,8 @@ CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* bro
             }
         };
         const auto deliverPathOf = [&](const CMPIInstance* instance) {
-            const CMPIObjectPath* const far = CMIsNullObject(instance) ? nullptr : CMGetObjectPath(instance, &status);
-            if (!CMIsNullObject(far)) {
+            CMPIObjectPath* const far = isNull(instance) ? nullptr : CMGetObjectPath(instance, &status);
+            if (!isNull(far)) {
                 request.place(far);
                 deliver(far);
             }

@@ -7,12 +7,58 @@ namespace Norv::PowerStateManagementServiceProvider {
 CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, const char* className,
                              CMPIStatus* status) {
     CMPIObjectPath* const path = CMNewObjectPath(broker, nameSpace, className, status);
-    if (CMIsNullObject(path)) {
+    if (isNull(path)) {
         return nullptr;
     }
     CMSetNameSpace(path, nameSpace);
     CMSetHostname(path, getSystemName().c_str());
     return path;
+}
+
+namespace {
+
+/** For CMPI_chars, the text begins where the value would. */
+const CMPIValue* textValue(const char* text) {
+    return reinterpret_cast<const CMPIValue*>(text);
+}
+
+/** The broker copies what a reference refers to. */
+CMPIValue referenceValue(const CMPIObjectPath* path) {
+    CMPIValue value = {};
+    value.ref = const_cast<CMPIObjectPath*>(path);
+    return value;
+}
+
+} // namespace
+
+void addKey(CMPIObjectPath* path, const char* name, const char* text) {
+    CMAddKey(path, name, textValue(text), CMPI_chars);
+}
+
+void addKey(CMPIObjectPath* path, const char* name, const CMPIObjectPath* reference) {
+    const CMPIValue value = referenceValue(reference);
+    CMAddKey(path, name, &value, CMPI_ref);
+}
+
+void setProperty(const CMPIInstance* instance, const char* name, const char* text) {
+    CMSetProperty(instance, name, textValue(text), CMPI_chars);
+}
+
+void setProperty(const CMPIInstance* instance, const char* name, CMPIUint16 number) {
+    CMPIValue value = {};
+    value.uint16 = number;
+    CMSetProperty(instance, name, &value, CMPI_uint16);
+}
+
+void setProperty(const CMPIInstance* instance, const char* name, const CMPIObjectPath* reference) {
+    const CMPIValue value = referenceValue(reference);
+    CMSetProperty(instance, name, &value, CMPI_ref);
+}
+
+void setProperty(const CMPIInstance* instance, const char* name, CMPIArray* array) {
+    CMPIValue value = {};
+    value.array = array;
+    CMSetProperty(instance, name, &value, CMPI_uint16A);
 }
 
 void returnAll(const CMPIResult* result, const std::vector<CMPIObjectPath*>& paths) {
@@ -33,7 +79,7 @@ void returnAll(const CMPIResult* result, const std::vector<CMPIInstance*>& insta
 void returnFirstMatch(const CMPIResult* result, const std::vector<CMPIInstance*>& instances,
                       const CMPIObjectPath* objectPath, bool flag, CMPIStatus* status) {
     forEach(instances, [&](const CMPIInstance* instance) {
-        if (CMIsNullObject(instance)) {
+        if (isNull(instance)) {
             return true;
         }
         const CMPIObjectPath* const path = CMGetObjectPath(instance, status);

@@ -1,5 +1,9 @@
 /**
  * What several operations do with the broker's objects.
+ *
+ * The headers of other object managers take the same objects as these, but not const: a path or instance that is
+ * changed is handed over as what the broker made. A value is handed over as a whole CMPIValue, since some brokers copy
+ * all of it, and a text as such.
  */
 #ifndef BROKEROBJECTS_H
 #define BROKEROBJECTS_H
@@ -13,9 +17,15 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
+/** Whether there is no object or one that holds nothing; CMIsNullObject of some headers looks at the pointer only. */
+template <typename Object>
+bool isNull(const Object* object) {
+    return object == nullptr || object->hdl == nullptr;
+}
+
 /** The text of a string that the broker gave; null where it gave none. */
 inline const char* textOf(const CMPIString* string) {
-    return CMIsNullObject(string) ? nullptr : CMGetCharPtr(string);
+    return isNull(string) ? nullptr : CMGetCharPtr(string);
 }
 
 /** Whether a text, which may be null, is this one to the letter. */
@@ -51,6 +61,16 @@ inline bool isObjectType(CMPIType type) {
  */
 CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, const char* className,
                              CMPIStatus* status);
+
+void addKey(CMPIObjectPath* path, const char* name, const char* text);
+void addKey(CMPIObjectPath* path, const char* name, const CMPIObjectPath* reference);
+
+void setProperty(const CMPIInstance* instance, const char* name, const char* text);
+void setProperty(const CMPIInstance* instance, const char* name, CMPIUint16 number);
+void setProperty(const CMPIInstance* instance, const char* name, const CMPIObjectPath* reference);
+
+/** Sets an array of CMPI_uint16. */
+void setProperty(const CMPIInstance* instance, const char* name, CMPIArray* array);
 
 /** Visits the objects in order until a visit returns false; whether none did. Objects are counted in 16 bits. */
 template <typename Object, typename Visit>

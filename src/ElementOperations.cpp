@@ -43,7 +43,7 @@ CMPIStatus getInstance(const ElementProvider& provider, const CMPIBroker* broker
     PowerStateManagementObjFactory factory(provider.key);
     std::vector<CMPIInstance*> instances;
     instances.reserve(factory.getNumberOfInstances());
-    if (!CMIsNullObject(key)) {
+    if (!isNull(key)) {
         if ((factory.*provider.oneInstance)(broker, objectPath, key, properties, instances, &operation.status) != 0) {
             return operation.fail(provider.lookupFailed);
         }

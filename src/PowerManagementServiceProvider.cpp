@@ -57,7 +57,7 @@ static bool isTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status
         return false;
     }
     const CMPIData time = CMGetArg(in, name, status);
-    return isObjectType(time.type) ? !CMIsNullObject(time.value.dateTime) : time.value.dateTime != nullptr;
+    return isObjectType(time.type) ? !isNull(time.value.dateTime) : time.value.dateTime != nullptr;
 }
 
 /** Writes the change to the machine's power-management node. A failure is in the log only. */
@@ -102,7 +102,7 @@ static Outcome requestPowerStateChange(const CMPIArgs* in, CMPIStatus* status, c
     }
     const CMPIData element = CMGetArg(in, "ManagedElement", status);
     CMPIObjectPath* const managedElement = isObjectType(element.type) ? element.value.ref : nullptr;
-    if (!CMIsNullObject(managedElement)) {
+    if (!isNull(managedElement)) {
         Instrumentation instrumentation;
         changePowerState(instrumentation, *change, operation);
         CMRelease(managedElement);
@@ -125,7 +125,8 @@ static CMPIStatus PowerManagementService_InvokeMethod(CMPIMethodMI*, const CMPIC
     }
 
     // Whatever was found on the way, the method reports that it completed.
-    const CMPIUint32 value = 0;
+    CMPIValue value = {};
+    value.uint32 = 0;
     operation.markExit();
     CMReturnData(result, &value, CMPI_uint32);
     CMReturnDone(result);

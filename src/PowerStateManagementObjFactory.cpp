@@ -72,8 +72,7 @@ Factory::Result appendObjectPaths(const Records& records, const CMPIBroker* brok
             logFailure(Class::pathCreationFailed, site);
             return Factory::pathCreationFailed;
         }
-        Class::setKeys(record,
-                       [path](const char* name, const char* value) { CMAddKey(path, name, value, CMPI_chars); });
+        Class::setKeys(record, [path](const char* name, const char* value) { addKey(path, name, value); });
         objectPaths.push_back(path);
     }
     return Factory::done;
@@ -112,19 +111,14 @@ CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath* ref, P
         return nullptr;
     }
     CMPIInstance* const instance = CMNewInstance(broker, path, nullptr);
-    if (CMIsNullObject(instance)) {
+    if (isNull(instance)) {
         return instance;
     }
     if (!isObjPath) {
         CMSetPropertyFilter(instance, properties, Class::keys);
     }
-    Class::setKeys(
-        record, [instance](const char* name, const char* value) { CMSetProperty(instance, name, value, CMPI_chars); });
+    Class::setKeys(record, [instance](const char* name, const char* value) { setProperty(instance, name, value); });
     return instance;
-}
-
-void setText(const CMPIInstance* instance, const char* property, const std::string& text) {
-    CMSetProperty(instance, property, text.c_str(), CMPI_chars);
 }
 
 /** The text behind a resource id in the language of the environment, in UTF-8. */
@@ -144,9 +138,11 @@ void setCodes(const CMPIBroker* broker, const CMPIInstance* instance, const char
         return;
     }
     for (unsigned short i = 0; i < count; ++i) {
-        CMSetArrayElementAt(array, i, &codes.at(i), CMPI_uint16);
+        CMPIValue code = {};
+        code.uint16 = codes.at(i);
+        CMSetArrayElementAt(array, i, &code, CMPI_uint16);
     }
-    CMSetProperty(instance, property, &array, CMPI_uint16A);
+    setProperty(instance, property, array);
 }
 
 /** The record under a key; where there is none, that is logged and the result is null. */
@@ -319,16 +315,16 @@ CMPIInstance* PowerStateManagementObjFactory::makePMInstance(const CMPIBroker* b
                          " isObjPath=", isObjPath, " rc=", rc);
     call.entering();
     CMPIInstance* const instance = newInstance<Service>(broker, ref, pm, properties, isObjPath, rc);
-    if (!CMIsNullObject(instance)) {
+    if (!isNull(instance)) {
         const RequestedProperties requested(properties, isObjPath);
         if (requested.contains("Caption")) {
-            setText(instance, "Caption", localizedText(L"MSGID_POWER_MANAGEMENT_CAPTION"));
+            setProperty(instance, "Caption", localizedText(L"MSGID_POWER_MANAGEMENT_CAPTION").c_str());
         }
         if (requested.contains("Description")) {
-            setText(instance, "Description", localizedText(L"MSGID_POWER_MANAGEMENT_DESCRIPTION"));
+            setProperty(instance, "Description", localizedText(L"MSGID_POWER_MANAGEMENT_DESCRIPTION").c_str());
         }
         if (requested.contains("ElementName")) {
-            setText(instance, "ElementName", pm.getElementName());
+            setProperty(instance, "ElementName", pm.getElementName().c_str());
         }
     }
     call.exiting();
@@ -342,7 +338,7 @@ CMPIInstance* PowerStateManagementObjFactory::makePMCapInstance(const CMPIBroker
                          " properties=", properties, " isObjPath=", isObjPath, " rc=", rc);
     call.entering();
     CMPIInstance* const instance = newInstance<Capabilities>(broker, ref, pm, properties, isObjPath, rc);
-    if (!CMIsNullObject(instance)) {
+    if (!isNull(instance)) {
         const RequestedProperties requested(properties, isObjPath);
         if (requested.contains("PowerChangeCapabilities")) {
             setCodes(broker, instance, "PowerChangeCapabilities", pm.getPowerChangeCapabilities(),
@@ -351,7 +347,7 @@ CMPIInstance* PowerStateManagementObjFactory::makePMCapInstance(const CMPIBroker
                      rc, Site::here());
         }
         if (requested.contains("ElementName")) {
-            setText(instance, "ElementName", pm.getCapabilitiesElementName());
+            setProperty(instance, "ElementName", pm.getCapabilitiesElementName().c_str());
         }
         if (requested.contains("PowerStatesSupported")) {
             setCodes(broker, instance, "PowerStatesSupported", pm.getPowerStatesSupported(),

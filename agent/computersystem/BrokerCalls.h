@@ -24,6 +24,12 @@ private:
     CMPIrc _code;
 };
 
+/** Whether there is no object or one that holds nothing; CMIsNullObject of some headers looks at the pointer only. */
+template <typename Object>
+bool isNull(const Object* object) {
+    return object == nullptr || object->hdl == nullptr;
+}
+
 /**
  * @param call what was called, for the message.
  * @throws OperationError where the call reported a failure, with its code.
@@ -32,7 +38,7 @@ inline void require(const std::string& call, const CMPIStatus& status) {
     if (status.rc == CMPI_RC_OK) {
         return;
     }
-    const char* const reason = CMIsNullObject(status.msg) ? nullptr : CMGetCharPtr(status.msg);
+    const char* const reason = isNull(status.msg) ? nullptr : CMGetCharPtr(status.msg);
     throw OperationError(status.rc, call + " failed with code " + std::to_string(status.rc) +
                                         (reason == nullptr ? "" : std::string(": ") + reason));
 }
@@ -49,7 +55,7 @@ auto requireObject(const std::string& call, Make make) {
     CMPIStatus status = {CMPI_RC_OK, nullptr};
     auto* const object = make(&status);
     require(call, status);
-    if (CMIsNullObject(object)) {
+    if (isNull(object)) {
         throw OperationError(CMPI_RC_ERR_FAILED, call + " gave no object and reported no failure");
     }
     return object;

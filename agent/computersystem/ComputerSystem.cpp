@@ -17,39 +17,63 @@ const char* nameFormatOf(const std::string& name) {
     return name.find_first_not_of(hostNameCharacters) == std::string::npos ? "IP" : "Other";
 }
 
-void setProperty(const CMPIInstance* instance, const char* property, const void* value, CMPIType type) {
+/* A value is handed over as a whole CMPIValue, since some brokers copy all of it, and a text as such. */
+
+/** For CMPI_chars, the text begins where the value would. */
+const CMPIValue* textValue(const char* text) {
+    return reinterpret_cast<const CMPIValue*>(text);
+}
+
+CMPIValue numberValue(CMPIUint16 number) {
+    CMPIValue value = {};
+    value.uint16 = number;
+    return value;
+}
+
+void setProperty(const CMPIInstance* instance, const char* property, const CMPIValue* value, CMPIType type) {
     require(std::string("setProperty(") + property + ')', CMSetProperty(instance, property, value, type));
 }
 
 void setText(const CMPIInstance* instance, const char* property, const std::string& text) {
-    setProperty(instance, property, text.c_str(), CMPI_chars);
+    setProperty(instance, property, textValue(text.c_str()), CMPI_chars);
+}
+
+void setNumber(const CMPIInstance* instance, const char* property, CMPIUint16 number) {
+    const CMPIValue value = numberValue(number);
+    setProperty(instance, property, &value, CMPI_uint16);
 }
 
 /**
- * Sets an array.
+ * Sets an array of elements of a type.
  *
- * @param elementType the type of the array's elements.
- * @param valueType the type in which `valueOf(index)`, a pointer, hands them over.
+ * @param valueOf gives the element at an index, of exactly that type: object managers do not convert elements.
  */
 template <typename ValueOf>
 void setArray(const CMPIBroker* broker, const CMPIInstance* instance, const char* property, std::size_t size,
-              CMPIType elementType, CMPIType valueType, ValueOf valueOf) {
+              CMPIType type, ValueOf valueOf) {
     const auto count = static_cast<CMPICount>(size);
-    CMPIArray* const array = requireObject(std::string("newArray for ") + property, [&](CMPIStatus* status) {
-        return CMNewArray(broker, count, elementType, status);
-    });
+    CMPIArray* const array = requireObject(std::string("newArray for ") + property,
+                                           [&](CMPIStatus* status) { return CMNewArray(broker, count, type, status); });
     for (CMPICount i = 0; i < count; ++i) {
+        const CMPIValue element = valueOf(i);
         require(std::string("setElementAt(") + std::to_string(i) + ") for " + property,
-                CMSetArrayElementAt(array, i, valueOf(i), valueType));
+                CMSetArrayElementAt(array, i, &element, type));
     }
-    setProperty(instance, property, &array, static_cast<CMPIType>(elementType | CMPI_ARRAY));
+    CMPIValue value = {};
+    value.array = array;
+    setProperty(instance, property, &value, static_cast<CMPIType>(type | CMPI_ARRAY));
 }
 
 /** Sets one text of each fact. */
 void setTexts(const CMPIBroker* broker, const CMPIInstance* instance, const char* property,
               const std::vector<IdentifyingFact>& facts, std::string IdentifyingFact::*text) {
-    setArray(broker, instance, property, facts.size(), CMPI_string, CMPI_chars,
-             [&](CMPICount i) { return (facts[i].*text).c_str(); });
+    setArray(broker, instance, property, facts.size(), CMPI_string, [&](CMPICount i) {
+        CMPIValue value = {};
+        value.string = requireObject(std::string("newString for ") + property, [&](CMPIStatus* status) {
+            return CMNewString(broker, (facts[i].*text).c_str(), status);
+        });
+        return value;
+    });
 }
 
 } // namespace
@@ -63,8 +87,8 @@ CMPIObjectPath* newSystemPath(const CMPIBroker* broker, const CMPIObjectPath* re
         });
     require("setHostname(" + name + ')', CMSetHostname(path, name.c_str()));
     require(std::string("addKey(") + creationClassNameKey + ')',
-            CMAddKey(path, creationClassNameKey, computerSystemClass, CMPI_chars));
-    require(std::string("addKey(") + nameKey + ')', CMAddKey(path, nameKey, name.c_str(), CMPI_chars));
+            CMAddKey(path, creationClassNameKey, textValue(computerSystemClass), CMPI_chars));
+    require(std::string("addKey(") + nameKey + ')', CMAddKey(path, nameKey, textValue(name.c_str()), CMPI_chars));
     return path;
 }
 
@@ -81,10 +105,10 @@ CMPIInstance* newSystemInstance(const CMPIBroker* broker, const CMPIObjectPath* 
     setText(instance, nameKey, name);
     setText(instance, "ElementName", name);
     setText(instance, "NameFormat", nameFormatOf(name));
-    setProperty(instance, "EnabledState", &enabledStateEnabled, CMPI_uint16);
-    setProperty(instance, "RequestedState", &requestedStateNotApplicable, CMPI_uint16);
-    setArray(broker, instance, "Dedicated", 1, CMPI_uint16, CMPI_uint16,
-             [](CMPICount) { return &dedicatedNotDedicated; });
+    setNumber(instance, "EnabledState", enabledStateEnabled);
+    setNumber(instance, "RequestedState", requestedStateNotApplicable);
+    setArray(broker, instance, "Dedicated", 1, CMPI_uint16,
+             [](CMPICount) { return numberValue(dedicatedNotDedicated); });
     if (!facts.empty()) {
         setTexts(broker, instance, "OtherIdentifyingInfo", facts, &IdentifyingFact::value);
         setTexts(broker, instance, "IdentifyingDescriptions", facts, &IdentifyingFact::description);

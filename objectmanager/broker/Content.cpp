@@ -198,7 +198,7 @@ NamedItemsContent copy(Memory& memory, const NamedItemsContent& items) {
 }
 
 ArrayContent copy(Memory& memory, const ArrayContent& array) {
-    return {array.elementType, array.count, copyElements(memory, array.elements, array.count)};
+    return {array.elementType, array.count, copyElements(memory, array.elements, array.count), array.takesChars};
 }
 
 EnumerationContent copy(Memory& memory, const EnumerationContent& enumeration) {

@@ -128,6 +128,8 @@ struct ArrayContent {
     CMPIType elementType = CMPI_null;
     std::uint32_t count = 0;
     Item* elements = nullptr;
+    /** Whether it was made for CMPI_chars: its elements, which are strings then, have to be handed over as such. */
+    bool takesChars = false;
 };
 
 struct EnumerationContent {

@@ -77,7 +77,7 @@ CMPIArray* newArray(const CMPIBroker* broker, CMPICount size, CMPIType type, CMP
     }
     Item* elements = newElements(request->memory(), size);
     std::for_each(elements, elements + size, [&](Item& element) { element.type = elementType; });
-    return newObjectOf<CMPIArray>(*request, {elementType, size, elements});
+    return newObjectOf<CMPIArray>(*request, {elementType, size, elements, type == CMPI_chars});
 }
 
 CMPIDateTime* newDateTimeOf(const CMPIBroker* broker, const std::optional<std::string>& text, CMPIStatus* rc) {

@@ -84,6 +84,8 @@ struct Arguments {
 
 struct Array {
     CMPIArray object;
+    const CMPIBroker* broker;
+    CMPIType type;
     struct Values elements;
 };
 
@@ -148,24 +150,14 @@ static CMPIString* newString(const CMPIBroker* broker, const char* text, CMPISta
     return string;
 }
 
-static size_t sizeOf(CMPIType type) {
-    switch (type) {
-    case CMPI_uint16:
-        return sizeof(CMPIUint16);
-    case CMPI_uint32:
-        return sizeof(CMPIUint32);
-    default:
-        return sizeof(void*);
-    }
-}
-
+/* Copies all of a value, as some object managers do: what is handed over has to be as large as that. */
 static CMPIData dataOf(const CMPIBroker* broker, const CMPIValue* value, CMPIType type) {
     CMPIData data = {type, CMPI_goodValue, {0}};
     if (type == CMPI_chars) {
         data.type = CMPI_string;
         data.value.string = newString(broker, (const char*)value, NULL);
     } else {
-        memcpy(&data.value, value, sizeOf(type));
+        data.value = *value;
     }
     return data;
 }
@@ -344,9 +336,10 @@ static CMPIObjectPath* getObjectPath(const CMPIInstance* object, CMPIStatus* sta
 }
 
 static CMPIArray* newArray(const CMPIBroker* broker, CMPICount size, CMPIType type, CMPIStatus* status) {
-    (void)type;
     struct Array* array = make(sizeof *array);
     array->object.hdl = array;
+    array->broker = broker;
+    array->type = type;
     array->object.ft = &tablesOf(broker)->array.known;
     if (size > maxEntries) {
         abort();
@@ -358,10 +351,10 @@ static CMPIArray* newArray(const CMPIBroker* broker, CMPICount size, CMPIType ty
 
 static CMPIStatus setElementAt(const CMPIArray* object, CMPICount index, const CMPIValue* value, CMPIType type) {
     struct Array* array = (struct Array*)object->hdl;
-    if (index >= array->elements.count || type != CMPI_uint16) {
+    if (index >= array->elements.count || type != array->type) {
         abort();
     }
-    array->elements.entries[index].data = dataOf(NULL, value, type);
+    array->elements.entries[index].data = dataOf(array->broker, value, type);
     return fine;
 }
 

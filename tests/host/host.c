@@ -199,8 +199,8 @@ static char* everything(const struct Providers* providers, const CMPIBroker* bro
 
     beginRequest();
     CMPIArgs* arguments = newArguments(broker);
-    CMPIObjectPath* element = classPath(broker, "ComputerSystem");
-    const CMPIUint16 reboot = 5;
+    const CMPIValue element = {.ref = classPath(broker, "ComputerSystem")};
+    const CMPIValue reboot = {.uint16 = 5};
     CMAddArg(arguments, "PowerState", &reboot, CMPI_uint16);
     CMAddArg(arguments, "ManagedElement", &element, CMPI_ref);
     CMPIResult* result = newResult(broker);

@@ -167,7 +167,7 @@ TEST_P(AssociationEntryPoints, EachOperationStandsInItsSlot) {
     };
     mi->ft->associators(mi, context, result, ref, "", nullptr, nullptr, nullptr, nullptr);
     EXPECT_TRUE(entered("Associators"));
-    mi->ft->associatorNames(mi, context, result, ref, "", nullptr, nullptr, nullptr);
+    mi->ft->associatorNames(mi, context, result, ref, nullptr, nullptr, nullptr, nullptr);
     EXPECT_TRUE(entered("AssociatorNames"));
     mi->ft->references(mi, context, result, ref, nullptr, nullptr, nullptr);
     EXPECT_TRUE(entered("References"));
@@ -194,7 +194,7 @@ TEST_P(AssociationEntryPoints, ShareTheirFilesBroker) {
     RecordingBroker other("other");
     library.instanceMI(provider, other);
     haveNodes({"a"});
-    expectOk(mi->ft->associatorNames(mi, context, result, ref, "", nullptr, nullptr, nullptr));
+    expectOk(mi->ft->associatorNames(mi, context, result, ref, nullptr, nullptr, nullptr, nullptr));
     EXPECT_THAT(transcript.calls(), testing::Contains(testing::StartsWith("other.newObjectPath(")));
     CMPIInstanceMI* instances = library.instanceMI(provider, broker);
     library.associationMI(provider, other);
@@ -212,7 +212,7 @@ TEST_P(AssociationEntryPoints, OtherProvidersDoNotChangeTheBroker) {
         }
     }
     haveNodes({"a"});
-    expectOk(mi->ft->associatorNames(mi, context, result, ref, "", nullptr, nullptr, nullptr));
+    expectOk(mi->ft->associatorNames(mi, context, result, ref, nullptr, nullptr, nullptr, nullptr));
     EXPECT_THAT(transcript.calls(), testing::Not(testing::Contains(testing::StartsWith("other."))));
 }
 

@@ -162,31 +162,7 @@ std::string shownType(CMPIType type) {
     return found == typeNames.end() ? "type " + std::to_string(type) : found->second;
 }
 
-/** Bytes of a value of this type; values come by address, often of a variable smaller than CMPIValue. */
-std::size_t sizeOf(CMPIType type) {
-    switch (type) {
-    case CMPI_boolean:
-    case CMPI_uint8:
-    case CMPI_sint8:
-        return sizeof(CMPIUint8);
-    case CMPI_char16:
-    case CMPI_uint16:
-    case CMPI_sint16:
-        return sizeof(CMPIUint16);
-    case CMPI_real32:
-    case CMPI_uint32:
-    case CMPI_sint32:
-        return sizeof(CMPIUint32);
-    case CMPI_real64:
-    case CMPI_uint64:
-    case CMPI_sint64:
-        return sizeof(CMPIUint64);
-    default:
-        return sizeof(void*);
-    }
-}
-
-/** The value as it comes, without taking texts over. */
+/** The value as it comes, without taking texts over. All of it is copied, as some object managers do. */
 CMPIData plainData(const CMPIValue* value, CMPIType type) {
     CMPIData data = nullValue(type);
     if (value != nullptr && type != CMPI_null) {
@@ -194,7 +170,7 @@ CMPIData plainData(const CMPIValue* value, CMPIType type) {
         if (type == CMPI_chars) {
             data.value.chars = reinterpret_cast<char*>(const_cast<CMPIValue*>(value));
         } else {
-            std::memcpy(&data.value, static_cast<const void*>(value), sizeOf(type));
+            data.value = *value;
         }
     }
     return data;
@@ -259,9 +235,9 @@ public:
     const Fault& fault() const { return _fault; }
 
     /** Ends a call that returns its status. */
-    CMPIStatus done() {
+    CMPIStatus done(CMPIrc usual = CMPI_RC_OK) {
         write(_line);
-        return {_fault.status.value_or(CMPI_RC_OK), _fault.message};
+        return {_fault.status.value_or(usual), _fault.message};
     }
 
     /** Ends a call that returns something else. */
@@ -594,6 +570,10 @@ CMPIStatus setProperty(const CMPIInstance* object, const char* name, const CMPIV
     Instance& instance = self(object);
     const CMPIData data = plainData(value, type);
     Call call = callOn(instance, "setProperty", std::string(name) + ", " + shownType(type) + ", " + shown(data));
+    if (data.state == CMPI_goodValue && (type & CMPI_ARRAY) != 0 &&
+        self(data.value.array).type != (type & ~CMPI_ARRAY)) {
+        return call.done(CMPI_RC_ERR_TYPE_MISMATCH);
+    }
     const bool isKey = contains(instance.keys, name);
     if (!instance.filtered || isKey || contains(instance.wanted, name)) {
         put(instance.properties, name, instance.broker->objects().stored(instance.name, name, data));
@@ -704,9 +684,13 @@ CMPIStatus setElementAt(const CMPIArray* object, CMPICount index, const CMPIValu
     Array& array = self(object);
     const CMPIData data = plainData(value, type);
     Call call = callOn(array, "setElementAt", shown(index) + ", " + shownType(type) + ", " + shown(data));
-    if (index < array.elements.size()) {
-        array.elements[index] = array.broker->objects().stored(array.name, "element", data);
+    if (type != array.type && type != CMPI_null) {
+        return call.done(CMPI_RC_ERR_TYPE_MISMATCH);
     }
+    if (index >= array.elements.size()) {
+        return call.done(CMPI_RC_ERR_NO_SUCH_PROPERTY);
+    }
+    array.elements[index] = array.broker->objects().stored(array.name, "element", data);
     return call.done();
 }
 
@@ -895,7 +879,10 @@ CMPIEnumeration* enumerate(Call& call, const CMPIBroker* broker, const CMPIObjec
         const auto found = script.find(self(path).className->text);
         if (found != script.end()) {
             for (Object* object : found->second) {
-                elements.push_back(plainData(reinterpret_cast<const CMPIValue*>(&object), type));
+                CMPIData element = nullValue(type);
+                element.state = CMPI_goodValue;
+                element.value.dataPtr.ptr = object;
+                elements.push_back(element);
             }
         }
         return self(broker).objects().newEnumeration(std::move(elements));

@@ -182,6 +182,22 @@ TEST_F(RecordingBrokerTest, AFilterKeepsWhatIsWantedAndTheKeys) {
     EXPECT_STREQ(CMGetCharPtr(CMGetKey(CMGetObjectPath(instance, nullptr), "Name", nullptr).value.string), "text");
 }
 
+TEST_F(RecordingBrokerTest, ArraysTakeElementsOfTheirOwnTypeAndPropertiesArraysOfTheirs) {
+    const CMPIArray* array = CMNewArray(&broker, 1, CMPI_string, nullptr);
+    const CMPIValue text = {.string = broker.string("string", "text")};
+    EXPECT_EQ(CMSetArrayElementAt(array, 0, "text", CMPI_chars).rc, CMPI_RC_ERR_TYPE_MISMATCH);
+    EXPECT_EQ(CMSetArrayElementAt(array, 1, &text, CMPI_string).rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
+    EXPECT_TRUE(CMIsNullValue(CMGetArrayElementAt(array, 0, nullptr)));
+    EXPECT_EQ(CMSetArrayElementAt(array, 0, &text, CMPI_string).rc, CMPI_RC_OK);
+    EXPECT_EQ(CMGetArrayElementAt(array, 0, nullptr).value.string, text.string);
+
+    CMPIInstance* instance = CMNewInstance(&broker, path, nullptr);
+    const CMPIValue value = {.array = const_cast<CMPIArray*>(array)};
+    EXPECT_EQ(CMSetProperty(instance, "Texts", &value, CMPI_uint16A).rc, CMPI_RC_ERR_TYPE_MISMATCH);
+    EXPECT_EQ(CMSetProperty(instance, "Texts", &value, CMPI_stringA).rc, CMPI_RC_OK);
+    EXPECT_EQ(CMGetPropertyCount(instance, nullptr), 1);
+}
+
 TEST_F(RecordingBrokerTest, UpCallsYieldWhatTheTestPutThere) {
     CMPIInstance* instance = broker.instance("instance", path);
     broker.instanceNames["CIM_Thing"] = {path};
@@ -217,7 +233,7 @@ TEST_F(RecordingBrokerTest, FaultsComeWhenTheyAreDue) {
 
 TEST_F(RecordingBrokerTest, ResultsKeepWhatIsReturned) {
     CMPIResult* result = broker.result("result");
-    const CMPIUint32 number = 7;
+    const CMPIValue number = {.uint32 = 7};
     CMReturnObjectPath(result, path);
     CMReturnData(result, &number, CMPI_uint32);
     CMReturnDone(result);

@@ -109,14 +109,17 @@ const Lines pathMade = {
     "path#1.addKey(Name, CMPI_chars, \"managed.example.org\")",
 };
 
-/** Setting one text of each of the machine's facts, if it has any. */
-Lines textsSet(const std::string& property, const std::string& array, std::string IdentifyingFact::*text) {
+/** Setting one text of each of the machine's facts, if it has any; `set` is the number of such properties before. */
+Lines textsSet(const std::string& property, std::size_t set, std::string IdentifyingFact::*text) {
     const std::vector<IdentifyingFact> facts = identifyingFacts();
+    const std::string array = "array#" + std::to_string(2 + set);
     Lines lines;
     if (!facts.empty()) {
         lines.push_back("broker.newArray(" + std::to_string(facts.size()) + ", CMPI_string) -> " + array);
         for (std::size_t i = 0; i < facts.size(); ++i) {
-            lines.push_back(array + ".setElementAt(" + std::to_string(i) + ", CMPI_chars, \"" + facts[i].*text + "\")");
+            const std::string value = '"' + facts[i].*text + '"';
+            lines.push_back("broker.newString(" + value + ") -> string#" + std::to_string(set * facts.size() + i + 1));
+            lines.push_back(array + ".setElementAt(" + std::to_string(i) + ", CMPI_string, " + value + ')');
         }
         lines.push_back("instance#1.setProperty(" + property + ", CMPI_stringA, " + array + ')');
     }
@@ -144,8 +147,8 @@ Lines instanceReturned(const std::string& properties) {
                "array#1.setElementAt(0, CMPI_uint16, 0)",
                "instance#1.setProperty(Dedicated, CMPI_uint16A, array#1)",
            } +
-           textsSet("OtherIdentifyingInfo", "array#2", &IdentifyingFact::value) +
-           textsSet("IdentifyingDescriptions", "array#3", &IdentifyingFact::description) +
+           textsSet("OtherIdentifyingInfo", 0, &IdentifyingFact::value) +
+           textsSet("IdentifyingDescriptions", 1, &IdentifyingFact::description) +
            Lines{"result.returnInstance(instance#1)", "result.returnDone()"};
 }
 
@@ -424,7 +427,7 @@ TEST_P(Operations, LetACancelledThreadGo) {
     EXPECT_THAT(records(), IsEmpty());
 }
 
-const Lines instanceObjectSlots = {"newInstance", "newArray"};
+const Lines instanceObjectSlots = {"newInstance", "newArray", "newString"};
 const Lines instanceOtherSlots = {"setPropertyFilter", "setProperty", "setElementAt", "returnInstance"};
 
 INSTANTIATE_TEST_SUITE_P(

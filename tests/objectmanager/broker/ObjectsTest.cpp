@@ -264,6 +264,34 @@ TEST_F(ArrayTest, RefusesElementsOfAnotherTypeAndPositionsBeyondItsEnd) {
     EXPECT_EQ(CMPI_RC_ERR_NO_SUCH_PROPERTY, status.rc);
 }
 
+TEST_F(ArrayTest, TakesTextsAsTheTypeThatItWasMadeForOnly) {
+    CMPIValue value = {};
+    value.string = CMNewString(mb, "text", nullptr);
+    const CMPIArray* strings = CMNewArray(mb, 1, CMPI_string, nullptr);
+    EXPECT_EQ(CMPI_RC_ERR_TYPE_MISMATCH, CMSetArrayElementAt(strings, 0, "text", CMPI_chars).rc);
+    EXPECT_TRUE(CMIsNullValue(CMGetArrayElementAt(strings, 0, nullptr)));
+    EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(strings, 0, &value, CMPI_string).rc);
+    EXPECT_EQ("text", text(CMGetArrayElementAt(strings, 0, nullptr)));
+
+    const CMPIArray* chars = CMClone(CMNewArray(mb, 1, CMPI_chars, nullptr), nullptr);
+    EXPECT_EQ(CMPI_RC_ERR_TYPE_MISMATCH, CMSetArrayElementAt(chars, 0, &value, CMPI_string).rc);
+    EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(chars, 0, "text", CMPI_chars).rc);
+    EXPECT_EQ("text", text(CMGetArrayElementAt(chars, 0, nullptr)));
+}
+
+TEST_F(ArrayTest, TakesNullsOfItsOwnTypeOrOfNone) {
+    const CMPIArray* array = CMNewArray(mb, 1, CMPI_uint16, nullptr);
+    const CMPIUint16 number = 5;
+    EXPECT_EQ(CMPI_RC_ERR_TYPE_MISMATCH, CMSetArrayElementAt(array, 0, nullptr, CMPI_uint32).rc);
+    for (const CMPIType type : {CMPI_uint16, CMPI_null}) {
+        EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(array, 0, &number, CMPI_uint16).rc);
+        EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(array, 0, nullptr, type).rc);
+        const CMPIData element = CMGetArrayElementAt(array, 0, nullptr);
+        EXPECT_TRUE(CMIsNullValue(element));
+        EXPECT_EQ(CMPI_uint16, element.type);
+    }
+}
+
 TEST_F(ArrayTest, MayBeEmpty) {
     const CMPIArray* array = CMNewArray(mb, 0, CMPI_string, &status);
     EXPECT_EQ(CMPI_RC_OK, status.rc);
@@ -276,7 +304,7 @@ protected:
                                       CMPI_RC_ERR_FAILED, nullptr);
 
     CMPIArray* texts(const char* only) {
-        CMPIArray* array = CMNewArray(mb, 1, CMPI_string, nullptr);
+        CMPIArray* array = CMNewArray(mb, 1, CMPI_chars, nullptr);
         CMSetArrayElementAt(array, 0, only, CMPI_chars);
         return array;
     }

@@ -59,50 +59,6 @@ std::string_view valueKind(CMPIType type) {
     return type == CMPI_boolean ? "boolean" : isInteger(type) || isReal(type) ? "numeric" : "string";
 }
 
-/** What is known of the standard qualifiers beside their values. */
-struct QualifierDeclaration {
-    std::string_view name;
-    CMPIType type;
-    bool overridable;
-    bool toSubclass;
-    bool translatable;
-};
-
-constexpr std::array<QualifierDeclaration, 25> standardQualifiers{{
-    {"Abstract", CMPI_boolean, true, false, false},
-    {"ArrayType", CMPI_string, false, true, false},
-    {"Association", CMPI_boolean, false, true, false},
-    {"Counter", CMPI_boolean, true, true, false},
-    {"Deprecated", CMPI_stringA, true, false, false},
-    {"Description", CMPI_string, true, true, true},
-    {"DisplayName", CMPI_string, true, true, true},
-    {"EmbeddedInstance", CMPI_string, true, true, false},
-    {"EmbeddedObject", CMPI_boolean, false, true, false},
-    {"Experimental", CMPI_boolean, true, false, false},
-    {"In", CMPI_boolean, false, true, false},
-    {"Key", CMPI_boolean, false, true, false},
-    {"MappingStrings", CMPI_stringA, true, true, false},
-    {"Max", CMPI_uint32, true, true, false},
-    {"MaxLen", CMPI_uint32, true, true, false},
-    {"Min", CMPI_uint32, true, true, false},
-    {"ModelCorrespondence", CMPI_stringA, true, true, false},
-    {"Out", CMPI_boolean, false, true, false},
-    {"Override", CMPI_string, true, false, false},
-    {"Propagated", CMPI_string, false, true, false},
-    {"Required", CMPI_boolean, false, true, false},
-    {"ValueMap", CMPI_stringA, true, true, false},
-    {"Values", CMPI_stringA, true, true, true},
-    {"Version", CMPI_string, true, false, true},
-    {"Weak", CMPI_boolean, false, true, false},
-}};
-
-const QualifierDeclaration* standardQualifier(std::string_view name) {
-    const auto* const found =
-        std::find_if(standardQualifiers.begin(), standardQualifiers.end(),
-                     [&](const QualifierDeclaration& declared) { return equalNames(declared.name, name); });
-    return found == standardQualifiers.end() ? nullptr : found;
-}
-
 } // namespace
 
 void ResponseWriter::attribute(std::string_view name, std::string_view value) {
@@ -313,14 +269,14 @@ void ResponseWriter::qualifiers(const Qualifiers& qualifiers, const Selection& s
         return;
     }
     for (const NamedValue& qualifier : qualifiers) {
-        const QualifierDeclaration* standard = standardQualifier(qualifier.name);
+        const QualifierType* type = _catalogue.qualifierTypes().find(qualifier.name);
         raw("<QUALIFIER");
         attribute("NAME", qualifier.name);
-        attribute("TYPE", elementTypeName(standard != nullptr ? standard->type : qualifier.value.type));
-        if (standard != nullptr) {
-            attribute("OVERRIDABLE", standard->overridable ? "true" : "false");
-            attribute("TOSUBCLASS", standard->toSubclass ? "true" : "false");
-            attribute("TRANSLATABLE", standard->translatable ? "true" : "false");
+        attribute("TYPE", elementTypeName(qualifier.value.type));
+        if (type != nullptr) {
+            attribute("OVERRIDABLE", type->overridable ? "true" : "false");
+            attribute("TOSUBCLASS", type->toSubclass ? "true" : "false");
+            attribute("TRANSLATABLE", type->translatable ? "true" : "false");
         }
         raw(">");
         value(qualifier.value);

@@ -14,16 +14,23 @@ namespace ObjectManager {
 
 namespace {
 
-/** What the qualifiers of an element become where they are declared again. */
-Qualifiers merged(const Qualifiers& inherited, Qualifiers own) {
-    std::copy_if(inherited.begin(), inherited.end(), std::back_inserter(own),
-                 [&own](const NamedValue& q) { return find(own, q.name) == nullptr; });
-    return own;
+void inheritQualifiers(Element& element, const Element& inherited, const QualifierTypes& types) {
+    element.qualifiers = types.merged(inherited.qualifiers, std::move(element.qualifiers));
+}
+
+/** So do the parameters, which an overriding method has in the same order. */
+void inheritQualifiers(Method& method, const Method& inherited, const QualifierTypes& types) {
+    method.qualifiers = types.merged(inherited.qualifiers, std::move(method.qualifiers));
+    for (Parameter& parameter : method.parameters) {
+        if (const Parameter* known = findElement(inherited.parameters, parameter.name)) {
+            inheritQualifiers(parameter, *known, types);
+        }
+    }
 }
 
 /** Adds the elements of a class to those that it inherits. */
 template <typename T>
-void addElements(std::vector<T>& elements, const std::vector<T>& own, const Class& owner) {
+void addElements(std::vector<T>& elements, const std::vector<T>& own, const Class& owner, const QualifierTypes& types) {
     for (T element : own) {
         element.origin = owner.name;
         element.declaredBy = owner.name;
@@ -38,7 +45,7 @@ void addElements(std::vector<T>& elements, const std::vector<T>& own, const Clas
                               fmt::format("found {} {}, expected the type {} that it is inherited with",
                                           typeName(element.type), element.name, typeName(inherited->type)));
         }
-        element.qualifiers = merged(inherited->qualifiers, std::move(element.qualifiers));
+        inheritQualifiers(element, *inherited, types);
         element.origin = inherited->origin;
         *inherited = std::move(element);
     }
@@ -47,8 +54,10 @@ void addElements(std::vector<T>& elements, const std::vector<T>& own, const Clas
 /** Declarations by name, and with what each of them inherits. */
 class Completion {
 public:
-    explicit Completion(std::vector<Class> declarations) {
+    /** @param types lives longer. */
+    Completion(std::vector<Class> declarations, const QualifierTypes& types) : _types(types) {
         for (Class& declared : declarations) {
+            convertQualifiers(declared);
             const auto [known, added] = _declared.try_emplace(declared.name, declared);
             if (!added) {
                 throw SchemaError(declared.place,
@@ -68,6 +77,20 @@ public:
     }
 
 private:
+    /** The qualifiers of the class and of its elements get values of their types. */
+    void convertQualifiers(Class& declared) const {
+        _types.convert(declared.qualifiers, declared.place);
+        for (Property& property : declared.properties) {
+            _types.convert(property.qualifiers, declared.place);
+        }
+        for (Method& method : declared.methods) {
+            _types.convert(method.qualifiers, declared.place);
+            for (Parameter& parameter : method.parameters) {
+                _types.convert(parameter.qualifiers, declared.place);
+            }
+        }
+    }
+
     /** `descendants` counts the classes on the way down to the one that is completed. */
     Class complete(const Class& declared, std::size_t descendants) const {
         Class whole = declared;
@@ -77,9 +100,10 @@ private:
             Class inherited = complete(superClassOf(declared, descendants), descendants + 1);
             whole.properties = std::move(inherited.properties);
             whole.methods = std::move(inherited.methods);
+            whole.qualifiers = _types.merged(inherited.qualifiers, std::move(whole.qualifiers));
         }
-        addElements(whole.properties, declared.properties, declared);
-        addElements(whole.methods, declared.methods, declared);
+        addElements(whole.properties, declared.properties, declared, _types);
+        addElements(whole.methods, declared.methods, declared, _types);
         return whole;
     }
 
@@ -107,13 +131,14 @@ private:
         }
     }
 
+    const QualifierTypes& _types;
     std::map<std::string, Class, NameLess> _declared;
 };
 
 } // namespace
 
-Catalogue::Catalogue(std::vector<Class> declarations) {
-    for (Class& whole : Completion(std::move(declarations)).classes()) {
+Catalogue::Catalogue(Declarations declarations) : _qualifierTypes(declarations.qualifierTypes) {
+    for (Class& whole : Completion(std::move(declarations.classes), _qualifierTypes).classes()) {
         Entry entry;
         for (const Property* key : whole.keys()) {
             entry.keyNames.push_back(key->name);
@@ -167,12 +192,14 @@ std::span<const ReferenceEnd> Catalogue::references(std::string_view name) const
 }
 
 Catalogue readCatalogue(const std::filesystem::path& folder) {
-    std::vector<Class> declarations;
+    Declarations all;
     for (const auto& file : filesOf(folder, ".mof")) {
-        std::vector<Class> declared = readMof(readFile(file), file.string());
-        std::move(declared.begin(), declared.end(), std::back_inserter(declarations));
+        Declarations declared = readMof(readFile(file), file.string());
+        std::move(declared.classes.begin(), declared.classes.end(), std::back_inserter(all.classes));
+        std::move(declared.qualifierTypes.begin(), declared.qualifierTypes.end(),
+                  std::back_inserter(all.qualifierTypes));
     }
-    return Catalogue(std::move(declarations));
+    return Catalogue(std::move(all));
 }
 
 } // namespace ObjectManager

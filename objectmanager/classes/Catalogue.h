@@ -5,6 +5,8 @@
 #define CLASSES_CATALOGUE_H
 
 #include "classes/Class.h"
+#include "classes/MofReader.h"
+#include "classes/QualifierType.h"
 #include "model/ClassInformation.h"
 
 #include <filesystem>
@@ -22,13 +24,17 @@ public:
     /**
      * @param declarations in any order, superclasses included.
      * @throws SchemaError where a class is declared twice, a superclass or the class of a reference is not declared, a
-     *         class is its own ancestor, or an inherited property or method is redeclared with another type.
+     *         class is its own ancestor, an inherited property or method is redeclared with another type, or a
+     *         qualifier has no value of its type.
      */
-    explicit Catalogue(std::vector<Class> declarations);
+    explicit Catalogue(Declarations declarations);
+
+    const QualifierTypes& qualifierTypes() const { return _qualifierTypes; }
 
     /**
      * The class with everything that it inherits, the ancestors' elements first. An element that is declared again
-     * stands in the ancestor's place, with the qualifiers of both declarations.
+     * stands in the ancestor's place. It has its own qualifiers and those of the ancestor's that go to subclasses, as
+     * the class has its superclass's.
      *
      * @return null where no such class is known.
      */
@@ -51,6 +57,7 @@ private:
         std::vector<ReferenceEnd> references;
     };
 
+    QualifierTypes _qualifierTypes;
     std::map<std::string, Entry, NameLess> _classes;
 };
 

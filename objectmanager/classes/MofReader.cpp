@@ -4,30 +4,94 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
+#include <iterator>
 #include <utility>
 
 namespace ObjectManager {
 
 namespace {
 
+/** What a flavor says of a qualifier type. */
+struct Flavor {
+    std::string_view name;
+    bool QualifierType::*member;
+    bool value;
+};
+
+constexpr Flavor flavors[] = {
+    {"EnableOverride", &QualifierType::overridable, true}, {"DisableOverride", &QualifierType::overridable, false},
+    {"ToSubclass", &QualifierType::toSubclass, true},      {"Restricted", &QualifierType::toSubclass, false},
+    {"Translatable", &QualifierType::translatable, true},
+};
+
 class Parser {
 public:
     Parser(std::string_view text, std::string_view file) : _file(file), _tokens(tokensOfMof(text, file)) {}
 
-    std::vector<Class> classes() {
-        std::vector<Class> result;
+    Declarations declarations() {
+        Declarations result;
         while (peek().kind != Token::Kind::end) {
-            result.push_back(classDeclaration());
+            if (acceptWord("qualifier")) {
+                result.qualifierTypes.push_back(qualifierType());
+            } else {
+                result.classes.push_back(classDeclaration());
+            }
         }
         return result;
     }
 
 private:
+    /** What follows the word Qualifier: "Name : type [] = default, Scope(...), Flavor(...);". */
+    QualifierType qualifierType() {
+        QualifierType declared;
+        declared.place = placeOf(_file, peek().line);
+        declared.name = identifier("the name of the qualifier type");
+        expect(":", "':' and a type");
+        const Token type = peek();
+        const auto found = typeByName(identifier("the name of a type"));
+        if (!found) {
+            fail(type, "the name of a type");
+        }
+        declared.type = arrayBrackets(*found);
+        if (accept("=")) {
+            initializer(declared.type); // nothing asks for what a qualifier would be where it is not given
+        }
+        while (accept(",")) {
+            if (acceptWord("flavor")) {
+                expect("(", "'(' and flavors");
+                do {
+                    flavor(declared);
+                } while (accept(","));
+            } else {
+                expectWord("scope", "Scope(...) or Flavor(...)");
+                expect("(", "'(' and scopes");
+                do {
+                    identifier("a scope");
+                } while (accept(","));
+            }
+            expect(")", "',' or ')'");
+        }
+        expect(";", fmt::format("';' behind the qualifier type {}", declared.name));
+        return declared;
+    }
+
+    void flavor(QualifierType& declared) {
+        const Token token = peek();
+        const std::string name = identifier("a flavor");
+        const auto* const known = std::find_if(std::begin(flavors), std::end(flavors),
+                                               [&](const Flavor& flavor) { return equalNames(flavor.name, name); });
+        if (known == std::end(flavors)) {
+            fail(token, "EnableOverride, DisableOverride, ToSubclass, Restricted or Translatable");
+        }
+        declared.*(known->member) = known->value;
+    }
+
     Class classDeclaration() {
         Class declared;
         declared.qualifiers = qualifierList();
         declared.place = placeOf(_file, peek().line);
-        expectWord("class", "a class declaration");
+        expectWord("class", "the declaration of a class or of a qualifier type");
         declared.name = identifier("the name of the class");
         if (accept(":")) {
             declared.superClass = identifier("the name of the superclass");
@@ -51,7 +115,7 @@ private:
             failBefore(fmt::format("a second property {} of {}", element.name, declared.name), "every name once");
         }
         Property property{std::move(element), {}};
-        arrayBrackets(property);
+        property.type = arrayBrackets(property.type);
         property.defaultValue = accept("=") ? initializer(property.type) : nullValue(property.type);
         expect(";", fmt::format("';' behind the property {}", property.name));
         declared.properties.push_back(std::move(property));
@@ -62,7 +126,7 @@ private:
         if (!accept(")")) {
             do {
                 Parameter parameter{typedElement("a parameter")};
-                arrayBrackets(parameter);
+                parameter.type = arrayBrackets(parameter.type);
                 result.parameters.push_back(std::move(parameter));
             } while (accept(","));
             expect(")", "',' or ')' behind a parameter");
@@ -77,8 +141,7 @@ private:
         element.qualifiers = qualifierList();
         const Token type = peek();
         const std::string name = identifier(expected);
-        if (peek().kind == Token::Kind::identifier && equalNames(peek().text, "ref")) {
-            ++_next;
+        if (acceptWord("ref")) {
             element.type = CMPI_ref;
             element.referenceClass = name;
         } else if (const auto found = typeByName(name)) {
@@ -90,14 +153,16 @@ private:
         return element;
     }
 
-    void arrayBrackets(Element& element) {
-        if (accept("[")) {
-            if (peek().kind == Token::Kind::number) {
-                ++_next;
-            }
-            expect("]", "']'");
-            element.type = static_cast<CMPIType>(element.type | CMPI_ARRAY);
+    /** The type, as that of an array where brackets follow. */
+    CMPIType arrayBrackets(CMPIType type) {
+        if (!accept("[")) {
+            return type;
         }
+        if (peek().kind == Token::Kind::number) {
+            ++_next;
+        }
+        expect("]", "']'");
+        return static_cast<CMPIType>(type | CMPI_ARRAY);
     }
 
     Qualifiers qualifierList() {
@@ -233,11 +298,16 @@ private:
         }
     }
 
+    bool acceptWord(std::string_view word) {
+        const bool found = peek().kind == Token::Kind::identifier && equalNames(peek().text, word);
+        _next += found ? 1 : 0;
+        return found;
+    }
+
     void expectWord(std::string_view word, const std::string& expected) {
-        if (peek().kind != Token::Kind::identifier || !equalNames(peek().text, word)) {
+        if (!acceptWord(word)) {
             fail(peek(), expected);
         }
-        ++_next;
     }
 
     std::string identifier(const std::string& expected) {
@@ -264,8 +334,8 @@ private:
 
 } // namespace
 
-std::vector<Class> readMof(std::string_view text, std::string_view file) {
-    return Parser(text, file).classes();
+Declarations readMof(std::string_view text, std::string_view file) {
+    return Parser(text, file).declarations();
 }
 
 } // namespace ObjectManager

@@ -1,25 +1,32 @@
 /**
- * Reads class declarations in the Managed Object Format (DSP0004).
+ * Reads declarations of classes and qualifier types in the Managed Object Format (DSP0004).
  */
 #ifndef CLASSES_MOFREADER_H
 #define CLASSES_MOFREADER_H
 
 #include "classes/Class.h"
 #include "classes/MofLexer.h"
+#include "classes/QualifierType.h"
 
 #include <string_view>
 #include <vector>
 
 namespace ObjectManager {
 
+/** What a text declares, each kind in its order. */
+struct Declarations {
+    std::vector<Class> classes;
+    std::vector<QualifierType> qualifierTypes;
+};
+
 /**
- * The classes that a text declares, in its order. Nothing but class declarations is understood; compiler directives are
- * skipped, and the flavors of qualifiers read over.
+ * The classes and qualifier types that a text declares. Compiler directives, the scopes of qualifier types and flavors
+ * where a qualifier is used are read over.
  *
  * @param file the name that errors give.
- * @throws SchemaError
+ * @throws SchemaError also where the text has anything else than declarations of classes and qualifier types.
  */
-std::vector<Class> readMof(std::string_view text, std::string_view file);
+Declarations readMof(std::string_view text, std::string_view file);
 
 } // namespace ObjectManager
 

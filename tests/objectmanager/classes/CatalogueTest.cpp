@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <string>
 #include <vector>
 
@@ -119,7 +120,15 @@ INSTANTIATE_TEST_SUITE_P(
         Misfit{"class A { uint8 N; };\nclass B : A { string N; };",
                "x.mof:2: found string N, expected the type uint8 that it is inherited with"},
         Misfit{"class A { B REF R; };", "x.mof:1: found B REF R in A, expected a declared class"},
-        Misfit{"class A { uint32 M(B REF R); };", "x.mof:1: found B REF R in A, expected a declared class"}));
+        Misfit{"class A { uint32 M(B REF R); };", "x.mof:1: found B REF R in A, expected a declared class"},
+        Misfit{"class A { [MaxLen(\"5\")] string T; };",
+               "x.mof:1: found string as value of the qualifier MaxLen, expected uint32"},
+        Misfit{"class A { [MaxLen(-5)] string T; };",
+               "x.mof:1: found sint64 as value of the qualifier MaxLen, expected uint32"},
+        Misfit{"class A { uint32 M([Values(\"one\")] uint8 N); };",
+               "x.mof:1: found string as value of the qualifier Values, expected string[]"},
+        Misfit{"Qualifier Q : string;\nQualifier q : string[];",
+               "x.mof:2: found another declaration of the qualifier type q, expected it as in x.mof:1"}));
 
 TEST(ReadCatalogue, reportsAFolderThatIsNotThere) {
     try {
@@ -130,6 +139,63 @@ TEST(ReadCatalogue, reportsAFolderThatIsNotThere) {
     }
 }
 
+std::vector<std::string> namesOf(const Qualifiers& qualifiers) {
+    std::vector<std::string> names;
+    for (const NamedValue& qualifier : qualifiers) {
+        names.push_back(qualifier.name);
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+TEST(QualifiersOfACatalogue, goToSubclassesUnlessTheyAreRestricted) {
+    const Catalogue catalogue(readMof(R"(
+        [Association, Abstract, Version("1"), UMLPackagePath("A::B")]
+        class Parent {
+            [Key, Max(1), Deprecated{"Other"}, Experimental] Parent REF One;
+            [Deprecated{"None"}, Description("d")] uint32 Act([In, Required, Experimental] uint16 How);
+        };
+        [Version("2")]
+        class Child : Parent {
+            [Override("One"), Min(1)] Child REF One;
+            [Override("Act")] uint32 Act(uint16 How);
+        };
+        class GrandChild : Child {
+            [Min(0)] Child REF One;
+        };)",
+                                      "x.mof"));
+    const Class& child = *catalogue.find("Child");
+    EXPECT_THAT(namesOf(child.qualifiers), ElementsAre("Association", "UMLPackagePath", "Version"));
+    EXPECT_THAT(namesOf(child.property("One")->qualifiers), ElementsAre("Key", "Max", "Min", "Override"));
+    EXPECT_THAT(namesOf(child.method("Act")->qualifiers), ElementsAre("Description", "Override"));
+    EXPECT_THAT(namesOf(child.method("Act")->parameters[0].qualifiers), ElementsAre("In", "Required"));
+    EXPECT_THAT(namesOf(catalogue.find("GrandChild")->property("One")->qualifiers), ElementsAre("Key", "Max", "Min"));
+}
+
+TEST(QualifiersOfACatalogue, haveValuesOfTheirTypes) {
+    const Catalogue catalogue(readMof(R"(
+        Qualifier Shade : uint8[], Flavor(Restricted);
+        class A { [MaxLen(64), MinValue(-1), Shade{1, 2}, Unknown(3)] string P; };)",
+                                      "x.mof"));
+    const Qualifiers& qualifiers = catalogue.find("A")->property("P")->qualifiers;
+    EXPECT_EQ(find(qualifiers, "MaxLen")->value, unsignedValue(CMPI_uint32, 64));
+    EXPECT_EQ(find(qualifiers, "MinValue")->value, signedValue(CMPI_sint64, -1));
+    EXPECT_EQ(find(qualifiers, "Shade")->value,
+              arrayValue(CMPI_uint8, {unsignedValue(CMPI_uint8, 1), unsignedValue(CMPI_uint8, 2)}));
+    EXPECT_EQ(find(qualifiers, "Unknown")->value, signedValue(CMPI_sint64, 3));
+    EXPECT_FALSE(catalogue.qualifierTypes().find("shade")->toSubclass);
+    EXPECT_FALSE(catalogue.qualifierTypes().find("Key")->overridable);
+    EXPECT_EQ(catalogue.qualifierTypes().find("Unknown"), nullptr);
+}
+
+TEST(QualifiersOfACatalogue, mayBeDeclaredTwiceInTheSameWay) {
+    const Catalogue catalogue(readMof("Qualifier Key : boolean, Flavor(DisableOverride);\n"
+                                      "Qualifier KEY : boolean, Flavor(DisableOverride);\n"
+                                      "class A {};",
+                                      "x.mof"));
+    EXPECT_NE(catalogue.find("A"), nullptr);
+}
+
 struct Code {
     Value value;
     std::optional<std::string> means;
@@ -138,13 +204,13 @@ struct Code {
 class ValueMapTest : public testing::TestWithParam<Code> {};
 
 TEST_P(ValueMapTest, tellsWhatACodeMeans) {
-    const auto classes = readMof(R"(
+    const auto declared = readMof(R"(
         class A {
             [ValueMap{"1", "2", "3..5", "..", "0x8000..", "..-5"},
              Values{"one", "two", "a few", "any", "many", "none"}] sint64 N;
         };)",
-                                 "x.mof");
-    EXPECT_EQ(meaning(*classes[0].property("N"), GetParam().value), GetParam().means);
+                                  "x.mof");
+    EXPECT_EQ(meaning(*declared.classes[0].property("N"), GetParam().value), GetParam().means);
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -156,8 +222,9 @@ INSTANTIATE_TEST_SUITE_P(
                     Code{nullValue(CMPI_sint64), std::nullopt}, Code{stringValue("other"), std::nullopt}));
 
 TEST(ValueMap, mayBeOfTexts) {
-    const auto classes =
+    const auto declared =
         readMof(R"(class A { [ValueMap{"a", "b"}, Values{"first", "second"}] string T; string U; };)", "x.mof");
+    const auto& classes = declared.classes;
     EXPECT_THAT(meaning(*classes[0].property("T"), stringValue("b")), Optional(std::string("second")));
     EXPECT_EQ(meaning(*classes[0].property("T"), stringValue("c")), std::nullopt);
     EXPECT_EQ(meaning(*classes[0].property("U"), stringValue("a")), std::nullopt);

@@ -4,21 +4,28 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <string_view>
+#include <vector>
 
 namespace ObjectManager {
 namespace {
 
+using testing::AllOf;
 using testing::ElementsAre;
 using testing::Field;
 using testing::SizeIs;
 
+std::vector<Class> classesOf(std::string_view text, std::string_view file) {
+    return readMof(text, file).classes;
+}
+
 TEST(MofReader, readsNothingFromAnEmptyText) {
-    EXPECT_THAT(readMof("", "x.mof"), SizeIs(0));
-    EXPECT_THAT(readMof("// a comment\n/* and\nanother */ #pragma locale(\"en_US\")\n", "x.mof"), SizeIs(0));
+    EXPECT_THAT(classesOf("", "x.mof"), SizeIs(0));
+    EXPECT_THAT(classesOf("// a comment\n/* and\nanother */ #pragma locale(\"en_US\")\n", "x.mof"), SizeIs(0));
 }
 
 TEST(MofReader, readsAClassWithItsSuperclassAndPlace) {
-    const auto classes = readMof("#pragma namespace(\"root\")\n\nclass A {\n};\nCLASS B : A {};", "x.mof");
+    const auto classes = classesOf("#pragma namespace(\"root\")\n\nclass A {\n};\nCLASS B : A {};", "x.mof");
     ASSERT_THAT(classes, SizeIs(2));
     EXPECT_EQ(classes[0].name, "A");
     EXPECT_EQ(classes[0].superClass, "");
@@ -29,7 +36,7 @@ TEST(MofReader, readsAClassWithItsSuperclassAndPlace) {
 }
 
 TEST(MofReader, readsPropertiesWithTypesAndDefaults) {
-    const auto classes = readMof(R"(
+    const auto classes = classesOf(R"(
         class A {
             string Text = "a\"b";
             uint16 Codes[] = {2, 0x10};
@@ -42,7 +49,7 @@ TEST(MofReader, readsPropertiesWithTypesAndDefaults) {
             uint32 Unset = NULL;
             A REF Other;
         };)",
-                                 "x.mof");
+                                   "x.mof");
     ASSERT_THAT(classes, SizeIs(1));
     const auto& properties = classes[0].properties;
     const auto valueOf = [&](const char* name) { return findElement(properties, name)->defaultValue; };
@@ -61,13 +68,13 @@ TEST(MofReader, readsPropertiesWithTypesAndDefaults) {
 }
 
 TEST(MofReader, readsQualifiersOfEveryForm) {
-    const auto classes = readMof(R"(
+    const auto classes = classesOf(R"(
         [Abstract, Version("1.2"), Min(1), Max(-2), Ratio(0.5), Sign('+'), Off(FALSE), Empty(NULL),
          Values{"one", "two"}, Numbers{1, 2}, None{},
          Text("one " "text"   // put together
               " of three") : DisableOverride ToSubclass]
         class A {};)",
-                                 "x.mof");
+                                   "x.mof");
     ASSERT_THAT(classes, SizeIs(1));
     const auto& qualifiers = classes[0].qualifiers;
     const auto valueOf = [&](const char* name) { return find(qualifiers, name)->value; };
@@ -86,13 +93,13 @@ TEST(MofReader, readsQualifiersOfEveryForm) {
 }
 
 TEST(MofReader, readsMethodsWithQualifiedParameters) {
-    const auto classes = readMof(R"(
+    const auto classes = classesOf(R"(
         class A {
             uint32 Stop();
             [Description("Does it.")]
             uint32 Do([In] uint16 How, [In(false), Out] string Names[], A REF Whom, [In, Out] datetime When);
         };)",
-                                 "x.mof");
+                                   "x.mof");
     ASSERT_THAT(classes, SizeIs(1));
     EXPECT_THAT(classes[0].method("stop")->parameters, SizeIs(0));
     const Method& method = *classes[0].method("do");
@@ -107,6 +114,27 @@ TEST(MofReader, readsMethodsWithQualifiedParameters) {
     EXPECT_EQ(directions(1), std::pair(false, true));
     EXPECT_EQ(directions(2), std::pair(true, false));
     EXPECT_EQ(directions(3), std::pair(true, true));
+}
+
+TEST(MofReader, readsQualifierTypesWithTheirFlavors) {
+    const auto types = readMof(R"(
+        Qualifier Key : boolean = false, Scope(property, reference), Flavor(DisableOverride, ToSubclass);
+        Qualifier Values : string[], Scope(any), Flavor(Translatable);
+        class A {};
+        QUALIFIER Since : datetime = NULL, Flavor(restricted);
+        Qualifier Plain : uint32;)",
+                               "x.mof")
+                           .qualifierTypes;
+    const auto type = [](const char* name, CMPIType of, bool overridable, bool toSubclass, bool translatable) {
+        return AllOf(Field(&QualifierType::name, name), Field(&QualifierType::type, of),
+                     Field(&QualifierType::overridable, overridable), Field(&QualifierType::toSubclass, toSubclass),
+                     Field(&QualifierType::translatable, translatable));
+    };
+    EXPECT_THAT(types, ElementsAre(type("Key", CMPI_boolean, false, true, false),
+                                   type("Values", CMPI_stringA, true, true, true),
+                                   type("Since", CMPI_dateTime, true, false, false),
+                                   type("Plain", CMPI_uint32, true, true, false)));
+    EXPECT_EQ(types[2].place, "x.mof:5");
 }
 
 struct BadMof {
@@ -128,7 +156,18 @@ TEST_P(BadMofTest, isReportedByFileAndLine) {
 INSTANTIATE_TEST_SUITE_P(
     texts, BadMofTest,
     testing::Values(
-        BadMof{"instance of A {};", "x.mof:1: found 'instance', expected a class declaration"},
+        BadMof{"instance of A {};",
+               "x.mof:1: found 'instance', expected the declaration of a class or of a qualifier type"},
+        BadMof{"Qualifier Q;", "x.mof:1: found ';', expected ':' and a type"},
+        BadMof{"Qualifier Q : text;", "x.mof:1: found 'text', expected the name of a type"},
+        BadMof{"Qualifier Q : string = 5;", "x.mof:1: found '5', expected a string"},
+        BadMof{"Qualifier Q : string,\nFlavour(any);", "x.mof:2: found 'Flavour', expected Scope(...) or Flavor(...)"},
+        BadMof{
+            "Qualifier Q : string, Flavor(Strong);",
+            "x.mof:1: found 'Strong', expected EnableOverride, DisableOverride, ToSubclass, Restricted or Translatable"},
+        BadMof{"Qualifier Q : string, Scope(any;", "x.mof:1: found ';', expected ',' or ')'"},
+        BadMof{"Qualifier Q : string\n\nclass A {};",
+               "x.mof:3: found 'class', expected ';' behind the qualifier type Q"},
         BadMof{"\n\nclass {};", "x.mof:3: found '{', expected the name of the class"},
         BadMof{"class A : {};", "x.mof:1: found '{', expected the name of the superclass"},
         BadMof{"class A;", "x.mof:1: found ';', expected ':' and a superclass, or '{'"},

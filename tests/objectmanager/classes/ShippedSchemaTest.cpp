@@ -124,7 +124,10 @@ TEST_F(ShippedSchemaTest, givesTheServiceItsKeysAndItsMethod) {
                             AllOf(Field(&Parameter::name, "ManagedElement"), Field(&Parameter::type, CMPI_ref),
                                   Field(&Parameter::referenceClass, "CIM_ManagedElement")),
                             AllOf(Field(&Parameter::name, "Time"), Field(&Parameter::type, CMPI_dateTime)),
+                            AllOf(Field(&Parameter::name, "Job"), Field(&Parameter::referenceClass, "CIM_ConcreteJob")),
                             AllOf(Field(&Parameter::name, "TimeoutPeriod"), Field(&Parameter::type, CMPI_dateTime))));
+    EXPECT_FALSE(method->parameters[3].isIn());
+    EXPECT_TRUE(method->parameters[3].isOut());
     EXPECT_THAT(meaning(*method, unsignedValue(CMPI_uint32, 0)), Optional(std::string("Completed with No Error")));
 }
 
@@ -135,8 +138,8 @@ TEST_F(ShippedSchemaTest, givesTheCapabilitiesTheirKeyAndTheirCodes) {
         return meaning(*capabilities.property(name), unsignedValue(CMPI_uint16, code));
     };
     EXPECT_THAT(meaningOf("PowerStatesSupported", 2), Optional(std::string("On")));
-    EXPECT_THAT(meaningOf("PowerStatesSupported", 5), Optional(std::string("Power Cycle (Off-Soft)")));
-    EXPECT_THAT(meaningOf("PowerStatesSupported", 8), Optional(std::string("Off-Soft")));
+    EXPECT_THAT(meaningOf("PowerStatesSupported", 5), Optional(std::string("Power Cycle (Off - Soft)")));
+    EXPECT_THAT(meaningOf("PowerStatesSupported", 8), Optional(std::string("Off - Soft")));
     EXPECT_THAT(meaningOf("PowerChangeCapabilities", 3), Optional(std::string("Power State Settable")));
     EXPECT_THAT(meaningOf("PowerChangeCapabilities", 8), Optional(std::string("Graceful Shutdown Supported")));
 }

@@ -148,7 +148,7 @@ TEST(PowerStatus, showsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
                            "not registered in root/cimv2\n");
     EXPECT_EQ(outcome.out, "SERVICE OR CAPABILITIES  POWER STATES THAT CAN BE ASKED FOR\n"
                            "service1\n"
-                           "capabilities1            5 (Power Cycle (Off-Soft)), 8 (Off-Soft)\n");
+                           "capabilities1            5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n");
     EXPECT_EQ(outcome.status, 0);
 }
 

@@ -89,7 +89,7 @@ TEST_F(ProvidedTest, showsTheCapabilitiesWithWhatTheirCodesMean) {
               "    PowerChangeCapabilities  3 (Power State Settable), 4 (Power Cycling Supported),\n"
               "                             8 (Graceful Shutdown Supported)\n"
               "    ElementName              PowerStateManagementCapabilities_chassis/blade1\n"
-              "    PowerStatesSupported     2 (On), 5 (Power Cycle (Off-Soft)), 8 (Off-Soft)\n");
+              "    PowerStatesSupported     2 (On), 5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n");
 }
 
 TEST_F(ProvidedTest, showsTheComputerSystemWithWhatItsCodesMean) {

@@ -142,8 +142,8 @@ TEST_P(WriterTest, takesATextThatIsNoUtf8) {
 
 TEST(MofText, ofAClassIsReadBackAsTheSameClass) {
     const auto declared = readMof(schema, "x.mof");
-    for (const Class& each : declared) {
-        const auto again = readMof(mofClass(each), "x.mof");
+    for (const Class& each : declared.classes) {
+        const auto again = readMof(mofClass(each), "x.mof").classes;
         ASSERT_EQ(again.size(), 1U);
         EXPECT_EQ(mofClass(again[0]), mofClass(each));
         EXPECT_EQ(again[0].properties.size(), each.properties.size());

@@ -1,0 +1,176 @@
+/*
+ * Compares the shipped part of the common model with DMTF's own CIM schema, of which no copy is kept here: the
+ * environment variable ORV_DMTF_SCHEMA names a folder with one (its .mof files may lie in folders below). Where it is
+ * not set, these tests are skipped.
+ */
+#include "classes/Catalogue.h"
+#include "classes/Files.h"
+#include "classes/Literals.h"
+#include "text/MofText.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace ObjectManager {
+namespace {
+
+/** The folder of the shipped schema with DMTF's classes in it, as one would make it for `orvcim --schema`. */
+class SchemaWithDmtfs {
+public:
+    explicit SchemaWithDmtfs(const std::filesystem::path& dmtf) {
+        std::filesystem::create_directories(_folder);
+        for (const auto& entry : std::filesystem::recursive_directory_iterator(dmtf)) {
+            if (entry.path().extension() == ".mof") {
+                std::filesystem::create_symlink(std::filesystem::absolute(entry.path()),
+                                                _folder / entry.path().filename());
+            }
+        }
+        for (const auto& file : filesOf(ORV_SCHEMA_FOLDER, ".mof")) {
+            if (file.filename() != "orv-core.mof") {
+                std::filesystem::create_symlink(file, _folder / file.filename());
+            }
+        }
+    }
+    ~SchemaWithDmtfs() { std::filesystem::remove_all(_folder); }
+    SchemaWithDmtfs(const SchemaWithDmtfs&) = delete;
+    SchemaWithDmtfs& operator=(const SchemaWithDmtfs&) = delete;
+
+    const std::filesystem::path& folder() const { return _folder; }
+
+private:
+    std::filesystem::path _folder = testing::TempDir() + "schema-with-dmtfs";
+};
+
+/** What two declarations differ in, a line each. Texts for people, and where else to look, may differ. */
+class Comparison {
+public:
+    std::vector<std::string> differences(const Class& ours, const Class& theirs) {
+        expectEqual(ours.name + ": superclass", ours.superClass, theirs.superClass);
+        qualifiers(ours.name, ours.qualifiers, theirs.qualifiers);
+        for (const Property& property : ours.properties) {
+            const std::string name = ours.name + '.' + property.name;
+            if (const Property* other = expectThere(name, theirs.property(property.name))) {
+                element(name, property, *other);
+                expectEqual(name + ": default", mofLiteral(property.defaultValue), mofLiteral(other->defaultValue));
+            }
+        }
+        for (const Method& method : ours.methods) {
+            const std::string name = ours.name + '.' + method.name;
+            if (const Method* other = expectThere(name, theirs.method(method.name))) {
+                element(name, method, *other);
+                parameters(name, method, *other);
+            }
+        }
+        return _differences;
+    }
+
+private:
+    void parameters(const std::string& name, const Method& ours, const Method& theirs) {
+        expectEqual(name + ": parameters", std::to_string(ours.parameters.size()),
+                    std::to_string(theirs.parameters.size()));
+        for (std::size_t i = 0; i < std::min(ours.parameters.size(), theirs.parameters.size()); ++i) {
+            const Parameter& parameter = ours.parameters[i];
+            expectEqual(name + ": parameter", parameter.name, theirs.parameters[i].name);
+            element(name + '(' + parameter.name + ')', parameter, theirs.parameters[i]);
+        }
+    }
+
+    void element(const std::string& name, const Element& ours, const Element& theirs) {
+        expectEqual(name + ": spelling", ours.name, theirs.name);
+        expectEqual(name + ": type", typeName(ours.type), typeName(theirs.type));
+        expectEqual(name + ": class", ours.referenceClass, theirs.referenceClass);
+        expectEqual(name + ": origin", ours.origin, theirs.origin);
+        expectEqual(name + ": declared by", ours.declaredBy, theirs.declaredBy);
+        qualifiers(name, ours.qualifiers, theirs.qualifiers);
+    }
+
+    void qualifiers(const std::string& name, const Qualifiers& ours, const Qualifiers& theirs) {
+        for (const NamedValue& qualifier : ours) {
+            qualifierOf(name, qualifier.name, ours, theirs);
+        }
+        for (const NamedValue& qualifier : theirs) {
+            if (find(ours, qualifier.name) == nullptr) {
+                qualifierOf(name, qualifier.name, ours, theirs);
+            }
+        }
+    }
+
+    void qualifierOf(const std::string& owner, const std::string& name, const Qualifiers& ours,
+                     const Qualifiers& theirs) {
+        constexpr std::array<std::string_view, 4> mayDiffer = {"Description", "MappingStrings", "ModelCorrespondence",
+                                                               "UMLPackagePath"};
+        if (std::any_of(mayDiffer.begin(), mayDiffer.end(),
+                        [&](std::string_view other) { return equalNames(name, other); })) {
+            return;
+        }
+        const auto text = [&](const Qualifiers& qualifiers) {
+            const NamedValue* found = find(qualifiers, name);
+            return found == nullptr ? std::string("nothing") : mofLiteral(found->value);
+        };
+        expectEqual(owner + ": " + name, text(ours), text(theirs));
+    }
+
+    template <typename T>
+    const T* expectThere(const std::string& name, const T* element) {
+        if (element == nullptr) {
+            _differences.push_back(name + ": DMTF has none");
+        }
+        return element;
+    }
+
+    void expectEqual(const std::string& name, const std::string& ours, const std::string& theirs) {
+        if (ours != theirs) {
+            _differences.push_back(name + ": ours is " + ours + ", DMTF's " + theirs);
+        }
+    }
+
+    std::vector<std::string> _differences;
+};
+
+class DmtfSchemaTest : public testing::Test {
+protected:
+    void SetUp() override {
+        const char* folder = std::getenv("ORV_DMTF_SCHEMA");
+        if (folder == nullptr) {
+            GTEST_SKIP() << "ORV_DMTF_SCHEMA is not set: nothing was compared with DMTF's schema";
+        }
+        _dmtf.reset(new Catalogue(readCatalogue(SchemaWithDmtfs(folder).folder()))); // a catalogue does not move
+    }
+
+    Catalogue _ours = readCatalogue(ORV_SCHEMA_FOLDER);
+    std::unique_ptr<const Catalogue> _dmtf;
+};
+
+TEST_F(DmtfSchemaTest, hasEveryElementThatIsShippedAsItIsShipped) {
+    for (const Class* ours : _ours.all()) {
+        const Class* theirs = _dmtf->find(ours->name);
+        ASSERT_NE(theirs, nullptr) << ours->name;
+        EXPECT_THAT(Comparison().differences(*ours, *theirs), testing::IsEmpty()) << ours->name;
+    }
+}
+
+TEST_F(DmtfSchemaTest, declaresTheStandardQualifiersAsTheyAreKnownWithoutIt) {
+    for (const Class* declared : _dmtf->all()) {
+        for (const NamedValue& qualifier : declared->qualifiers) {
+            const QualifierType* theirs = _dmtf->qualifierTypes().find(qualifier.name);
+            const QualifierType* ours = _ours.qualifierTypes().find(qualifier.name);
+            ASSERT_NE(ours, nullptr) << qualifier.name;
+            EXPECT_EQ(ours->type, theirs->type) << qualifier.name;
+            EXPECT_EQ(ours->overridable, theirs->overridable) << qualifier.name;
+            EXPECT_EQ(ours->toSubclass, theirs->toSubclass) << qualifier.name;
+            EXPECT_EQ(ours->translatable, theirs->translatable) << qualifier.name;
+        }
+    }
+}
+
+} // namespace
+} // namespace ObjectManager

@@ -1,8 +1,9 @@
 /* New objects, and the services that work on them. */
-#include "broker/Describe.h"
 #include "broker/Objects.h"
 
 #include "model/DateTime.h"
+#include "text/MofText.h"
+#include "text/ObjectPathText.h"
 
 #include <chrono>
 
@@ -132,18 +133,22 @@ std::string describeContent(const char& text) {
     return &text;
 }
 std::string describeContent(const PathContent& path) {
-    return describe(toModel(path));
+    return formatObjectPath(toModel(path));
 }
 std::string describeContent(const InstanceContent& instance) {
-    return describe(toModel(instance));
+    return mofInstance(toModel(instance));
 }
 std::string describeContent(const NamedItemsContent& content) {
-    return describe(toModel(content.items));
+    std::string text;
+    for (const NamedValue& named : toModel(content.items)) {
+        text += (text.empty() ? "" : ", ") + named.name + '=' + mofLiteral(named.value);
+    }
+    return text;
 }
 std::string describeContent(const ArrayContent& array) {
     Item item{static_cast<CMPIType>(array.elementType | CMPI_ARRAY), false, array.count, {}};
     item.content.elements = array.elements;
-    return describe(toModel(item));
+    return mofLiteral(toModel(item));
 }
 std::string describeContent(const EnumerationContent& enumeration) {
     return describeContent(enumeration.elements);

@@ -2,6 +2,7 @@
 
 #include "cimxml/Markup.h"
 #include "cimxml/ProtocolError.h"
+#include "classes/Literals.h"
 
 #include <algorithm>
 #include <charconv>

@@ -16,7 +16,6 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-constexpr std::string_view blanks = " \t\r\n";
 constexpr std::array<std::string_view, 5> entities{"lt", "gt", "amp", "quot", "apos"};
 constexpr const char* knownReference = "one of the five entities of XML or a reference to a character that it allows";
 
@@ -236,11 +235,6 @@ const std::string* XmlElement::attribute(std::string_view attributeName) const {
 
 XmlElement parseMarkup(std::string_view text) {
     return Builder(text).build();
-}
-
-std::string_view trimmed(std::string_view text) {
-    const std::size_t start = std::min(text.find_first_not_of(blanks), text.size());
-    return text.substr(start, text.find_last_not_of(blanks) - start + 1);
 }
 
 } // namespace ObjectManager::CimXml

@@ -35,9 +35,6 @@ struct XmlElement {
  */
 XmlElement parseMarkup(std::string_view text);
 
-/** The text without the white space at its ends. */
-std::string_view trimmed(std::string_view text);
-
 } // namespace ObjectManager::CimXml
 
 #endif

@@ -3,6 +3,9 @@
 #include "classes/Literals.h"
 
 #include <algorithm>
+#include <cstdint>
+#include <utility>
+#include <variant>
 
 namespace ObjectManager {
 
@@ -22,20 +25,26 @@ std::vector<std::string> textsOf(const Qualifiers& qualifiers, std::string_view 
     return texts;
 }
 
-/** The integer as a signed number wide enough for its comparison with the bounds of a ValueMap. */
-std::optional<long double> numberOf(const Value& value) {
+/** An integer, whether it has a sign or not. */
+using Integer = std::variant<std::uint64_t, std::int64_t>;
+
+std::optional<Integer> integerOf(const Value& value) {
     if (const auto* number = std::get_if<std::uint64_t>(&value.content)) {
-        return static_cast<long double>(*number);
+        return *number;
     }
     if (const auto* number = std::get_if<std::int64_t>(&value.content)) {
-        return static_cast<long double>(*number);
+        return *number;
     }
     return std::nullopt;
 }
 
-std::optional<long double> numberOf(std::string_view text) {
+std::optional<Integer> integerOf(std::string_view text) {
     const auto value = valueOfUntypedText(text);
-    return value ? numberOf(*value) : std::nullopt;
+    return value ? integerOf(*value) : std::nullopt;
+}
+
+bool isAtMost(const Integer& left, const Integer& right) {
+    return std::visit([](auto low, auto high) { return std::cmp_less_equal(low, high); }, left, right);
 }
 
 constexpr std::string_view range = "..";
@@ -45,17 +54,18 @@ bool covers(const std::string& entry, const Value& value) {
     if (const auto* text = std::get_if<std::string>(&value.content)) {
         return entry == *text;
     }
-    const auto number = numberOf(value);
+    const auto number = integerOf(value);
     const std::size_t dots = entry.find(range);
     if (!number || entry == range) {
         return false;
     }
     if (dots == std::string::npos) {
-        return numberOf(entry) == number;
+        const auto only = integerOf(entry);
+        return only && isAtMost(*only, *number) && isAtMost(*number, *only);
     }
-    const auto low = numberOf(entry.substr(0, dots));
-    const auto high = numberOf(entry.substr(dots + range.size()));
-    return (!low || *low <= *number) && (!high || *number <= *high);
+    const auto low = integerOf(entry.substr(0, dots));
+    const auto high = integerOf(entry.substr(dots + range.size()));
+    return (!low || isAtMost(*low, *number)) && (!high || isAtMost(*number, *high));
 }
 
 } // namespace
@@ -74,7 +84,7 @@ std::optional<std::string> meaning(const Element& element, const Value& value) {
     auto entry = std::find_if(map.begin(), map.end(), [&](const std::string& e) { return covers(e, value); });
     if (entry == map.end()) {
         // ".." alone stands for every number that no other entry covers.
-        entry = numberOf(value) ? std::find(map.begin(), map.end(), range) : map.end();
+        entry = integerOf(value) ? std::find(map.begin(), map.end(), range) : map.end();
     }
     return entry == map.end() ? std::nullopt : std::optional(texts[static_cast<std::size_t>(entry - map.begin())]);
 }

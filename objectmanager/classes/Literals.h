@@ -32,6 +32,9 @@ std::optional<CMPIType> typeByName(std::string_view name);
 /** The name of a type as declarations write it; "uint16[]" for an array, "reference" and "instance" for those. */
 std::string typeName(CMPIType type);
 
+/** The text without the white space at its ends. */
+std::string_view trimmed(std::string_view text);
+
 bool isInteger(CMPIType type);
 bool isReal(CMPIType type);
 

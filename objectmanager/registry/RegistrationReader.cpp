@@ -1,6 +1,7 @@
 #include "registry/RegistrationReader.h"
 
 #include "classes/Files.h"
+#include "classes/Literals.h"
 #include "classes/MofLexer.h"
 #include "registry/ProviderTypes.h"
 
@@ -16,13 +17,6 @@
 namespace ObjectManager {
 
 namespace {
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view blanks = " \t\r";
-    const std::size_t first = text.find_first_not_of(blanks);
-    return first == std::string_view::npos ? std::string_view()
-                                           : text.substr(first, text.find_last_not_of(blanks) - first + 1);
-}
 
 std::vector<std::string> wordsOf(std::string_view text) {
     std::istringstream stream{std::string(text)};

@@ -9,10 +9,12 @@
 #include <cerrno>
 #include <cstdint>
 #include <ctime>
+#include <initializer_list>
 #include <stdexcept>
 #include <string_view>
 #include <system_error>
 #include <utility>
+#include <vector>
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -93,40 +95,141 @@ void writeAll(const OpenFile& file, const std::filesystem::path& path, std::stri
     }
 }
 
-PowerRequest parseRequest(const std::string& node, const nlohmann::json& value) {
-    const nlohmann::json& request = value.at(requestKey);
-    const auto* const transition = std::ranges::find_if(
-        powerTransitions, [&](const PowerTransition& candidate) { return request == candidate.name; });
-    if (transition == powerTransitions.end()) {
-        throw std::invalid_argument("unknown request " + request.dump() + " of node " + node);
+/**
+ * Reads a state file's text value by value: the destructor of a document allocates memory, and ends the process where
+ * there is none. What the file has beside the requests is ignored.
+ */
+class Reader final : public nlohmann::json_sax<nlohmann::json> {
+public:
+    /** @throws std::invalid_argument where the text is no state file's. */
+    static PowerRequests read(const std::string& text) {
+        Reader reader;
+        nlohmann::json::sax_parse(text, &reader);
+        if (!reader._hasNodes) {
+            throw std::invalid_argument(std::string(nodesKey) + " is missing");
+        }
+        return std::move(reader._requests);
     }
-    const nlohmann::json& over = value.at(overKey);
-    if (!over.is_number_unsigned() || !std::in_range<std::int64_t>(over.get<std::uint64_t>())) {
-        throw std::invalid_argument("time " + over.dump() + " of node " + node + " is not in milliseconds since 1970");
-    }
-    return {transition, TimePoint(std::chrono::milliseconds(over.get<std::int64_t>()))};
-}
 
-/** @throws nlohmann::json::exception or std::invalid_argument where the text is no state file's. */
-PowerRequests parse(const std::string& text) {
-    const nlohmann::json document = nlohmann::json::parse(text);
-    const nlohmann::json& nodes = document.at(nodesKey);
-    if (!nodes.is_object()) {
-        throw std::invalid_argument(std::string(nodesKey) + " is no object");
-    }
-    PowerRequests requests;
-    for (const auto& [node, request] : nodes.items()) {
-        requests.emplace(node, parseRequest(node, request));
-    }
-    return requests;
-}
+    bool null() override { return refuse("null"); }
+    bool boolean(bool value) override { return refuse(value ? "true" : "false"); }
+    bool number_integer(number_integer_t value) override { return refuse(std::to_string(value)); }
+    bool number_float(number_float_t /*value*/, const string_t& text) override { return refuse(text); }
+    bool binary(binary_t& /*value*/) override { return refuse("binary"); }
 
+    bool number_unsigned(number_unsigned_t value) override {
+        if (!isField(overKey) || !std::in_range<std::int64_t>(value)) {
+            return refuse(std::to_string(value));
+        }
+        _over = TimePoint(std::chrono::milliseconds(static_cast<std::int64_t>(value)));
+        return true;
+    }
+
+    bool string(string_t& value) override {
+        if (!isField(requestKey)) {
+            return refuse('"' + value + '"');
+        }
+        const auto* const transition = std::ranges::find(powerTransitions, value, &PowerTransition::name);
+        if (transition == powerTransitions.end()) {
+            return refuse('"' + value + '"');
+        }
+        _transition = transition;
+        return true;
+    }
+
+    bool start_object(std::size_t /*elements*/) override {
+        if (_keys.size() == 3) {
+            refuse("an object");
+        }
+        _hasNodes = _hasNodes || isAt({nodesKey});
+        _keys.emplace_back();
+        return true;
+    }
+
+    bool end_object() override {
+        _keys.pop_back();
+        if (_keys.size() == 2 && _keys.front() == nodesKey) {
+            finishNode(_keys.back());
+        }
+        return true;
+    }
+
+    bool key(string_t& value) override {
+        _keys.back() = value;
+        return true;
+    }
+
+    // An array is a level without a key.
+    bool start_array(std::size_t /*elements*/) override {
+        refuse("an array");
+        _keys.emplace_back();
+        return true;
+    }
+
+    bool end_array() override {
+        _keys.pop_back();
+        return true;
+    }
+
+    bool parse_error(std::size_t /*position*/, const std::string& /*token*/,
+                     const nlohmann::detail::exception& error) override {
+        throw std::invalid_argument(error.what());
+    }
+
+private:
+    bool isAt(std::initializer_list<std::string_view> keys) const { return std::ranges::equal(_keys, keys); }
+
+    /** Whether the value that comes now is this one of a node. */
+    bool isField(std::string_view field) const {
+        return _keys.size() == 3 && _keys.front() == nodesKey && _keys.back() == field;
+    }
+
+    /** Ignores a value where any may stand; true, to go on. */
+    bool refuse(const std::string& found) const {
+        const bool isNode = _keys.size() == 2 && _keys.front() == nodesKey;
+        if (isAt({nodesKey})) {
+            throw std::invalid_argument(std::string(nodesKey) + " is no object");
+        }
+        if (isField(requestKey)) {
+            throw std::invalid_argument("unknown request " + found + " of node " + _keys[1]);
+        }
+        if (isField(overKey)) {
+            throw std::invalid_argument("time " + found + " of node " + _keys[1] +
+                                        " is not in milliseconds since 1970");
+        }
+        if (isNode) {
+            throw std::invalid_argument("node " + _keys[1] + " is no object");
+        }
+        return true;
+    }
+
+    void finishNode(const std::string& node) {
+        if (_transition == nullptr || !_over) {
+            throw std::invalid_argument("node " + node + " lacks " + (_transition == nullptr ? requestKey : overKey));
+        }
+        _requests.insert_or_assign(node, PowerRequest{_transition, *_over});
+        _transition = nullptr;
+        _over.reset();
+    }
+
+    /** The keys that lead to the value that comes now. */
+    std::vector<std::string> _keys;
+    bool _hasNodes = false;
+    const PowerTransition* _transition = nullptr;
+    std::optional<TimePoint> _over;
+    PowerRequests _requests;
+};
+
+/** @throws nlohmann::json::exception where a node's name is not UTF-8. */
 std::string format(const PowerRequests& requests) {
-    nlohmann::json nodes = nlohmann::json::object();
+    std::string text;
     for (const auto& [node, request] : requests) {
-        nodes[node] = {{requestKey, request.transition->name}, {overKey, request.over.time_since_epoch().count()}};
+        text.append(text.empty() ? "\n" : ",\n");
+        text.append("    ").append(nlohmann::json(node).dump()).append(": {\n      \"").append(overKey);
+        text.append("\": ").append(std::to_string(request.over.time_since_epoch().count())).append(",\n      \"");
+        text.append(requestKey).append("\": \"").append(request.transition->name).append("\"\n    }");
     }
-    return nlohmann::json{{nodesKey, nodes}}.dump(2) + '\n';
+    return std::string("{\n  \"") + nodesKey + "\": {" + text + (text.empty() ? "}\n}\n" : "\n  }\n}\n");
 }
 
 /** The first "<file>.damaged-<UTC time>-<number>" that does not exist. */
@@ -236,9 +339,7 @@ StateFile::Content StateFile::load() const {
     content.signature = FileSignature(status);
     const std::string text = readAll(file, _file);
     try {
-        content.requests = std::make_shared<PowerRequests>(parse(text));
-    } catch (const nlohmann::json::exception& error) {
-        content.damage = error.what();
+        content.requests = std::make_shared<PowerRequests>(Reader::read(text));
     } catch (const std::invalid_argument& error) {
         content.damage = error.what();
     }

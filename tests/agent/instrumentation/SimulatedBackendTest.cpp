@@ -178,6 +178,26 @@ TEST_F(Simulated, IsInTheConfiguredStatesAgainOnceTheFileIsRemoved) {
     EXPECT_THAT(powerState(blade1), Optional(12));
 }
 
+TEST_F(Simulated, IgnoresWhatElseIsInItsFile) {
+    writeFile(stateFile, R"({"version": [1, {"nodes": 2}], "nodes": {"system": {"by": ["a", {"over": -1}],
+        "request": "shutdown", "more": {"request": "sleep", "over": null}, "over": 5}}, "comment": {"system": true}})");
+    EXPECT_THAT(powerState(system), Optional(10));
+    EXPECT_THAT(folder.filesThatBegin("state.json."), IsEmpty());
+}
+
+TEST_F(Simulated, WritesItsFileForPeopleAndOtherPrograms) {
+    ASSERT_TRUE(select()->requestPowerState(blade1, 12).accepted);
+    now += 1min;
+    ASSERT_TRUE(select()->requestPowerState(system, 9).accepted);
+    const auto over = [this](std::chrono::milliseconds duration) {
+        return std::to_string((now + duration).time_since_epoch().count());
+    };
+    EXPECT_EQ(contentOf(stateFile),
+              "{\n  \"nodes\": {\n    \"chassis/blade1\": {\n      \"over\": " + over(settings().shutdownTime - 1min) +
+                  ",\n      \"request\": \"shutdown\"\n    },\n    \"system\": {\n      \"over\": " +
+                  over(settings().rebootTime) + ",\n      \"request\": \"reboot\"\n    }\n  }\n}\n");
+}
+
 TEST_F(Simulated, KeepsTheRequestsOfNodesThatItDoesNotHave) {
     writeFile(stateFile, R"({"nodes": {"rack/old": {"request": "shutdown", "over": 5}}})");
     select()->requestPowerState(system, 9);
@@ -244,13 +264,14 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(Damage{"Empty", "", "parse error"}, Damage{"Torn", R"({"nodes": {"sys)", "parse error"},
                     Damage{"NoText", "\xff\xfe", "parse error"},
                     Damage{"NumberTooLarge", R"({"nodes": 1e999})", "number overflow"},
-                    Damage{"OtherType", "[]", "cannot use at()"}, Damage{"NoNodes", "{}", "'nodes' not found"},
+                    Damage{"OtherType", "[]", "nodes is missing"}, Damage{"NoNodes", "{}", "nodes is missing"},
+                    Damage{"NodesElsewhere", R"([{"nodes": {}}])", "nodes is missing"},
                     Damage{"NodesNoObject", R"({"nodes": []})", "nodes is no object"},
-                    Damage{"NodeNoObject", R"({"nodes": {"system": 9}})", "cannot use at()"},
-                    Damage{"NoRequest", R"({"nodes": {"system": {"over": 5}}})", "'request' not found"},
+                    Damage{"NodeNoObject", R"({"nodes": {"system": 9}})", "node system is no object"},
+                    Damage{"NoRequest", R"({"nodes": {"system": {"over": 5}}})", "node system lacks request"},
                     Damage{"UnknownRequest", R"({"nodes": {"system": {"request": "sleep", "over": 5}}})",
                            "unknown request \"sleep\" of node system"},
-                    Damage{"NoTime", R"({"nodes": {"system": {"request": "reboot"}}})", "'over' not found"},
+                    Damage{"NoTime", R"({"nodes": {"system": {"request": "reboot"}}})", "node system lacks over"},
                     Damage{"NegativeTime", R"({"nodes": {"system": {"request": "reboot", "over": -1}}})",
                            "time -1 of node system is not in milliseconds since 1970"},
                     Damage{"FractionOfTime", R"({"nodes": {"system": {"request": "reboot", "over": 0.5}}})",

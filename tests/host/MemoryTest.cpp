@@ -1,0 +1,404 @@
+/**
+ * What becomes of an operation, and of its host, where memory is short: each allocation that the operation makes fails
+ * in turn, once alone and once with all that follow.
+ *
+ * The host's own allocations never fail, nor do those that happen once in a process or a thread: each operation has run
+ * before. Among the latter is the memory that the loader allocates for a library's thread-local variables; where there
+ * is none for it, the loader ends the process.
+ */
+#include "broker.h"
+
+#include "agent/TestSupport.h"
+
+#include "cmpimacs.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cstddef>
+#include <cstdint>
+#include <exception>
+#include <functional>
+#include <new>
+#include <string>
+#include <vector>
+
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+extern "C" {
+void* __libc_malloc(std::size_t size);
+void* __libc_calloc(std::size_t count, std::size_t size);
+void* __libc_realloc(void* memory, std::size_t size);
+void* __libc_memalign(std::size_t alignment, std::size_t size);
+
+extern const char __executable_start;
+extern const char etext;
+}
+
+namespace {
+
+/** What is to happen to the allocations of this thread. */
+struct Shortage {
+    bool counting = false;
+    unsigned int allocations = 0;
+    /** The number of the allocation that fails; 0 for none. */
+    unsigned int first = 0;
+    bool allThatFollow = false;
+};
+
+constinit thread_local Shortage shortage;
+
+/** Whether an allocation that is asked for at an address is to fail. */
+bool fails(const void* caller) {
+    const auto address = reinterpret_cast<std::uintptr_t>(caller);
+    const bool isHost = address >= reinterpret_cast<std::uintptr_t>(&__executable_start) &&
+                        address < reinterpret_cast<std::uintptr_t>(&etext);
+    if (!shortage.counting || isHost) {
+        return false;
+    }
+    const unsigned int number = ++shortage.allocations;
+    const bool failing =
+        shortage.first != 0 && (number == shortage.first || (shortage.allThatFollow && number > shortage.first));
+    if (failing) {
+        errno = ENOMEM;
+    }
+    return failing;
+}
+
+} // namespace
+
+/* The allocator of the whole process. */
+extern "C" {
+
+void* malloc(std::size_t size) {
+    return fails(__builtin_return_address(0)) ? nullptr : __libc_malloc(size);
+}
+
+void* calloc(std::size_t count, std::size_t size) {
+    return fails(__builtin_return_address(0)) ? nullptr : __libc_calloc(count, size);
+}
+
+void* realloc(void* memory, std::size_t size) {
+    return fails(__builtin_return_address(0)) ? nullptr : __libc_realloc(memory, size);
+}
+
+void* aligned_alloc(std::size_t alignment, std::size_t size) {
+    return fails(__builtin_return_address(0)) ? nullptr : __libc_memalign(alignment, size);
+}
+}
+
+namespace {
+
+CMPIInstanceMI* computerSystem = nullptr;
+
+CMPIStatus computerSystemNames(const CMPIBroker*, const CMPIContext* context, const CMPIObjectPath* path,
+                               CMPIResult* result) {
+    return computerSystem->ft->enumerateInstanceNames(computerSystem, context, result, path);
+}
+
+CMPIStatus computerSystems(const CMPIBroker*, const CMPIContext* context, const CMPIObjectPath* path,
+                           CMPIResult* result) {
+    return computerSystem->ft->enumerateInstances(computerSystem, context, result, path, nullptr);
+}
+
+/** The provider libraries in this process, and the broker that they use. */
+class Host {
+public:
+    static const Host& instance() {
+        static const Host host;
+        return host;
+    }
+
+    const CMPIBroker* broker = newBroker(knownTables, computerSystemNames, computerSystems);
+
+    template <typename MI>
+    MI* provider(const std::string& name, const std::string& kind) const {
+        return create<MI>(_provider, name, kind);
+    }
+
+    CMPIObjectPath* path(const std::string& className) const {
+        return CMNewObjectPath(broker, "root/cimv2", ("TALVO_" + className).c_str(), nullptr);
+    }
+
+private:
+    Host() { computerSystem = create<CMPIInstanceMI>(load(ORV_COMPUTERSYSTEM_LIBRARY), "ComputerSystem", "Instance"); }
+
+    static void* load(const char* file) {
+        void* const library = dlopen(file, RTLD_NOW);
+        if (library == nullptr) {
+            throw std::runtime_error(dlerror());
+        }
+        return library;
+    }
+
+    template <typename MI>
+    MI* create(void* library, const std::string& name, const std::string& kind) const {
+        const std::string factory = name + "Provider_Create_" + kind + "MI";
+        using Create = MI*(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
+        auto* const create = reinterpret_cast<Create*>(dlsym(library, factory.c_str()));
+        if (create == nullptr) {
+            throw std::runtime_error(dlerror());
+        }
+        return create(broker, nullptr, nullptr);
+    }
+
+    void* _provider = load(ORV_PROVIDER_LIBRARY);
+};
+
+/** One request: everything that the operation needs is made before, and the call is all that may lack memory. */
+using Call = std::function<CMPIStatus()>;
+using Request = std::function<Call(CMPIResult* result)>;
+
+struct Operation {
+    std::string name;
+    Request request;
+    /** Whether it closes its result where it did what was asked. */
+    bool closes = true;
+};
+
+/** How a request ended. */
+struct Outcome {
+    bool threw = false;
+    CMPIrc code = CMPI_RC_OK;
+    bool closed = false;
+    std::string text;
+    unsigned int allocations = 0;
+};
+
+Outcome run(const Operation& operation, unsigned int failing, bool allThatFollow) {
+    beginRequest();
+    Outcome outcome;
+    CMPIResult* const result = newResult(Host::instance().broker);
+    const Call call = operation.request(result);
+    shortage = {.counting = true, .first = failing, .allThatFollow = allThatFollow};
+    try {
+        outcome.code = call().rc;
+    } catch (const std::exception&) {
+        outcome.threw = true;
+    }
+    shortage.counting = false;
+    outcome.allocations = shortage.allocations;
+    outcome.closed = isClosed(result) != 0;
+    outcome.text = returnedText(result);
+    endRequest();
+    return outcome;
+}
+
+/** What has been written to standard error since it was asked last. Standard error is a file from the first time on. */
+class StandardError {
+public:
+    explicit StandardError(const std::string& file) : _file(open(file.c_str(), O_RDWR | O_CREAT | O_APPEND, 0600)) {
+        dup2(_file, STDERR_FILENO);
+    }
+
+    std::string text() {
+        std::string text;
+        char chunk[4096];
+        for (ssize_t size = 0; (size = pread(_file, chunk, sizeof chunk, _read)) > 0; _read += size) {
+            text.append(chunk, static_cast<std::size_t>(size));
+        }
+        return text;
+    }
+
+private:
+    int _file;
+    off_t _read = 0;
+};
+
+/** The allocation that fails now, where the parent of the process sees it. */
+struct Progress {
+    unsigned int failing;
+    bool allThatFollow;
+    unsigned int allocations;
+    /** What was wrong, where anything was. */
+    char complaint[4096];
+};
+
+void complain(Progress& progress, const std::string& text) {
+    text.copy(progress.complaint, sizeof progress.complaint - 1);
+    _exit(EXIT_FAILURE);
+}
+
+/** Lets each allocation of an operation fail; ends the process at the first that has another outcome than it should. */
+void failEachAllocation(const Operation& operation, Progress& progress, const std::string& errors) {
+    const Outcome usual = (run(operation, 0, false), run(operation, 0, false));
+    if (usual.threw || usual.code != CMPI_RC_OK || usual.text.empty() || usual.closed != operation.closes) {
+        complain(progress, "the operation does not do with enough memory what it should: " + usual.text);
+    }
+    StandardError standardError(errors);
+    for (const bool allThatFollow : {false, true}) {
+        progress.allThatFollow = allThatFollow;
+        for (progress.failing = 1;; ++progress.failing) {
+            const Outcome outcome = run(operation, progress.failing, allThatFollow);
+            if (outcome.allocations < progress.failing) {
+                break;
+            }
+            progress.allocations = progress.failing;
+            const std::string reported = standardError.text();
+            const bool failed = outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed;
+            // What nobody needs for the answer, such as a record of the log, may be lacking; and where the provider has
+            // to leave out what it could not read, it has to say so.
+            if (!failed && outcome.text != usual.text && reported.find("bad_alloc") == std::string::npos &&
+                reported.find(" log 6000 ") == std::string::npos) {
+                complain(progress, "the operation succeeded and returned\n" + outcome.text + "instead of\n" +
+                                       usual.text + "and reported only: " + reported);
+            }
+            const Outcome next = run(operation, 0, false);
+            if (next.threw || next.code != CMPI_RC_OK || next.closed != usual.closed || next.text != usual.text) {
+                complain(progress, "the next operation returned\n" + next.text + "instead of\n" + usual.text);
+            }
+            standardError.text();
+        }
+    }
+    _exit(EXIT_SUCCESS);
+}
+
+class MemoryShortage : public testing::TestWithParam<Operation> {
+protected:
+    MemoryShortage() {
+        AgentTest::writeFile(folder / "agent.toml", "[system]\nname = \"host.example\"\n"
+                                                    "[instrumentation.simulated]\nstate-file = \"" +
+                                                        (folder / "machine.json").string() +
+                                                        "\"\nreboot-time = 0\nshutdown-time = 0\n");
+        setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
+    }
+
+    AgentTest::TemporaryFolder folder;
+    Progress& progress = *static_cast<Progress*>(
+        mmap(nullptr, sizeof(Progress), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0));
+};
+
+TEST_P(MemoryShortage, EndsTheOperationAndNotTheHost) {
+    const pid_t host = fork();
+    ASSERT_GE(host, 0);
+    if (host == 0) {
+        failEachAllocation(GetParam(), progress, (folder / "errors").string());
+    }
+    int status = 0;
+    ASSERT_EQ(waitpid(host, &status, 0), host);
+    const std::string place = "allocation " + std::to_string(progress.failing) +
+                              (progress.allThatFollow ? " and all that follow" : "") + " failed";
+    EXPECT_TRUE(WIFEXITED(status)) << place << ", and the host ended by signal " << WTERMSIG(status) << '\n'
+                                   << AgentTest::contentOf(folder / "errors");
+    EXPECT_EQ(WEXITSTATUS(status), EXIT_SUCCESS) << place << ": " << progress.complaint;
+    EXPECT_GT(progress.allocations, 0U);
+}
+
+/* The operations */
+
+const char* const classes[] = {"PowerManagementService", "PowerManagementCapabilities",
+                               "AssociatedPowerManagementService", "PowerManagementElementCapabilities",
+                               "PowerManagementHostedService"};
+
+CMPIInstanceMI* instanceProvider(const std::string& className) {
+    const Host& host = Host::instance();
+    return className == "ComputerSystem" ? computerSystem : host.provider<CMPIInstanceMI>(className, "Instance");
+}
+
+/** The path of a class's first instance. */
+CMPIObjectPath* firstOf(const std::string& className) {
+    const Host& host = Host::instance();
+    CMPIInstanceMI* const mi = instanceProvider(className);
+    CMPIResult* const names = newResult(host.broker);
+    mi->ft->enumerateInstanceNames(mi, newContext(host.broker), names, host.path(className));
+    std::size_t count = 0;
+    CMPIObjectPath** const paths = returnedPaths(names, &count);
+    return count == 0 ? nullptr : paths[0];
+}
+
+void addInstanceOperations(std::vector<Operation>& operations, const std::string& className) {
+    const auto enumerated = [className](auto member) -> Request {
+        return [=](CMPIResult* result) -> Call {
+            const Host& host = Host::instance();
+            CMPIInstanceMI* const mi = instanceProvider(className);
+            const CMPIContext* const context = newContext(host.broker);
+            const CMPIObjectPath* const path = host.path(className);
+            return [=] { return member(mi, context, result, path); };
+        };
+    };
+    operations.push_back({className + "_EnumInstanceNames", enumerated([](auto* mi, auto... arguments) {
+                              return mi->ft->enumerateInstanceNames(mi, arguments...);
+                          })});
+    operations.push_back({className + "_EnumInstances", enumerated([](auto* mi, auto... arguments) {
+                              return mi->ft->enumerateInstances(mi, arguments..., nullptr);
+                          })});
+    operations.push_back({className + "_GetInstance", [className](CMPIResult* result) -> Call {
+                              CMPIInstanceMI* const mi = instanceProvider(className);
+                              const CMPIContext* const context = newContext(Host::instance().broker);
+                              const CMPIObjectPath* const path = firstOf(className);
+                              return [=] { return mi->ft->getInstance(mi, context, result, path, nullptr); };
+                          }});
+}
+
+void addTraversals(std::vector<Operation>& operations, const std::string& className, const std::string& source) {
+    const auto traversal = [=](auto call) -> Request {
+        return [=](CMPIResult* result) -> Call {
+            const Host& host = Host::instance();
+            auto* const mi = host.provider<CMPIAssociationMI>(className, "Association");
+            const CMPIContext* const context = newContext(host.broker);
+            const CMPIObjectPath* const path = firstOf(source);
+            return [=] { return call(mi, context, result, path); };
+        };
+    };
+    const std::string from = "_from_" + source;
+    operations.push_back({className + "_AssociatorNames" + from, traversal([](auto* mi, auto... arguments) {
+                              return mi->ft->associatorNames(mi, arguments..., nullptr, nullptr, nullptr, nullptr);
+                          }),
+                          false});
+    operations.push_back({className + "_Associators" + from, traversal([](auto* mi, auto... arguments) {
+                              return mi->ft->associators(mi, arguments..., nullptr, nullptr, nullptr, nullptr, nullptr);
+                          }),
+                          false});
+    operations.push_back({className + "_ReferenceNames" + from, traversal([](auto* mi, auto... arguments) {
+                              return mi->ft->referenceNames(mi, arguments..., nullptr, nullptr);
+                          }),
+                          false});
+    operations.push_back({className + "_References" + from, traversal([](auto* mi, auto... arguments) {
+                              return mi->ft->references(mi, arguments..., nullptr, nullptr, nullptr);
+                          }),
+                          false});
+}
+
+Operation powerRequest(const std::string& name, CMPIUint16 state) {
+    return {name, [state](CMPIResult* result) -> Call {
+                const Host& host = Host::instance();
+                auto* const mi = host.provider<CMPIMethodMI>("PowerManagementService", "Method");
+                const CMPIContext* const context = newContext(host.broker);
+                const CMPIObjectPath* const path = firstOf("PowerManagementService");
+                CMPIArgs* const arguments = newArguments(host.broker);
+                const CMPIValue powerState = {.uint16 = state};
+                const CMPIValue element = {.ref = firstOf("ComputerSystem")};
+                CMAddArg(arguments, "PowerState", &powerState, CMPI_uint16);
+                CMAddArg(arguments, "ManagedElement", &element, CMPI_ref);
+                return [=] {
+                    return mi->ft->invokeMethod(mi, context, result, path, "RequestPowerStateChange", arguments,
+                                                nullptr);
+                };
+            }};
+}
+
+std::vector<Operation> operations() {
+    std::vector<Operation> operations;
+    for (const char* className : classes) {
+        addInstanceOperations(operations, className);
+    }
+    addInstanceOperations(operations, "ComputerSystem");
+    for (const char* className : {"AssociatedPowerManagementService", "PowerManagementHostedService"}) {
+        addTraversals(operations, className, "PowerManagementService");
+        addTraversals(operations, className, "ComputerSystem");
+    }
+    addTraversals(operations, "PowerManagementElementCapabilities", "PowerManagementService");
+    addTraversals(operations, "PowerManagementElementCapabilities", "PowerManagementCapabilities");
+    operations.push_back(powerRequest("Reboot", 5));
+    operations.push_back(powerRequest("Shutdown", 8));
+    return operations;
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, MemoryShortage, testing::ValuesIn(operations()),
+                         [](const auto& test) { return test.param.name; });
+
+} // namespace

@@ -38,12 +38,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     static Dispatcher dispatcher(registryWithoutProviders(), {{}, &catalogue, nullptr});
     static CimXml::Service service(dispatcher, catalogue);
 
-    const CimXml::WireCase given = CimXml::readWireCase({reinterpret_cast<const char*>(data), size});
-    const CimXml::HttpReply reply = service.answer(given.request(), given.caller);
-    if (reply.status == 200) {
-        CimXml::parseMarkup(reply.body);
-    } else if (reply.status == 500) {
-        fail(reply);
+    for (const CimXml::WireCase& given : CimXml::readWireCases({reinterpret_cast<const char*>(data), size})) {
+        const CimXml::HttpReply reply = service.answer(given.request(), given.caller);
+        if (reply.status == 200) {
+            CimXml::parseMarkup(reply.body);
+        } else if (reply.status == 500) {
+            fail(reply);
+        }
     }
     return 0;
 }

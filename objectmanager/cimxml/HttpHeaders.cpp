@@ -75,23 +75,19 @@ std::optional<std::string> numberOf(std::string_view declaration) {
                                                                      : std::nullopt;
 }
 
-/** Resolves the "%41" in a header value. */
-std::string decoded(std::string_view value, std::string_view header) {
+/** Resolves the "%41" in a header value. A '%' without two hexadecimal digits stands for itself. */
+std::string decoded(std::string_view value) {
     std::string text;
     for (std::size_t i = 0; i < value.size(); ++i) {
-        if (value[i] != '%') {
-            text += value[i];
-            continue;
-        }
         const std::string_view digits = value.substr(i + 1, 2);
         unsigned char byte = 0;
         const auto [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), byte, 16);
-        if (error != std::errc() || digits.size() != 2 || end != digits.data() + digits.size()) {
-            throw headerMismatch("found '%' in the header " + std::string(header) +
-                                 ", expected two hexadecimal digits behind it");
+        if (value[i] == '%' && digits.size() == 2 && error == std::errc() && end == digits.data() + digits.size()) {
+            text += static_cast<char>(byte);
+            i += digits.size();
+        } else {
+            text += value[i];
         }
-        text += static_cast<char>(byte);
-        i += digits.size();
     }
     return text;
 }
@@ -229,7 +225,7 @@ void RequestHeaders::checkAgainst(const Message& message) const {
                              message.protocolVersion() + "\" as in the body");
     }
     const std::string* method = findOwn("CIMMethod");
-    if (method == nullptr || !equalNames(trimmed(decoded(*method, "CIMMethod")), message.method())) {
+    if (method == nullptr || !equalNames(trimmed(decoded(*method)), message.method())) {
         throw headerMismatch(
             (method == nullptr ? "found no header CIMMethod" : "found the CIMMethod \"" + *method + '"') +
             ", expected \"" + message.method() + "\" as in the body");
@@ -240,7 +236,7 @@ void RequestHeaders::checkAgainst(const Message& message) const {
 /** The namespace must be the same and, where a class's method is called, the class. */
 void RequestHeaders::checkObject(const Message& message) const {
     const std::string* object = findOwn("CIMObject");
-    const std::string path = object == nullptr ? std::string() : decoded(*object, "CIMObject");
+    const std::string path = object == nullptr ? std::string() : decoded(*object);
     std::string_view nameSpace = trimmed(path);
     nameSpace.remove_prefix(nameSpace.starts_with('/') ? 1 : 0);
     std::string_view className;
@@ -275,10 +271,11 @@ std::string RequestHeaders::host() const {
     return host == nullptr ? std::string() : *host;
 }
 
-std::vector<std::pair<std::string, std::string>> RequestHeaders::ofAnswer() const {
+std::vector<std::pair<std::string, std::string>> RequestHeaders::ofAnswer(std::chrono::microseconds taken) const {
     std::vector<std::pair<std::string, std::string>> headers = extensionHeaders(replyPrefix());
     headers.emplace_back("Content-Type", replyType());
     headers.emplace_back(replyPrefix() + "CIMOperation", "MethodResponse");
+    headers.emplace_back(replyPrefix() + "WBEMServerResponseTime", std::to_string(taken.count()));
     return headers;
 }
 

@@ -6,6 +6,7 @@
 #include "cimxml/RequestReader.h"
 #include "cimxml/Service.h"
 
+#include <chrono>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -38,8 +39,8 @@ public:
     /** What the names of CIM's headers in the reply begin with, "73-"; empty for POST. */
     std::string replyPrefix() const { return _extended ? _prefix : std::string(); }
 
-    /** The headers of a reply that is a CIM document. */
-    std::vector<std::pair<std::string, std::string>> ofAnswer() const;
+    /** The headers of a reply that is a CIM document, and took some time to make. */
+    std::vector<std::pair<std::string, std::string>> ofAnswer(std::chrono::microseconds taken) const;
 
 private:
     /** The entries of all headers of that name, whose values are lists. */

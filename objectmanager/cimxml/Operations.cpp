@@ -1,139 +1,15 @@
 #include "cimxml/Operations.h"
 
 #include "agentlog/AgentLog.h"
-#include "cimxml/Parameters.h"
+#include "cimxml/ClassAssociations.h"
+#include "cimxml/IntrinsicCall.h"
+#include "cimxml/PullOperations.h"
 
 #include <algorithm>
-#include <array>
 
 namespace ObjectManager::CimXml {
 
 namespace {
-
-/** An intrinsic method that is being answered. */
-struct Call {
-    const Operation& operation;
-    const Parameters& parameters;
-
-    Dispatcher& dispatcher() const { return operation.dispatcher; }
-    const Catalogue& catalogue() const { return operation.catalogue; }
-    const std::string& nameSpace() const { return operation.message.nameSpace(); }
-    ResponseWriter& writer() const { return operation.writer; }
-
-    Invocation invocation() const {
-        Invocation invocation;
-        invocation.principal = operation.caller.user;
-        invocation.flags = (parameters.flag("IncludeClassOrigin", false) ? CMPI_FLAG_IncludeClassOrigin : 0) |
-                           (parameters.flag("DeepInheritance", true) ? CMPI_FLAG_DeepInheritance : 0);
-        return invocation;
-    }
-};
-
-/* What classes there are. */
-
-bool isRegistered(const Operation& operation, std::string_view className) {
-    const auto& registrations = operation.dispatcher.registry().registrations();
-    return std::any_of(registrations.begin(), registrations.end(), [&](const Registration& registration) {
-        return equalNames(registration.className, className) && registration.isIn(operation.message.nameSpace());
-    });
-}
-
-CimError unknownClass(const std::string& className, CMPIrc code = CMPI_RC_ERR_INVALID_CLASS) {
-    return {code, "there is no class " + className};
-}
-
-/** Throws where nobody serves instances of the class itself, so that there is none. */
-void requireServed(const Operation& operation, const std::string& className) {
-    if (!isRegistered(operation, className)) {
-        throw operation.catalogue.find(className) == nullptr
-            ? unknownClass(className)
-            : CimError(CMPI_RC_ERR_NOT_FOUND, "no provider serves instances of the class " + className);
-    }
-}
-
-/** The failure of one class's provider in an enumeration of an ancestor, named by the class. */
-CimError failureOf(const std::string& className, const CimError& error) {
-    CimError failure(error.code, className + ": " + error.what());
-    failure.reasons = error.reasons;
-    return failure;
-}
-
-/** Calls for each class that is the one named or descends from it, and has a provider of instances. */
-template <class Do>
-void forEachServed(const Call& call, const ObjectPath& classPath, Do doWith) {
-    bool served = false;
-    for (const Registration* registration :
-         call.dispatcher().registry().all(classPath.nameSpace, ProviderKind::instance)) {
-        if (call.catalogue().isA(registration->className, classPath.className)) {
-            served = true;
-            ObjectPath path = classPath;
-            path.className = registration->className;
-            try {
-                doWith(path);
-            } catch (const CimError& error) {
-                if (equalNames(path.className, classPath.className)) {
-                    throw;
-                }
-                throw failureOf(path.className, error);
-            }
-        }
-    }
-    // Nobody having to serve it, a class that is declared has no instances.
-    if (!served &&
-        (isRegistered(call.operation, classPath.className) || call.catalogue().find(classPath.className) == nullptr)) {
-        call.dispatcher().registry().find(classPath.nameSpace, classPath.className, ProviderKind::instance);
-    }
-}
-
-/** Throws `unknown` where there is no such class: where the class itself is asked for, DSP0200 has another code. */
-const Class& declaredClass(const Call& call, const std::string& className, CMPIrc unknown = CMPI_RC_ERR_INVALID_CLASS) {
-    const Class* declared = call.catalogue().find(className);
-    if (declared == nullptr) {
-        throw unknownClass(className, unknown);
-    }
-    return *declared;
-}
-
-/* What of them is asked for. */
-
-/**
- * What a provider is asked for: the properties as the class spells them, without those that it does not have, and with
- * its keys, lest instances lose their paths.
- */
-PropertyList askedOfProvider(const Call& call, const PropertyList& properties, const std::string& className) {
-    const Class* declared = call.catalogue().find(className);
-    if (!properties || declared == nullptr) {
-        return properties;
-    }
-    const auto keys = call.catalogue().keyNames(className);
-    PropertyList asked(std::in_place, keys.begin(), keys.end());
-    for (const std::string& name : *properties) {
-        const Property* property = declared->property(name);
-        if (property != nullptr && !property->isKey()) {
-            asked->push_back(property->name);
-        }
-    }
-    return asked;
-}
-
-/** Of instances. LocalOnly and IncludeQualifiers, which are deprecated for them, are always taken as false. */
-Selection selectionOfInstances(const Call& call) {
-    call.parameters.flag("LocalOnly", true);
-    call.parameters.flag("IncludeQualifiers", false);
-    Selection selection;
-    selection.properties = call.parameters.propertyList();
-    selection.classOrigin = call.parameters.flag("IncludeClassOrigin", false);
-    return selection;
-}
-
-Selection selectionOfClasses(const Call& call) {
-    Selection selection;
-    selection.properties = call.parameters.propertyList();
-    selection.localOnly = call.parameters.flag("LocalOnly", true);
-    selection.qualifiers = call.parameters.flag("IncludeQualifiers", true);
-    selection.classOrigin = call.parameters.flag("IncludeClassOrigin", false);
-    return selection;
-}
 
 /* The methods, in the order of their table. */
 
@@ -149,56 +25,55 @@ void getInstance(const Call& call) {
 }
 
 void enumerateInstances(const Call& call) {
-    const ObjectPath classPath = call.parameters.className("ClassName");
-    Selection selection = selectionOfInstances(call);
-    if (!call.parameters.flag("DeepInheritance", true)) {
-        selection.within = call.catalogue().find(classPath.className);
-    }
+    const Selection selection = selectionOfEnumeration(call);
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachServed(call, classPath, [&](const ObjectPath& path) {
-        const PropertyList properties = askedOfProvider(call, selection.properties, path.className);
-        call.dispatcher().enumerateInstances(call.invocation(), path, properties, [&](Instance&& instance) {
-            call.writer().namedInstance(instance, selection);
-        });
-    });
+    forEachInstance(call, selection, [&](Instance&& instance) { call.writer().namedInstance(instance, selection); });
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
 void enumerateInstanceNames(const Call& call) {
-    const ObjectPath classPath = call.parameters.className("ClassName");
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachServed(call, classPath, [&](const ObjectPath& path) {
-        call.dispatcher().enumerateInstanceNames(call.invocation(), path,
-                                                 [&](ObjectPath&& name) { call.writer().instanceName(name); });
-    });
+    forEachInstanceName(call, [&](ObjectPath&& name) { call.writer().instanceName(name); });
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
-/** The source of a walk. Between classes there is none. */
-ObjectPath source(const Call& call) {
-    ObjectPath path = call.parameters.objectName("ObjectName");
-    if (path.keys.empty()) {
-        declaredClass(call, path.className);
-        throw CimError(CMPI_RC_ERR_NOT_SUPPORTED,
-                       "found the class " + path.className + " as ObjectName, expected an instance: " +
-                           call.operation.message.method() + " is not supported between classes");
+/* Associations between classes are those that their declarations allow. */
+
+/** The class that ObjectName names, and the filter's classes are declared. */
+const Class& sourceClass(const Call& call, const AssociationFilter& filter) {
+    for (const std::string& className : {filter.associationClass, filter.resultClass}) {
+        if (!className.empty()) {
+            declaredClass(call, className, CMPI_RC_ERR_INVALID_PARAMETER);
+        }
     }
-    return path;
+    return declaredClass(call, call.parameters.className("ObjectName").className, CMPI_RC_ERR_INVALID_PARAMETER);
 }
 
-AssociationFilter associatorFilter(const Call& call) {
-    return {call.parameters.optionalClassName("AssocClass"), call.parameters.optionalClassName("ResultClass"),
-            call.parameters.optionalText("Role"), call.parameters.optionalText("ResultRole")};
+void writeClasses(const Call& call, const std::vector<const Class*>& classes) {
+    const Selection selection = selectionOfClasses(call, false, false);
+    call.writer().raw("<IRETURNVALUE>\n");
+    for (const Class* declared : classes) {
+        call.writer().classWithPath(*declared, selection);
+    }
+    call.writer().raw("</IRETURNVALUE>\n");
 }
 
-AssociationFilter referenceFilter(const Call& call) {
-    return {call.parameters.optionalClassName("ResultClass"), {}, call.parameters.optionalText("Role"), {}};
+void writeClassPaths(const Call& call, const std::vector<const Class*>& classes) {
+    call.writer().raw("<IRETURNVALUE>\n");
+    for (const Class* declared : classes) {
+        call.writer().classObjectPath(declared->name);
+    }
+    call.writer().raw("</IRETURNVALUE>\n");
 }
 
 void associators(const Call& call) {
+    if (call.parameters.isClassName("ObjectName")) {
+        const AssociationFilter filter = associatorFilter(call);
+        return writeClasses(call, associatorsOfClass(call.catalogue(), sourceClass(call, filter), filter));
+    }
     const Selection selection = selectionOfInstances(call);
-    const auto found =
-        call.dispatcher().associators(call.invocation(), source(call), associatorFilter(call), selection.properties);
+    const auto found = call.dispatcher().associators(call.invocation(), call.parameters.instanceName("ObjectName"),
+                                                     associatorFilter(call), selection.properties);
     call.writer().raw("<IRETURNVALUE>\n");
     for (const auto& [associationClass, instances] : found) {
         for (const Instance& instance : instances) {
@@ -209,7 +84,12 @@ void associators(const Call& call) {
 }
 
 void associatorNames(const Call& call) {
-    const auto found = call.dispatcher().associatorNames(call.invocation(), source(call), associatorFilter(call));
+    if (call.parameters.isClassName("ObjectName")) {
+        const AssociationFilter filter = associatorFilter(call);
+        return writeClassPaths(call, associatorsOfClass(call.catalogue(), sourceClass(call, filter), filter));
+    }
+    const auto found = call.dispatcher().associatorNames(call.invocation(), call.parameters.instanceName("ObjectName"),
+                                                         associatorFilter(call));
     call.writer().raw("<IRETURNVALUE>\n");
     for (const auto& [associationClass, paths] : found) {
         for (const ObjectPath& path : paths) {
@@ -220,10 +100,12 @@ void associatorNames(const Call& call) {
 }
 
 void references(const Call& call) {
+    if (call.parameters.isClassName("ObjectName")) {
+        const AssociationFilter filter = referenceFilter(call);
+        return writeClasses(call, referencesOfClass(call.catalogue(), sourceClass(call, filter), filter));
+    }
     const Selection selection = selectionOfInstances(call);
-    // With all properties, since the paths of associations are made of some.
-    const auto found =
-        call.dispatcher().references(call.invocation(), source(call), referenceFilter(call), std::nullopt);
+    const auto found = referencesOf(call, call.parameters.instanceName("ObjectName"));
     call.writer().raw("<IRETURNVALUE>\n");
     for (const Instance& instance : found) {
         call.writer().objectWithPath(instance, selection);
@@ -232,7 +114,12 @@ void references(const Call& call) {
 }
 
 void referenceNames(const Call& call) {
-    const auto found = call.dispatcher().referenceNames(call.invocation(), source(call), referenceFilter(call));
+    if (call.parameters.isClassName("ObjectName")) {
+        const AssociationFilter filter = referenceFilter(call);
+        return writeClassPaths(call, referencesOfClass(call.catalogue(), sourceClass(call, filter), filter));
+    }
+    const auto found = call.dispatcher().referenceNames(call.invocation(), call.parameters.instanceName("ObjectName"),
+                                                        referenceFilter(call));
     call.writer().raw("<IRETURNVALUE>\n");
     for (const ObjectPath& path : found) {
         call.writer().objectPath(path);
@@ -329,7 +216,7 @@ void execQuery(const Call& call) {
 }
 
 void getClass(const Call& call) {
-    const Selection selection = selectionOfClasses(call);
+    const Selection selection = selectionOfClasses(call, true, true);
     const Class& declared =
         declaredClass(call, call.parameters.className("ClassName").className, CMPI_RC_ERR_NOT_FOUND);
     call.writer().raw("<IRETURNVALUE>\n");
@@ -356,7 +243,7 @@ std::vector<const Class*> classesBelow(const Call& call) {
 }
 
 void enumerateClasses(const Call& call) {
-    const Selection selection = selectionOfClasses(call);
+    const Selection selection = selectionOfClasses(call, true, true);
     const std::vector<const Class*> classes = classesBelow(call);
     call.writer().raw("<IRETURNVALUE>\n");
     for (const Class* declared : classes) {
@@ -407,6 +294,39 @@ constexpr IntrinsicMethod intrinsicMethods[] = {
      {"ObjectName", "ResultClass", "Role", "IncludeQualifiers", "IncludeClassOrigin", "PropertyList"},
      references},
     {"ReferenceNames", Access::read, {"ObjectName", "ResultClass", "Role"}, referenceNames},
+    {"OpenEnumerateInstances",
+     Access::read,
+     {"ClassName", "DeepInheritance", "IncludeClassOrigin", "PropertyList", "FilterQueryLanguage", "FilterQuery",
+      "OperationTimeout", "ContinueOnError", "MaxObjectCount"},
+     openEnumerateInstances},
+    {"OpenEnumerateInstancePaths",
+     Access::read,
+     {"ClassName", "FilterQueryLanguage", "FilterQuery", "OperationTimeout", "ContinueOnError", "MaxObjectCount"},
+     openEnumerateInstancePaths},
+    {"OpenAssociatorInstances",
+     Access::read,
+     {"InstanceName", "AssocClass", "ResultClass", "Role", "ResultRole", "IncludeClassOrigin", "PropertyList",
+      "FilterQueryLanguage", "FilterQuery", "OperationTimeout", "ContinueOnError", "MaxObjectCount"},
+     openAssociatorInstances},
+    {"OpenAssociatorInstancePaths",
+     Access::read,
+     {"InstanceName", "AssocClass", "ResultClass", "Role", "ResultRole", "FilterQueryLanguage", "FilterQuery",
+      "OperationTimeout", "ContinueOnError", "MaxObjectCount"},
+     openAssociatorInstancePaths},
+    {"OpenReferenceInstances",
+     Access::read,
+     {"InstanceName", "ResultClass", "Role", "IncludeClassOrigin", "PropertyList", "FilterQueryLanguage", "FilterQuery",
+      "OperationTimeout", "ContinueOnError", "MaxObjectCount"},
+     openReferenceInstances},
+    {"OpenReferenceInstancePaths",
+     Access::read,
+     {"InstanceName", "ResultClass", "Role", "FilterQueryLanguage", "FilterQuery", "OperationTimeout",
+      "ContinueOnError", "MaxObjectCount"},
+     openReferenceInstancePaths},
+    {"PullInstancesWithPath", Access::read, {"EnumerationContext", "MaxObjectCount"}, pullInstancesWithPath},
+    {"PullInstancePaths", Access::read, {"EnumerationContext", "MaxObjectCount"}, pullInstancePaths},
+    {"CloseEnumeration", Access::read, {"EnumerationContext"}, closeEnumeration},
+    {"EnumerationCount", Access::read, {"EnumerationContext"}, enumerationCount},
     {"GetProperty", Access::read, {"InstanceName", "PropertyName"}, getProperty},
     {"SetProperty", Access::change, {"InstanceName", "PropertyName", "NewValue"}, setProperty},
     {"CreateInstance", Access::change, {"NewInstance"}, createInstance},

@@ -2,6 +2,7 @@
 #ifndef CIMXML_OPERATIONS_H
 #define CIMXML_OPERATIONS_H
 
+#include "cimxml/Enumerations.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/ResponseWriter.h"
 #include "cimxml/Service.h"
@@ -15,6 +16,7 @@ struct Operation {
     const Message& message;
     const Caller& caller;
     ResponseWriter& writer;
+    Enumerations& enumerations;
 };
 
 /**

@@ -61,6 +61,20 @@ bool Parameters::flag(std::string_view name, bool otherwise) const {
                             : std::get<bool>(_reader.value(*found, CMPI_boolean, std::string(name)).content);
 }
 
+std::optional<std::uint32_t> Parameters::optionalNumber(std::string_view name) const {
+    const XmlElement* const found = optional(name, {"VALUE"});
+    if (found == nullptr) {
+        return std::nullopt;
+    }
+    const Value value = _reader.value(*found, CMPI_uint32, std::string(name));
+    return static_cast<std::uint32_t>(std::get<std::uint64_t>(value.content));
+}
+
+std::uint32_t Parameters::number(std::string_view name) const {
+    required(name, {"VALUE"});
+    return *optionalNumber(name);
+}
+
 std::string Parameters::text(std::string_view name) const {
     return required(name, {"VALUE"}).text;
 }
@@ -83,9 +97,8 @@ ObjectPath Parameters::instanceName(std::string_view name) const {
     return _reader.instanceName(required(name, {"INSTANCENAME"}));
 }
 
-ObjectPath Parameters::objectName(std::string_view name) const {
-    const XmlElement& found = required(name, {"INSTANCENAME", "CLASSNAME"});
-    return found.name == "CLASSNAME" ? _reader.className(found) : _reader.instanceName(found);
+bool Parameters::isClassName(std::string_view name) const {
+    return required(name, {"INSTANCENAME", "CLASSNAME"}).name == "CLASSNAME";
 }
 
 PropertyList Parameters::propertyList() const {

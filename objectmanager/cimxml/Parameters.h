@@ -7,6 +7,7 @@
 #include "model/Operations.h"
 
 #include <array>
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -14,7 +15,7 @@
 namespace ObjectManager::CimXml {
 
 /** What a method takes; the rest is empty. */
-using ParameterNames = std::array<std::string_view, 8>;
+using ParameterNames = std::array<std::string_view, 12>;
 
 /**
  * Every function throws CimError with CMPI_RC_ERR_INVALID_PARAMETER where a parameter is no such value or, if it has no
@@ -27,6 +28,9 @@ public:
     Parameters(const Message& message, const Catalogue& catalogue, const ParameterNames& names);
 
     bool flag(std::string_view name, bool otherwise) const;
+    /** A uint32; nothing where it is missing. */
+    std::optional<std::uint32_t> optionalNumber(std::string_view name) const;
+    std::uint32_t number(std::string_view name) const;
     std::string text(std::string_view name) const;
     /** Empty where it is missing. */
     std::string optionalText(std::string_view name) const;
@@ -35,8 +39,8 @@ public:
     /** Empty where it is missing. */
     std::string optionalClassName(std::string_view name) const;
     ObjectPath instanceName(std::string_view name) const;
-    /** The name of an instance, or of a class, which has no keys. */
-    ObjectPath objectName(std::string_view name) const;
+    /** Whether the parameter, the name of a class or of an instance, is that of a class. */
+    bool isClassName(std::string_view name) const;
     PropertyList propertyList() const;
     Instance instance(std::string_view name) const;
     /** An instance, with its own name as its path. A property that its class lacks is CMPI_RC_ERR_NO_SUCH_PROPERTY. */

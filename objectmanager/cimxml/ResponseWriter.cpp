@@ -1,6 +1,7 @@
 #include "cimxml/ResponseWriter.h"
 
 #include "cimxml/Characters.h"
+#include "cimxml/StatusCodes.h"
 #include "classes/Literals.h"
 
 #include <algorithm>
@@ -71,7 +72,8 @@ void ResponseWriter::attribute(std::string_view name, std::string_view value) {
 
 void ResponseWriter::error(CMPIrc code, std::string_view description) {
     // What is no code of CIM's is told to the client as a failure.
-    const bool known = code > CMPI_RC_OK && code <= CMPI_RC_ERR_METHOD_NOT_FOUND;
+    const bool known = (code > CMPI_RC_OK && code <= CMPI_RC_ERR_METHOD_NOT_FOUND) ||
+                       (code >= invalidEnumerationContext && code <= serverLimitsExceeded);
     raw("<ERROR CODE=\"");
     appendNumber(_text, static_cast<int>(known ? code : CMPI_RC_ERR_FAILED));
     raw("\"");
@@ -105,9 +107,10 @@ void ResponseWriter::key(const NamedValue& key) {
     if (std::holds_alternative<std::shared_ptr<const ObjectPath>>(key.value.content)) {
         value(key.value);
     } else {
-        raw("<KEYVALUE VALUETYPE=\"");
-        raw(valueKind(key.value.type));
-        raw("\">");
+        raw("<KEYVALUE");
+        attribute("VALUETYPE", valueKind(key.value.type));
+        attribute("TYPE", elementTypeName(key.value.type));
+        raw(">");
         scalar(key.value);
         raw("</KEYVALUE>");
     }
@@ -124,12 +127,24 @@ void ResponseWriter::instanceName(const ObjectPath& path) {
     raw("</INSTANCENAME>\n");
 }
 
-void ResponseWriter::instancePath(const ObjectPath& path) {
-    raw("<INSTANCEPATH>\n<NAMESPACEPATH>\n<HOST>");
+void ResponseWriter::nameSpacePath(const std::string& nameSpace) {
+    raw("<NAMESPACEPATH>\n<HOST>");
     appendText(_text, _host);
     raw("</HOST>\n");
-    localNameSpacePath(path.nameSpace);
+    localNameSpacePath(nameSpace);
     raw("</NAMESPACEPATH>\n");
+}
+
+void ResponseWriter::classPath(const std::string& name) {
+    raw("<CLASSPATH>\n");
+    nameSpacePath(_nameSpace);
+    className(name);
+    raw("</CLASSPATH>\n");
+}
+
+void ResponseWriter::instancePath(const ObjectPath& path) {
+    raw("<INSTANCEPATH>\n");
+    nameSpacePath(path.nameSpace);
     instanceName(path);
     raw("</INSTANCEPATH>\n");
 }
@@ -137,6 +152,12 @@ void ResponseWriter::instancePath(const ObjectPath& path) {
 void ResponseWriter::objectPath(const ObjectPath& path) {
     raw("<OBJECTPATH>\n");
     instancePath(path);
+    raw("</OBJECTPATH>\n");
+}
+
+void ResponseWriter::classObjectPath(const std::string& name) {
+    raw("<OBJECTPATH>\n");
+    classPath(name);
     raw("</OBJECTPATH>\n");
 }
 
@@ -230,6 +251,13 @@ void ResponseWriter::instance(const Instance& instance, const Selection& selecti
             property(element, declared, selection);
         }
     }
+    if (declared != nullptr) {
+        for (const Property& absent : declared->properties) {
+            if (isWanted(selection, absent.name) && find(instance.properties, absent.name) == nullptr) {
+                property({absent.name, nullValue(absent.type)}, declared, selection);
+            }
+        }
+    }
     raw("</INSTANCE>\n");
 }
 
@@ -244,6 +272,20 @@ void ResponseWriter::objectWithPath(const Instance& instance, const Selection& s
     raw("<VALUE.OBJECTWITHPATH>\n");
     instancePath(instance.path);
     this->instance(instance, selection);
+    raw("</VALUE.OBJECTWITHPATH>\n");
+}
+
+void ResponseWriter::instanceWithPath(const Instance& instance, const Selection& selection) {
+    raw("<VALUE.INSTANCEWITHPATH>\n");
+    instancePath(instance.path);
+    this->instance(instance, selection);
+    raw("</VALUE.INSTANCEWITHPATH>\n");
+}
+
+void ResponseWriter::classWithPath(const Class& declared, const Selection& selection) {
+    raw("<VALUE.OBJECTWITHPATH>\n");
+    classPath(declared.name);
+    classDeclaration(declared, selection);
     raw("</VALUE.OBJECTWITHPATH>\n");
 }
 

@@ -37,6 +37,7 @@ public:
     /** What was written. */
     std::string take() { return std::move(_text); }
     std::size_t size() const { return _text.size(); }
+    std::string_view written() const { return _text; }
     /** Drops what was written behind the first `size` bytes. */
     void truncate(std::size_t size) { _text.resize(size); }
 
@@ -55,13 +56,17 @@ public:
     void instancePath(const ObjectPath& path);
     /** An OBJECTPATH. */
     void objectPath(const ObjectPath& path);
+    /** The OBJECTPATH of a class. */
+    void classObjectPath(const std::string& name);
 
-    /** An INSTANCE. */
+    /** An INSTANCE. Properties that its class declares and it has no value of are there without one. */
     void instance(const Instance& instance, const Selection& selection);
     /** A VALUE.NAMEDINSTANCE. */
     void namedInstance(const Instance& instance, const Selection& selection);
     /** A VALUE.OBJECTWITHPATH. */
     void objectWithPath(const Instance& instance, const Selection& selection);
+    /** A VALUE.INSTANCEWITHPATH. */
+    void instanceWithPath(const Instance& instance, const Selection& selection);
 
     /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; nothing where the value is null. */
     void value(const Value& value);
@@ -72,9 +77,13 @@ public:
 
     /** A CLASS. */
     void classDeclaration(const Class& declared, const Selection& selection);
+    /** A VALUE.OBJECTWITHPATH of a class. */
+    void classWithPath(const Class& declared, const Selection& selection);
 
 private:
     void localNameSpacePath(const std::string& nameSpace);
+    void nameSpacePath(const std::string& nameSpace);
+    void classPath(const std::string& name);
     void reference(const ObjectPath& path);
     void scalar(const Value& value);
     void key(const NamedValue& key);

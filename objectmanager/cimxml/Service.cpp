@@ -38,8 +38,8 @@ std::string descriptionOf(const CimError& error) {
 }
 
 /** The document that answers the message. */
-std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, const Message& message, const Caller& caller,
-                       const std::string& host) {
+std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, Enumerations& enumerations,
+                       const Message& message, const Caller& caller, const std::string& host) {
     ResponseWriter writer(catalogue, host.empty() ? ownHostName() : host, message.nameSpace());
     const char* const response = message.isIntrinsic() ? "IMETHODRESPONSE" : "METHODRESPONSE";
     writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">\n<MESSAGE");
@@ -51,7 +51,7 @@ std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, const
     writer.raw(">\n");
     const std::size_t start = writer.size();
     try {
-        perform({dispatcher, catalogue, message, caller, writer});
+        perform({dispatcher, catalogue, message, caller, writer, enumerations});
     } catch (const CimError& error) {
         writer.truncate(start);
         writer.error(error.code, descriptionOf(error));
@@ -64,17 +64,23 @@ std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, const
 
 } // namespace
 
-Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue) : _dispatcher(dispatcher), _catalogue(catalogue) {}
+Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings)
+    : _dispatcher(dispatcher), _catalogue(catalogue), _clock(settings.clock),
+      _enumerations(settings.enumerations, settings.clock, settings.newContext) {}
 
 HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
+    const Enumerations::TimePoint start = _clock();
     std::string prefix;
     try {
+        _enumerations.closeExpired();
         const RequestHeaders headers(request);
         prefix = headers.replyPrefix();
         headers.check();
         const Message message(request.body);
         headers.checkAgainst(message);
-        return {Http::ok, headers.ofAnswer(), documentOf(_dispatcher, _catalogue, message, caller, headers.host())};
+        std::string document = documentOf(_dispatcher, _catalogue, _enumerations, message, caller, headers.host());
+        return {Http::ok, headers.ofAnswer(std::chrono::floor<std::chrono::microseconds>(_clock() - start)),
+                std::move(document)};
     } catch (const ProtocolError& error) {
         return failure(error.status(), headersOfFailure(error, prefix), error.what(),
                        error.cimError() == nullptr ? error.what() : error.cimError());

@@ -2,6 +2,7 @@
 #ifndef CIMXML_SERVICE_H
 #define CIMXML_SERVICE_H
 
+#include "cimxml/Enumerations.h"
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
 #include "server/HttpMessage.h"
@@ -12,10 +13,17 @@ using Server::Caller;
 using Server::HttpReply;
 using Server::HttpRequest;
 
+struct ServiceSettings {
+    EnumerationLimits enumerations;
+    /** What the time of answers and of open enumerations is taken from. */
+    Enumerations::Clock clock = std::chrono::steady_clock::now;
+    Enumerations::NewContext newContext = randomContext;
+};
+
 class Service {
 public:
-    /** All outlive the service. */
-    Service(Dispatcher& dispatcher, const Catalogue& catalogue);
+    /** Dispatcher and catalogue outlive the service. */
+    Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings = {});
 
     /** Used by several threads at once; never throws. */
     HttpReply answer(const HttpRequest& request, const Caller& caller);
@@ -23,6 +31,8 @@ public:
 private:
     Dispatcher& _dispatcher;
     const Catalogue& _catalogue;
+    const Enumerations::Clock _clock;
+    Enumerations _enumerations;
 };
 
 } // namespace ObjectManager::CimXml

@@ -28,9 +28,25 @@ constexpr std::uint16_t httpPort = 5988;
 constexpr std::uint16_t httpsPort = 5989;
 
 /** What asks the machine nothing but what it is. */
-constexpr std::array<const char*, 11> readingMethods = {
-    "AssociatorNames",    "Associators", "EnumerateClassNames", "EnumerateClasses", "EnumerateInstanceNames",
-    "EnumerateInstances", "GetClass",    "GetInstance",         "GetProperty",      "ReferenceNames",
+constexpr std::array<const char*, 19> readingMethods = {
+    "AssociatorNames",
+    "Associators",
+    "EnumerateClassNames",
+    "EnumerateClasses",
+    "EnumerateInstanceNames",
+    "EnumerateInstances",
+    "GetClass",
+    "GetInstance",
+    "GetProperty",
+    "OpenAssociatorInstancePaths",
+    "OpenAssociatorInstances",
+    "OpenEnumerateInstancePaths",
+    "OpenEnumerateInstances",
+    "OpenReferenceInstancePaths",
+    "OpenReferenceInstances",
+    "PullInstancePaths",
+    "PullInstancesWithPath",
+    "ReferenceNames",
     "References",
 };
 
@@ -173,7 +189,7 @@ void serve(Session& session) {
 
     const ServiceManager manager;
     const EndSignals signals;
-    CimXml::Service service(session.dispatcher(), session.catalogue());
+    CimXml::Service service(session.dispatcher(), session.catalogue(), {.enumerations = options.enumerations});
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
         Server::HttpReply reply = service.answer(request, caller);
         // What the agent logged meanwhile was of interest to this request only.

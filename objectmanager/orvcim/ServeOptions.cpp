@@ -97,6 +97,12 @@ void addServeOptions(CLI::App& command, ServeOptions& options) {
     addCount(command, "--max-connections-per-address", limits.connectionsPerAddress, "Connections of one client");
     addTime(command, "--request-time", limits.requestTime, "Seconds in which a request has to arrive");
     addTime(command, "--idle-time", limits.idleTime, "Seconds after which an idle connection is closed");
+    addCount(command, "--max-enumerations", options.enumerations.count,
+             "Enumerations open at a time, of one user half of them");
+    addCount(command, "--max-enumeration-bytes", options.enumerations.bytes,
+             "Bytes of what open enumerations hold, of one user half of them");
+    addTime(command, "--enumeration-time", options.enumerations.time,
+            "Seconds after which an enumeration that nobody pulls from is closed");
 }
 
 } // namespace ObjectManager::Orvcim

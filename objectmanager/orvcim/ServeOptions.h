@@ -4,6 +4,7 @@
 #ifndef ORVCIM_SERVEOPTIONS_H
 #define ORVCIM_SERVEOPTIONS_H
 
+#include "cimxml/Enumerations.h"
 #include "server/Settings.h"
 
 #include <cstdint>
@@ -20,6 +21,7 @@ namespace ObjectManager::Orvcim {
 struct ServeOptions {
     /** Its port is that of the protocol where none is asked for. */
     Server::Settings server;
+    CimXml::EnumerationLimits enumerations;
     std::optional<std::uint16_t> port;
     /** Empty where there is no TLS. */
     std::filesystem::path certificate;

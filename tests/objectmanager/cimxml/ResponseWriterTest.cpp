@@ -68,7 +68,7 @@ TEST_F(ResponseWriterTest, writesReferencesInTheNamespaceOfTheRequestWhereTheyNa
               "<LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"a\"/><NAMESPACE NAME=\"b\"/>"
               "</LOCALNAMESPACEPATH>\n"
               "<INSTANCENAME CLASSNAME=\"Test_Any\">\n"
-              "<KEYBINDING NAME=\"Name\"><KEYVALUE VALUETYPE=\"string\">&lt;</KEYVALUE></KEYBINDING>\n"
+              "<KEYBINDING NAME=\"Name\"><KEYVALUE VALUETYPE=\"string\" TYPE=\"string\">&lt;</KEYVALUE></KEYBINDING>\n"
               "</INSTANCENAME>\n</LOCALINSTANCEPATH>\n</VALUE.REFERENCE>\n");
     EXPECT_EQ(written(referenceValue({"", "", "Test_Any", {}})),
               "<VALUE.REFERENCE>\n<LOCALCLASSPATH>\n"
@@ -85,9 +85,10 @@ TEST_F(ResponseWriterTest, namesTheKindOfKeys) {
                               {"N", signedValue(CMPI_sint8, -1)},
                               {"D", dateTimeValue("20260101000000.000000+000")}}});
     });
-    EXPECT_THAT(name, HasSubstr("<KEYVALUE VALUETYPE=\"boolean\">TRUE</KEYVALUE>"));
-    EXPECT_THAT(name, HasSubstr("<KEYVALUE VALUETYPE=\"numeric\">-1</KEYVALUE>"));
-    EXPECT_THAT(name, HasSubstr("<KEYVALUE VALUETYPE=\"string\">20260101000000.000000+000</KEYVALUE>"));
+    EXPECT_THAT(name, HasSubstr("<KEYVALUE VALUETYPE=\"boolean\" TYPE=\"boolean\">TRUE</KEYVALUE>"));
+    EXPECT_THAT(name, HasSubstr("<KEYVALUE VALUETYPE=\"numeric\" TYPE=\"sint8\">-1</KEYVALUE>"));
+    EXPECT_THAT(name,
+                HasSubstr("<KEYVALUE VALUETYPE=\"string\" TYPE=\"datetime\">20260101000000.000000+000</KEYVALUE>"));
 }
 
 TEST_F(ResponseWriterTest, writesPropertiesWithTheTypeOfTheirValueElseOfTheirDeclaration) {

@@ -69,6 +69,10 @@ Service& ServiceFixture::service() {
     return world().service;
 }
 
+Service ServiceFixture::serviceWith(const ServiceSettings& settings) {
+    return {world().dispatcher, world().catalogue, settings};
+}
+
 std::filesystem::path ServiceFixture::stateFile() {
     return world().agent.stateFile();
 }

@@ -21,6 +21,9 @@ protected:
     /** Made once: the agent reads its configuration once in a process. */
     static Service& service();
 
+    /** Another one beside it, with settings of its own. */
+    static Service serviceWith(const ServiceSettings& settings);
+
     /** Where the simulated machine keeps its state. */
     static std::filesystem::path stateFile();
 

@@ -16,7 +16,9 @@ WireCase readWireCase(const std::string& text) {
     std::string line;
     while (std::getline(lines, line) && line.starts_with('#')) {
     }
-    std::istringstream(line) >> read.method >> read.caller.user;
+    unsigned short pause = 0;
+    std::istringstream(line) >> read.method >> read.caller.user >> pause;
+    read.pause = std::chrono::seconds(pause);
     read.caller.mayRead = read.caller.user != "stranger";
     read.caller.mayChangePower = read.caller.user == "operator";
     while (std::getline(lines, line) && !line.empty()) {
@@ -26,6 +28,18 @@ WireCase readWireCase(const std::string& text) {
     }
     read.body = {std::istreambuf_iterator<char>(lines), {}};
     return read;
+}
+
+std::vector<WireCase> readWireCases(const std::string& text) {
+    const std::string separator = '\n' + std::string(requestSeparator);
+    std::vector<WireCase> cases;
+    for (std::size_t start = 0; start <= text.size();) {
+        const std::size_t found = text.find(separator, start);
+        const std::size_t end = found == std::string::npos ? text.size() : found + 1;
+        cases.push_back(readWireCase(text.substr(start, end - start)));
+        start = found == std::string::npos ? text.size() + 1 : end + requestSeparator.size();
+    }
+    return cases;
 }
 
 std::string textOf(const HttpReply& reply) {

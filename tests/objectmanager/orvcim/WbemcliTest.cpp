@@ -53,11 +53,15 @@ std::string textOf(const Json& value) {
 /** Objects with their properties, each as lines in an order of their own. */
 using Objects = std::vector<std::string>;
 
-/** From what the client prints with -nl. */
+/** From what the client prints with -nl. Properties without a value, which the command line leaves out, are left out.
+ */
 Objects clientsObjects(const std::string& out) {
     std::vector<std::vector<std::string>> objects;
     std::istringstream stream(out);
     for (std::string line; std::getline(stream, line);) {
+        if (line.starts_with('-') && line.ends_with('=')) {
+            continue;
+        }
         if (line.starts_with('-')) {
             objects.back().push_back(essence(line.substr(1)));
         } else if (!line.empty()) {

@@ -3,8 +3,9 @@
  *
  *   registration-forms TABLE LOCATION NAME VERSION FOLDER
  *
- * FOLDER/NAME.reg for object managers that read such files, the embedded one among them, and FOLDER/pg/NAME.mof for
- * those that take instances of PG_ProviderModule, PG_Provider and PG_ProviderCapabilities.
+ * FOLDER/NAME.reg for the embedded object manager, FOLDER/sfcb/NAME.reg for sfcb, which reads the same form but refuses
+ * what it does not know, and FOLDER/pg/NAME.mof for those that take instances of PG_ProviderModule, PG_Provider and
+ * PG_ProviderCapabilities.
  */
 #include "classes/Files.h"
 #include "registry/RegistrationReader.h"
@@ -39,6 +40,10 @@ void makeForms(const std::string& table, const std::string& location, const std:
     write(
         folder / "pg" / (name + ".mof"),
         ObjectManager::registrationInstances(registrations, {name, "The orv-power-state-management project", version}));
+    for (auto& registration : registrations) {
+        registration.methods.clear();
+    }
+    write(folder / "sfcb" / (name + ".reg"), ObjectManager::registrationSections(registrations));
 }
 
 } // namespace

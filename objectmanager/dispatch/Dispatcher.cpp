@@ -253,6 +253,10 @@ void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath&
 MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                                       const std::vector<NamedValue>& arguments) {
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::method);
+    if (!registration.mayImplement(method)) {
+        throw CimError(CMPI_RC_ERR_METHOD_NOT_AVAILABLE,
+                       registration.provider + " does not implement the method " + method);
+    }
     CMPIMethodMI& mi = _providers.methodProvider(registration);
     const CMPIArgs* answers = nullptr;
     return serve(

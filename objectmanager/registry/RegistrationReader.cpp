@@ -80,10 +80,12 @@ private:
             registration.location = value;
         } else if (key == "namespace") {
             registration.nameSpaces = wordsOf(value);
+        } else if (key == "methods") {
+            registration.methods = wordsOf(value);
         } else if (key == "type") {
             types(registration, value);
         } else if (key != "unload" && key != "group") {
-            fail(_line, key, "provider, location, type, namespace, unload or group");
+            fail(_line, key, "provider, location, type, namespace, methods, unload or group");
         }
     }
 

@@ -6,9 +6,11 @@
  *        location: NAME
  *        type: instance method association property indication
  *        namespace: NAMESPACE NAMESPACE
+ *        methods: METHOD METHOD
  *
- * with lines in any order, and comments behind #. "unload" and "group" are for object managers that run providers in
- * processes of their own; they are read over.
+ * with lines in any order, and comments behind #. Without "methods", the provider is taken to implement every method of
+ * the class. "unload" and "group" are for object managers that run providers in processes of their own; they are read
+ * over.
  */
 #ifndef REGISTRY_REGISTRATIONREADER_H
 #define REGISTRY_REGISTRATIONREADER_H

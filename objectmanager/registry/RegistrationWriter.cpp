@@ -67,6 +67,9 @@ std::string registrationSections(const std::vector<Registration>& registrations)
                        "   namespace: {}\n",
                        registration.className, registration.provider, registration.location,
                        fmt::join(typeNames(registration), " "), fmt::join(registration.nameSpaces, " "));
+        if (!registration.methods.empty()) {
+            fmt::format_to(std::back_inserter(text), "   methods: {}\n", fmt::join(registration.methods, " "));
+        }
     }
     return text;
 }
@@ -106,10 +109,13 @@ std::string registrationInstances(const std::vector<Registration>& registrations
                        "    Namespaces = {{\"{}\"}};\n"
                        "    ProviderType = {{{}}};\n"
                        "    SupportedProperties = NULL;\n"
-                       "    SupportedMethods = NULL;\n"
+                       "    SupportedMethods = {};\n"
                        "}};\n",
                        module.name, registration.provider, registration.className, registration.className,
-                       fmt::join(registration.nameSpaces, "\", \""), fmt::join(capabilities(registration), ", "));
+                       fmt::join(registration.nameSpaces, "\", \""), fmt::join(capabilities(registration), ", "),
+                       registration.methods.empty()
+                           ? "NULL"
+                           : fmt::format("{{\"{}\"}}", fmt::join(registration.methods, "\", \"")));
     }
     return text;
 }

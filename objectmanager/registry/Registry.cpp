@@ -30,6 +30,11 @@ bool Registration::isIn(std::string_view nameSpace) const {
                        [&](const std::string& name) { return equalNames(name, nameSpace); });
 }
 
+bool Registration::mayImplement(std::string_view methodName) const {
+    return methods.empty() || std::any_of(methods.begin(), methods.end(),
+                                          [&](const std::string& name) { return equalNames(name, methodName); });
+}
+
 void Registry::requireNameSpace(std::string_view nameSpace) const {
     if (std::none_of(_registrations.begin(), _registrations.end(),
                      [&](const Registration& registration) { return registration.isIn(nameSpace); })) {

@@ -23,9 +23,14 @@ struct Registration {
     bool association = false;
     bool property = false;
     bool indication = false;
+    /** Those that the provider of methods implements; none where the registration does not tell. */
+    std::vector<std::string> methods;
 
     /** Whether the class is served in the namespace; letter case is ignored. */
     bool isIn(std::string_view nameSpace) const;
+
+    /** Whether the provider may implement the method; letter case is ignored. */
+    bool mayImplement(std::string_view methodName) const;
 };
 
 enum class ProviderKind { instance, method, association };

@@ -39,7 +39,21 @@ TEST_F(ShippedSchemaTest, registersTheServiceForInstancesAndMethods) {
                                                Field(&Registration::provider, "PowerManagementServiceProvider"),
                                                Field(&Registration::location, "orvpowerstatemanagementprovider"),
                                                Field(&Registration::instance, true), Field(&Registration::method, true),
-                                               Field(&Registration::association, false))));
+                                               Field(&Registration::association, false),
+                                               Field(&Registration::methods, ElementsAre("RequestPowerStateChange")))));
+}
+
+/** sfcb ends where a registration has what it does not know. */
+TEST_F(ShippedSchemaTest, registersWithSfcbInItsOwnForm) {
+    const std::filesystem::path folder = ORV_SCHEMA_FOLDER;
+    for (const char* name : {"orv-power-management.reg", "orv-computer-system.reg"}) {
+        std::string text = readFile(folder / name);
+        const std::string methods = "   methods: RequestPowerStateChange\n";
+        if (const std::size_t line = text.find(methods); line != std::string::npos) {
+            text.erase(line, methods.size());
+        }
+        EXPECT_EQ(readFile(folder / "sfcb" / name), text);
+    }
 }
 
 TEST_F(ShippedSchemaTest, registersTheCapabilitiesForInstancesOnly) {

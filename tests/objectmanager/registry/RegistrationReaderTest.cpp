@@ -20,6 +20,7 @@ TEST(RegistrationReader, readsSectionsWithLinesInAnyOrder) {
                                                                   "   location: alib   # a comment\n"
                                                                   "   type: instance method\n"
                                                                   "   namespace: root/cimv2 root/interop\n"
+                                                                  "   methods: Start Stop\n"
                                                                   "\r\n"
                                                                   "[ B ]\r\n"
                                                                   "type: association property indication\r\n"
@@ -36,11 +37,13 @@ TEST(RegistrationReader, readsSectionsWithLinesInAnyOrder) {
     EXPECT_EQ(a.location, "alib");
     EXPECT_THAT(a.nameSpaces, ElementsAre("root/cimv2", "root/interop"));
     EXPECT_TRUE(a.instance && a.method && !a.association && !a.property && !a.indication);
+    EXPECT_THAT(a.methods, ElementsAre("Start", "Stop"));
     const Registration& b = registrations[1];
     EXPECT_EQ(b.className, "B");
     EXPECT_EQ(b.provider, "BProvider");
     EXPECT_EQ(b.location, "blib");
     EXPECT_THAT(b.nameSpaces, ElementsAre("root/cimv2"));
+    EXPECT_THAT(b.methods, IsEmpty());
     EXPECT_TRUE(!b.instance && !b.method && b.association && b.property && b.indication);
 }
 
@@ -73,8 +76,9 @@ INSTANTIATE_TEST_SUITE_P(
         BadRegistration{"[A]\nprovider X", "x.reg:2: found 'provider X', expected [CLASS] or KEY: VALUE"},
         BadRegistration{"[A]\nprovider: X\nprovider: Y", "x.reg:3: found 'provider', expected every key of [A] once"},
         BadRegistration{"[A]\nprovider:", "x.reg:2: found 'provider', expected a value behind 'provider:'"},
-        BadRegistration{"[A]\nlibrary: x",
-                        "x.reg:2: found 'library', expected provider, location, type, namespace, unload or group"},
+        BadRegistration{
+            "[A]\nlibrary: x",
+            "x.reg:2: found 'library', expected provider, location, type, namespace, methods, unload or group"},
         BadRegistration{"[A]\ntype: instance methods",
                         "x.reg:2: found 'methods', expected instance, method, association, property or indication"},
         BadRegistration{"\n[A]\nprovider: X\ntype: instance\n[B]\n",

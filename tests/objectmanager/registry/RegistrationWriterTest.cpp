@@ -21,6 +21,7 @@ Registration disk() {
     registration.nameSpaces = {"root/cimv2", "root/interop"};
     registration.instance = true;
     registration.method = true;
+    registration.methods = {"Start", "Stop"};
     return registration;
 }
 
@@ -30,6 +31,7 @@ Registration diskInBay() {
     registration.className = "Test_DiskInBay";
     registration.nameSpaces = {"root/cimv2"};
     registration.method = false;
+    registration.methods = {};
     registration.association = true;
     return registration;
 }
@@ -40,6 +42,7 @@ TEST(RegistrationSections, areWhatObjectManagersRead) {
                                                            "   location: testdisks\n"
                                                            "   type: instance method\n"
                                                            "   namespace: root/cimv2 root/interop\n"
+                                                           "   methods: Start Stop\n"
                                                            "[Test_DiskInBay]\n"
                                                            "   provider: DiskProvider\n"
                                                            "   location: testdisks\n"
@@ -81,7 +84,7 @@ TEST(RegistrationInstances, areOneModuleWithEachProviderOnceAndTheCapabilitiesOf
                                                                     "\"root/interop\"};\n"
                                                                     "    ProviderType = {2, 5};\n"
                                                                     "    SupportedProperties = NULL;\n"
-                                                                    "    SupportedMethods = NULL;\n"
+                                                                    "    SupportedMethods = {\"Start\", \"Stop\"};\n"
                                                                     "};\n"
                                                                     "\n"
                                                                     "instance of PG_ProviderCapabilities {\n"

@@ -33,6 +33,14 @@ TEST_F(RegistryTest, FindsTheProviderOfEachKind) {
     EXPECT_EQ("Holds", registry.find("root/interop", "Test_Holds", ProviderKind::association).provider);
 }
 
+TEST(Registration, TellsWhichMethodsTheProviderMayImplement) {
+    Registration registration;
+    EXPECT_TRUE(registration.mayImplement("Any"));
+    registration.methods = {"Start", "Stop"};
+    EXPECT_TRUE(registration.mayImplement("STOP"));
+    EXPECT_FALSE(registration.mayImplement("Any"));
+}
+
 TEST_F(RegistryTest, LetterCaseDoesNotMatter) {
     EXPECT_EQ("DiskInstances", registry.find("ROOT/CIMV2", "test_disk", ProviderKind::instance).provider);
 }

@@ -3,8 +3,9 @@
  * in turn, once alone and once with all that follow.
  *
  * The host's own allocations never fail, nor do those that happen once in a process or a thread: each operation has run
- * before. Among the latter is the memory that the loader allocates for a library's thread-local variables; where there
- * is none for it, the loader ends the process.
+ * before. Among these are the loader's, which allocates a library's thread-local variables when a thread uses them
+ * first and ends the process where it cannot, and those of the library that parses the configuration, which does the
+ * same.
  */
 #include "broker.h"
 
@@ -267,24 +268,30 @@ protected:
         setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
     }
 
+    /** Runs a function that does not return in a process of its own. */
+    template <typename Function>
+    void inHost(Function function) {
+        const pid_t host = fork();
+        ASSERT_GE(host, 0);
+        if (host == 0) {
+            function();
+        }
+        int status = 0;
+        ASSERT_EQ(waitpid(host, &status, 0), host);
+        const std::string place = "allocation " + std::to_string(progress.failing) +
+                                  (progress.allThatFollow ? " and all that follow" : "") + " failed";
+        EXPECT_TRUE(WIFEXITED(status)) << place << ", and the host ended by signal " << WTERMSIG(status);
+        EXPECT_EQ(WEXITSTATUS(status), EXIT_SUCCESS) << place << ": " << progress.complaint;
+    }
+
     AgentTest::TemporaryFolder folder;
+    const std::string errors = (folder / "errors").string();
     Progress& progress = *static_cast<Progress*>(
         mmap(nullptr, sizeof(Progress), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0));
 };
 
 TEST_P(MemoryShortage, EndsTheOperationAndNotTheHost) {
-    const pid_t host = fork();
-    ASSERT_GE(host, 0);
-    if (host == 0) {
-        failEachAllocation(GetParam(), progress, (folder / "errors").string());
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(host, &status, 0), host);
-    const std::string place = "allocation " + std::to_string(progress.failing) +
-                              (progress.allThatFollow ? " and all that follow" : "") + " failed";
-    EXPECT_TRUE(WIFEXITED(status)) << place << ", and the host ended by signal " << WTERMSIG(status) << '\n'
-                                   << AgentTest::contentOf(folder / "errors");
-    EXPECT_EQ(WEXITSTATUS(status), EXIT_SUCCESS) << place << ": " << progress.complaint;
+    inHost([this] { failEachAllocation(GetParam(), progress, errors); });
     EXPECT_GT(progress.allocations, 0U);
 }
 

@@ -91,7 +91,7 @@ struct Array {
 
 struct Enumeration {
     CMPIEnumeration object;
-    CMPIObjectPath** paths;
+    CMPIData elements[maxEntries];
     size_t count;
     size_t position;
 };
@@ -103,6 +103,8 @@ struct Result {
     int closed;
     CMPIObjectPath* paths[maxEntries];
     size_t pathCount;
+    CMPIInstance* instances[maxEntries];
+    size_t instanceCount;
 };
 
 /* A broker, and the function tables of the objects that it makes. Behind each table lie the slots of later versions. */
@@ -117,7 +119,8 @@ enum { laterSlots = 4, maxBrokers = 2 };
 
 struct Broker {
     CMPIBroker broker;
-    UpCall* upCall;
+    UpCall* names;
+    UpCall* instances;
     LATER_TABLE(CMPIBrokerFT, services);
     LATER_TABLE(CMPIBrokerEncFT, factories);
     LATER_TABLE(CMPIContextFT, context);
@@ -218,10 +221,12 @@ static void appendData(struct Result* result, const CMPIData* data) {
     case CMPI_ref:
         appendPath(result, data->value.ref->hdl);
         break;
-    case CMPI_uint16A: {
+    case CMPI_uint16A:
+    case CMPI_stringA: {
         const struct Array* array = data->value.array->hdl;
         for (CMPICount i = 0; i < array->elements.count; ++i) {
-            append(result, "%s%u", i == 0 ? "{" : " ", (unsigned int)array->elements.entries[i].data.value.uint16);
+            append(result, i == 0 ? "{" : " ");
+            appendData(result, &array->elements.entries[i].data);
         }
         append(result, "}");
         break;
@@ -298,6 +303,19 @@ static CMPIData getKey(const CMPIObjectPath* object, const char* name, CMPIStatu
     return get(&pathOf(object)->keys, name, status);
 }
 
+static CMPIData getKeyAt(const CMPIObjectPath* object, CMPICount index, CMPIString** name, CMPIStatus* status) {
+    const struct Values* keys = &pathOf(object)->keys;
+    if (index >= keys->count) {
+        CMSetStatus(status, CMPI_RC_ERR_NO_SUCH_PROPERTY);
+        return (CMPIData){CMPI_null, CMPI_notFound | CMPI_nullValue, {0}};
+    }
+    if (name != NULL) {
+        *name = newString(pathOf(object)->broker, keys->entries[index].name, NULL);
+    }
+    ok(status);
+    return keys->entries[index].data;
+}
+
 static CMPICount getKeyCount(const CMPIObjectPath* object, CMPIStatus* status) {
     ok(status);
     return pathOf(object)->keys.count;
@@ -309,7 +327,9 @@ static CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath*
     struct Instance* instance = make(sizeof *instance);
     instance->object.hdl = instance;
     instance->object.ft = &tablesOf(broker)->instance.known;
-    instance->path = pathOf(path);
+    instance->path = make(sizeof *instance->path);
+    *instance->path = *pathOf(path);
+    instance->path->object.hdl = instance->path;
     ok(status);
     return &instance->object;
 }
@@ -317,6 +337,10 @@ static CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath*
 static CMPIStatus setProperty(const CMPIInstance* object, const char* name, const CMPIValue* value, CMPIType type) {
     struct Instance* instance = (struct Instance*)object->hdl;
     put(&instance->properties, instance->path->broker, name, value, type);
+    /* The references of an association are its keys. */
+    if (type == CMPI_ref) {
+        put(&instance->path->keys, instance->path->broker, name, value, type);
+    }
     return fine;
 }
 
@@ -375,10 +399,8 @@ static CMPIData getArg(const CMPIArgs* object, const char* name, CMPIStatus* sta
 
 static CMPIData getNext(const CMPIEnumeration* object, CMPIStatus* status) {
     struct Enumeration* enumeration = (struct Enumeration*)object->hdl;
-    CMPIData data = {CMPI_ref, CMPI_goodValue, {0}};
-    data.value.ref = enumeration->paths[enumeration->position++];
     ok(status);
-    return data;
+    return enumeration->elements[enumeration->position++];
 }
 
 static CMPIBoolean hasNext(const CMPIEnumeration* object, CMPIStatus* status) {
@@ -387,25 +409,49 @@ static CMPIBoolean hasNext(const CMPIEnumeration* object, CMPIStatus* status) {
     return enumeration->position < enumeration->count;
 }
 
-static CMPIEnumeration* enumerateInstanceNames(const CMPIBroker* broker, const CMPIContext* context,
-                                               const CMPIObjectPath* classPath, CMPIStatus* status) {
+static struct Result* resultOf(const CMPIResult* object) {
+    return (struct Result*)object->hdl;
+}
+
+/* What the up-call returns into a result of its own; nothing where there is no up-call. */
+static const struct Result* answerOf(const CMPIBroker* broker, UpCall* upCall, const CMPIContext* context,
+                                     const CMPIObjectPath* classPath, CMPIStatus* status) {
     CMPIResult* result = newResult(broker);
-    if (tablesOf(broker)->upCall != NULL) {
-        tablesOf(broker)->upCall(broker, context, classPath, result);
-    }
+    *status = upCall == NULL ? fine : upCall(broker, context, classPath, result);
+    return resultOf(result);
+}
+
+static struct Enumeration* newEnumeration(const CMPIBroker* broker, size_t count) {
     struct Enumeration* enumeration = make(sizeof *enumeration);
     enumeration->object.hdl = enumeration;
     enumeration->object.ft = &tablesOf(broker)->enumeration.known;
-    enumeration->paths = returnedPaths(result, &enumeration->count);
-    ok(status);
+    enumeration->count = count;
+    return enumeration;
+}
+
+static CMPIEnumeration* enumerateInstanceNames(const CMPIBroker* broker, const CMPIContext* context,
+                                               const CMPIObjectPath* classPath, CMPIStatus* status) {
+    const struct Result* answer = answerOf(broker, tablesOf(broker)->names, context, classPath, status);
+    struct Enumeration* enumeration = newEnumeration(broker, answer->pathCount);
+    for (size_t i = 0; i < answer->pathCount; ++i) {
+        enumeration->elements[i] = (CMPIData){CMPI_ref, CMPI_goodValue, {.ref = answer->paths[i]}};
+    }
+    return &enumeration->object;
+}
+
+static CMPIEnumeration* enumerateInstances(const CMPIBroker* broker, const CMPIContext* context,
+                                           const CMPIObjectPath* classPath, const char** properties,
+                                           CMPIStatus* status) {
+    (void)properties;
+    const struct Result* answer = answerOf(broker, tablesOf(broker)->instances, context, classPath, status);
+    struct Enumeration* enumeration = newEnumeration(broker, answer->instanceCount);
+    for (size_t i = 0; i < answer->instanceCount; ++i) {
+        enumeration->elements[i] = (CMPIData){CMPI_instance, CMPI_goodValue, {.inst = answer->instances[i]}};
+    }
     return &enumeration->object;
 }
 
 /* Slots: results */
-
-static struct Result* resultOf(const CMPIResult* object) {
-    return (struct Result*)object->hdl;
-}
 
 static CMPIStatus returnObjectPath(const CMPIResult* object, const CMPIObjectPath* path) {
     struct Result* result = resultOf(object);
@@ -419,10 +465,15 @@ static CMPIStatus returnObjectPath(const CMPIResult* object, const CMPIObjectPat
 }
 
 static CMPIStatus returnInstance(const CMPIResult* object, const CMPIInstance* returned) {
-    const struct Instance* instance = returned->hdl;
-    appendPath(resultOf(object), instance->path);
-    appendValues(resultOf(object), &instance->properties);
-    append(resultOf(object), "\n");
+    struct Instance* instance = (struct Instance*)returned->hdl;
+    struct Result* result = resultOf(object);
+    appendPath(result, instance->path);
+    appendValues(result, &instance->properties);
+    append(result, "\n");
+    if (result->instanceCount == maxEntries) {
+        abort();
+    }
+    result->instances[result->instanceCount++] = &instance->object;
     return fine;
 }
 
@@ -474,7 +525,7 @@ CMPIArgs* newArguments(const CMPIBroker* broker) {
     return &arguments->object;
 }
 
-const CMPIBroker* newBroker(enum TableLength length, UpCall* upCall) {
+const CMPIBroker* newBroker(enum TableLength length, UpCall* names, UpCall* instances) {
     const CMPIVersion version = length == longerTables ? CMPIVersion210 : CMPIVersion200;
     static struct Broker brokers[maxBrokers];
     static int count;
@@ -483,11 +534,13 @@ const CMPIBroker* newBroker(enum TableLength length, UpCall* upCall) {
     }
     struct Broker* broker = &brokers[count++];
     broker->broker = (CMPIBroker){broker, &broker->services.known, &broker->factories.known, NULL, NULL};
-    broker->upCall = upCall;
+    broker->names = names;
+    broker->instances = instances;
     broker->services.known = (CMPIBrokerFT){.brokerCapabilities = CMPI_MB_BasicRead,
                                             .brokerVersion = version,
                                             .brokerName = "host",
-                                            .enumerateInstanceNames = enumerateInstanceNames};
+                                            .enumerateInstanceNames = enumerateInstanceNames,
+                                            .enumerateInstances = enumerateInstances};
     broker->factories.known = (CMPIBrokerEncFT){.ftVersion = version,
                                                 .newInstance = newInstance,
                                                 .newObjectPath = newObjectPath,
@@ -508,6 +561,7 @@ const CMPIBroker* newBroker(enum TableLength length, UpCall* upCall) {
                                             .getClassName = getClassName,
                                             .addKey = addKey,
                                             .getKey = getKey,
+                                            .getKeyAt = getKeyAt,
                                             .getKeyCount = getKeyCount};
     broker->instance.known = (CMPIInstanceFT){.ftVersion = version,
                                               .getProperty = getProperty,

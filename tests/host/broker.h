@@ -10,16 +10,21 @@
 
 #include <stddef.h>
 
+#ifdef __cplusplus
+extern "C" {
+#endif
+
 /* The tables as CMPI 2.0 has them, or those of a later object manager: a higher version, with slots behind the known
    ones that end the program when they are called. */
 enum TableLength { knownTables, longerTables };
 
-/* Answers the up-call for the instance names of a class by returning paths into the result. */
-typedef void UpCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* classPath,
-                    CMPIResult* result);
+/* Answers an up-call for the instance names or the instances of a class by returning them into the result; a failure is
+   the caller's. */
+typedef CMPIStatus UpCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* classPath,
+                          CMPIResult* result);
 
-/* A broker of its own; it lives as long as the process. The up-call may be null: then no class has an instance. */
-const CMPIBroker* newBroker(enum TableLength length, UpCall* upCall);
+/* A broker of its own; it lives as long as the process. An up-call may be null: then no class has an instance. */
+const CMPIBroker* newBroker(enum TableLength length, UpCall* names, UpCall* instances);
 
 /* Between these two lies one request of the calling thread: the second frees all that was made since the first. */
 void beginRequest(void);
@@ -35,5 +40,9 @@ int isClosed(const CMPIResult* result);
 CMPIObjectPath** returnedPaths(const CMPIResult* result, size_t* count);
 
 CMPIArgs* newArguments(const CMPIBroker* broker);
+
+#ifdef __cplusplus
+}
+#endif
 
 #endif

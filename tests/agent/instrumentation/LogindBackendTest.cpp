@@ -248,8 +248,8 @@ TEST_F(Machine, IsNotHeldUpByInhibitorsThatMerelyDelayOrForbidSomethingElse) {
 }
 
 TEST_F(Machine, TakesBackARequestThatFoundNoAnswer) {
-    timeout = 2s;
-    bus.startLogind(R"({"Calls": {"ScheduleShutdown": {"delay": 3}}})");
+    timeout = 5s;
+    bus.startLogind(R"({"Calls": {"ScheduleShutdown": {"delay": 6}}})");
     EXPECT_FALSE(request(9).accepted);
     timeout = 20s;
     EXPECT_THAT(powerState(), Optional(1)) << "once systemd-logind answers again";
@@ -465,6 +465,7 @@ TEST_F(Machine, RefusesARequestWhileAnotherIsBeingMade) {
     EXPECT_EQ(outcome.description, "reboot of this machine, node system: " + lockFile.string() +
                                        ": cannot be locked: Resource temporarily unavailable");
     close(others);
+    timeout = 20s;
     EXPECT_TRUE(request(9).accepted);
 }
 

@@ -1,5 +1,6 @@
 #include "Hanging.h"
 #include "LogProcess.h"
+#include "PassingTime.h"
 
 #include <gmock/gmock.h>
 
@@ -333,7 +334,8 @@ TEST(FileTest, AFileSystemThatHangsHoldsOneThreadAndNotTheOthers) {
         LogTest::hangFiles(true);
         std::thread held([] { writeLog(6000, "held"); });
         LogTest::waitUntil([] { return LogTest::hangingWrites() == 1; });
-        std::this_thread::sleep_for(std::chrono::milliseconds(1500));
+        // Longer than others wait for a write that is on its way.
+        AgentTest::passTime(std::chrono::seconds(2));
 
         // A child has none of the threads that hang.
         process.run([] {

@@ -2,6 +2,7 @@
 
 #include "Allocations.h"
 #include "LogProcess.h"
+#include "PassingTime.h"
 
 #include <gmock/gmock.h>
 
@@ -180,6 +181,7 @@ TEST(LoggerTest, NothingIsSaidWhereThereIsNoConfiguration) {
 /** Writes records below the default thresholds until something is said on standard error. */
 void writeUntilSomethingIsSaid(const LogProcess& process) {
     LogTest::waitUntil([&process] {
+        AgentTest::passTime(std::chrono::seconds(1));
         writeLog(3000, "below");
         return !process.standardError().empty();
     });
@@ -208,6 +210,7 @@ TEST(LoggerTest, AFileThatIsMadeOrRemovedIsAChange) {
         writeUntilSomethingIsSaid(process);
         process.configure("[log]\nlevel = 3000\n");
         LogTest::waitUntil([&process] {
+            AgentTest::passTime(std::chrono::seconds(1));
             writeLog(3000, "heard");
             return textsOf(process.standardError()).back() == "heard";
         });
@@ -242,7 +245,11 @@ TEST(LoggerTest, AChangeOfSomethingElseIsNotTold) {
     process.run([&process] {
         writeLog(1, "first use");
         process.configure("[system]\nname = \"other\"\n");
-        std::this_thread::sleep_for(std::chrono::milliseconds(2500));
+        // A change that is this recent is looked at twice.
+        for (int look = 0; look < 3; ++look) {
+            AgentTest::passTime(std::chrono::seconds(1));
+            writeLog(3000, "below");
+        }
         writeLog(6000, "failure");
     });
     EXPECT_THAT(textsOf(process.standardError()), ElementsAre("failure"));

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <stdexcept>
 #include <system_error>
 #include <thread>
 #include <utility>
@@ -138,18 +139,20 @@ RunningProcess::~RunningProcess() {
 
 std::string RunningProcess::firstLine() const {
     siginfo_t ended{};
-    while (true) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::minutes{1};
+    while (std::chrono::steady_clock::now() < end) {
         const bool running =
             waitid(P_PID, static_cast<id_t>(_process), &ended, WEXITED | WNOHANG | WNOWAIT) == 0 && ended.si_pid == 0;
         const std::string text = _files->out.content();
-        if (const std::size_t end = text.find('\n'); end != std::string::npos) {
-            return text.substr(0, end);
+        if (const std::size_t length = text.find('\n'); length != std::string::npos) {
+            return text.substr(0, length);
         }
         if (!running) {
             return "";
         }
         std::this_thread::sleep_for(std::chrono::milliseconds{2});
     }
+    throw std::runtime_error("the program prints no line within a minute");
 }
 
 std::string RunningProcess::err() const {

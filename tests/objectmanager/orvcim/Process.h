@@ -36,7 +36,11 @@ public:
     RunningProcess& operator=(const RunningProcess&) = delete;
     ~RunningProcess();
 
-    /** Waits until it has written a line to its standard output. @return empty where it ended before. */
+    /**
+     * Waits until it has written a line to its standard output, for a minute at most. @return empty where it ended
+     * before.
+     * @throws std::runtime_error after that minute.
+     */
     std::string firstLine() const;
     /** What it has written to its standard error so far. */
     std::string err() const;

@@ -5,11 +5,10 @@
 #include <nlohmann/json.hpp>
 
 #include <algorithm>
-#include <chrono>
+#include <filesystem>
 #include <fstream>
 #include <regex>
 #include <sstream>
-#include <thread>
 
 namespace OrvcimTest {
 namespace {
@@ -118,6 +117,16 @@ protected:
     Json inProcess(std::vector<std::string> arguments) const {
         arguments.insert(arguments.end(), {"--format", "json"});
         return Json::parse(answerOf(arguments));
+    }
+
+    /** Has the machine's reboot, however long it takes, end now. */
+    void rebootIsOver() const {
+        const std::filesystem::path file = _folder / "state.json";
+        std::stringstream state;
+        state << std::ifstream(file).rdbuf();
+        const std::filesystem::path replacement = _folder / "state.json.new";
+        std::ofstream(replacement) << std::regex_replace(state.str(), std::regex("(\"over\":\\s*)[0-9]+"), "$010");
+        std::filesystem::rename(replacement, file);
     }
 
     static std::string clientsAnswer(const std::vector<std::string>& arguments) {
@@ -266,7 +275,7 @@ TEST_F(WbemcliTest, isToldWhatDoesNotExist) {
 
 /** With nothing but the client: from the host to its power, and a reboot that can be watched. */
 TEST_F(WbemcliTest, reboots) {
-    configure("reboot-time = 1.5\n[[instrumentation.simulated.node]]\npath = \"system\"\n");
+    configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"system\"\n");
     serve();
     const auto lineOf = [](std::string text) { return text.substr(0, text.find('\n')); };
     const std::string system = "http://" + lineOf(clientsAnswer({"ein", url("root/cimv2:TALVO_ComputerSystem")}));
@@ -282,10 +291,7 @@ TEST_F(WbemcliTest, reboots) {
     EXPECT_THAT(answer, EndsWith("RequestPowerStateChange: 0\n"));
     EXPECT_THAT(state(), HasSubstr("PowerState=1,"));
 
-    const auto end = std::chrono::steady_clock::now() + std::chrono::seconds{30};
-    while (state().find("PowerState=2,") == std::string::npos && std::chrono::steady_clock::now() < end) {
-        std::this_thread::sleep_for(std::chrono::milliseconds{20});
-    }
+    rebootIsOver();
     EXPECT_THAT(state(), HasSubstr("PowerState=2,"));
 }
 

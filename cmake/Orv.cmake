@@ -60,24 +60,30 @@ function(orv_install_manual file)
   install(FILES "${compressed}" DESTINATION "${CMAKE_INSTALL_MANDIR}/man${section}")
 endfunction()
 
-# orv_add_test(NAME SOURCES... LIBRARIES... [SHARDS N]): a GoogleTest program that ctest runs; with SHARDS, N times with an
-# Nth of its tests, which runs long ones side by side.
+# What test programs are compiled with besides: they are compiled often and run briefly, so the compiler's time counts and
+# theirs does not. References that are null or misaligned, and objects of another class, are looked for in what is
+# tested; in the tests' own code, that would take the compiler nearly as long as everything else.
+string(FIND "${ORV_SANITIZE}" undefined position)
+add_library(orv_test_options INTERFACE)
+target_compile_options(orv_test_options INTERFACE -O0 -g1 -U_FORTIFY_SOURCE
+  $<$<NOT:$<EQUAL:${position},-1>>:-fno-sanitize=null,alignment,vptr>)
+
+# orv_add_test(NAME SOURCES... LIBRARIES... [EXCEPT PATTERN]): a GoogleTest program that ctest runs; with EXCEPT, without
+# the tests whose names match, which are run by a test of their own.
 function(orv_add_test name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "" "SHARDS" "SOURCES;LIBRARIES")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "" "EXCEPT" "SOURCES;LIBRARIES")
   add_executable(${name} ${arg_SOURCES})
-  target_link_libraries(${name} PRIVATE orv_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
-  if(NOT arg_SHARDS)
-    add_test(NAME ${name} COMMAND ${name})
-    set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
-    return()
+  target_link_libraries(${name} PRIVATE
+    orv_options orv_test_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
+  if(TARGET orv_test_headers)
+    target_precompile_headers(${name} REUSE_FROM orv_test_headers)
   endif()
-  math(EXPR last "${arg_SHARDS} - 1")
-  foreach(index RANGE ${last})
-    add_test(NAME ${name}_${index} COMMAND ${name})
-    set_tests_properties(${name}_${index} PROPERTIES
-      TIMEOUT 1500
-      ENVIRONMENT "GTEST_TOTAL_SHARDS=${arg_SHARDS};GTEST_SHARD_INDEX=${index}")
-  endforeach()
+  set(filter)
+  if(arg_EXCEPT)
+    set(filter "--gtest_filter=-${arg_EXCEPT}")
+  endif()
+  add_test(NAME ${name} COMMAND ${name} ${filter})
+  set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
 endfunction()
 
 # orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema

@@ -1,5 +1,6 @@
 #include "Configuration.h"
 
+#include "PowerStates.h"
 #include "TableReader.h"
 
 #include <unistd.h>
@@ -34,7 +35,9 @@ constexpr std::array<std::pair<std::string_view, Backend>, 2> backends{{
 }};
 
 constexpr Integer<int> level{0, alwaysWrittenLevel};
-constexpr Integer<unsigned int> powerState{0, std::numeric_limits<std::uint16_t>::max()};
+constexpr Integer<unsigned int> sixteenBits{0, std::numeric_limits<std::uint16_t>::max()};
+constexpr NumberOrName<unsigned int> powerState{sixteenBits, nodePowerStates};
+constexpr NumberOrName<unsigned int> supportedPowerState{sixteenBits, supportedPowerStates};
 constexpr Integer<std::uint64_t> fileSize{0, std::numeric_limits<std::int64_t>::max()};
 constexpr Integer<unsigned int> fileCount{0, 1000};
 constexpr Seconds transitionTime{std::chrono::seconds{0}, std::chrono::hours{24}};
@@ -83,7 +86,7 @@ void readSimulated(TableReader& table, SimulatedSettings& simulated) {
             element.reject("path", "a path that no other node has");
         }
         element.read("power-state", powerState, node.powerState);
-        element.readList("power-states", powerState, node.powerStates);
+        element.readList("power-states", supportedPowerState, node.powerStates);
         nodes.push_back(std::move(node));
     });
     if (configured) {
@@ -94,6 +97,7 @@ void readSimulated(TableReader& table, SimulatedSettings& simulated) {
 void readLogind(TableReader& table, LogindSettings& logind) {
     table.read("delay", transitionTime, logind.delay);
     table.read("timeout", waitingTime, logind.timeout);
+    table.read("lock-file", AbsolutePath{}, logind.lockFile);
 }
 
 void readInstrumentation(TableReader& table, InstrumentationSettings& instrumentation) {
@@ -156,20 +160,30 @@ bool isWithoutFile() {
            std::filesystem::symlink_status(defaultFile, error).type() == std::filesystem::file_type::not_found;
 }
 
-std::filesystem::path defaultStateFile() {
-    constexpr const char* name = "orv/simulated-machine.json";
+/** A file of the agent's own, where the key does not name another one. */
+std::filesystem::path ownFile(const char* name, const char* key) {
     if (geteuid() == 0) {
-        return std::filesystem::path("/var/lib") / name;
+        return std::filesystem::path("/var/lib/orv") / name;
     }
     // The XDG base directory specification has relative paths ignored.
     if (const auto state = environment("XDG_STATE_HOME"); state && state->starts_with('/')) {
-        return std::filesystem::path(*state) / name;
+        return std::filesystem::path(*state) / "orv" / name;
     }
     if (const auto home = environment("HOME")) {
-        return std::filesystem::path(*home) / ".local/state" / name;
+        return std::filesystem::path(*home) / ".local/state/orv" / name;
     }
-    throw ConfigurationError("instrumentation.simulated.state-file: missing: expected an absolute path, or the "
-                             "environment variable XDG_STATE_HOME or HOME to say where state is kept");
+    throw ConfigurationError(std::string(key) + ": missing: expected an absolute path, or the environment variable "
+                                                "XDG_STATE_HOME or HOME to say where state is kept");
+}
+
+/** Of the machine in use only: what another one would need may be missing. */
+void completePaths(InstrumentationSettings& instrumentation) {
+    if (instrumentation.backend == Backend::simulated && instrumentation.simulated.stateFile.empty()) {
+        instrumentation.simulated.stateFile = ownFile("simulated-machine.json", "instrumentation.simulated.state-file");
+    }
+    if (instrumentation.backend == Backend::logind && instrumentation.logind.lockFile.empty()) {
+        instrumentation.logind.lockFile = ownFile("power-request.lock", "instrumentation.logind.lock-file");
+    }
 }
 
 } // namespace
@@ -180,9 +194,7 @@ std::string configurationFile() {
 
 Configuration loadConfiguration() {
     Configuration configuration = isWithoutFile() ? Configuration{} : configurationFrom(configurationFile());
-    if (configuration.instrumentation.simulated.stateFile.empty()) {
-        configuration.instrumentation.simulated.stateFile = defaultStateFile();
-    }
+    completePaths(configuration.instrumentation);
     return configuration;
 }
 

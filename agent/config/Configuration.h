@@ -55,7 +55,7 @@ struct SimulatedNode {
 
 /** Table [instrumentation.simulated]. */
 struct SimulatedSettings {
-    /** Where the simulated machine's state is kept, shared by every process. */
+    /** Where the simulated machine's state is kept, shared by every process. Empty where the machine is another one. */
     std::filesystem::path stateFile;
     std::chrono::milliseconds rebootTime{10'000};
     std::chrono::milliseconds shutdownTime{5'000};
@@ -68,6 +68,8 @@ struct LogindSettings {
     std::chrono::milliseconds delay{5'000};
     /** How long an operation may wait for the bus and for systemd-logind, all in all. */
     std::chrono::milliseconds timeout{5'000};
+    /** Locked while a request is made, so that of two that are made at once the second finds the first. */
+    std::filesystem::path lockFile;
 };
 
 /** Table [instrumentation]. */

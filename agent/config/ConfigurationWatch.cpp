@@ -1,7 +1,7 @@
 #include "ConfigurationWatch.h"
 
-#include "CoarseClock.h"
 #include "Configuration.h"
+#include "base/CoarseClock.h"
 
 #include <chrono>
 #include <utility>

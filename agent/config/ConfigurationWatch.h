@@ -1,7 +1,7 @@
 #ifndef AGENT_CONFIGURATIONWATCH_H
 #define AGENT_CONFIGURATIONWATCH_H
 
-#include "FileSignature.h"
+#include "base/FileSignature.h"
 
 #include <atomic>
 #include <cstdint>

@@ -24,6 +24,31 @@ namespace Norv::Agent {
 //   expected()      its description, as it completes "expected ..."
 //   accept(node)    the value, or nothing where the node is something else.
 
+/** Names that stand for values. */
+template <typename T>
+using Names = std::span<const std::pair<std::string_view, T>>;
+
+/** The names in quotation marks. */
+template <typename T>
+std::string listOf(Names<T> names, const char* separator) {
+    std::string text;
+    for (const auto& name : names) {
+        text += (text.empty() ? "\"" : separator + std::string("\"")) + std::string(name.first) + '"';
+    }
+    return text;
+}
+
+/** Not set where the node is not one of the names. */
+template <typename T>
+std::optional<T> valueOf(Names<T> names, const toml::node& node) {
+    for (const auto& [name, value] : names) {
+        if (node.value_exact<std::string_view>() == name) {
+            return value;
+        }
+    }
+    return std::nullopt;
+}
+
 template <std::integral T>
 struct Integer {
     T low;
@@ -36,6 +61,19 @@ struct Integer {
             return std::nullopt;
         }
         return static_cast<T>(*value);
+    }
+};
+
+/** One of `names`, or a number that may be among those for which they stand. */
+template <typename T>
+struct NumberOrName {
+    Integer<T> numbers;
+    Names<T> names;
+
+    std::string expected() const { return numbers.expected() + " or one of " + listOf(names, ", "); }
+    std::optional<T> accept(const toml::node& node) const {
+        const auto named = valueOf(names, node);
+        return named ? named : numbers.accept(node);
     }
 };
 
@@ -69,23 +107,10 @@ struct NodePath {
 /** One of a few names, each of which stands for a value. */
 template <typename T>
 struct Choice {
-    std::span<const std::pair<std::string_view, T>> names;
+    Names<T> names;
 
-    std::string expected() const {
-        std::string text;
-        for (const auto& name : names) {
-            text += (text.empty() ? "\"" : " or \"") + std::string(name.first) + '"';
-        }
-        return text;
-    }
-    std::optional<T> accept(const toml::node& node) const {
-        for (const auto& [name, value] : names) {
-            if (node.value_exact<std::string_view>() == name) {
-                return value;
-            }
-        }
-        return std::nullopt;
-    }
+    std::string expected() const { return listOf(names, " or "); }
+    std::optional<T> accept(const toml::node& node) const { return valueOf(names, node); }
 };
 
 class TableReader {

@@ -10,16 +10,23 @@
 #include <cstddef>
 #include <memory>
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
 namespace Norv::Agent {
 
-/** How a request for another power state ended. */
+/** How a request for another power state, or its cancellation, ended. */
 struct PowerRequestOutcome {
     bool accepted;
     /** For people: what was asked of which node, and when it will be over or why it was refused. */
     std::string description;
+};
+
+/** Why a request is not even tried. what() is the reason, for people. */
+class Refusal : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
 };
 
 /**
@@ -40,8 +47,17 @@ public:
 
     virtual const std::vector<unsigned int>& powerStates(std::size_t node) const = 0;
 
-    /** Asks for another power state; an accepted one shows in `powerState` of this selection at once. */
+    /**
+     * Asks for another power state; an accepted one shows in `powerState` of this selection at once. Refused where
+     * another request is under way.
+     */
     virtual PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) = 0;
+
+    /**
+     * Takes back the request that is under way, by whomever it was made; the node is then as it was before. Refused
+     * where there is none, or where it is too late.
+     */
+    virtual PowerRequestOutcome cancelRequest(std::size_t node) = 0;
 };
 
 /** What stands behind the nodes, for people who want to know whether it will do. */
@@ -51,7 +67,7 @@ struct MachineReport {
         std::string value;
     };
 
-    /** What it does now, and what it can be asked to do. */
+    /** What it does now, what it can be asked to do, and what it warns of. */
     std::vector<Fact> facts;
     /** What is missing, and what to do about it. */
     std::vector<std::string> problems;
@@ -66,6 +82,9 @@ public:
 
     /** The machine, for people, as it completes "Power management of". */
     virtual std::string machine() const = 0;
+
+    /** What is allowed and will not do what one would think, for people; empty where there is nothing of the kind. */
+    virtual std::string warning() const { return {}; }
 
     /** Never null; without nodes where the machine has none. */
     virtual std::unique_ptr<NodeSelection> selectPowerManagementNodes() = 0;

@@ -28,6 +28,9 @@ std::unique_ptr<Backend> createBackend() {
         } else {
             report(informationLevel, "Power management of " + backend->machine(), OrvLog::MACHINE_RECORD);
         }
+        if (const std::string warning = backend->warning(); !warning.empty()) {
+            report(failureLevel, warning);
+        }
         return backend;
     } catch (const ConfigurationError&) {
         // The log library says what is wrong, on its first use: now at the latest.

@@ -27,6 +27,8 @@ using Kind = LogindError::Kind;
 /** Errors by which the bus says that nobody can answer. */
 constexpr std::array<std::string_view, 3> noServiceErrors = {
     SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER, "org.freedesktop.systemd1.NoSuchUnit"};
+/** Errors by which systemd says that a service must not be started. */
+constexpr std::array<std::string_view, 1> maskedErrors = {"org.freedesktop.systemd1.UnitMasked"};
 /** Errors by which the bus says that whoever should have answered is gone. */
 constexpr std::array<std::string_view, 2> unansweredErrors = {SD_BUS_ERROR_NO_REPLY, SD_BUS_ERROR_DISCONNECTED};
 
@@ -136,11 +138,6 @@ bool contains(std::string_view list, std::string_view name) {
 
 } // namespace
 
-std::chrono::microseconds Deadline::remaining() const {
-    const auto left = std::chrono::floor<std::chrono::microseconds>(_end - std::chrono::steady_clock::now());
-    return std::max(left, std::chrono::microseconds{0});
-}
-
 void Logind::Closer::operator()(sd_bus* bus) const {
     libsystemd().sd_bus_close_unref(bus);
 }
@@ -150,6 +147,10 @@ void Logind::Unreferencer::operator()(sd_bus_message* message) const {
 }
 
 Logind::Logind(const Deadline& deadline) : _deadline(deadline) {
+    if (_deadline.remaining().count() == 0) {
+        throw LogindError(Kind::unanswered,
+                          "there was no answer within " + inSeconds(_deadline.whole()) + ", a moment ago");
+    }
     sd_bus* bus = nullptr;
     if (const int result = libsystemd().sd_bus_open_system(&bus); result < 0) {
         failToConnect(textOf(-result));
@@ -201,6 +202,7 @@ Logind::Message Logind::send(const Message& call, const char* method) {
     sd_bus_message* reply = nullptr;
     const int result = libsystemd().sd_bus_call(_bus.get(), call.get(), remaining, error.target(), &reply);
     if (result >= 0) {
+        _answers = true;
         return Message(reply);
     }
     if (_deadline.remaining().count() == 0) {
@@ -215,6 +217,13 @@ Logind::Message Logind::send(const Message& call, const char* method) {
     }
     if (error.isOneOf(noServiceErrors)) {
         throw LogindError(Kind::noService, "systemd-logind is not on the system bus: " + error.text());
+    }
+    if (error.isOneOf(maskedErrors)) {
+        throw _answers ? LogindError(Kind::polkitMasked, std::string(method) +
+                                                             ": polkit is masked, which "
+                                                             "systemd-logind has to ask: " +
+                                                             error.text())
+                       : LogindError(Kind::masked, "systemd-logind is masked: " + error.text());
     }
     throw LogindError(Kind::refused, std::string(method) + ": " + error.text());
 }
@@ -289,7 +298,15 @@ void Logind::scheduleShutdown(const ScheduledShutdown& shutdown) {
     send(call, method);
 }
 
-void Logind::cancelScheduledShutdown() noexcept {
+bool Logind::cancelScheduledShutdown() {
+    constexpr const char* method = "CancelScheduledShutdown";
+    const Message reply = send(newCall(managerInterface, method), method);
+    int cancelled = 0;
+    require(libsystemd().sd_bus_message_read(reply.get(), "b", &cancelled), method);
+    return cancelled != 0;
+}
+
+void Logind::takeBackScheduledShutdown() noexcept {
     sd_bus_message* call = nullptr;
     if (libsystemd().sd_bus_message_new_method_call(_bus.get(), &call, service, path, managerInterface,
                                                     "CancelScheduledShutdown") >= 0) {

@@ -4,6 +4,8 @@
 #ifndef INSTRUMENTATION_LOGIND_H
 #define INSTRUMENTATION_LOGIND_H
 
+#include "base/Deadline.h"
+
 #include <chrono>
 #include <cstdint>
 #include <memory>
@@ -16,22 +18,6 @@ struct sd_bus_message;
 
 namespace Norv::Agent {
 
-/** The time that everything an operation waits for may take together. */
-class Deadline {
-public:
-    explicit Deadline(std::chrono::milliseconds whole)
-        : _whole(whole), _end(std::chrono::steady_clock::now() + whole) {}
-
-    std::chrono::milliseconds whole() const { return _whole; }
-
-    /** Not negative. */
-    std::chrono::microseconds remaining() const;
-
-private:
-    std::chrono::milliseconds _whole;
-    std::chrono::steady_clock::time_point _end;
-};
-
 /** A call that did not do what it should. what() is the reason, for people. */
 class LogindError : public std::runtime_error {
 public:
@@ -40,6 +26,10 @@ public:
         noBus,
         /** Nobody on the bus is systemd-logind, and nobody starts it. */
         noService,
+        /** Systemd-logind must not be started. */
+        masked,
+        /** Systemd-logind answers, but polkit, which it has to ask about this user, must not be started. */
+        polkitMasked,
         /** Systemd-logind, or the bus in its place, said no. */
         refused,
         /** No answer came: whether the call did something is not known. */
@@ -96,8 +86,11 @@ public:
 
     void scheduleShutdown(const ScheduledShutdown& shutdown);
 
+    /** Cancels the scheduled shutdown. @return whether there was one. */
+    bool cancelScheduledShutdown();
+
     /** Asks for the scheduled shutdown to be cancelled, without waiting for an answer. Does not throw. */
-    void cancelScheduledShutdown() noexcept;
+    void takeBackScheduledShutdown() noexcept;
 
 private:
     struct Closer {
@@ -115,6 +108,8 @@ private:
 
     Deadline _deadline;
     std::unique_ptr<sd_bus, Closer> _bus;
+    /** Whether systemd-logind has answered anything. */
+    bool _answers = false;
 };
 
 } // namespace Norv::Agent

@@ -1,19 +1,19 @@
 #include "LogindBackend.h"
 
 #include "Logind.h"
+#include "Patience.h"
 #include "Report.h"
 #include "Wording.h"
+#include "base/Folders.h"
+#include "base/LockFile.h"
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
-#include <ctime>
+#include <functional>
 #include <stdexcept>
 #include <system_error>
 #include <utility>
 
-#include <fcntl.h>
-#include <sys/file.h>
 #include <unistd.h>
 
 namespace Norv::Agent {
@@ -103,59 +103,29 @@ struct Pending {
     unsigned int state;
     /** For people: what, and when. */
     std::string description;
+    /** Whether the machine already goes down. */
+    bool begun;
+    /** When it does. */
+    WallTime time;
 };
 
 std::optional<Pending> pendingOn(Logind& logind) {
     const bool preparing = logind.isPreparingForShutdown();
     const ScheduledShutdown scheduled = logind.scheduledShutdown();
+    const WallTime now = std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now());
     if (scheduled.type.empty()) {
-        return preparing ? std::optional(Pending{goingDown, "the machine is going down"}) : std::nullopt;
+        return preparing ? std::optional(Pending{goingDown, "the machine is going down", true, now}) : std::nullopt;
     }
     const auto* const transition = std::ranges::find(transitions, scheduled.type, &Transition::scheduledType);
     // There are others, such as "halt" and "kexec".
     const unsigned int state = transition != transitions.end() ? transition->state : goingDown;
-    return Pending{state,
-                   scheduled.type + (preparing ? " is under way"
-                                               : " is scheduled for " +
-                                                     inUtc(std::chrono::floor<std::chrono::seconds>(scheduled.time)))};
+    if (preparing) {
+        return Pending{state, scheduled.type + " is under way", true, now};
+    }
+    return Pending{
+        state, scheduled.type + " is scheduled for " + inUtc(std::chrono::floor<std::chrono::seconds>(scheduled.time)),
+        false, scheduled.time};
 }
-
-/** The lock on a file, held by one process and thread at a time. */
-class Lock {
-public:
-    /** @throws std::system_error where the file cannot be opened, or others hold the lock until the deadline. */
-    Lock(const std::filesystem::path& file, const Deadline& deadline)
-        : _descriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY)) {
-        if (_descriptor < 0) {
-            throw std::system_error(errno, std::generic_category(), file.string() + ": cannot be opened");
-        }
-        while (::flock(_descriptor, LOCK_EX | LOCK_NB) != 0) {
-            const int error = errno;
-            if ((error != EWOULDBLOCK && error != EINTR) || deadline.remaining().count() == 0) {
-                ::close(_descriptor);
-                throw std::system_error(error, std::generic_category(), file.string() + ": cannot be locked");
-            }
-            constexpr timespec pause{.tv_sec = 0, .tv_nsec = 10'000'000};
-            ::nanosleep(&pause, nullptr);
-        }
-    }
-    ~Lock() {
-        // Closing would not do: a child that the host has just forked holds the same lock.
-        ::flock(_descriptor, LOCK_UN);
-        ::close(_descriptor);
-    }
-    Lock(const Lock&) = delete;
-    Lock& operator=(const Lock&) = delete;
-
-private:
-    int _descriptor;
-};
-
-/** A request that systemd-logind was not asked to fulfil. what() is the reason. */
-class Refusal : public std::runtime_error {
-public:
-    using std::runtime_error::runtime_error;
-};
 
 /** @throws Refusal where something speaks against it now. */
 void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
@@ -171,23 +141,23 @@ void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
     }
 }
 
-/** Has systemd-logind do it. @return when, for people. */
-std::string carryOut(Logind& logind, const Transition& transition, std::chrono::milliseconds delay) {
+/** Has systemd-logind do it. @return when. */
+WallTime carryOut(Logind& logind, const Transition& transition, std::chrono::milliseconds delay) {
+    const WallTime time = std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
     if (delay.count() == 0) {
         logind.shutDown(transition.method);
-        return "at once";
+        return time;
     }
-    const WallTime time = std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
     try {
         logind.scheduleShutdown({transition.scheduledType, time});
     } catch (const LogindError& error) {
         if (error.kind() == LogindError::Kind::unanswered) {
             // The call may still be waiting. It was refused here, and must not bring the machine down later.
-            logind.cancelScheduledShutdown();
+            logind.takeBackScheduledShutdown();
         }
         throw;
     }
-    return "at " + inUtc(std::chrono::floor<std::chrono::seconds>(time)) + ", in " + inSeconds(delay);
+    return time;
 }
 
 std::string adviceFor(LogindError::Kind kind) {
@@ -196,6 +166,11 @@ std::string adviceFor(LogindError::Kind kind) {
         return ": start the system bus (dbus.service), or give " + user() + " access to it";
     case LogindError::Kind::noService:
         return ": install systemd-logind and start it (systemd-logind.service)";
+    case LogindError::Kind::masked:
+        return ": let it be started again (systemctl unmask systemd-logind.service)";
+    case LogindError::Kind::polkitMasked:
+        return ": let polkit be started again (systemctl unmask polkit.service), or have root make the requests: " +
+               user() + " needs polkit's leave";
     case LogindError::Kind::refused:
         return ": let the policy of the system bus and of polkit allow it to " + user();
     case LogindError::Kind::unanswered:
@@ -204,32 +179,42 @@ std::string adviceFor(LogindError::Kind kind) {
     return ": look into the journal of systemd-logind (journalctl --unit systemd-logind)";
 }
 
+/** The reason, with advice where it is one that somebody has brought about on purpose, and forgotten. */
+std::string reasonOf(const LogindError& error) {
+    const bool isMasked = error.kind() == LogindError::Kind::masked || error.kind() == LogindError::Kind::polkitMasked;
+    return error.what() + (isMasked ? adviceFor(error.kind()) : std::string());
+}
+
 } // namespace
 
 class LogindBackend::Selection final : public NodeSelection {
 public:
-    explicit Selection(const LogindBackend& backend) : _backend(backend) {
+    explicit Selection(LogindBackend& backend) : _backend(backend) {
+        if (const auto known = backend._end.begun()) {
+            show(*known);
+            return;
+        }
+        const auto due = backend._end.due();
         try {
-            Logind logind{Deadline(backend._settings.timeout)};
-            const auto pending = pendingOn(logind);
-            _states.push_back(listedOn);
-            for (const ListedState& listed : listedStates) {
-                if (logind.can(listed.canMethod) == yes) {
-                    _states.push_back(listed.state);
-                }
-            }
-            std::ranges::sort(_states);
-            _state = pending ? pending->state : running;
+            const Patience patience(due ? std::min(backend._settings.timeout, shortTimeout)
+                                        : backend._settings.timeout);
+            Logind logind(patience.deadline());
+            read(logind);
         } catch (const LogindError& error) {
+            if (due) {
+                show(*due);
+                return;
+            }
             _states.clear();
-            report(failureLevel, std::string("The power state of this machine cannot be told: ") + error.what());
+            report(failureLevel, std::string("The power state of this machine cannot be told: ") + reasonOf(error));
         }
     }
 
     std::size_t size() const override { return 1; }
 
     const std::string& path(std::size_t /*node*/) const override {
-        static const std::string path = nodePath;
+        // Never destroyed: cursors may be used until the very end of the process.
+        static const std::string& path = *new std::string(nodePath);
         return path;
     }
 
@@ -245,28 +230,87 @@ public:
                     "power state " + std::to_string(state) + ' ' + where + ": expected " + acceptedStates(transitions)};
         }
         const std::string what = transition->name + (' ' + where);
-        const Deadline deadline(_backend._settings.timeout);
-        try {
-            const Lock lock(_backend._lockFile, deadline);
-            Logind logind(deadline);
+        return attempt(what, [&](Logind& logind) {
             requireThatItCanBeDone(logind, *transition);
-            const std::string when = carryOut(logind, *transition, _backend._settings.delay);
+            const std::chrono::milliseconds delay = _backend._settings.delay;
+            const WallTime time = carryOut(logind, *transition, delay);
             _state = state;
-            return {true, what + ", " + when};
+            _backend._end.note(time, delay.count() == 0, {state, _states});
+            return delay.count() == 0
+                       ? std::string(", at once")
+                       : ", at " + inUtc(std::chrono::floor<std::chrono::seconds>(time)) + ", in " + inSeconds(delay);
+        });
+    }
+
+    PowerRequestOutcome cancelRequest(std::size_t node) override {
+        return attempt("cancellation of the request of this machine, node " + path(node), [&](Logind& logind) {
+            const auto pending = pendingOn(logind);
+            if (!pending) {
+                throw Refusal("no request is in progress");
+            }
+            if (pending->begun || !logind.cancelScheduledShutdown()) {
+                throw Refusal("it is too late: " + pending->description);
+            }
+            _state = running;
+            _backend._end.forget();
+            return " (" + pending->description + ')';
+        });
+    }
+
+private:
+    /** How long others are asked once the machine should go down: they may be gone, and this process is to end. */
+    static constexpr std::chrono::milliseconds shortTimeout{500};
+
+    void show(const EndOfTheMachine::Node& node) {
+        _state = node.state;
+        _states = node.powerStates;
+    }
+
+    void read(Logind& logind) {
+        const auto pending = pendingOn(logind);
+        _states.push_back(listedOn);
+        try {
+            for (const ListedState& listed : listedStates) {
+                if (logind.can(listed.canMethod) == yes) {
+                    _states.push_back(listed.state);
+                }
+            }
+        } catch (const LogindError& error) {
+            if (error.kind() != LogindError::Kind::polkitMasked) {
+                throw;
+            }
+            report(failureLevel,
+                   std::string("What this machine can be asked to do cannot be told: ") + reasonOf(error));
+        }
+        std::ranges::sort(_states);
+        _state = pending ? pending->state : running;
+        if (pending) {
+            _backend._end.note(pending->time, pending->begun, {pending->state, _states});
+        } else {
+            _backend._end.forget();
+        }
+    }
+
+    /** @param action what to ask of systemd-logind; gives the end of the description, or throws the reason. */
+    PowerRequestOutcome attempt(const std::string& what, const std::function<std::string(Logind&)>& action) {
+        const Patience patience(_backend._settings.timeout);
+        try {
+            createMissingFolders(_backend._settings.lockFile.parent_path());
+            const LockFile lock(_backend._settings.lockFile, patience.deadline());
+            Logind logind(patience.deadline());
+            return {true, what + action(logind)};
+        } catch (const LogindError& error) {
+            return {false, what + ": " + reasonOf(error)};
         } catch (const std::exception& error) {
             return {false, what + ": " + error.what()};
         }
     }
 
-private:
-    const LogindBackend& _backend;
+    LogindBackend& _backend;
     /** Not set where it cannot be told. */
     std::optional<unsigned int> _state;
     std::vector<unsigned int> _states;
 };
-
-LogindBackend::LogindBackend(const LogindSettings& settings, std::filesystem::path lockFile)
-    : _settings(settings), _lockFile(std::move(lockFile)) {}
 
 std::unique_ptr<NodeSelection> LogindBackend::selectPowerManagementNodes() {
     return std::make_unique<Selection>(*this);
@@ -279,7 +323,9 @@ std::string LogindBackend::machine() const {
 MachineReport LogindBackend::examine() {
     MachineReport found;
     try {
-        Logind logind{Deadline(_settings.timeout)};
+        requireWritable(_settings.lockFile.parent_path());
+        const Patience patience(_settings.timeout);
+        Logind logind(patience.deadline());
         const auto pending = pendingOn(logind);
         found.facts.push_back({"under way", pending ? pending->description : "nothing"});
         for (const Transition& transition : transitions) {
@@ -299,6 +345,9 @@ MachineReport LogindBackend::examine() {
         }
     } catch (const LogindError& error) {
         found.problems.push_back(error.what() + adviceFor(error.kind()));
+    } catch (const std::system_error& error) {
+        found.problems.push_back(std::string(error.what()) + ": let " + user() +
+                                 " write there, or name another lock-file");
     }
     return found;
 }

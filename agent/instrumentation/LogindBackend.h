@@ -6,21 +6,17 @@
 #define INSTRUMENTATION_LOGINDBACKEND_H
 
 #include "Backend.h"
+#include "EndOfTheMachine.h"
 #include "config/Configuration.h"
 
-#include <filesystem>
+#include <utility>
 
 namespace Norv::Agent {
 
 class LogindBackend final : public Backend {
 public:
-    /**
-     * Nothing is connected yet.
-     *
-     * @param lockFile locked while a request is made, so that of two that are made at once the second finds the first.
-     * Any file that every process reads which makes requests; it is not changed.
-     */
-    LogindBackend(const LogindSettings& settings, std::filesystem::path lockFile);
+    /** Nothing is connected yet. */
+    explicit LogindBackend(LogindSettings settings) : _settings(std::move(settings)) {}
 
     bool isSimulated() const override { return false; }
     std::string machine() const override;
@@ -31,7 +27,8 @@ private:
     class Selection;
 
     const LogindSettings _settings;
-    const std::filesystem::path _lockFile;
+    /** What keeps the node's state once the machine goes down. */
+    EndOfTheMachine _end;
 };
 
 } // namespace Norv::Agent

@@ -3,14 +3,14 @@
 #include "PowerTransition.h"
 #include "Report.h"
 #include "Wording.h"
+#include "base/Folders.h"
+#include "config/PowerStates.h"
 
 #include <algorithm>
-#include <cerrno>
+#include <cstdint>
 #include <exception>
 #include <system_error>
 #include <utility>
-
-#include <unistd.h>
 
 namespace Norv::Agent {
 
@@ -32,11 +32,8 @@ public:
         if (request == _requests->end()) {
             return _backend._settings.nodes[node].powerState;
         }
-        const auto& [transition, over] = request->second;
-        const auto remaining = over - _backend._clock();
-        // More can remain than a transition takes where the clock was set back, or the file came from elsewhere.
-        const bool isOver = remaining.count() <= 0 || remaining > _backend._settings.*transition->duration;
-        return isOver ? transition->stateAfterwards : transition->state;
+        const PowerTransition& transition = *request->second.transition;
+        return isUnderWay(request->second) ? transition.state : transition.stateAfterwards;
     }
 
     const std::vector<unsigned int>& powerStates(std::size_t node) const override {
@@ -50,17 +47,61 @@ public:
             return {false, "power state " + std::to_string(state) + ' ' + where + ": expected " +
                                acceptedStates(powerTransitions)};
         }
-        const std::string what = transition->name + (' ' + where);
         const std::chrono::milliseconds duration = _backend._settings.*transition->duration;
-        try {
-            _requests = _backend._stateFile.write(path(node), {transition, _backend._clock() + duration});
-        } catch (const std::exception& error) {
-            return {false, what + ": " + error.what()};
-        }
-        return {true, what + ", over in " + inSeconds(duration)};
+        return change(transition->name + (' ' + where), [&](PowerRequests& requests) {
+            const auto before = requests.find(path(node));
+            if (before == requests.end()) {
+                requests.emplace(path(node), PowerRequest{transition, _backend._clock() + duration});
+            } else if (isUnderWay(before->second)) {
+                throw Refusal("another request is in progress: " + describe(before->second));
+            } else {
+                before->second = {transition, _backend._clock() + duration, before->second.transition};
+            }
+            return ", over in " + inSeconds(duration);
+        });
+    }
+
+    PowerRequestOutcome cancelRequest(std::size_t node) override {
+        return change("cancellation of the request of simulated node " + path(node), [&](PowerRequests& requests) {
+            const auto last = requests.find(path(node));
+            if (last == requests.end() || !isUnderWay(last->second)) {
+                throw Refusal("no request is in progress");
+            }
+            const std::string cancelled = std::string(" (") + last->second.transition->name + ')';
+            if (last->second.after == nullptr) {
+                requests.erase(last);
+            } else {
+                last->second = {last->second.after, TimePoint()};
+            }
+            return cancelled;
+        });
     }
 
 private:
+    /** Not where the end is further away than a transition takes: the clock was set back, or the file came from
+     * elsewhere. */
+    bool isUnderWay(const PowerRequest& request) const {
+        const auto remaining = request.over - _backend._clock();
+        return remaining.count() > 0 && remaining <= _backend._settings.*request.transition->duration;
+    }
+
+    std::string describe(const PowerRequest& request) const {
+        return std::string(request.transition->name) + " is over at " +
+               inUtc(std::chrono::ceil<std::chrono::seconds>(request.over)) + ", in " +
+               inSeconds(request.over - _backend._clock());
+    }
+
+    /** @param action what to do to the file's content; gives the end of the description, or throws the reason. */
+    PowerRequestOutcome change(const std::string& what, const std::function<std::string(PowerRequests&)>& action) {
+        try {
+            std::string end;
+            _requests = _backend._stateFile.update([&](PowerRequests& requests) { end = action(requests); });
+            return {true, what + end};
+        } catch (const std::exception& error) {
+            return {false, what + ": " + error.what()};
+        }
+    }
+
     SimulatedBackend& _backend;
     /** Null where the state file cannot be read. */
     std::shared_ptr<const PowerRequests> _requests;
@@ -73,6 +114,20 @@ std::string SimulatedBackend::machine() const {
     const std::size_t count = _settings.nodes.size();
     return "a simulated machine (" + std::to_string(count) + (count == 1 ? " node" : " nodes") + ", state in " +
            _settings.stateFile.string() + ')';
+}
+
+std::string SimulatedBackend::warning() const {
+    // Each service is paired with each capabilities, and CMPI providers of this interface count with 16 bits.
+    constexpr std::uint64_t mostNodes = 255;
+    const std::uint64_t count = _settings.nodes.size();
+    if (count <= mostNodes) {
+        return {};
+    }
+    return std::to_string(count) +
+           " nodes: clients see too few instances of TALVO_PowerManagementElementCapabilities, "
+           "or none, since their " +
+           std::to_string(count * count) + " pairs of service and capabilities are counted with 16 bits: expected " +
+           std::to_string(mostNodes) + " nodes at most";
 }
 
 std::unique_ptr<NodeSelection> SimulatedBackend::selectPowerManagementNodes() {
@@ -90,16 +145,12 @@ MachineReport SimulatedBackend::examine() {
     try {
         const Selection nodes(*this, _stateFile.read());
         for (std::size_t node = 0; node < nodes.size(); ++node) {
-            found.facts.push_back(
-                {"node " + nodes.path(node), "power state " + std::to_string(*nodes.powerState(node))});
+            found.facts.push_back({"node " + nodes.path(node), nodePowerStateText(*nodes.powerState(node))});
         }
-        std::filesystem::path folder = _settings.stateFile.parent_path();
-        while (!std::filesystem::exists(folder)) {
-            folder = folder.parent_path();
+        if (const std::string text = warning(); !text.empty()) {
+            found.facts.push_back({"warning", text});
         }
-        if (::access(folder.c_str(), W_OK) != 0) {
-            throw std::system_error(errno, std::generic_category(), folder.string() + ": cannot be written");
-        }
+        requireWritable(_settings.stateFile.parent_path());
     } catch (const std::system_error& error) {
         found.problems.push_back(std::string(error.what()) + ": let the user write there, or name another state-file");
     }

@@ -22,6 +22,7 @@ public:
 
     bool isSimulated() const override { return true; }
     std::string machine() const override;
+    std::string warning() const override;
     std::unique_ptr<NodeSelection> selectPowerManagementNodes() override;
     MachineReport examine() override;
 

@@ -1,6 +1,9 @@
 #include "StateFile.h"
 
 #include "Report.h"
+#include "base/Descriptor.h"
+#include "base/Folders.h"
+#include "base/LockFile.h"
 
 #include <nlohmann/json.hpp>
 
@@ -17,7 +20,7 @@
 #include <vector>
 
 #include <fcntl.h>
-#include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace Norv::Agent {
@@ -27,6 +30,12 @@ namespace {
 constexpr const char* nodesKey = "nodes";
 constexpr const char* requestKey = "request";
 constexpr const char* overKey = "over";
+constexpr const char* afterKey = "after";
+
+/** How long others may keep the file locked. */
+constexpr std::chrono::seconds patience{5};
+/** No file of ours is larger. */
+constexpr off_t largestSize = off_t{16} * 1024 * 1024;
 
 /** @throws std::system_error of errno. */
 [[noreturn]] void fail(const std::filesystem::path& path, const std::string& problem) {
@@ -37,45 +46,21 @@ std::filesystem::path withSuffix(std::filesystem::path path, const std::string& 
     return path += suffix;
 }
 
-/** An open file that is closed with the object. */
-class OpenFile {
-public:
-    /** `descriptor` as open(2) gave it; its errno belongs to the caller. */
-    explicit OpenFile(int descriptor) : _descriptor(descriptor) {}
-    ~OpenFile() {
-        if (_descriptor >= 0) {
-            ::close(_descriptor);
-        }
-    }
-    OpenFile(const OpenFile&) = delete;
-    OpenFile& operator=(const OpenFile&) = delete;
-
-    bool isOpen() const { return _descriptor >= 0; }
-    int descriptor() const { return _descriptor; }
-
-private:
-    int _descriptor;
-};
-
-/** As mkdir -p does, with a mode that gives nobody else more than reading. */
-void createMissingFolders(const std::filesystem::path& folder) {
-    std::error_code ignored;
-    if (std::filesystem::is_directory(folder, ignored)) {
-        return;
-    }
-    createMissingFolders(folder.parent_path());
-    if (::mkdir(folder.c_str(), 0755) != 0 && errno != EEXIST) {
-        fail(folder, "cannot be created");
-    }
+[[noreturn]] void failOnSize(const std::filesystem::path& path) {
+    errno = EFBIG;
+    fail(path, "is not a state file, which has " + std::to_string(largestSize) + " bytes at most");
 }
 
-std::string readAll(const OpenFile& file, const std::filesystem::path& path) {
+std::string readAll(const Descriptor& file, const std::filesystem::path& path) {
     std::string text;
     std::array<char, 65536> block;
     for (;;) {
-        const ssize_t size = ::read(file.descriptor(), block.data(), block.size());
+        const ssize_t size = ::read(file.number(), block.data(), block.size());
         if (size > 0) {
             text.append(block.data(), static_cast<std::size_t>(size));
+            if (std::cmp_greater(text.size(), largestSize)) {
+                failOnSize(path);
+            }
         } else if (size == 0) {
             return text;
         } else if (errno != EINTR) {
@@ -84,12 +69,13 @@ std::string readAll(const OpenFile& file, const std::filesystem::path& path) {
     }
 }
 
-void writeAll(const OpenFile& file, const std::filesystem::path& path, std::string_view text) {
+void writeAll(const Descriptor& file, const std::filesystem::path& path, std::string_view text) {
     while (!text.empty()) {
-        const ssize_t size = ::write(file.descriptor(), text.data(), text.size());
-        if (size >= 0) {
+        const ssize_t size = ::write(file.number(), text.data(), text.size());
+        if (size > 0) {
             text.remove_prefix(static_cast<std::size_t>(size));
-        } else if (errno != EINTR) {
+        } else if (size == 0 || errno != EINTR) {
+            errno = size == 0 ? ENOSPC : errno;
             fail(path, "cannot be written");
         }
     }
@@ -126,14 +112,11 @@ public:
     }
 
     bool string(string_t& value) override {
-        if (!isField(requestKey)) {
-            return refuse('"' + value + '"');
-        }
         const auto* const transition = std::ranges::find(powerTransitions, value, &PowerTransition::name);
-        if (transition == powerTransitions.end()) {
+        if ((!isField(requestKey) && !isField(afterKey)) || transition == powerTransitions.end()) {
             return refuse('"' + value + '"');
         }
-        _transition = transition;
+        (isField(requestKey) ? _transition : _after) = transition;
         return true;
     }
 
@@ -190,7 +173,7 @@ private:
         if (isAt({nodesKey})) {
             throw std::invalid_argument(std::string(nodesKey) + " is no object");
         }
-        if (isField(requestKey)) {
+        if (isField(requestKey) || isField(afterKey)) {
             throw std::invalid_argument("unknown request " + found + " of node " + _keys[1]);
         }
         if (isField(overKey)) {
@@ -207,8 +190,9 @@ private:
         if (_transition == nullptr || !_over) {
             throw std::invalid_argument("node " + node + " lacks " + (_transition == nullptr ? requestKey : overKey));
         }
-        _requests.insert_or_assign(node, PowerRequest{_transition, *_over});
+        _requests.insert_or_assign(node, PowerRequest{_transition, *_over, _after});
         _transition = nullptr;
+        _after = nullptr;
         _over.reset();
     }
 
@@ -216,6 +200,7 @@ private:
     std::vector<std::string> _keys;
     bool _hasNodes = false;
     const PowerTransition* _transition = nullptr;
+    const PowerTransition* _after = nullptr;
     std::optional<TimePoint> _over;
     PowerRequests _requests;
 };
@@ -225,7 +210,11 @@ std::string format(const PowerRequests& requests) {
     std::string text;
     for (const auto& [node, request] : requests) {
         text.append(text.empty() ? "\n" : ",\n");
-        text.append("    ").append(nlohmann::json(node).dump()).append(": {\n      \"").append(overKey);
+        text.append("    ").append(nlohmann::json(node).dump()).append(": {\n      \"");
+        if (request.after != nullptr) {
+            text.append(afterKey).append("\": \"").append(request.after->name).append("\",\n      \"");
+        }
+        text.append(overKey);
         text.append("\": ").append(std::to_string(request.over.time_since_epoch().count())).append(",\n      \"");
         text.append(requestKey).append("\": \"").append(request.transition->name).append("\"\n    }");
     }
@@ -250,27 +239,6 @@ std::filesystem::path nameForDamaged(const std::filesystem::path& file) {
 
 } // namespace
 
-/** Keeps every other thread and process from replacing the file; readers are not kept from anything. */
-class StateFile::Lock {
-public:
-    /** Waits until nobody else has the lock. */
-    explicit Lock(const std::filesystem::path& stateFile)
-        : _path(withSuffix(stateFile, ".lock")), _file(::open(_path.c_str(), O_RDONLY | O_CREAT | O_CLOEXEC, 0644)) {
-        if (!_file.isOpen()) {
-            fail(_path, "cannot be opened");
-        }
-        while (::flock(_file.descriptor(), LOCK_EX) != 0) {
-            if (errno != EINTR) {
-                fail(_path, "cannot be locked");
-            }
-        }
-    }
-
-private:
-    const std::filesystem::path _path;
-    const OpenFile _file;
-};
-
 // A guest does not know when its host changes the working directory, hence the absolute path.
 StateFile::StateFile(const std::filesystem::path& file) : _file(std::filesystem::absolute(file)) {}
 
@@ -285,7 +253,7 @@ std::shared_ptr<const PowerRequests> StateFile::read() {
     Content content = load();
     if (!content.damage.empty()) {
         try {
-            content = loadOrSetAside(Lock(_file));
+            content = loadOrSetAside(lock());
         } catch (const std::system_error& error) {
             report(alwaysWrittenLevel, "The state file " + _file.string() + " is damaged (" + content.damage +
                                            "): the simulated machine starts from its configured states. The file "
@@ -298,14 +266,18 @@ std::shared_ptr<const PowerRequests> StateFile::read() {
     return content.requests;
 }
 
-std::shared_ptr<const PowerRequests> StateFile::write(const std::string& node, const PowerRequest& request) {
+std::shared_ptr<const PowerRequests> StateFile::update(const std::function<void(PowerRequests&)>& change) {
     createMissingFolders(_file.parent_path());
-    const Lock lock(_file);
-    const Content content = loadOrSetAside(lock);
+    const LockFile held = lock();
+    const Content content = loadOrSetAside(held);
     auto requests = std::make_shared<PowerRequests>(*content.requests);
-    requests->insert_or_assign(node, request);
-    store(*requests, content.signature, lock);
+    change(*requests);
+    store(*requests, content.signature, held);
     return requests;
+}
+
+LockFile StateFile::lock() const {
+    return {withSuffix(_file, ".lock"), Deadline(patience)};
 }
 
 std::optional<FileSignature> StateFile::currentSignature() const {
@@ -321,7 +293,7 @@ std::optional<FileSignature> StateFile::currentSignature() const {
 
 StateFile::Content StateFile::load() const {
     // Opening what is no regular file must not wait for its other end.
-    const OpenFile file(::open(_file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+    const Descriptor file(::open(_file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (!file.isOpen()) {
         if (errno == ENOENT) {
             return {};
@@ -329,11 +301,14 @@ StateFile::Content StateFile::load() const {
         fail(_file, "cannot be read");
     }
     struct stat status {};
-    if (::fstat(file.descriptor(), &status) != 0) {
+    if (::fstat(file.number(), &status) != 0) {
         fail(_file, "cannot be read");
     }
     if (!S_ISREG(status.st_mode)) {
         throw std::system_error(EINVAL, std::system_category(), _file.string() + ": is not a regular file");
+    }
+    if (status.st_size > largestSize) {
+        failOnSize(_file);
     }
     Content content;
     content.signature = FileSignature(status);
@@ -346,7 +321,7 @@ StateFile::Content StateFile::load() const {
     return content;
 }
 
-StateFile::Content StateFile::loadOrSetAside(const Lock& /*lock*/) const {
+StateFile::Content StateFile::loadOrSetAside(const LockFile& /*held*/) const {
     Content content = load();
     if (content.damage.empty()) {
         return content;
@@ -362,13 +337,13 @@ StateFile::Content StateFile::loadOrSetAside(const Lock& /*lock*/) const {
 }
 
 void StateFile::store(const PowerRequests& requests, const std::optional<FileSignature>& replaced,
-                      const Lock& /*lock*/) const {
+                      const LockFile& /*held*/) const {
     const std::filesystem::path replacement = withSuffix(_file, ".new");
     // A process that was killed while it wrote has left its own.
     if (::unlink(replacement.c_str()) != 0 && errno != ENOENT) {
         fail(replacement, "cannot be removed");
     }
-    const OpenFile file(::open(replacement.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0644));
+    const Descriptor file(::open(replacement.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0644));
     if (!file.isOpen()) {
         fail(replacement, "cannot be created");
     }
@@ -385,7 +360,7 @@ void StateFile::store(const PowerRequests& requests, const std::optional<FileSig
             static_cast<time_t>(seconds.count()), static_cast<long>((modified - seconds).count())
         };
         const std::array<struct timespec, 2> times = {time, time};
-        if (::futimens(file.descriptor(), times.data()) != 0 || ::fsync(file.descriptor()) != 0 ||
+        if (::futimens(file.number(), times.data()) != 0 || ::fsync(file.number()) != 0 ||
             ::rename(replacement.c_str(), _file.c_str()) != 0) {
             fail(replacement, "cannot be put in place");
         }
@@ -395,9 +370,9 @@ void StateFile::store(const PowerRequests& requests, const std::optional<FileSig
     }
     // The new file is whole and in place. Where this fails, a power failure can bring the former one back: no reason to
     // call the request refused.
-    const OpenFile folder(::open(_file.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    const Descriptor folder(::open(_file.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (folder.isOpen()) {
-        ::fsync(folder.descriptor());
+        ::fsync(folder.number());
     }
 }
 

@@ -1,20 +1,24 @@
 /**
  * The state of the simulated machine: one file that every process on the host shares.
  *
- *     { "nodes": { "chassis/blade1": { "request": "reboot", "over": 1795177867123 } } }
+ *     { "nodes": { "chassis/blade1": { "request": "reboot", "over": 1795177867123, "after": "shutdown" } } }
  *
- * holds the last power request of each node that ever had one; "over" is in milliseconds since 1970 (UTC). The file is
+ * holds the last power request of each node that ever had one; "over" is in milliseconds since 1970 (UTC), and "after"
+ * is the request before, where there was one: what the node goes back to where the last one is cancelled. The file is
  * replaced as a whole, under a lock on "<file>.lock" beside it, so that a reader needs no lock and a process that is
- * killed at any moment leaves a whole file. A damaged file is set aside as "<file>.damaged-<UTC time>-<number>".
+ * killed at any moment leaves a whole file. A damaged file is set aside as "<file>.damaged-<UTC time>-<number>". One
+ * that is larger than any of ours is neither read nor replaced.
  */
 #ifndef INSTRUMENTATION_STATEFILE_H
 #define INSTRUMENTATION_STATEFILE_H
 
 #include "PowerTransition.h"
-#include "config/FileSignature.h"
+#include "base/FileSignature.h"
+#include "base/LockFile.h"
 
 #include <chrono>
 #include <filesystem>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -30,6 +34,8 @@ struct PowerRequest {
     const PowerTransition* transition;
     /** When the transition is over. */
     TimePoint over;
+    /** The node's request before, which was over; null where there was none. */
+    const PowerTransition* after = nullptr;
 };
 
 /** The last request of each node that had one, by the node's path. */
@@ -50,13 +56,14 @@ public:
     std::shared_ptr<const PowerRequests> read();
 
     /**
-     * Replaces the last request of a node.
+     * Changes what the file holds, while nobody else can.
      *
+     * @param change what is to be changed. Where it throws, the file stays as it is.
      * @return what the file holds afterwards.
-     * @throws std::system_error where the file cannot be read or written, or a damaged one cannot be set aside; the
-     * file is then as it was.
+     * @throws std::system_error where the file cannot be locked, read or written, or a damaged one cannot be set aside;
+     * the file is then as it was. What `change` throws.
      */
-    std::shared_ptr<const PowerRequests> write(const std::string& node, const PowerRequest& request);
+    std::shared_ptr<const PowerRequests> update(const std::function<void(PowerRequests&)>& change);
 
 private:
     struct Content {
@@ -67,12 +74,11 @@ private:
         std::string damage;
     };
 
-    class Lock;
-
+    LockFile lock() const;
     std::optional<FileSignature> currentSignature() const;
     Content load() const;
-    Content loadOrSetAside(const Lock& lock) const;
-    void store(const PowerRequests& requests, const std::optional<FileSignature>& replaced, const Lock& lock) const;
+    Content loadOrSetAside(const LockFile& held) const;
+    void store(const PowerRequests& requests, const std::optional<FileSignature>& replaced, const LockFile& held) const;
 
     const std::filesystem::path _file;
 

@@ -1,7 +1,7 @@
 #include "Norv/Locale.h"
 
 #include "ResourceLibrary.h"
-#include "Unicode.h"
+#include "base/Utf8.h"
 
 #include "OrvLog/OrvLogger.h"
 
@@ -127,7 +127,7 @@ ResourceString::operator const std::wstring&() const {
 }
 
 std::string make_string(const std::wstring& text) {
-    return Locale::utf8From(text);
+    return Agent::utf8From(text);
 }
 
 } // namespace Norv

@@ -1,6 +1,6 @@
 #include "ResourceLibrary.h"
 
-#include "Unicode.h"
+#include "base/Utf8.h"
 
 #include <bit>
 #include <cstddef>
@@ -56,7 +56,7 @@ private:
 
     std::wstring string(std::uint64_t table, std::uint64_t index) const {
         const std::uint64_t element = table + index * 8;
-        auto string = Locale::wideFrom(bytes(number(element + 4), number(element)));
+        auto string = Agent::wideFrom(bytes(number(element + 4), number(element)));
         if (!string) {
             throw std::runtime_error("message " + std::to_string(index) + " is not in UTF-8");
         }

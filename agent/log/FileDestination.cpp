@@ -1,6 +1,9 @@
 #include "Destination.h"
 #include "LineWriter.h"
 
+#include "base/Descriptor.h"
+#include "base/Folders.h"
+
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -16,48 +19,28 @@
 
 namespace OrvLog {
 
+using Norv::Agent::Descriptor;
+
 namespace {
 
-/** An open file; negative where it could not be opened. */
-class Descriptor {
-public:
-    explicit Descriptor(const std::string& path) : _number(open(path.c_str(), flags)) {
-        if (_number >= 0 || errno != ENOENT) {
-            return;
-        }
-        _number = open(path.c_str(), flags | O_CREAT | O_EXCL, mode);
-        if (_number >= 0) {
-            giveToOwnerOfFolder(path);
-        } else if (errno == EEXIST) {
-            // Somebody else has just made it, or the name is a link to a file that is missing.
-            _number = open(path.c_str(), flags | O_CREAT, mode);
-        }
+constexpr int flags = O_WRONLY | O_APPEND | O_CLOEXEC | O_NOCTTY | O_NONBLOCK;
+constexpr mode_t mode = 0640;
+
+Descriptor openToAppend(const std::string& path) {
+    Descriptor existing(open(path.c_str(), flags));
+    if (existing.isOpen() || errno != ENOENT) {
+        return existing;
     }
-    ~Descriptor() {
-        if (_number >= 0) {
-            close(_number);
-        }
+    Descriptor made(open(path.c_str(), flags | O_CREAT | O_EXCL, mode));
+    if (made.isOpen()) {
+        // Where it stays root's, root's records are written all the same.
+        Norv::Agent::giveToOwnerOfFolder(made, path);
+    } else if (errno == EEXIST) {
+        // Somebody else has just made it, or the name is a link to a file that is missing.
+        return Descriptor(open(path.c_str(), flags | O_CREAT, mode));
     }
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-
-    int number() const { return _number; }
-
-private:
-    static constexpr int flags = O_WRONLY | O_APPEND | O_CLOEXEC | O_NOCTTY | O_NONBLOCK;
-    static constexpr mode_t mode = 0640;
-
-    // A service with a user of its own has the folder. It could not go on writing to a file that root made there.
-    void giveToOwnerOfFolder(const std::string& path) const {
-        struct stat folder {};
-        if (geteuid() == 0 && stat(path.substr(0, path.rfind('/') + 1).c_str(), &folder) == 0) {
-            // Where it stays root's, root's records are written all the same.
-            [[maybe_unused]] const int result = fchown(_number, folder.st_uid, folder.st_gid);
-        }
-    }
-
-    int _number;
-};
+    return made;
+}
 
 // The file is opened for each line: nothing is held that a host that closes its descriptors could take away or give to
 // somebody else, and a file that others removed or renamed is there again at once.
@@ -70,8 +53,8 @@ public:
 
     int write(const Line& line) override {
         {
-            const Descriptor file(_path);
-            if (file.number() < 0) {
+            const Descriptor file = openToAppend(_path);
+            if (!file.isOpen()) {
                 return errno;
             }
             if (!isFull(file, line.whole().size())) {
@@ -84,8 +67,8 @@ public:
 
 private:
     int append(const Line& line) {
-        const Descriptor file(_path);
-        return file.number() < 0 ? errno : _writer.write(file.number(), line);
+        const Descriptor file = openToAppend(_path);
+        return !file.isOpen() ? errno : _writer.write(file.number(), line);
     }
 
     bool isFull(const Descriptor& file, std::size_t more) const {

@@ -1,6 +1,6 @@
 #include "Gate.h"
 
-#include "config/CoarseClock.h"
+#include "base/CoarseClock.h"
 
 #include <unistd.h>
 

@@ -59,6 +59,9 @@ public:
     /** Starts a systemd-logind. @param parameters of logind_mock.py, as JSON. */
     void startLogind(const std::string& parameters = "{}");
 
+    /** Ends it again. */
+    void endLogind() { _logind.end(); }
+
     /** The methods that were called, in order, with their arguments: "Reboot False". Without what only reads. */
     std::vector<std::string> requests() const;
 

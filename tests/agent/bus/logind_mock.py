@@ -3,6 +3,7 @@
 Parameters, beside those of the template that it extends:
 
 ScheduledShutdown   type and time that stand there from the beginning
+PropertiesError     [name, message] with which reading any property fails
 Inhibitors          list of [what, who, why, mode, uid, pid]
 Calls               what a method does in place of its work:
                       {"error": [name, message]}   fails
@@ -28,6 +29,18 @@ self.props[self.interface]["ScheduledShutdown"] = dbus.Struct(("", dbus.UInt64(0
 GO_DOWN = """
 self.props[self.interface]["PreparingForShutdown"] = dbus.Boolean(True)
 """
+
+
+class Unreadable(dict):
+    """Properties that cannot be read."""
+
+    def __init__(self, name, message):
+        super().__init__()
+        self.name = name
+        self.message = message
+
+    def __getitem__(self, key):
+        raise dbus.exceptions.DBusException(self.message, name=self.name)
 
 
 def code_of(method, work, calls):
@@ -63,6 +76,8 @@ def load(mock, parameters):
     }
     for can in ("CanReboot", "CanPowerOff", "CanSuspend", "CanHibernate"):
         methods[can] = ("", "s", f"ret = {parameters.get(can, 'yes')!r}")
+    if "PropertiesError" in parameters:
+        mock.props[MAIN_IFACE] = Unreadable(*parameters["PropertiesError"])
     calls = parameters.get("Calls", {})
     mock.AddMethods(MAIN_IFACE, [(name, given, returned, code_of(name, work, calls))
                                  for name, (given, returned, work) in methods.items()])

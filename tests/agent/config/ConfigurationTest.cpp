@@ -109,6 +109,7 @@ TEST_F(ConfigurationTest, EveryKeyOfTheFileIsRead) {
         [instrumentation.logind]
         delay = 7.5
         timeout = 0.5
+        lock-file = "/run/orv.lock"
 
         [instrumentation.simulated]
         state-file = "/var/lib/state.json"
@@ -143,6 +144,7 @@ TEST_F(ConfigurationTest, EveryKeyOfTheFileIsRead) {
 
     EXPECT_EQ(configuration.instrumentation.logind.delay, milliseconds{7'500});
     EXPECT_EQ(configuration.instrumentation.logind.timeout, milliseconds{500});
+    EXPECT_EQ(configuration.instrumentation.logind.lockFile, "/run/orv.lock");
 
     const auto& simulated = configuration.instrumentation.simulated;
     EXPECT_EQ(simulated.stateFile, "/var/lib/state.json");
@@ -159,6 +161,23 @@ TEST_F(ConfigurationTest, EveryKeyOfTheFileIsRead) {
 
 TEST_F(ConfigurationTest, AnEmptyListOfNodesIsAMachineWithoutNodes) {
     EXPECT_THAT(load("instrumentation.simulated.node = []").instrumentation.simulated.nodes, IsEmpty());
+}
+
+TEST_F(ConfigurationTest, PowerStatesHaveNamesAndNumbers) {
+    const auto nodes = load(R"(
+        [[instrumentation.simulated.node]]
+        path = "a"
+        power-state = "off"
+        power-states = ["on", 5, "off-soft"]
+        [[instrumentation.simulated.node]]
+        path = "b"
+        power-state = 10
+    )")
+                           .instrumentation.simulated.nodes;
+    ASSERT_EQ(nodes.size(), 2U);
+    EXPECT_EQ(nodes[0].powerState, 10U);
+    EXPECT_THAT(nodes[0].powerStates, ElementsAre(2, 5, 8));
+    EXPECT_EQ(nodes[1].powerState, 10U);
 }
 
 TEST_F(ConfigurationTest, ALargeTreeIsReadInOrder) {
@@ -232,6 +251,12 @@ TEST_P(WrongConfigurationTest, IsReportedWithFileLineKeyValueAndWhatWasExpected)
     EXPECT_EQ(errorOf(GetParam().text), file.string() + GetParam().error);
 }
 
+#define SUPPORTED_STATES                                                                                               \
+    "an integer from 0 to 65535 or one of \"on\", \"sleep-light\", \"sleep-deep\", \"power-cycle-off-soft\", "         \
+    "\"off-hard\", \"hibernate\", \"off-soft\", \"power-cycle-off-hard\", \"master-bus-reset\", "                      \
+    "\"diagnostic-interrupt\", \"off-soft-graceful\", \"off-hard-graceful\", \"master-bus-reset-graceful\", "          \
+    "\"power-cycle-off-soft-graceful\", \"power-cycle-off-hard-graceful\""
+
 constexpr WrongFile wrongFiles[] = {
     {"UnknownTable", "\n[locale]\n", ":2: locale: unknown key: expected one of system, log, instrumentation"},
     {"UnknownKey", "[system]\nnmae = \"x\"\n", ":2: system.nmae: unknown key: expected one of name"},
@@ -289,11 +314,15 @@ constexpr WrongFile wrongFiles[] = {
      "[[instrumentation.simulated.node]]\npath = \"a/b\"\n[[instrumentation.simulated.node]]\npath = \"a/b\"\n",
      ":4: instrumentation.simulated.node[1].path: \"a/b\": expected a path that no other node has"},
     {"PowerStateAboveTheRange", "[[instrumentation.simulated.node]]\npath = \"a\"\npower-state = 65536\n",
-     ":3: instrumentation.simulated.node[0].power-state: 65536: expected an integer from 0 to 65535"},
+     ":3: instrumentation.simulated.node[0].power-state: 65536: expected an integer from 0 to 65535 or one of \"running\", "
+     "\"hibernating\", \"rebooting\", \"off\", \"shutting-down\""},
+    {"PowerStateOfAnUnknownName", "[[instrumentation.simulated.node]]\npath = \"a\"\npower-state = \"on\"\n",
+     ":3: instrumentation.simulated.node[0].power-state: \"on\": expected an integer from 0 to 65535 or one of "
+     "\"running\", \"hibernating\", \"rebooting\", \"off\", \"shutting-down\""},
     {"PowerStatesThatAreNoList", "[[instrumentation.simulated.node]]\npath = \"a\"\npower-states = 5\n",
-     ":3: instrumentation.simulated.node[0].power-states: 5: expected a list, each element an integer from 0 to 65535"},
+     ":3: instrumentation.simulated.node[0].power-states: 5: expected a list, each element " SUPPORTED_STATES},
     {"PowerStateOfAnotherType", "[[instrumentation.simulated.node]]\npath = \"a\"\npower-states = [2, \"off\"]\n",
-     ":3: instrumentation.simulated.node[0].power-states[1]: \"off\": expected an integer from 0 to 65535"},
+     ":3: instrumentation.simulated.node[0].power-states[1]: \"off\": expected " SUPPORTED_STATES},
 };
 
 INSTANTIATE_TEST_SUITE_P(Configuration, WrongConfigurationTest, testing::ValuesIn(wrongFiles),
@@ -333,6 +362,18 @@ TEST_F(ConfigurationTest, AnEmptyVariableCountsAsNotSet) {
     EXPECT_EQ(loadConfiguration().source, "");
     unsetenv("ORV_AGENT_CONFIG");
     EXPECT_EQ(loadConfiguration().source, "");
+}
+
+TEST_F(ConfigurationTest, OnlyTheMachineInUseNeedsAPlaceForItsFile) {
+    if (ORV_LOGIND == 0) {
+        GTEST_SKIP() << "there is one kind of machine only";
+    }
+    const auto real = load("[instrumentation]\nbackend = \"logind\"\n").instrumentation;
+    EXPECT_EQ(real.simulated.stateFile, "");
+    EXPECT_EQ(real.logind.lockFile.filename(), "power-request.lock");
+    const auto simulated = load("").instrumentation;
+    EXPECT_EQ(simulated.logind.lockFile, "");
+    EXPECT_EQ(simulated.simulated.stateFile.filename(), "simulated-machine.json");
 }
 
 TEST_F(ConfigurationTest, StateIsKeptWhereTheUserKeepsState) {

@@ -63,11 +63,10 @@ const std::string askedByThis =
 class Cursor : public testing::Test {
 protected:
     static void SetUpTestSuite() {
-        static const TemporaryFolder folder;
-        writeFile(folder / "agent.toml", R"(
+        writeFile(folder() / "agent.toml", R"(
             [instrumentation.simulated]
-            state-file = ")" + (folder / "state.json").string() +
-                                             R"("
+            state-file = ")" + (folder() / "state.json").string() +
+                                               R"("
             reboot-time = 3600
             [[instrumentation.simulated.node]]
             path = "system"
@@ -79,12 +78,21 @@ protected:
             path = "chassis/blade2"
             power-states = []
         )");
-        setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
+        setenv("ORV_AGENT_CONFIG", (folder() / "agent.toml").c_str(), 1);
         Instrumentation firstUse;
         takeLog();
     }
 
+    /** Nothing has been asked of the machine yet. */
+    void SetUp() override { std::filesystem::remove(folder() / "state.json"); }
+
     Instrumentation cursor;
+
+private:
+    static const TemporaryFolder& folder() {
+        static const TemporaryFolder only;
+        return only;
+    }
 };
 
 /** Every member gives nothing, and leaves what it was handed alone. */
@@ -294,6 +302,25 @@ TEST_F(Processes, TellWhichMachineIsManagedBeforeAnythingElse) {
     EXPECT_THAT(run("machine"), ElementsAre("simulated", StartsWith(firstUse)));
     configure("[instrumentation]\nbackend = \"abacus\"\n");
     EXPECT_THAT(run("machine"), ElementsAre("none", StartsWith("trace 6000")));
+}
+
+TEST_F(Processes, WarnOnceOfMoreNodesThanCanBeCounted) {
+    std::string nodes;
+    for (int number = 0; number < 256; ++number) {
+        nodes += "[[instrumentation.simulated.node]]\npath = \"" + std::to_string(number) + "\"\n";
+    }
+    configureSimulated(nodes, "10");
+    EXPECT_THAT(
+        run("machine machine"),
+        ElementsAre("simulated", "simulated", StartsWith(firstUse),
+                    StartsWith("log 6000 Corvane.Instrumentation 256 nodes: clients see too few instances of ")));
+}
+
+TEST_F(Processes, MayEndWhileCursorsAreInUse) {
+    configureSimulated("", "10");
+    for (int round = 0; round < 20; ++round) {
+        EXPECT_THAT(run("stay"), ElementsAre(StartsWith(firstUse), "at the end /system 1"));
+    }
 }
 
 TEST_F(Processes, SeeEachOthersRequests) {

@@ -1,4 +1,5 @@
 #include "LogindBackend.h"
+#include "base/LockFile.h"
 
 #include "PrivateBus.h"
 #include "RecordedLog.h"
@@ -13,8 +14,6 @@
 #include <regex>
 #include <thread>
 
-#include <fcntl.h>
-#include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 
@@ -61,14 +60,13 @@ protected:
     explicit Machine(const std::string& policy = "") : bus(policy) {}
 
     void SetUp() override {
-        writeFile(lockFile, "");
         requireBusIn(bus.folder());
         takeLog();
     }
 
     /** Another process's view of the machine. */
     std::unique_ptr<LogindBackend> machine() const {
-        return std::make_unique<LogindBackend>(LogindSettings{delay, timeout}, lockFile);
+        return std::make_unique<LogindBackend>(LogindSettings{delay, timeout, lockFile});
     }
 
     std::optional<unsigned int> powerState() const { return machine()->selectPowerManagementNodes()->powerState(0); }
@@ -288,8 +286,8 @@ protected:
 
     void configure(const std::string& more) const {
         writeFile(bus.folder() / "agent.toml", "[instrumentation]\nbackend = \"logind\"\n"
-                                               "[instrumentation.logind]\n" +
-                                                   more);
+                                               "[instrumentation.logind]\nlock-file = \"" +
+                                                   lockFile.string() + "\"\n" + more);
     }
 
     /** What a process writes that runs the commands of probe.cpp. */
@@ -304,9 +302,12 @@ protected:
 
     /** What it says of a request that is refused, where it may be that the power state cannot be read either. */
     testing::Matcher<std::vector<std::string>> refusal(const std::string& reason, bool unreadable) const {
+        // What nobody answered the first time is not waited for again.
+        const std::string again =
+            unreadable ? "(" + reason + "|there was no answer within .* s, a moment ago)" : reason;
         const auto refused = MatchesRegex("log 10000 Corvane\\.Instrumentation Power request refused: reboot of this "
                                           "machine, node system: " +
-                                          reason + " \\[asked by instrumentation_probe, process N, uid N\\]");
+                                          again + " \\[asked by instrumentation_probe, process N, uid N\\]");
         if (unreadable) {
             return ElementsAre("refused", StartsWith(notice),
                                MatchesRegex("log 6000 Corvane\\.Instrumentation The power state of this machine cannot "
@@ -417,6 +418,16 @@ INSTANTIATE_TEST_SUITE_P(
                 "delay = 3600\n",
                 R"(<deny send_destination="org.freedesktop.login1" send_interface="org.freedesktop.DBus.Properties"/>)",
                 true},
+        Failure{"WhereSystemdLogindIsMasked",
+                R"({"PropertiesError": ["org.freedesktop.systemd1.UnitMasked", "Unit is masked."]})",
+                R"(systemd-logind is masked: org\.freedesktop\.systemd1\.UnitMasked: Unit is masked\.: let it be )"
+                R"(started again \(systemctl unmask systemd-logind\.service\))",
+                "delay = 3600\n", "", true},
+        Failure{"WherePolkitIsMasked",
+                R"({"Calls": {"ScheduleShutdown": {"error": ["org.freedesktop.systemd1.UnitMasked", "Unit"]}}})",
+                R"(ScheduleShutdown: polkit is masked, which systemd-logind has to ask: org\.freedesktop\.systemd1\.)"
+                R"(UnitMasked: Unit: let polkit be started again \(systemctl unmask polkit\.service\), or have root )"
+                R"(make the requests: uid [0-9]+ needs polkit's leave)"},
         Failure{"WithoutSystemdLogind", nullptr,
                 R"(systemd-logind is not on the system bus: org\.freedesktop\.DBus\.Error\.ServiceUnknown: The name )"
                 R"(org\.freedesktop\.login1 was not provided by any \.service files)",
@@ -458,23 +469,139 @@ TEST_F(Processes, AreRefusedByABusThatSaysNothing) {
 TEST_F(Machine, RefusesARequestWhileAnotherIsBeingMade) {
     bus.startLogind();
     timeout = 300ms;
-    const int others = open(lockFile.c_str(), O_RDONLY | O_CLOEXEC);
-    ASSERT_EQ(flock(others, LOCK_EX), 0);
+    auto held = std::make_unique<LockFile>(lockFile, Deadline(0ms));
     const PowerRequestOutcome outcome = request(9);
     EXPECT_FALSE(outcome.accepted);
     EXPECT_EQ(outcome.description, "reboot of this machine, node system: " + lockFile.string() +
-                                       ": cannot be locked: Resource temporarily unavailable");
-    close(others);
+                                       ": locked by instrumentation_logind_test, process " + std::to_string(getpid()) +
+                                       ": Resource temporarily unavailable");
+    held.reset();
     timeout = 20s;
     EXPECT_TRUE(request(9).accepted);
 }
 
 TEST_F(Machine, RefusesARequestThatItCannotKeepApartFromOthers) {
     bus.startLogind();
-    std::filesystem::remove(lockFile);
-    EXPECT_EQ(request(9).description, "reboot of this machine, node system: " + lockFile.string() +
-                                          ": cannot be opened: No such file or directory");
+    std::filesystem::create_directory(lockFile);
+    EXPECT_THAT(request(9).description,
+                StartsWith("reboot of this machine, node system: " + lockFile.string() + ": cannot be opened: "));
     EXPECT_THAT(bus.requests(), IsEmpty());
+}
+
+TEST_F(Machine, RunsOnOnceARequestIsCancelled) {
+    bus.startLogind();
+    const auto backend = machine();
+    const auto nodes = backend->selectPowerManagementNodes();
+    ASSERT_TRUE(nodes->requestPowerState(0, 9).accepted);
+    const PowerRequestOutcome outcome = machine()->selectPowerManagementNodes()->cancelRequest(0);
+    EXPECT_TRUE(outcome.accepted);
+    EXPECT_THAT(outcome.description, MatchesRegex("cancellation of the request of this machine, node system \\(reboot "
+                                                  "is scheduled for 20[0-9-]+T[0-9:]+Z\\)"));
+    EXPECT_THAT(bus.requests(), ElementsAre(StartsWith("ScheduleShutdown \"reboot\" "), "CancelScheduledShutdown"));
+    EXPECT_THAT(powerState(), Optional(1));
+    EXPECT_TRUE(nodes->requestPowerState(0, 12).accepted);
+}
+
+TEST_F(Machine, HasNothingToCancelWhereNothingIsScheduled) {
+    bus.startLogind();
+    const auto cancel = [this] { return machine()->selectPowerManagementNodes()->cancelRequest(0).description; };
+    const std::string what = "cancellation of the request of this machine, node system: ";
+    EXPECT_EQ(cancel(), what + "no request is in progress");
+    bus.startLogind(R"({"PreparingForShutdown": true, "ScheduledShutdown": ["reboot", 1795177867000000]})");
+    EXPECT_EQ(cancel(), what + "it is too late: reboot is under way");
+    EXPECT_THAT(bus.requests(), IsEmpty());
+}
+
+/** What is left to ask at the machine's end. */
+struct Ending {
+    const char* name;
+    /** Of the systemd-logind that is there then; null where there is none. */
+    const char* parameters;
+};
+
+void PrintTo(const Ending& given, std::ostream* stream) {
+    *stream << given.name;
+}
+
+class MachineEnding : public Machine, public testing::WithParamInterface<Ending> {
+protected:
+    void leave() {
+        bus.endLogind();
+        if (GetParam().parameters != nullptr) {
+            bus.startLogind(GetParam().parameters);
+        }
+        takeLog();
+    }
+};
+
+INSTANTIATE_TEST_SUITE_P(All, MachineEnding,
+                         testing::Values(Ending{"WithoutSystemdLogind", nullptr},
+                                         Ending{"WithOneThatCannotAnswer",
+                                                R"({"PropertiesError": ["org.freedesktop.DBus.Error.Failed", "no"]})"},
+                                         Ending{"WithOneThatHasForgotten", "{}"}),
+                         [](const auto& each) { return std::string(each.param.name); });
+
+TEST_P(MachineEnding, GoesDownWhateverCanStillBeAskedOnceItWasSeenTo) {
+    bus.startLogind(R"({"ScheduledShutdown": ["reboot", 1795177867000000], "PreparingForShutdown": true})");
+    const auto backend = machine();
+    ASSERT_THAT(backend->selectPowerManagementNodes()->powerState(0), Optional(9));
+    leave();
+    const auto nodes = backend->selectPowerManagementNodes();
+    EXPECT_THAT(nodes->powerState(0), Optional(9));
+    EXPECT_THAT(nodes->powerStates(0), ElementsAre(2, 4, 5, 7, 8));
+    EXPECT_THAT(takeLog(), IsEmpty());
+}
+
+TEST_P(MachineEnding, GoesDownOnceItDidWhatItWasAskedToDoAtOnce) {
+    bus.startLogind();
+    delay = 0ms;
+    const auto backend = machine();
+    ASSERT_TRUE(backend->selectPowerManagementNodes()->requestPowerState(0, 12).accepted);
+    leave();
+    EXPECT_THAT(backend->selectPowerManagementNodes()->powerState(0), Optional(12));
+    EXPECT_THAT(takeLog(), IsEmpty());
+}
+
+TEST_F(Machine, GoesDownAtItsTimeWhereNobodyCanBeAskedAnyMore) {
+    bus.startLogind();
+    delay = 1ms;
+    const auto backend = machine();
+    ASSERT_TRUE(backend->selectPowerManagementNodes()->requestPowerState(0, 9).accepted);
+    bus.endLogind();
+    EXPECT_THAT(backend->selectPowerManagementNodes()->powerState(0), Optional(9));
+    EXPECT_THAT(takeLog(), IsEmpty());
+    bus.startLogind();
+    EXPECT_THAT(backend->selectPowerManagementNodes()->powerState(0), Optional(1)) << "cancelled meanwhile";
+    bus.endLogind();
+    EXPECT_EQ(backend->selectPowerManagementNodes()->powerState(0), std::nullopt);
+}
+
+TEST_F(Machine, IsNotTakenForGoingDownBeforeItsTime) {
+    bus.startLogind();
+    const auto backend = machine();
+    ASSERT_TRUE(backend->selectPowerManagementNodes()->requestPowerState(0, 9).accepted);
+    bus.endLogind();
+    EXPECT_EQ(backend->selectPowerManagementNodes()->powerState(0), std::nullopt);
+}
+
+TEST_F(Machine, TellsItsStateThoughPolkitIsMasked) {
+    bus.startLogind(R"({"Calls": {"CanSuspend": {"error": ["org.freedesktop.systemd1.UnitMasked", "polkit"]}}})");
+    const auto backend = machine();
+    const auto nodes = backend->selectPowerManagementNodes();
+    EXPECT_THAT(nodes->powerState(0), Optional(1));
+    EXPECT_THAT(nodes->powerStates(0), ElementsAre(2));
+    EXPECT_THAT(takeLog(), ElementsAre(HasSubstr("CanSuspend: polkit is masked")));
+}
+
+TEST_F(Processes, WaitOnceForASystemdLogindThatDoesNotAnswer) {
+    configure("timeout = 0.5\n");
+    bus.startLogind(R"({"Calls": {"CanReboot": {"delay": 60}}})");
+    const std::string untold = "log 6000 Corvane.Instrumentation The power state of this machine cannot be told: ";
+    const auto inTheSameRequest = untold + "there was no answer within 0.5 s, a moment ago";
+    EXPECT_THAT(run("list list list list"),
+                ElementsAre("system unknown", "system unknown", "system unknown", "system unknown", StartsWith(notice),
+                            MatchesRegex(untold + ".*: systemd-logind does not answer within 0\\.5 s"),
+                            inTheSameRequest, inTheSameRequest, inTheSameRequest));
 }
 
 } // namespace

@@ -1,5 +1,6 @@
 #include "SimulatedBackend.h"
 
+#include "FailingCalls.h"
 #include "RecordedLog.h"
 #include "TestSupport.h"
 
@@ -7,6 +8,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cerrno>
 #include <csignal>
 #include <functional>
 #include <limits>
@@ -123,13 +125,49 @@ INSTANTIATE_TEST_SUITE_P(All, SimulatedTransition,
                                                     "shutdown of simulated node system, over in 2.5 s"}),
                          [](const auto& each) { return std::to_string(each.param.state); });
 
-TEST_F(Simulated, DoesWhatItWasAskedForLast) {
+TEST_F(Simulated, RefusesAnotherRequestUntilTheOneBeforeIsOver) {
     const auto nodes = select();
-    nodes->requestPowerState(system, 9);
-    nodes->requestPowerState(system, 12);
+    EXPECT_TRUE(nodes->requestPowerState(system, 9).accepted);
+    now += 9500ms;
+    for (const unsigned int state : {9U, 12U}) {
+        const PowerRequestOutcome outcome = machine()->selectPowerManagementNodes()->requestPowerState(system, state);
+        EXPECT_FALSE(outcome.accepted);
+        EXPECT_THAT(outcome.description, EndsWith(" of simulated node system: another request is in progress: reboot "
+                                                  "is over at 2026-11-20T12:31:18Z, in 0.5 s"));
+    }
+    EXPECT_TRUE(nodes->requestPowerState(blade1, 12).accepted) << "of another node";
+    now += 500ms;
+    EXPECT_TRUE(nodes->requestPowerState(system, 12).accepted);
     EXPECT_THAT(nodes->powerState(system), Optional(12));
-    now += 2500ms;
-    EXPECT_THAT(nodes->powerState(system), Optional(10));
+}
+
+TEST_F(Simulated, IsAsBeforeOnceARequestIsCancelled) {
+    const auto nodes = select();
+    nodes->requestPowerState(blade2, 9);
+    const PowerRequestOutcome outcome = machine()->selectPowerManagementNodes()->cancelRequest(blade2);
+    EXPECT_TRUE(outcome.accepted);
+    EXPECT_EQ(outcome.description, "cancellation of the request of simulated node chassis/blade2 (reboot)");
+    EXPECT_THAT(powerState(blade2), Optional(6)) << "as it is configured";
+
+    nodes->requestPowerState(system, 12);
+    now += 1h;
+    nodes->requestPowerState(system, 9);
+    EXPECT_TRUE(nodes->cancelRequest(system).accepted);
+    EXPECT_THAT(nodes->powerState(system), Optional(10)) << "off, as the shutdown before has left it";
+    EXPECT_TRUE(nodes->requestPowerState(system, 9).accepted);
+}
+
+TEST_F(Simulated, HasNothingToCancelWhereNothingIsInProgress) {
+    const auto nodes = select();
+    const char* const refusal = "cancellation of the request of simulated node system: no request is in progress";
+    EXPECT_EQ(nodes->cancelRequest(system).description, refusal);
+    EXPECT_FALSE(std::filesystem::exists(stateFile) && contentOf(stateFile).find("system") != std::string::npos);
+    nodes->requestPowerState(system, 9);
+    now += 10s;
+    const PowerRequestOutcome outcome = nodes->cancelRequest(system);
+    EXPECT_FALSE(outcome.accepted);
+    EXPECT_EQ(outcome.description, refusal);
+    EXPECT_THAT(powerState(system), Optional(1));
 }
 
 TEST_F(Simulated, ComesBackFromOffByAReboot) {
@@ -166,7 +204,8 @@ TEST_F(Simulated, GivesEachFileALaterTimeThanTheOneBefore) {
     std::filesystem::last_write_time(stateFile, std::filesystem::file_time_type::clock::now() + 1h);
     for (int i = 0; i < 10; ++i) {
         const auto before = std::filesystem::last_write_time(stateFile);
-        select()->requestPowerState(system, 9);
+        now += 10s;
+        ASSERT_TRUE(select()->requestPowerState(system, 9).accepted);
         ASSERT_GT(std::filesystem::last_write_time(stateFile), before);
     }
 }
@@ -261,24 +300,25 @@ TEST_P(SimulatedDamaged, FileIsSetAsideBeforeARequestIsWritten) {
 
 INSTANTIATE_TEST_SUITE_P(
     All, SimulatedDamaged,
-    testing::Values(Damage{"Empty", "", "parse error"}, Damage{"Torn", R"({"nodes": {"sys)", "parse error"},
-                    Damage{"NoText", "\xff\xfe", "parse error"},
-                    Damage{"NumberTooLarge", R"({"nodes": 1e999})", "number overflow"},
-                    Damage{"OtherType", "[]", "nodes is missing"}, Damage{"NoNodes", "{}", "nodes is missing"},
-                    Damage{"NodesElsewhere", R"([{"nodes": {}}])", "nodes is missing"},
-                    Damage{"NodesNoObject", R"({"nodes": []})", "nodes is no object"},
-                    Damage{"NodeNoObject", R"({"nodes": {"system": 9}})", "node system is no object"},
-                    Damage{"NoRequest", R"({"nodes": {"system": {"over": 5}}})", "node system lacks request"},
-                    Damage{"UnknownRequest", R"({"nodes": {"system": {"request": "sleep", "over": 5}}})",
-                           "unknown request \"sleep\" of node system"},
-                    Damage{"NoTime", R"({"nodes": {"system": {"request": "reboot"}}})", "node system lacks over"},
-                    Damage{"NegativeTime", R"({"nodes": {"system": {"request": "reboot", "over": -1}}})",
-                           "time -1 of node system is not in milliseconds since 1970"},
-                    Damage{"FractionOfTime", R"({"nodes": {"system": {"request": "reboot", "over": 0.5}}})",
-                           "time 0.5 of node system is not in milliseconds since 1970"},
-                    Damage{"TimeTooLarge",
-                           R"({"nodes": {"system": {"request": "reboot", "over": 9223372036854775808}}})",
-                           "time 9223372036854775808 of node system is not in milliseconds since 1970"}),
+    testing::Values(
+        Damage{"Empty", "", "parse error"}, Damage{"Torn", R"({"nodes": {"sys)", "parse error"},
+        Damage{"NoText", "\xff\xfe", "parse error"}, Damage{"NumberTooLarge", R"({"nodes": 1e999})", "number overflow"},
+        Damage{"OtherType", "[]", "nodes is missing"}, Damage{"NoNodes", "{}", "nodes is missing"},
+        Damage{"NodesElsewhere", R"([{"nodes": {}}])", "nodes is missing"},
+        Damage{"NodesNoObject", R"({"nodes": []})", "nodes is no object"},
+        Damage{"NodeNoObject", R"({"nodes": {"system": 9}})", "node system is no object"},
+        Damage{"NoRequest", R"({"nodes": {"system": {"over": 5}}})", "node system lacks request"},
+        Damage{"UnknownRequestBefore", R"({"nodes": {"system": {"request": "reboot", "over": 5, "after": "sleep"}}})",
+               "unknown request \"sleep\" of node system"},
+        Damage{"UnknownRequest", R"({"nodes": {"system": {"request": "sleep", "over": 5}}})",
+               "unknown request \"sleep\" of node system"},
+        Damage{"NoTime", R"({"nodes": {"system": {"request": "reboot"}}})", "node system lacks over"},
+        Damage{"NegativeTime", R"({"nodes": {"system": {"request": "reboot", "over": -1}}})",
+               "time -1 of node system is not in milliseconds since 1970"},
+        Damage{"FractionOfTime", R"({"nodes": {"system": {"request": "reboot", "over": 0.5}}})",
+               "time 0.5 of node system is not in milliseconds since 1970"},
+        Damage{"TimeTooLarge", R"({"nodes": {"system": {"request": "reboot", "over": 9223372036854775808}}})",
+               "time 9223372036854775808 of node system is not in milliseconds since 1970"}),
     [](const auto& each) { return each.param.name; });
 
 TEST_F(Simulated, GivesEveryDamagedFileItsOwnName) {
@@ -343,6 +383,90 @@ TEST_F(Simulated, CannotTellItsStatesWhereTheFileCannotBeRead) {
     EXPECT_EQ(select()->size(), 3);
 }
 
+/** A call that fails while the state is stored, and what the refusal then says after the state file's name. */
+struct FailingCall {
+    const char* call;
+    int error;
+    const char* problem;
+};
+
+void PrintTo(const FailingCall& given, std::ostream* stream) {
+    *stream << given.call << " with error " << given.error;
+}
+
+class SimulatedStoring : public Simulated, public testing::WithParamInterface<FailingCall> {};
+
+TEST_P(SimulatedStoring, RefusesTheRequestWhereACallFailsAndLeavesTheFileAsItWas) {
+    ASSERT_TRUE(select()->requestPowerState(blade1, 9).accepted);
+    const std::string before = contentOf(stateFile);
+    const auto nodes = select();
+    AgentTest::failNext(GetParam().call, GetParam().error);
+    const PowerRequestOutcome outcome = nodes->requestPowerState(system, 9);
+    EXPECT_TRUE(AgentTest::hasFailed());
+    EXPECT_FALSE(outcome.accepted);
+    EXPECT_EQ(outcome.description, "reboot of simulated node system: " + stateFile.string() + GetParam().problem);
+    EXPECT_EQ(contentOf(stateFile), before);
+    EXPECT_THAT(folder.filesThatBegin("state.json.new"), IsEmpty());
+    EXPECT_THAT(nodes->powerState(system), Optional(1));
+    EXPECT_TRUE(nodes->requestPowerState(system, 9).accepted) << "once the call succeeds again";
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All, SimulatedStoring,
+    testing::Values(FailingCall{"write", ENOSPC, ".new: cannot be written: No space left on device"},
+                    FailingCall{"write", 0, ".new: cannot be written: No space left on device"},
+                    FailingCall{"write", EIO, ".new: cannot be written: Input/output error"},
+                    FailingCall{"futimens", EPERM, ".new: cannot be put in place: Operation not permitted"},
+                    FailingCall{"fsync", EIO, ".new: cannot be put in place: Input/output error"},
+                    FailingCall{"rename", EACCES, ".new: cannot be put in place: Permission denied"}));
+
+TEST_F(Simulated, IsWrittenOnWhereASignalInterrupts) {
+    AgentTest::failNext("write", EINTR);
+    EXPECT_TRUE(select()->requestPowerState(system, 9).accepted);
+    EXPECT_TRUE(AgentTest::hasFailed());
+    EXPECT_THAT(powerState(system), Optional(9));
+}
+
+TEST_F(Simulated, WarnsOfMoreNodesThanCanBeCounted) {
+    SimulatedSettings many = settings();
+    many.nodes.assign(255, {"node"});
+    EXPECT_EQ(SimulatedBackend(many).warning(), "");
+    many.nodes.emplace_back();
+    SimulatedBackend machine(many);
+    EXPECT_EQ(machine.warning(),
+              "256 nodes: clients see too few instances of TALVO_PowerManagementElementCapabilities, or none, since "
+              "their 65536 pairs of service and capabilities are counted with 16 bits: expected 255 nodes at most");
+    const auto facts = machine.examine().facts;
+    EXPECT_EQ(facts.back().name, "warning");
+    EXPECT_EQ(facts.back().value, machine.warning());
+}
+
+TEST_F(Simulated, TellsItsStatesByNameToWhoeverExaminesIt) {
+    select()->requestPowerState(system, 12);
+    std::vector<std::string> facts;
+    for (const auto& [name, value] : backend->examine().facts) {
+        facts.push_back(name + ": " + value);
+    }
+    EXPECT_THAT(facts, ElementsAre("node system: shutting-down", "node chassis/blade1: shutting-down",
+                                   "node chassis/blade2: power state 6"));
+}
+
+TEST_F(Simulated, NeitherReadsNorReplacesAFileThatIsLargerThanAnyOfItsOwn) {
+    writeFile(stateFile, "");
+    std::filesystem::resize_file(stateFile, 2'000'000'000);
+    EXPECT_EQ(powerState(system), std::nullopt);
+    EXPECT_THAT(takeLog(), ElementsAre(AllOf(HasSubstr(stateFile.string()),
+                                             HasSubstr("is not a state file, which has 16777216 bytes at most"))));
+    EXPECT_FALSE(select()->requestPowerState(system, 9).accepted);
+    EXPECT_EQ(std::filesystem::file_size(stateFile), 2'000'000'000U);
+}
+
+TEST_F(Simulated, DoesNotWaitForAPipeInPlaceOfItsFile) {
+    ASSERT_EQ(mkfifo(stateFile.c_str(), 0666), 0);
+    EXPECT_EQ(powerState(system), std::nullopt);
+    EXPECT_FALSE(select()->requestPowerState(system, 9).accepted);
+}
+
 TEST_F(Simulated, RefusesRequestsWhereTheFolderIsAFile) {
     writeFile(folder / "file", "");
     stateFile = folder / "file/state.json";
@@ -372,6 +496,7 @@ TEST_F(Simulated, FileIsWholeWheneverAProcessIsKilled) {
     for (int round = 0; round < 60; ++round) {
         const pid_t child = inProcess([&] {
             for (unsigned int i = 0;; ++i) {
+                now += 10s; // so that the one before is over
                 machine()->selectPowerManagementNodes()->requestPowerState(i % 3, i % 2 == 0 ? 9 : 12);
                 const char written = 1;
                 if (i == 0 && write(pipe[1], &written, 1) != 1) {
@@ -388,6 +513,7 @@ TEST_F(Simulated, FileIsWholeWheneverAProcessIsKilled) {
         StateFile file(stateFile);
         EXPECT_EQ(file.read()->count("system"), 1);
         ASSERT_THAT(takeLog(), IsEmpty());
+        now += 24h * 365; // whatever the child has asked for is over
         ASSERT_TRUE(select()->requestPowerState(system, 9).accepted);
     }
     close(pipe[0]);
@@ -403,7 +529,9 @@ TEST_F(Simulated, LosesNoRequestAmongProcesses) {
         children.push_back(inProcess([&] {
             StateFile file(stateFile);
             for (int i = 0; i < requests; ++i) {
-                file.write(std::to_string(process) + '/' + std::to_string(i), {&powerTransitions.front(), now});
+                file.update([&](PowerRequests& content) {
+                    content[std::to_string(process) + '/' + std::to_string(i)] = {&powerTransitions.front(), now};
+                });
             }
         }));
     }
@@ -425,7 +553,7 @@ TEST_F(Simulated, ServesManyThreadsAtOnce) {
                 if (i < 2 && !nodes->requestPowerState(i, 9).accepted) {
                     ++wrong;
                 }
-                if (i < 2 && nodes->powerState(i) != 9) {
+                if (i < 2 && (nodes->powerState(i) != 9 || !nodes->cancelRequest(i).accepted)) {
                     ++wrong;
                 }
                 if (nodes->powerState(blade2) != 6) {

@@ -5,6 +5,7 @@
  *     list               each node: its text, property 123, property 125
  *     write NODE VALUE   writes property 123 of a node
  *     machine            which machine it is
+ *     stay               keeps a cursor in use, in a thread and in an object that is destroyed last
  *
  * and prints what they give, then the log records that were written meanwhile.
  */
@@ -14,10 +15,13 @@
 #include "Norv/Machine.h"
 
 #include <array>
+#include <atomic>
 #include <cstdlib>
 #include <iostream>
+#include <memory>
 #include <span>
 #include <string>
+#include <thread>
 #include <vector>
 
 using namespace Norv;
@@ -52,6 +56,40 @@ void write(const std::string& path, unsigned int value) {
     std::cout << (node.setProperty(NodeLexicon::POWER_STATE, value) ? "accepted" : "refused") << '\n';
 }
 
+/** Made before anything of the library is, and so destroyed after it. */
+class LastUser {
+public:
+    ~LastUser() {
+        if (cursor) {
+            unsigned int state = 0;
+            const bool told = cursor->selectNode(NodeLexicon::POWER_MANAGEMENT_NODE) &&
+                              cursor->getProperty(NodeLexicon::POWER_STATE, state);
+            std::cout << "at the end " << cursor->getPathToNode() << ' ' << (told ? std::to_string(state) : "unknown")
+                      << std::endl;
+        }
+    }
+
+    std::unique_ptr<Instrumentation> cursor;
+};
+
+LastUser lastUser;
+
+void stay() {
+    lastUser.cursor = std::make_unique<Instrumentation>();
+    static std::atomic<bool> uses = false;
+    std::thread([] {
+        for (;;) {
+            Instrumentation node;
+            node.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);
+            static_cast<void>(node.getPathToNode());
+            if (!uses.exchange(true)) {
+                uses.notify_one();
+            }
+        }
+    }).detach();
+    uses.wait(false);
+}
+
 } // namespace
 
 int main(int count, char** values) {
@@ -63,6 +101,8 @@ int main(int count, char** values) {
         } else if (command == "write" && i + 2 < arguments.size()) {
             write(arguments[i + 1], static_cast<unsigned int>(std::stoul(arguments[i + 2])));
             i += 2;
+        } else if (command == "stay") {
+            stay();
         } else if (command == "machine") {
             std::cout << machineNames.at(static_cast<std::size_t>(orvInstrumentationMachine1())) << '\n';
         } else {

@@ -1,5 +1,4 @@
 #include "ResourceLibrary.h"
-#include "Unicode.h"
 
 #include "TestSupport.h"
 
@@ -15,8 +14,6 @@
 namespace {
 
 using Norv::ResourceLibrary;
-using Norv::Locale::utf8From;
-using Norv::Locale::wideFrom;
 using testing::HasSubstr;
 
 /** A catalogue with one message, number by number as the format has it. */
@@ -103,19 +100,6 @@ TEST(ResourceLibraryTest, NoDamageIsTakenForMemory) {
                 errorOf(damaged);
             }
         }
-    }
-}
-
-TEST(UnicodeTest, Utf8IsReadAsItIsWritten) {
-    const std::wstring text = L"a\u007f\u0080\u07ff\u0800\ud7ff\ue000\uffff\U00010000\U0010ffff";
-    EXPECT_EQ(wideFrom(utf8From(text)), text);
-    EXPECT_EQ(wideFrom(""), L"");
-}
-
-TEST(UnicodeTest, WhatIsNotUtf8IsRefused) {
-    for (const char* text : {"\x80", "\xc3", "\xc3(", "\xc0\xaf", "\xe0\x80\xaf", "\xed\xa0\x80", "\xf4\x90\x80\x80",
-                             "\xff", "a\xe3\x81"}) {
-        EXPECT_EQ(wideFrom(text), std::nullopt) << testing::PrintToString(text);
     }
 }
 

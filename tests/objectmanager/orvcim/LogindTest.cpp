@@ -32,6 +32,7 @@ protected:
             << "[system]\nname = \"machine.example\"\n"
             << "[log]\ndestination = \"file\"\nfile = \"" << _folder.string() << "/log\"\n"
             << "[instrumentation]\nbackend = \"logind\"\n[instrumentation.logind]\n"
+            << "lock-file = \"" << _folder.string() << "/lock\"\n"
             << settings;
     }
 

@@ -31,7 +31,7 @@ TEST_F(ProvidedTest, checksTheAgent) {
                                                "  machine              a simulated machine (1 node, state in " +
                                                (_folder / "state.json").string() +
                                                ")\n"
-                                               "  node chassis/blade1  power state 1\n"));
+                                               "  node chassis/blade1  running\n"));
 }
 
 TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
@@ -118,6 +118,7 @@ TEST_F(ProvidedTest, reportsAnInstanceThatIsNotThere) {
 }
 
 TEST_F(ProvidedTest, rebootsAndShutsDownTheSimulatedMachine) {
+    configure("reboot-time = 0\nshutdown-time = 0\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     EXPECT_THAT(answerOf({"power", "reboot"}), StartsWith("Power request accepted: reboot of simulated node"));
     EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
     EXPECT_THAT(answerOf({"power", "shutdown"}), StartsWith("Power request accepted: shutdown of simulated node"));

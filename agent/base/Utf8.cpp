@@ -1,10 +1,10 @@
-#include "Unicode.h"
+#include "Utf8.h"
 
 #include <algorithm>
 #include <cwchar>
 #include <locale>
 
-namespace Norv::Locale {
+namespace Norv::Agent {
 
 namespace {
 
@@ -51,4 +51,4 @@ std::optional<std::wstring> wideFrom(std::string_view text) {
     return std::wstring(codes.data(), written);
 }
 
-} // namespace Norv::Locale
+} // namespace Norv::Agent

@@ -1,5 +1,5 @@
-#ifndef CONFIG_FILESIGNATURE_H
-#define CONFIG_FILESIGNATURE_H
+#ifndef BASE_FILESIGNATURE_H
+#define BASE_FILESIGNATURE_H
 
 #include <chrono>
 

@@ -1,5 +1,5 @@
-#ifndef AGENT_COARSECLOCK_H
-#define AGENT_COARSECLOCK_H
+#ifndef BASE_COARSECLOCK_H
+#define BASE_COARSECLOCK_H
 
 #include <cstdint>
 #include <ctime>

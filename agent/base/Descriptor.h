@@ -1,0 +1,34 @@
+#ifndef BASE_DESCRIPTOR_H
+#define BASE_DESCRIPTOR_H
+
+#include <unistd.h>
+
+#include <utility>
+
+namespace Norv::Agent {
+
+/** An open file that is closed with the object. */
+class Descriptor {
+public:
+    /** @param number as open(2) gave it; its errno stays the caller's. */
+    explicit Descriptor(int number) : _number(number) {}
+    ~Descriptor() {
+        if (isOpen()) {
+            ::close(_number);
+        }
+    }
+    Descriptor(Descriptor&& other) noexcept : _number(std::exchange(other._number, -1)) {}
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    Descriptor& operator=(Descriptor&&) = delete;
+
+    bool isOpen() const { return _number >= 0; }
+    int number() const { return _number; }
+
+private:
+    int _number;
+};
+
+} // namespace Norv::Agent
+
+#endif

@@ -1,0 +1,71 @@
+#include "FailingCalls.h"
+
+#include <cerrno>
+#include <cstdio>
+
+#include <dlfcn.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace {
+
+thread_local std::string failing;
+thread_local int failure = 0;
+
+/** Whether a call fails now, and only now. */
+bool fails(const char* call) {
+    if (failing != call) {
+        return false;
+    }
+    failing.clear();
+    errno = failure;
+    return true;
+}
+
+/** The C library's own function. */
+template <typename Function>
+Function* real(const char* name) {
+    return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+
+} // namespace
+
+namespace AgentTest {
+
+void failNext(const std::string& call, int error) {
+    failing = call;
+    failure = error;
+}
+
+bool hasFailed() {
+    return failing.empty();
+}
+
+} // namespace AgentTest
+
+// The code under test takes these from the program.
+extern "C" {
+
+ssize_t write(int descriptor, const void* data, size_t size) {
+    static auto* const original = real<decltype(write)>("write");
+    if (fails("write")) {
+        return failure == 0 ? 0 : -1;
+    }
+    return original(descriptor, data, size);
+}
+
+int fsync(int descriptor) {
+    static auto* const original = real<decltype(fsync)>("fsync");
+    return fails("fsync") ? -1 : original(descriptor);
+}
+
+int futimens(int descriptor, const timespec times[2]) noexcept {
+    static auto* const original = real<int(int, const timespec*)>("futimens");
+    return fails("futimens") ? -1 : original(descriptor, times);
+}
+
+int rename(const char* from, const char* to) noexcept {
+    static auto* const original = real<int(const char*, const char*)>("rename");
+    return fails("rename") ? -1 : original(from, to);
+}
+}

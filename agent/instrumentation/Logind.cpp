@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <limits>
 #include <string_view>
 #include <system_error>
 
@@ -53,15 +54,18 @@ public:
     // Its functions, by their own names. NOLINTNEXTLINE(bugprone-macro-parentheses): a name is declared
 #define ORV_FUNCTION(name) decltype(&::name) name = reinterpret_cast<decltype(&::name)>(function(#name))
     ORV_FUNCTION(sd_bus_call);
+    ORV_FUNCTION(sd_bus_call_async);
     ORV_FUNCTION(sd_bus_close_unref);
     ORV_FUNCTION(sd_bus_error_free);
     ORV_FUNCTION(sd_bus_is_open);
     ORV_FUNCTION(sd_bus_is_ready);
     ORV_FUNCTION(sd_bus_message_append);
     ORV_FUNCTION(sd_bus_message_enter_container);
+    ORV_FUNCTION(sd_bus_message_get_error);
     ORV_FUNCTION(sd_bus_message_new_method_call);
     ORV_FUNCTION(sd_bus_message_read);
     ORV_FUNCTION(sd_bus_message_set_expect_reply);
+    ORV_FUNCTION(sd_bus_message_ref);
     ORV_FUNCTION(sd_bus_message_unref);
     ORV_FUNCTION(sd_bus_open_system);
     ORV_FUNCTION(sd_bus_process);
@@ -89,6 +93,14 @@ const Libsystemd& libsystemd() {
     return library;
 }
 
+std::string textOf(const sd_bus_error& error) {
+    return printable(error.name) + ": " + printable(error.message);
+}
+
+bool isOneOf(const auto& names, const std::string& name) {
+    return std::ranges::find(names, name) != names.end();
+}
+
 class BusErrorText {
 public:
     BusErrorText() = default;
@@ -98,13 +110,10 @@ public:
 
     sd_bus_error* target() { return &_error; }
 
-    bool isOneOf(const auto& names) const { return std::ranges::find(names, name()) != names.end(); }
-
-    std::string text() const { return name() + ": " + printable(_error.message); }
+    std::string name() const { return printable(_error.name); }
+    std::string text() const { return textOf(_error); }
 
 private:
-    std::string name() const { return printable(_error.name); }
-
     sd_bus_error _error = SD_BUS_ERROR_NULL;
 };
 
@@ -186,65 +195,115 @@ Logind::Message Logind::newCall(const char* interface, const char* method) {
     return Message(call);
 }
 
+Logind::Message Logind::newQuestion(const char* question) {
+    constexpr std::array<std::string_view, 2> properties = {preparingForShutdown, scheduledShutdownProperty};
+    if (std::ranges::find(properties, question) == properties.end()) {
+        return newCall(managerInterface, question);
+    }
+    Message call = newCall(propertiesInterface, "Get");
+    require(libsystemd().sd_bus_message_append(call.get(), "ss", managerInterface, question), question);
+    return call;
+}
+
 Logind::Message Logind::send(const Message& call, const char* method) {
-    const auto unanswered = [method](const std::string& reason) {
-        return LogindError(Kind::unanswered, std::string(method) + ": " + reason);
-    };
-    const auto noAnswerInTime = [&] {
-        return unanswered("systemd-logind does not answer within " + inSeconds(_deadline.whole()));
-    };
     const auto remaining = static_cast<std::uint64_t>(_deadline.remaining().count());
     if (remaining == 0) {
         // To sd-bus this would mean a time of its own.
-        throw noAnswerInTime();
+        failToAnswer(method, -ETIMEDOUT);
     }
     BusErrorText error;
     sd_bus_message* reply = nullptr;
     const int result = libsystemd().sd_bus_call(_bus.get(), call.get(), remaining, error.target(), &reply);
-    if (result >= 0) {
-        _answers = true;
-        return Message(reply);
+    if (result < 0) {
+        failToAnswer(method, result, error.name(), error.text());
     }
+    _answers = true;
+    return Message(reply);
+}
+
+void Logind::askTogether(std::span<const char* const> questions) {
+    const auto keep = [](sd_bus_message* answer, void* asked, sd_bus_error*) {
+        static_cast<Asked*>(asked)->answer.reset(libsystemd().sd_bus_message_ref(answer));
+        return 1;
+    };
+    for (const char* question : questions) {
+        const Message call = newQuestion(question);
+        Asked& asked = _asked.emplace_back(question, Message());
+        require(libsystemd().sd_bus_call_async(_bus.get(), nullptr, call.get(), keep, &asked,
+                                               std::numeric_limits<std::uint64_t>::max()),
+                question);
+    }
+    // Where the connection is lost or the time is over, those without an answer say so.
+    while (std::ranges::any_of(_asked, [](const Asked& asked) { return asked.answer == nullptr; })) {
+        int result = libsystemd().sd_bus_process(_bus.get(), nullptr);
+        if (result == 0) {
+            const auto remaining = _deadline.remaining();
+            if (remaining.count() == 0) {
+                return;
+            }
+            result = libsystemd().sd_bus_wait(_bus.get(), static_cast<std::uint64_t>(remaining.count()));
+        }
+        if (result < 0 && result != -EINTR) {
+            return;
+        }
+    }
+}
+
+Logind::Message Logind::answerTo(const char* question) {
+    const auto asked = std::ranges::find(_asked, std::string_view(question), &Asked::question);
+    if (asked == _asked.end()) {
+        return send(newQuestion(question), question);
+    }
+    if (asked->answer == nullptr) {
+        failToAnswer(question, -ECONNRESET);
+    }
+    const Message answer = std::move(asked->answer);
+    _asked.erase(asked);
+    if (const sd_bus_error* error = libsystemd().sd_bus_message_get_error(answer.get())) {
+        failToAnswer(question, -ECONNRESET, printable(error->name), textOf(*error));
+    }
+    _answers = true;
+    return Message(libsystemd().sd_bus_message_ref(answer.get()));
+}
+
+void Logind::failToAnswer(const char* method, int result, const std::string& error, const std::string& text) {
+    const auto unanswered = [method](const std::string& reason) {
+        return LogindError(Kind::unanswered, std::string(method) + ": " + reason);
+    };
     if (_deadline.remaining().count() == 0) {
-        throw noAnswerInTime();
+        throw unanswered("systemd-logind does not answer within " + inSeconds(_deadline.whole()));
     }
     // An answer leaves the connection open.
     if (libsystemd().sd_bus_is_open(_bus.get()) <= 0) {
         throw unanswered("the connection to the system bus was lost: " + textOf(-result));
     }
-    if (error.isOneOf(unansweredErrors)) {
-        throw unanswered("systemd-logind ended without an answer: " + error.text());
+    if (isOneOf(unansweredErrors, error)) {
+        throw unanswered("systemd-logind ended without an answer: " + text);
     }
-    if (error.isOneOf(noServiceErrors)) {
-        throw LogindError(Kind::noService, "systemd-logind is not on the system bus: " + error.text());
+    if (isOneOf(noServiceErrors, error)) {
+        throw LogindError(Kind::noService, "systemd-logind is not on the system bus: " + text);
     }
-    if (error.isOneOf(maskedErrors)) {
+    if (isOneOf(maskedErrors, error)) {
         throw _answers ? LogindError(Kind::polkitMasked, std::string(method) +
                                                              ": polkit is masked, which "
                                                              "systemd-logind has to ask: " +
-                                                             error.text())
-                       : LogindError(Kind::masked, "systemd-logind is masked: " + error.text());
+                                                             text)
+                       : LogindError(Kind::masked, "systemd-logind is masked: " + text);
     }
-    throw LogindError(Kind::refused, std::string(method) + ": " + error.text());
-}
-
-Logind::Message Logind::property(const char* name) {
-    const Message call = newCall(propertiesInterface, "Get");
-    require(libsystemd().sd_bus_message_append(call.get(), "ss", managerInterface, name), name);
-    return send(call, name);
+    throw LogindError(Kind::refused, std::string(method) + ": " + text);
 }
 
 bool Logind::isPreparingForShutdown() {
-    constexpr const char* name = "PreparingForShutdown";
-    const Message reply = property(name);
+    constexpr const char* name = preparingForShutdown;
+    const Message reply = answerTo(name);
     int preparing = 0;
     require(libsystemd().sd_bus_message_read(reply.get(), "v", "b", &preparing), name);
     return preparing != 0;
 }
 
 ScheduledShutdown Logind::scheduledShutdown() {
-    constexpr const char* name = "ScheduledShutdown";
-    const Message reply = property(name);
+    constexpr const char* name = scheduledShutdownProperty;
+    const Message reply = answerTo(name);
     const char* type = nullptr;
     std::uint64_t time = 0;
     require(libsystemd().sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
@@ -252,15 +311,15 @@ ScheduledShutdown Logind::scheduledShutdown() {
 }
 
 std::string Logind::can(const char* method) {
-    const Message reply = send(newCall(managerInterface, method), method);
+    const Message reply = answerTo(method);
     const char* answer = nullptr;
     require(libsystemd().sd_bus_message_read(reply.get(), "s", &answer), method);
     return printable(answer);
 }
 
 std::vector<Inhibitor> Logind::shutdownInhibitors() {
-    constexpr const char* method = "ListInhibitors";
-    const Message reply = send(newCall(managerInterface, method), method);
+    constexpr const char* method = listInhibitors;
+    const Message reply = answerTo(method);
     require(libsystemd().sd_bus_message_enter_container(reply.get(), 'a', "(ssssuu)"), method);
     std::vector<Inhibitor> inhibitors;
     for (;;) {

@@ -8,7 +8,9 @@
 
 #include <chrono>
 #include <cstdint>
+#include <list>
 #include <memory>
+#include <span>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -71,6 +73,20 @@ public:
     /** Connects to the bus that DBUS_SYSTEM_BUS_ADDRESS names, else to the machine's. */
     explicit Logind(const Deadline& deadline);
 
+    /** Questions that are not methods without arguments, but properties. */
+    static constexpr const char* preparingForShutdown = "PreparingForShutdown";
+    static constexpr const char* scheduledShutdownProperty = "ScheduledShutdown";
+    /** The question behind shutdownInhibitors. */
+    static constexpr const char* listInhibitors = "ListInhibitors";
+
+    /**
+     * Asks several questions at once, so that all of them take the time of one. Their answers are what the members
+     * below give when they are next called; what is wrong with an answer is then thrown.
+     *
+     * @param questions those above, and methods for `can`.
+     */
+    void askTogether(std::span<const char* const> questions);
+
     bool isPreparingForShutdown();
 
     ScheduledShutdown scheduledShutdown();
@@ -103,10 +119,23 @@ private:
 
     void waitUntilConnected();
     Message newCall(const char* interface, const char* method);
+    Message newQuestion(const char* question);
     Message send(const Message& call, const char* method);
-    Message property(const char* name);
+    Message answerTo(const char* question);
+    /** Throws what it means that a call has no answer, or an error: its name and text, which are empty else. */
+    [[noreturn]] void failToAnswer(const char* method, int result, const std::string& error = "",
+                                   const std::string& text = "");
+
+    /** A question that was asked together with others. */
+    struct Asked {
+        const char* question;
+        /** Null until it comes. */
+        Message answer;
+    };
 
     Deadline _deadline;
+    /** What sd-bus calls back writes here; the bus goes first. */
+    std::list<Asked> _asked;
     std::unique_ptr<sd_bus, Closer> _bus;
     /** Whether systemd-logind has answered anything. */
     bool _answers = false;

@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <array>
 #include <functional>
+#include <iterator>
 #include <stdexcept>
 #include <system_error>
 #include <utility>
@@ -129,6 +130,8 @@ std::optional<Pending> pendingOn(Logind& logind) {
 
 /** @throws Refusal where something speaks against it now. */
 void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
+    logind.askTogether(std::array{Logind::preparingForShutdown, Logind::scheduledShutdownProperty,
+                                  Logind::listInhibitors, transition.canMethod});
     if (const auto pending = pendingOn(logind)) {
         throw Refusal("another request is in progress: " + pending->description);
     }
@@ -267,6 +270,9 @@ private:
     }
 
     void read(Logind& logind) {
+        std::vector<const char*> questions = {Logind::preparingForShutdown, Logind::scheduledShutdownProperty};
+        std::ranges::transform(listedStates, std::back_inserter(questions), &ListedState::canMethod);
+        logind.askTogether(questions);
         const auto pending = pendingOn(logind);
         _states.push_back(listedOn);
         try {

@@ -29,7 +29,7 @@ namespace {
 namespace fs = std::filesystem;
 
 /** The language's id is its index. */
-constexpr std::array<std::string_view, 3> languages{"en", "de", "ja"};
+constexpr auto languages = std::to_array<std::string_view>({ORV_LANGUAGES});
 constexpr unsigned int english = 0;
 
 constexpr unsigned int powerManagementLibrary = 2;

@@ -1,3 +1,4 @@
+#include "cimxml/Operations.h"
 #include "cimxml/Service.h"
 #include "orvcim/Commands.h"
 #include "orvcim/ServiceManager.h"
@@ -14,7 +15,6 @@
 #include <syslog.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
@@ -26,29 +26,6 @@ namespace {
 
 constexpr std::uint16_t httpPort = 5988;
 constexpr std::uint16_t httpsPort = 5989;
-
-/** What asks the machine nothing but what it is. */
-constexpr std::array<const char*, 19> readingMethods = {
-    "AssociatorNames",
-    "Associators",
-    "EnumerateClassNames",
-    "EnumerateClasses",
-    "EnumerateInstanceNames",
-    "EnumerateInstances",
-    "GetClass",
-    "GetInstance",
-    "GetProperty",
-    "OpenAssociatorInstancePaths",
-    "OpenAssociatorInstances",
-    "OpenEnumerateInstancePaths",
-    "OpenEnumerateInstances",
-    "OpenReferenceInstancePaths",
-    "OpenReferenceInstances",
-    "PullInstancePaths",
-    "PullInstancesWithPath",
-    "ReferenceNames",
-    "References",
-};
 
 /** Files that are open beside the connections, at most. */
 constexpr rlim_t otherFiles = 200;
@@ -64,7 +41,7 @@ Server::Settings settingsOf(const ServeOptions& options) {
     settings.port = options.port.value_or(settings.tls ? httpsPort : httpPort);
     if (!options.authenticate) {
         // The machine is a simulated one then, which never waits for anybody else.
-        settings.promptMethods.assign(readingMethods.begin(), readingMethods.end());
+        settings.promptMethods = CimXml::readingMethods();
     }
     return settings;
 }

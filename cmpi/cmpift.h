@@ -6,6 +6,11 @@
  * Unless a slot says otherwise: a trailing CMPIStatus pointer may be null, then no status is wanted. What a function
  * returns belongs to the object manager and lives until the current request ends or the object is released; what
  * `clone` returns belongs to the caller, who releases it. Text handed in is copied.
+ *
+ * An attached thread is one in which the object manager called a provider, until that call returns, and one that a
+ * provider started itself, between its attachThread and its detachThread. Functions of the object manager may be called
+ * from several threads at once unless a table says otherwise; what a provider keeps in memory of its own it guards
+ * itself.
  */
 #ifndef CMPIFT_H
 #define CMPIFT_H
@@ -130,7 +135,11 @@ struct _CMPIIndicationMI {
     const CMPIIndicationMIFT* ft;
 };
 
-/** Factories for encapsulated data types, and the services of the object manager that work on them. */
+/**
+ * Factories for encapsulated data types, and the services of the object manager that work on them.
+ *
+ * Threads: those that are attached. A new object belongs to the thread that made it.
+ */
 struct _CMPIBrokerEncFT {
     CMPIVersion ftVersion;
     CMPIInstance* (*newInstance)(const CMPIBroker*, const CMPIObjectPath*, CMPIStatus*);
@@ -157,7 +166,13 @@ struct _CMPIBrokerEncFT {
                                CMPICount, ...);
 };
 
-/** Up-calls into the object manager: operations on other classes, indications, and thread attachment. */
+/**
+ * Up-calls into the object manager: operations on other classes, indications, and thread attachment.
+ *
+ * Threads: those that are attached. prepareAttachThread is called in the attached thread that starts another one, and
+ * attachThread, before anything else, and detachThread, last, in the thread that was started. An up-call may come back
+ * to the calling provider in the same thread before it returns.
+ */
 struct _CMPIBrokerFT {
     unsigned int brokerCapabilities;
     CMPIVersion brokerVersion;
@@ -194,7 +209,11 @@ struct _CMPIBrokerFT {
     CMPIData (*getProperty)(const CMPIBroker*, const CMPIContext*, const CMPIObjectPath*, const char*, CMPIStatus*);
 };
 
-/** Encapsulation of the operating system: file names, threads, mutexes and conditions. */
+/**
+ * Encapsulation of the operating system: file names, threads, mutexes and conditions.
+ *
+ * Threads: any. A thread that newThread started has to be attached before it uses the other tables.
+ */
 struct _CMPIBrokerExtFT {
     CMPIVersion ftVersion;
     char* (*resolveFileName)(const char*);
@@ -219,7 +238,12 @@ struct _CMPIBrokerExtFT {
     int (*signalCondition)(void*);
 };
 
-/** Memory services of the object manager (CMPI_MB_Supports_MemEnhancements). */
+/**
+ * Memory services of the object manager (CMPI_MB_Supports_MemEnhancements).
+ *
+ * Threads: those that are attached. mark and release concern the objects of the calling thread; memory is freed in the
+ * thread that allocated it.
+ */
 struct _CMPIBrokerMemFT {
     CMPIVersion ftVersion;
     CMPIGcStat* (*mark)(const CMPIBroker*, CMPIStatus*);
@@ -238,7 +262,11 @@ struct _CMPIBrokerMemFT {
     void (*freeSelectExp)(const CMPIBroker*, CMPISelectExp*);
 };
 
-/** The context of one invocation: named entries such as CMPIPrincipal. */
+/**
+ * The context of one invocation: named entries such as CMPIPrincipal.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIContextFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIContext*);
@@ -249,7 +277,12 @@ struct _CMPIContextFT {
     CMPIStatus (*addEntry)(const CMPIContext*, const char*, const CMPIValue*, const CMPIType);
 };
 
-/** Where a provider delivers what an operation returns. */
+/**
+ * Where a provider delivers what an operation returns.
+ *
+ * Threads: the one in which the operation was called, and those that the provider attached for it, one at a time, until
+ * the operation returns.
+ */
 struct _CMPIResultFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIResult*);
@@ -261,7 +294,11 @@ struct _CMPIResultFT {
     CMPIStatus (*returnError)(const CMPIResult*, const CMPIError*);
 };
 
-/** Object path: host, namespace, class name and key bindings. */
+/**
+ * Object path: host, namespace, class name and key bindings.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIObjectPathFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIObjectPath*);
@@ -285,7 +322,11 @@ struct _CMPIObjectPathFT {
     CMPIString* (*toString)(const CMPIObjectPath*, CMPIStatus*);
 };
 
-/** Instance: an object path and property values. */
+/**
+ * Instance: an object path and property values.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIInstanceFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIInstance*);
@@ -301,7 +342,11 @@ struct _CMPIInstanceFT {
                                         const char*);
 };
 
-/** Arguments of an extrinsic method, by name and in order. */
+/**
+ * Arguments of an extrinsic method, by name and in order.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIArgsFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIArgs*);
@@ -312,7 +357,11 @@ struct _CMPIArgsFT {
     CMPICount (*getArgCount)(const CMPIArgs*, CMPIStatus*);
 };
 
-/** String: immutable, owned by the object. */
+/**
+ * String: immutable, owned by the object.
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPIStringFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIString*);
@@ -320,7 +369,11 @@ struct _CMPIStringFT {
     const char* (*getCharPtr)(const CMPIString*, CMPIStatus*);
 };
 
-/** Array of fixed size and element type. */
+/**
+ * Array of fixed size and element type.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIArrayFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIArray*);
@@ -331,7 +384,11 @@ struct _CMPIArrayFT {
     CMPIStatus (*setElementAt)(const CMPIArray*, CMPICount, const CMPIValue*, CMPIType);
 };
 
-/** Enumeration: what an up-call returned, one element at a time. */
+/**
+ * Enumeration: what an up-call returned, one element at a time.
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIEnumerationFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIEnumeration*);
@@ -341,7 +398,11 @@ struct _CMPIEnumerationFT {
     CMPIArray* (*toArray)(const CMPIEnumeration*, CMPIStatus*);
 };
 
-/** Date and time or interval (DSP0004, datetime type). */
+/**
+ * Date and time or interval (DSP0004, datetime type).
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPIDateTimeFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIDateTime*);
@@ -351,7 +412,11 @@ struct _CMPIDateTimeFT {
     CMPIBoolean (*isInterval)(const CMPIDateTime*, CMPIStatus*);
 };
 
-/** Select expression of an indication filter. */
+/**
+ * Select expression of an indication filter.
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPISelectExpFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPISelectExp*);
@@ -363,7 +428,11 @@ struct _CMPISelectExpFT {
     CMPIBoolean (*evaluateUsingAccessor)(const CMPISelectExp*, CMPIAccessor*, void*, CMPIStatus*);
 };
 
-/** Normalized condition of a select expression. */
+/**
+ * Normalized condition of a select expression.
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPISelectCondFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPISelectCond*);
@@ -372,7 +441,11 @@ struct _CMPISelectCondFT {
     CMPISubCond* (*getSubCondAt)(const CMPISelectCond*, CMPICount, CMPIStatus*);
 };
 
-/** Conjunction or disjunction inside a select condition. */
+/**
+ * Conjunction or disjunction inside a select condition.
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPISubCondFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPISubCond*);
@@ -382,7 +455,11 @@ struct _CMPISubCondFT {
     CMPIPredicate* (*getPredicate)(const CMPISubCond*, const char*, CMPIStatus*);
 };
 
-/** Predicate inside a sub-condition. */
+/**
+ * Predicate inside a sub-condition.
+ *
+ * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ */
 struct _CMPIPredicateFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIPredicate*);
@@ -391,7 +468,11 @@ struct _CMPIPredicateFT {
     CMPIBoolean (*evaluateUsingAccessor)(const CMPIPredicate*, CMPIAccessor*, void*, CMPIStatus*);
 };
 
-/** CIM error object (CMPI_MB_Supports_Extended_Error). */
+/**
+ * CIM error object (CMPI_MB_Supports_Extended_Error).
+ *
+ * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ */
 struct _CMPIErrorFT {
     CMPIVersion ftVersion;
     CMPIStatus (*release)(CMPIError*);
@@ -422,7 +503,12 @@ struct _CMPIErrorFT {
     CMPIStatus (*setMessageArguments)(const CMPIError*, const CMPIArray*);
 };
 
-/** Instance provider. */
+/**
+ * Instance provider.
+ *
+ * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
+ * function of the table runs.
+ */
 struct _CMPIInstanceMIFT {
     CMPIVersion ftVersion;
     int miVersion;
@@ -442,7 +528,12 @@ struct _CMPIInstanceMIFT {
                             const char*);
 };
 
-/** Association provider. */
+/**
+ * Association provider.
+ *
+ * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
+ * function of the table runs.
+ */
 struct _CMPIAssociationMIFT {
     CMPIVersion ftVersion;
     int miVersion;
@@ -458,7 +549,12 @@ struct _CMPIAssociationMIFT {
                                  const char*, const char*);
 };
 
-/** Method provider. */
+/**
+ * Method provider.
+ *
+ * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
+ * function of the table runs.
+ */
 struct _CMPIMethodMIFT {
     CMPIVersion ftVersion;
     int miVersion;
@@ -468,7 +564,12 @@ struct _CMPIMethodMIFT {
                                const CMPIArgs*, CMPIArgs*);
 };
 
-/** Property provider. */
+/**
+ * Property provider.
+ *
+ * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
+ * function of the table runs.
+ */
 struct _CMPIPropertyMIFT {
     CMPIVersion ftVersion;
     int miVersion;
@@ -482,7 +583,12 @@ struct _CMPIPropertyMIFT {
                                         const char*, const CMPIData, const char*);
 };
 
-/** Indication provider. */
+/**
+ * Indication provider.
+ *
+ * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
+ * function of the table runs.
+ */
 struct _CMPIIndicationMIFT {
     CMPIVersion ftVersion;
     int miVersion;

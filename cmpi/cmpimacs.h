@@ -235,7 +235,8 @@
 /*
  * Stubs. Each defines the static function table of one kind of provider and its exported factory function
  * `<provider>_Create_<Kind>MI`. `pfx` is the prefix of the operations' names, `pn` the provider's name, `broker` the
- * variable that keeps the broker, `hook` a statement run by every call of the factory (CMNoHook for none).
+ * variable that keeps the broker, `hook` a statement run by every call of the factory (CMNoHook for none). The object
+ * manager may call a factory again, from any thread; it calls it before the functions of the table that it returns.
  */
 
 #define CMNoHook

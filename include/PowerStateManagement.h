@@ -25,10 +25,10 @@ private:
 namespace PowerStateManagementServiceProvider {
 
 /**
- * One power-managed element: the names it goes by and its power state (CIM_PowerManagementService and
+ * One power-managed element: its names and its power state (CIM_PowerManagementService and
  * CIM_PowerManagementCapabilities, DMTF DSP1027). A plain value: copies share nothing.
  *
- * A setter of a text stores its argument and reports whether it is not empty.
+ * A setter of a text stores its argument and returns whether that is not empty.
  */
 class PowerStateManagement {
 public:
@@ -47,7 +47,8 @@ public:
      */
     bool setPowerState(unsigned int powerState);
 
-    /** Both advertise fixed lists, whatever the tree offers: the argument is ignored. Return true. */
+    /** The lists that a record advertises are fixed, whatever the tree offers: both ignore the argument, return true.
+     */
     bool setPowerChangeCapabilities(std::vector<unsigned int> codes);
     bool setPowerStatesSupported(std::vector<unsigned int> codes);
 
@@ -59,7 +60,7 @@ public:
     /** 0 where no power state was stored. */
     unsigned short getPowerState();
 
-    /** Always 12 (Off - Soft Graceful), which is stored as well. */
+    /** Always 12, which is Not Applicable as a requested power state (DSP1027); it is stored as well. */
     unsigned short getRequestedPowerState();
 
     /**

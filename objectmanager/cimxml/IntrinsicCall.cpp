@@ -130,10 +130,11 @@ AssociationFilter referenceFilter(const Call& call) {
     return {call.parameters.optionalClassName("ResultClass"), {}, call.parameters.optionalText("Role"), {}};
 }
 
-void forEachInstance(const Call& call, const Selection& selection, const InstanceSink& sink) {
-    forEachServed(call, call.parameters.className("ClassName"), [&](const ObjectPath& path) {
-        const PropertyList properties = askedOfProvider(call, selection.properties, path.className);
-        call.dispatcher().enumerateInstances(call.invocation(), path, properties, sink);
+void forEachInstance(const Call& call, const ObjectPath& classPath, const PropertyList& properties,
+                     const InstanceSink& sink) {
+    forEachServed(call, classPath, [&](const ObjectPath& path) {
+        call.dispatcher().enumerateInstances(call.invocation(), path, askedOfProvider(call, properties, path.className),
+                                             sink);
     });
 }
 

@@ -62,9 +62,10 @@ AssociationFilter referenceFilter(const Call& call);
 
 /* What is given. */
 
-/** Calls for each instance of the class ClassName and of its descendants. */
-void forEachInstance(const Call& call, const Selection& selection, const InstanceSink& sink);
-/** As `forEachInstance`, with the instances' paths. */
+/** Calls for each instance of the class and of its descendants, with these properties at least. */
+void forEachInstance(const Call& call, const ObjectPath& classPath, const PropertyList& properties,
+                     const InstanceSink& sink);
+/** Calls for the path of each instance of the class ClassName and of its descendants. */
 void forEachInstanceName(const Call& call, const PathSink& sink);
 
 /** The associations of an instance, with all properties, since the paths of associations are made of some. */

@@ -4,6 +4,7 @@
 #include "cimxml/ClassAssociations.h"
 #include "cimxml/IntrinsicCall.h"
 #include "cimxml/PullOperations.h"
+#include "cimxml/Query.h"
 
 #include <algorithm>
 
@@ -27,7 +28,8 @@ void getInstance(const Call& call) {
 void enumerateInstances(const Call& call) {
     const Selection selection = selectionOfEnumeration(call);
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachInstance(call, selection, [&](Instance&& instance) { call.writer().namedInstance(instance, selection); });
+    forEachInstance(call, call.parameters.className("ClassName"), selection.properties,
+                    [&](Instance&& instance) { call.writer().namedInstance(instance, selection); });
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
@@ -184,33 +186,25 @@ void deleteInstance(const Call& call) {
     call.dispatcher().deleteInstance(call.invocation(), path);
 }
 
-/** The class that a query is about: the word behind FROM, which all languages of queries have. */
-std::string classOfQuery(const std::string& query) {
-    constexpr std::string_view space = " \t\r\n";
-    bool from = false;
-    for (std::size_t start = query.find_first_not_of(space); start != std::string::npos;) {
-        const std::size_t end = std::min(query.find_first_of(space, start), query.size());
-        std::string word = query.substr(start, end - start);
-        if (from) {
-            return word;
-        }
-        from = equalNames(word, "from");
-        start = query.find_first_not_of(space, end);
-    }
-    throw CimError(CMPI_RC_ERR_INVALID_QUERY, "found the query \"" + query + "\", expected FROM and a class in it");
-}
-
+/** Answered from an enumeration: providers are not asked for queries, which few of them know. */
 void execQuery(const Call& call) {
-    const std::string language = call.parameters.text("QueryLanguage");
-    const std::string query = call.parameters.text("Query");
-    const ObjectPath classPath{{}, call.nameSpace(), classOfQuery(query), {}};
+    const Query query = parseQuery(call.parameters.text("Query"), call.parameters.text("QueryLanguage"));
+    checkQuery(query, declaredClass(call, query.className));
+    PropertyList needed = query.properties;
+    if (needed) {
+        const std::vector<std::string> compared = query.compared();
+        needed->insert(needed->end(), compared.begin(), compared.end());
+    }
+    Selection selection;
+    selection.properties = query.properties;
+    const ObjectPath classPath{{}, call.nameSpace(), query.className, {}};
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachServed(call, classPath, [&](const ObjectPath& path) {
-        call.dispatcher().execQuery(call.invocation(), path, query, language, [&](Instance&& instance) {
+    forEachInstance(call, classPath, needed, [&](Instance&& instance) {
+        if (matches(query, instance)) {
             call.writer().raw("<VALUE.OBJECT>\n");
-            call.writer().instance(instance, {});
+            call.writer().instance(instance, selection);
             call.writer().raw("</VALUE.OBJECT>\n");
-        });
+        }
     });
     call.writer().raw("</IRETURNVALUE>\n");
 }
@@ -257,6 +251,25 @@ void enumerateClassNames(const Call& call) {
     call.writer().raw("<IRETURNVALUE>\n");
     for (const Class* declared : classes) {
         call.writer().className(declared->name);
+    }
+    call.writer().raw("</IRETURNVALUE>\n");
+}
+
+void getQualifier(const Call& call) {
+    const std::string name = call.parameters.text("QualifierName");
+    const QualifierType* type = call.catalogue().qualifierTypes().find(name);
+    if (type == nullptr) {
+        throw CimError(CMPI_RC_ERR_NOT_FOUND, "there is no qualifier type " + name);
+    }
+    call.writer().raw("<IRETURNVALUE>\n");
+    call.writer().qualifierDeclaration(*type);
+    call.writer().raw("</IRETURNVALUE>\n");
+}
+
+void enumerateQualifiers(const Call& call) {
+    call.writer().raw("<IRETURNVALUE>\n");
+    for (const QualifierType* type : call.catalogue().qualifierTypes().all()) {
+        call.writer().qualifierDeclaration(*type);
     }
     call.writer().raw("</IRETURNVALUE>\n");
 }
@@ -342,6 +355,8 @@ constexpr IntrinsicMethod intrinsicMethods[] = {
      {"ClassName", "DeepInheritance", "LocalOnly", "IncludeQualifiers", "IncludeClassOrigin"},
      enumerateClasses},
     {"EnumerateClassNames", Access::read, {"ClassName", "DeepInheritance"}, enumerateClassNames},
+    {"GetQualifier", Access::read, {"QualifierName"}, getQualifier},
+    {"EnumerateQualifiers", Access::read, {}, enumerateQualifiers},
 };
 
 /** The arguments, in the order of the method's parameters. What is null is left out, as if it had not been given. */

@@ -115,7 +115,7 @@ void pull(const Call& call, Pulled kind) {
 void openEnumerateInstances(const Call& call) {
     const Selection selection = selectionOfEnumeration(call);
     Opening opening(call, Pulled::instancesWithPath);
-    forEachInstance(call, selection, [&](Instance&& instance) {
+    forEachInstance(call, call.parameters.className("ClassName"), selection.properties, [&](Instance&& instance) {
         call.writer().instanceWithPath(instance, selection);
         opening.written();
     });

@@ -316,14 +316,35 @@ void ResponseWriter::qualifiers(const Qualifiers& qualifiers, const Selection& s
         attribute("NAME", qualifier.name);
         attribute("TYPE", elementTypeName(qualifier.value.type));
         if (type != nullptr) {
-            attribute("OVERRIDABLE", type->overridable ? "true" : "false");
-            attribute("TOSUBCLASS", type->toSubclass ? "true" : "false");
-            attribute("TRANSLATABLE", type->translatable ? "true" : "false");
+            flavors(*type);
         }
         raw(">");
         value(qualifier.value);
         raw("</QUALIFIER>\n");
     }
+}
+
+void ResponseWriter::flavors(const QualifierType& type) {
+    attribute("OVERRIDABLE", type.overridable ? "true" : "false");
+    attribute("TOSUBCLASS", type.toSubclass ? "true" : "false");
+    attribute("TRANSLATABLE", type.translatable ? "true" : "false");
+}
+
+void ResponseWriter::qualifierDeclaration(const QualifierType& type) {
+    raw("<QUALIFIER.DECLARATION");
+    attribute("NAME", type.name);
+    attribute("TYPE", elementTypeName(type.type));
+    attribute("ISARRAY", (type.type & CMPI_ARRAY) != 0 ? "true" : "false");
+    flavors(type);
+    raw(">\n<SCOPE");
+    for (const auto& [scopeName, scope] : scopeNames) {
+        std::string name(scopeName);
+        std::transform(name.begin(), name.end(), name.begin(), [](char c) { return static_cast<char>(c - 'a' + 'A'); });
+        attribute(name, (type.scopes & scope) != 0 ? "true" : "false");
+    }
+    raw("/>\n");
+    value(type.defaultValue);
+    raw("</QUALIFIER.DECLARATION>\n");
 }
 
 void ResponseWriter::origin(const Element& element, const Class& owner, const Selection& selection) {

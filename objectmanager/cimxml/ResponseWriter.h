@@ -77,6 +77,8 @@ public:
 
     /** A CLASS. */
     void classDeclaration(const Class& declared, const Selection& selection);
+    /** A QUALIFIER.DECLARATION. */
+    void qualifierDeclaration(const QualifierType& type);
     /** A VALUE.OBJECTWITHPATH of a class. */
     void classWithPath(const Class& declared, const Selection& selection);
 
@@ -92,6 +94,7 @@ private:
     void methodDeclaration(const Method& method, const Class& owner, const Selection& selection);
     void parameterDeclaration(const Parameter& parameter, const Selection& selection);
     void qualifiers(const Qualifiers& qualifiers, const Selection& selection);
+    void flavors(const QualifierType& type);
     void origin(const Element& element, const Class& owner, const Selection& selection);
 
     const Catalogue& _catalogue;

@@ -54,9 +54,7 @@ private:
             fail(type, "the name of a type");
         }
         declared.type = arrayBrackets(*found);
-        if (accept("=")) {
-            initializer(declared.type); // nothing asks for what a qualifier would be where it is not given
-        }
+        declared.defaultValue = accept("=") ? initializer(declared.type) : nullValue(declared.type);
         while (accept(",")) {
             if (acceptWord("flavor")) {
                 expect("(", "'(' and flavors");
@@ -67,13 +65,27 @@ private:
                 expectWord("scope", "Scope(...) or Flavor(...)");
                 expect("(", "'(' and scopes");
                 do {
-                    identifier("a scope");
+                    scope(declared);
                 } while (accept(","));
             }
             expect(")", "',' or ')'");
         }
         expect(";", fmt::format("';' behind the qualifier type {}", declared.name));
         return declared;
+    }
+
+    void scope(QualifierType& declared) {
+        const Token token = peek();
+        const std::string name = identifier("a scope");
+        const auto* const known = std::find_if(scopeNames.begin(), scopeNames.end(),
+                                               [&](const ScopeName& entry) { return equalNames(entry.name, name); });
+        if (known != scopeNames.end()) {
+            declared.scopes |= known->scope;
+        } else if (equalNames(name, "any")) {
+            declared.scopes = anyScope;
+        } else if (!equalNames(name, "schema") && !equalNames(name, "qualifier")) {
+            fail(token, "class, association, reference, property, method, parameter, indication or any");
+        }
     }
 
     void flavor(QualifierType& declared) {

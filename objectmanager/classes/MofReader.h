@@ -20,8 +20,8 @@ struct Declarations {
 };
 
 /**
- * The classes and qualifier types that a text declares. Compiler directives, the scopes of qualifier types and flavors
- * where a qualifier is used are read over.
+ * The classes and qualifier types that a text declares. Compiler directives, and flavors where a qualifier is used, are
+ * read over.
  *
  * @param file the name that errors give.
  * @throws SchemaError also where the text has anything else than declarations of classes and qualifier types.

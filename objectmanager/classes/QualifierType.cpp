@@ -23,74 +23,80 @@ struct StandardType {
     bool overridable;
     bool toSubclass;
     bool translatable;
+    Scopes scopes;
+    /** Null where there is none. */
+    const char* defaultValue;
 };
+
+constexpr Scopes ofClasses = aClass | anAssociation | anIndication;
+constexpr Scopes ofValues = aProperty | aMethod | aParameter;
 
 constexpr StandardType standardTypes[] = {
     // clang-format off
-    {"Abstract", CMPI_boolean, true, false, false},
-    {"Aggregate", CMPI_boolean, false, true, false},
-    {"Aggregation", CMPI_boolean, false, true, false},
-    {"ArrayType", CMPI_string, false, true, false},
-    {"Association", CMPI_boolean, false, true, false},
-    {"BitMap", CMPI_stringA, true, true, false},
-    {"BitValues", CMPI_stringA, true, true, true},
-    {"ClassConstraint", CMPI_stringA, true, true, false},
-    {"Composition", CMPI_boolean, false, true, false},
-    {"Correlatable", CMPI_stringA, true, true, false},
-    {"Counter", CMPI_boolean, true, true, false},
-    {"Deprecated", CMPI_stringA, true, false, false},
-    {"Description", CMPI_string, true, true, true},
-    {"DisplayName", CMPI_string, true, true, true},
-    {"DN", CMPI_boolean, false, true, false},
-    {"EmbeddedInstance", CMPI_string, true, true, false},
-    {"EmbeddedObject", CMPI_boolean, false, true, false},
-    {"Exception", CMPI_boolean, false, true, false},
-    {"Experimental", CMPI_boolean, true, false, false},
-    {"Gauge", CMPI_boolean, true, true, false},
-    {"In", CMPI_boolean, false, true, false},
-    {"Indication", CMPI_boolean, false, true, false},
-    {"IsPUnit", CMPI_boolean, true, true, false},
-    {"Key", CMPI_boolean, false, true, false},
-    {"MappingStrings", CMPI_stringA, true, true, false},
-    {"Max", CMPI_uint32, true, true, false},
-    {"MaxLen", CMPI_uint32, true, true, false},
-    {"MaxValue", CMPI_sint64, true, true, false},
-    {"MethodConstraint", CMPI_stringA, true, true, false},
-    {"Min", CMPI_uint32, true, true, false},
-    {"MinLen", CMPI_uint32, true, true, false},
-    {"MinValue", CMPI_sint64, true, true, false},
-    {"ModelCorrespondence", CMPI_stringA, true, true, false},
-    {"NullValue", CMPI_string, false, true, false},
-    {"OctetString", CMPI_boolean, false, true, false},
-    {"Out", CMPI_boolean, false, true, false},
-    {"Override", CMPI_string, true, false, false},
-    {"Propagated", CMPI_string, false, true, false},
-    {"PropertyConstraint", CMPI_stringA, true, true, false},
-    {"PUnit", CMPI_string, true, true, false},
-    {"Read", CMPI_boolean, true, true, false},
-    {"Reference", CMPI_string, true, true, false},
-    {"Required", CMPI_boolean, false, true, false},
-    {"Revision", CMPI_string, true, true, true},
-    {"Schema", CMPI_string, false, true, true},
-    {"Static", CMPI_boolean, false, true, false},
-    {"Structure", CMPI_boolean, false, true, false},
-    {"Terminal", CMPI_boolean, true, true, false},
-    {"UMLPackagePath", CMPI_string, true, true, false},
-    {"Units", CMPI_string, true, true, true},
-    {"ValueMap", CMPI_stringA, true, true, false},
-    {"Values", CMPI_stringA, true, true, true},
-    {"Version", CMPI_string, true, false, true},
-    {"Weak", CMPI_boolean, false, true, false},
-    {"Write", CMPI_boolean, true, true, false},
-    {"XMLNamespaceName", CMPI_string, true, true, false},
+    {"Abstract", CMPI_boolean, true, false, false, ofClasses, "FALSE"},
+    {"Aggregate", CMPI_boolean, false, true, false, aReference, "FALSE"},
+    {"Aggregation", CMPI_boolean, false, true, false, anAssociation, "FALSE"},
+    {"ArrayType", CMPI_string, false, true, false, aProperty | aParameter, "Bag"},
+    {"Association", CMPI_boolean, false, true, false, anAssociation, "FALSE"},
+    {"BitMap", CMPI_stringA, true, true, false, ofValues, nullptr},
+    {"BitValues", CMPI_stringA, true, true, true, ofValues, nullptr},
+    {"ClassConstraint", CMPI_stringA, true, true, false, ofClasses, nullptr},
+    {"Composition", CMPI_boolean, false, true, false, anAssociation, "FALSE"},
+    {"Correlatable", CMPI_stringA, true, true, false, aProperty, nullptr},
+    {"Counter", CMPI_boolean, true, true, false, ofValues, "FALSE"},
+    {"Deprecated", CMPI_stringA, true, false, false, anyScope, nullptr},
+    {"Description", CMPI_string, true, true, true, anyScope, nullptr},
+    {"DisplayName", CMPI_string, true, true, true, anyScope, nullptr},
+    {"DN", CMPI_boolean, false, true, false, ofValues, "FALSE"},
+    {"EmbeddedInstance", CMPI_string, true, true, false, ofValues, nullptr},
+    {"EmbeddedObject", CMPI_boolean, false, true, false, ofValues, "FALSE"},
+    {"Exception", CMPI_boolean, false, true, false, aClass | anIndication, "FALSE"},
+    {"Experimental", CMPI_boolean, true, false, false, anyScope, "FALSE"},
+    {"Gauge", CMPI_boolean, true, true, false, ofValues, "FALSE"},
+    {"In", CMPI_boolean, false, true, false, aParameter, "TRUE"},
+    {"Indication", CMPI_boolean, false, true, false, aClass | anIndication, "FALSE"},
+    {"IsPUnit", CMPI_boolean, true, true, false, ofValues, "FALSE"},
+    {"Key", CMPI_boolean, false, true, false, aReference | aProperty, "FALSE"},
+    {"MappingStrings", CMPI_stringA, true, true, false, anyScope, nullptr},
+    {"Max", CMPI_uint32, true, true, false, aReference, nullptr},
+    {"MaxLen", CMPI_uint32, true, true, false, ofValues, nullptr},
+    {"MaxValue", CMPI_sint64, true, true, false, ofValues, nullptr},
+    {"MethodConstraint", CMPI_stringA, true, true, false, aMethod, nullptr},
+    {"Min", CMPI_uint32, true, true, false, aReference, "0"},
+    {"MinLen", CMPI_uint32, true, true, false, ofValues, "0"},
+    {"MinValue", CMPI_sint64, true, true, false, ofValues, nullptr},
+    {"ModelCorrespondence", CMPI_stringA, true, true, false, anyScope, nullptr},
+    {"NullValue", CMPI_string, false, true, false, aProperty, nullptr},
+    {"OctetString", CMPI_boolean, false, true, false, ofValues, "FALSE"},
+    {"Out", CMPI_boolean, false, true, false, aParameter, "FALSE"},
+    {"Override", CMPI_string, true, false, false, aReference | aProperty | aMethod, nullptr},
+    {"Propagated", CMPI_string, false, true, false, aProperty, nullptr},
+    {"PropertyConstraint", CMPI_stringA, true, true, false, aReference | aProperty, nullptr},
+    {"PUnit", CMPI_string, true, true, false, ofValues, nullptr},
+    {"Read", CMPI_boolean, true, true, false, aProperty, "TRUE"},
+    {"Reference", CMPI_string, true, true, false, aProperty, nullptr},
+    {"Required", CMPI_boolean, false, true, false, aReference | aProperty | aMethod | aParameter, "FALSE"},
+    {"Revision", CMPI_string, true, true, true, ofClasses, nullptr},
+    {"Schema", CMPI_string, false, true, true, aProperty | aMethod, nullptr},
+    {"Static", CMPI_boolean, false, true, false, aProperty | aMethod, "FALSE"},
+    {"Structure", CMPI_boolean, false, true, false, aClass | anIndication, "FALSE"},
+    {"Terminal", CMPI_boolean, true, true, false, ofClasses, "FALSE"},
+    {"UMLPackagePath", CMPI_string, true, true, false, ofClasses, nullptr},
+    {"Units", CMPI_string, true, true, true, ofValues, nullptr},
+    {"ValueMap", CMPI_stringA, true, true, false, ofValues, nullptr},
+    {"Values", CMPI_stringA, true, true, true, ofValues, nullptr},
+    {"Version", CMPI_string, true, false, true, ofClasses, nullptr},
+    {"Weak", CMPI_boolean, false, true, false, aReference, "FALSE"},
+    {"Write", CMPI_boolean, true, true, false, aProperty, "FALSE"},
+    {"XMLNamespaceName", CMPI_string, true, true, false, ofValues, nullptr},
     // clang-format on
 };
 
 bool isSame(const QualifierType& left, const QualifierType& right) {
     const auto asTuple = [](const QualifierType& type) {
-        return std::tuple(type.type, type.overridable, type.toSubclass, type.translatable);
+        return std::tuple(type.type, type.overridable, type.toSubclass, type.translatable, type.scopes);
     };
-    return asTuple(left) == asTuple(right);
+    return asTuple(left) == asTuple(right) && left.defaultValue == right.defaultValue;
 }
 
 /** The value in a type that is no array, or nothing where it is none of it. */
@@ -138,7 +144,15 @@ std::optional<Value> valueOf(const Value& value, CMPIType type) {
 QualifierTypes::QualifierTypes(const std::vector<QualifierType>& declared) {
     for (const StandardType& type : standardTypes) {
         const std::string name(type.name);
-        _types.emplace(name, QualifierType{name, type.type, type.overridable, type.toSubclass, type.translatable, {}});
+        _types.emplace(name, QualifierType{name,
+                                           type.type,
+                                           type.overridable,
+                                           type.toSubclass,
+                                           type.translatable,
+                                           type.scopes,
+                                           type.defaultValue == nullptr ? nullValue(type.type)
+                                                                        : valueOfText(type.defaultValue, type.type),
+                                           {}});
     }
     for (const QualifierType& type : declared) {
         QualifierType& known = _types.try_emplace(type.name, type).first->second;
@@ -154,6 +168,15 @@ QualifierTypes::QualifierTypes(const std::vector<QualifierType>& declared) {
 const QualifierType* QualifierTypes::find(std::string_view name) const {
     const auto found = _types.find(name);
     return found == _types.end() ? nullptr : &found->second;
+}
+
+std::vector<const QualifierType*> QualifierTypes::all() const {
+    std::vector<const QualifierType*> types;
+    types.reserve(_types.size());
+    for (const auto& [name, type] : _types) {
+        types.push_back(&type);
+    }
+    return types;
 }
 
 void QualifierTypes::convert(Qualifiers& qualifiers, const std::string& place) const {

@@ -6,12 +6,39 @@
 
 #include "classes/Class.h"
 
+#include <array>
 #include <map>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace ObjectManager {
+
+/** What a qualifier may stand at: bits that are or-ed. */
+using Scopes = unsigned int;
+
+constexpr Scopes aClass = 1;
+constexpr Scopes anAssociation = 2;
+constexpr Scopes aReference = 4;
+constexpr Scopes aProperty = 8;
+constexpr Scopes aMethod = 16;
+constexpr Scopes aParameter = 32;
+constexpr Scopes anIndication = 64;
+/** Written as "any". */
+constexpr Scopes anyScope = 127;
+
+struct ScopeName {
+    std::string_view name;
+    Scopes scope;
+};
+
+constexpr std::array<ScopeName, 7> scopeNames{{{"class", aClass},
+                                               {"association", anAssociation},
+                                               {"reference", aReference},
+                                               {"property", aProperty},
+                                               {"method", aMethod},
+                                               {"parameter", aParameter},
+                                               {"indication", anIndication}}};
 
 /** The flavors are those that a qualifier type has where its declaration gives none. */
 struct QualifierType {
@@ -23,6 +50,9 @@ struct QualifierType {
     /** Whether a class inherits the qualifier, and an element that is declared again. */
     bool toSubclass = true;
     bool translatable = false;
+    Scopes scopes = 0;
+    /** What the qualifier is where it is not given; null where the declaration says nothing. */
+    Value defaultValue{};
     /** Where the declaration stands, "file:line"; empty for those that every schema has. */
     std::string place;
 };
@@ -39,6 +69,9 @@ public:
 
     /** The type called `name`, letter case ignored, or null. */
     const QualifierType* find(std::string_view name) const;
+
+    /** All types, by name. */
+    std::vector<const QualifierType*> all() const;
 
     /**
      * Gives each qualifier a value of its type. One that has no type keeps what it has.

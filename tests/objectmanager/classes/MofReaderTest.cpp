@@ -116,7 +116,7 @@ TEST(MofReader, readsMethodsWithQualifiedParameters) {
     EXPECT_EQ(directions(3), std::pair(true, true));
 }
 
-TEST(MofReader, readsQualifierTypesWithTheirFlavors) {
+TEST(MofReader, readsQualifierTypesWithTheirScopesAndFlavors) {
     const auto types = readMof(R"(
         Qualifier Key : boolean = false, Scope(property, reference), Flavor(DisableOverride, ToSubclass);
         Qualifier Values : string[], Scope(any), Flavor(Translatable);
@@ -135,6 +135,10 @@ TEST(MofReader, readsQualifierTypesWithTheirFlavors) {
                                    type("Since", CMPI_dateTime, true, false, false),
                                    type("Plain", CMPI_uint32, true, true, false)));
     EXPECT_EQ(types[2].place, "x.mof:5");
+    EXPECT_EQ(types[0].scopes, aProperty | aReference);
+    EXPECT_EQ(types[0].defaultValue, booleanValue(false));
+    EXPECT_EQ(types[1].scopes, anyScope);
+    EXPECT_TRUE(types[1].defaultValue.isNull());
 }
 
 struct BadMof {

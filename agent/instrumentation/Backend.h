@@ -60,7 +60,7 @@ public:
     virtual PowerRequestOutcome cancelRequest(std::size_t node) = 0;
 };
 
-/** What stands behind the nodes, for people who want to know whether it will do. */
+/** The machine behind the nodes, for people who want to know whether it can do what it is there for. */
 struct MachineReport {
     struct Fact {
         std::string name;
@@ -83,7 +83,7 @@ public:
     /** The machine, for people, as it completes "Power management of". */
     virtual std::string machine() const = 0;
 
-    /** What is allowed and will not do what one would think, for people; empty where there is nothing of the kind. */
+    /** Why clients will not see the machine as it is configured, for people; empty where they will. */
     virtual std::string warning() const { return {}; }
 
     /** Never null; without nodes where the machine has none. */

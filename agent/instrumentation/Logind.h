@@ -81,7 +81,7 @@ public:
 
     /**
      * Asks several questions at once, so that all of them take the time of one. Their answers are what the members
-     * below give when they are next called; what is wrong with an answer is then thrown.
+     * below return when they are next called; an answer that is an error is thrown then.
      *
      * @param questions those above, and methods for `can`.
      */

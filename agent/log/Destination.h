@@ -29,7 +29,7 @@ public:
     virtual int write(const Line& line) = 0;
 };
 
-/** The host's standard error, as long as it takes what is written. */
+/** The host's standard error. A line that it cannot take at once is lost. */
 std::unique_ptr<Destination> standardErrorDestination();
 
 /** The file and rotation of `settings`, for any number of processes and threads that write and rotate the same file. */

@@ -9,8 +9,8 @@ namespace OrvLog {
 
 /**
  * Keeps threads away from a destination that hangs, such as a file on a network that is down: once a thread has been in
- * for a second and nobody has got out since, nobody else is let in until it is. What is written to such a file cannot
- * be given up by whoever writes, but nobody needs to join in.
+ * for a second and nobody has got out since, nobody else is let in until it is. The thread that writes to such a file
+ * cannot give up, but no other thread has to wait with it.
  */
 class Gate {
 public:

@@ -18,9 +18,9 @@ public:
     /** That of the calling thread. */
     static LastOperation& ofThisThread();
 
-    /** Whether a record that is not written may be needed. */
+    /** Whether a record that is below the threshold is an operation, and so to be remembered. */
     static bool isOne(const Record& record) { return record.kind == Kind::log && record.level >= operationLevel; }
-    /** Whether a record that is written may need it. Power requests and the like tell all by themselves. */
+    /** Whether a written record is a failure that the operation explains. Records of power requests need no other. */
     static bool isNeededFor(const Record& record) {
         return record.kind == Kind::log && record.level >= failureLevel &&
                record.level < Norv::Agent::alwaysWrittenLevel;

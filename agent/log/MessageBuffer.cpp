@@ -15,7 +15,7 @@ namespace OrvLog {
 
 namespace {
 
-// Collects what is streamed. Texts are handed over by swapping two strings, so that both keep their memory.
+// Collects streamed text. A text is handed over by swapping two strings, so that both keep their memory.
 class Texts final : public std::streambuf {
 public:
     const std::string& handOver() {

@@ -22,7 +22,11 @@ public:
         sigaddset(&_signals, SIGPIPE);
         sigaddset(&_signals, SIGXFSZ);
         pthread_sigmask(SIG_BLOCK, &_signals, &_before);
-        sigpending(&_pendingBefore);
+        // A signal that the host does not block cannot be pending.
+        sigemptyset(&_pendingBefore);
+        if (sigismember(&_before, SIGPIPE) != 0 || sigismember(&_before, SIGXFSZ) != 0) {
+            sigpending(&_pendingBefore);
+        }
     }
 
     ~WithoutWriteSignals() { pthread_sigmask(SIG_SETMASK, &_before, nullptr); }

@@ -8,6 +8,8 @@ target_compile_options(orv_options INTERFACE
   $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor -Woverloaded-virtual>
   # GCC 12 sees overlapping copies where there are none, in the concatenation of strings.
   $<$<COMPILE_LANG_AND_ID:CXX,GNU>:-Wno-restrict>
+  # Of several files that are compiled as one, each has names of its own.
+  $<$<AND:$<BOOL:${CMAKE_UNITY_BUILD}>,$<COMPILE_LANG_AND_ID:CXX,GNU>>:-Wno-shadow;-Wno-subobject-linkage>
   $<$<BOOL:${ORV_WERROR}>:-Werror>
   # Source names in log records are relative to the project, wherever it is built.
   "-fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=")

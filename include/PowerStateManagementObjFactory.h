@@ -76,7 +76,7 @@ public:
     unsigned short getAllPMCMPIInstances(const CMPIBroker* broker, const CMPIObjectPath* ref, char const** properties,
                                          bool isObjPath, std::vector<CMPIInstance*>& instances, CMPIStatus* rc);
 
-    /** Appends the instance of each capabilities object; as `getAllPMCMPIInstances`, but none at all is done, too. */
+    /** As `getAllPMCMPIInstances`, for capabilities objects; returns done where there is none, too. */
     unsigned short getAllPMCapCMPIInstances(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                             char const** properties, bool isObjPath,
                                             std::vector<CMPIInstance*>& instances, CMPIStatus* rc);
@@ -107,8 +107,8 @@ public:
      * @param ref the source, of which only the class name counts.
      * @param refLeftClass the association's class; null matches no association.
      * @param refRightClass the request's result class, which is reported but decides nothing. May be null.
-     * @return one of the class names above, or an empty text where source and association do not belong together; not
-     *         to be freed.
+     * @return one of the class names above, or an empty text where the association does not link the source's class;
+     * not to be freed.
      */
     const char* get_assoc_targetClass_Name(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                            const char* refLeftClass, const char* refRightClass, CMPIStatus* rc);

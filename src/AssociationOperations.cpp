@@ -83,7 +83,7 @@ public:
         return path;
     }
 
-    /** Finds the far end of a traversal; false where source and association do not belong together. */
+    /** Finds the far end of a traversal; false where the association does not link the class of the source. */
     bool resolve(const char* assocClass, const char* resultClass) {
         _target = factory.get_assoc_targetClass_ObjectPath(_broker, _ref, assocClass, resultClass, &operation.status);
         return !isNull(_target);
@@ -105,7 +105,7 @@ public:
         return isText(className, _provider.second.className) ? &_provider.second : nullptr;
     }
 
-    /** Visits the path of each object at the far end; false, with `notAvailable` reported, where they can't be had. */
+    /** Visits the path of each object at the far end; false, with `notAvailable` reported, where they cannot be had. */
     template <typename Visit>
     bool forEachFarPath(const AssociationEnd& end, const char* notAvailable, Visit visit) {
         return forEachPath(end, _target, notAvailable, [&](CMPIObjectPath* path) {

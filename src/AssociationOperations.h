@@ -25,7 +25,7 @@ enum class ObjectSource {
     capabilities,
 };
 
-/** The records whose power states an association carries. Where there are several records, it matters. */
+/** The records whose power states an association carries; the choices differ where there are several records. */
 enum class PowerStates {
     none,
     firstRecord,
@@ -47,7 +47,7 @@ struct AssociationEnd {
     /** The association's property that refers to this end. */
     const char* role;
     ObjectSource source;
-    /** Reported where this end is the far one and its objects cannot be had. */
+    /** The text reported where this end is the far one and its objects cannot be had. */
     AssociationTexts notAvailable;
     /** Whether AssociatorNames sets the namespace and the host name of this end's paths. */
     bool placedByAssociatorNames = false;
@@ -57,7 +57,7 @@ struct AssociationEnd {
     PowerStates inReferences = PowerStates::none;
 };
 
-/** Reported where the walk over an association's pairs fails. */
+/** The texts reported where the walk over an association's pairs fails. */
 struct PairTexts {
     const char* servicesNotAvailable;
     const char* servicePathNull;
@@ -76,7 +76,7 @@ struct PairTexts {
 using AssociationBuilder = unsigned short (*)(const CMPIObjectPath* ref, char const** properties,
                                               const CMPIContext* context, std::vector<CMPIInstance*>& instances);
 
-/** What tells the provider of one association from those of the others. */
+/** What distinguishes the provider of one association from those of the others. */
 struct AssociationProvider {
     const std::string& category;
     const char* className;
@@ -89,7 +89,7 @@ struct AssociationProvider {
     const char** filterKeys;
     PairTexts instances;
     PairTexts names;
-    /** Reported where source and association do not belong together. */
+    /** The texts reported where the association does not link the class of the source. */
     AssociationTexts targetNull;
     /** What an enumerated instance carries. */
     PowerStates inInstances = PowerStates::none;
@@ -161,7 +161,10 @@ CMPIStatus associators(const AssociationProvider& provider, const CMPIBroker* br
 CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                           const CMPIResult* result, const CMPIObjectPath* op, const Site& site = Site::here());
 
-/** @param properties the request's property list, which no property is left out for. */
+/**
+ * @param properties the request's property list. The references have all their properties, whatever it lists; it
+ * decides whether the instances that they refer to are built with keys alone.
+ */
 CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                       const CMPIResult* result, const CMPIObjectPath* op, char const** properties,
                       const Site& site = Site::here());

@@ -17,7 +17,7 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
-/** What tells the provider of one element class from that of the other. */
+/** What distinguishes the provider of one element class from that of the other. */
 struct ElementProvider {
     using AllObjectPaths = unsigned short (PowerStateManagementObjFactory::*)(const CMPIBroker*, const CMPIObjectPath*,
                                                                               std::vector<CMPIObjectPath*>&,

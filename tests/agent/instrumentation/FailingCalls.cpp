@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstring>
 
 #include <dlfcn.h>
 #include <sys/stat.h>
@@ -9,15 +10,16 @@
 
 namespace {
 
-thread_local std::string failing;
-thread_local int failure = 0;
+/** A literal; null where none fails. Writes may come until the very end of a thread. */
+constinit thread_local const char* failing = nullptr;
+constinit thread_local int failure = 0;
 
 /** Whether a call fails now, and only now. */
 bool fails(const char* call) {
-    if (failing != call) {
+    if (failing == nullptr || std::strcmp(failing, call) != 0) {
         return false;
     }
-    failing.clear();
+    failing = nullptr;
     errno = failure;
     return true;
 }
@@ -32,13 +34,13 @@ Function* real(const char* name) {
 
 namespace AgentTest {
 
-void failNext(const std::string& call, int error) {
+void failNext(const char* call, int error) {
     failing = call;
     failure = error;
 }
 
 bool hasFailed() {
-    return failing.empty();
+    return failing == nullptr;
 }
 
 } // namespace AgentTest

@@ -4,16 +4,15 @@
 #ifndef TESTS_INSTRUMENTATION_FAILINGCALLS_H
 #define TESTS_INSTRUMENTATION_FAILINGCALLS_H
 
-#include <string>
-
 namespace AgentTest {
 
 /**
  * Has this thread's next call of write, fsync, futimens or rename fail.
  *
+ * @param call its name, a literal.
  * @param error the error number; 0 is a write(2) that writes nothing.
  */
-void failNext(const std::string& call, int error);
+void failNext(const char* call, int error);
 
 /** Whether it has failed since. */
 bool hasFailed();

@@ -21,6 +21,17 @@ std::size_t shareOfOneUser(std::size_t limit) {
     return limit / 2 + limit % 2;
 }
 
+const char* nameOf(Pulled kind) {
+    switch (kind) {
+    case Pulled::instancesWithPath:
+        return "instances with their paths";
+    case Pulled::instancePaths:
+        return "paths";
+    default:
+        return "what a query finds";
+    }
+}
+
 CimError limitExceeded(const std::string& found, std::size_t limit, const std::string& what) {
     return {serverLimitsExceeded,
             "found " + found + ", expected at most " + std::to_string(limit) + ' ' + what +
@@ -76,10 +87,8 @@ bool Enumerations::pull(const EnumerationOwner& owner, const std::string& contex
     const auto found = find(owner, context);
     Enumeration& enumeration = found->second;
     if (enumeration.kind != kind) {
-        throw CimError(invalidEnumerationContext,
-                       kind == Pulled::instancePaths
-                           ? "found an enumeration of instances, expected one of paths"
-                           : "found an enumeration of paths, expected one of instances with their paths");
+        throw CimError(invalidEnumerationContext, std::string("found an enumeration of ") + nameOf(enumeration.kind) +
+                                                      ", expected one of " + nameOf(kind));
     }
     const ObjectTexts& objects = enumeration.objects;
     const std::size_t end = enumeration.next + std::min(count, objects.ends.size() - enumeration.next);

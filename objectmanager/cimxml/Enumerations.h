@@ -25,7 +25,7 @@ struct EnumerationLimits {
 };
 
 /** What an enumeration gives; each has a pull operation of its own. */
-enum class Pulled { instancesWithPath, instancePaths };
+enum class Pulled { instancesWithPath, instancePaths, instances };
 
 /** Who opened an enumeration, and where. Nobody else can pull from it or close it. */
 struct EnumerationOwner {

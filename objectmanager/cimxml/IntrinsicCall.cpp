@@ -138,6 +138,20 @@ void forEachInstance(const Call& call, const ObjectPath& classPath, const Proper
     });
 }
 
+void forEachMatch(const Call& call, const Query& query, const InstanceSink& sink) {
+    checkQuery(query, declaredClass(call, query.className));
+    PropertyList needed = query.properties;
+    if (needed) {
+        const std::vector<std::string> compared = query.compared();
+        needed->insert(needed->end(), compared.begin(), compared.end());
+    }
+    forEachInstance(call, {{}, call.nameSpace(), query.className, {}}, needed, [&](Instance&& instance) {
+        if (matches(query, instance)) {
+            sink(std::move(instance));
+        }
+    });
+}
+
 void forEachInstanceName(const Call& call, const PathSink& sink) {
     forEachServed(call, call.parameters.className("ClassName"), [&](const ObjectPath& path) {
         call.dispatcher().enumerateInstanceNames(call.invocation(), path, sink);

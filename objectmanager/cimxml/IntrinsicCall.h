@@ -4,6 +4,7 @@
 
 #include "cimxml/Operations.h"
 #include "cimxml/Parameters.h"
+#include "cimxml/Query.h"
 
 #include <functional>
 #include <string>
@@ -65,6 +66,8 @@ AssociationFilter referenceFilter(const Call& call);
 /** Calls for each instance of the class and of its descendants, with these properties at least. */
 void forEachInstance(const Call& call, const ObjectPath& classPath, const PropertyList& properties,
                      const InstanceSink& sink);
+/** Calls for each instance of the query's class and of its descendants that meets its condition. */
+void forEachMatch(const Call& call, const Query& query, const InstanceSink& sink);
 /** Calls for the path of each instance of the class ClassName and of its descendants. */
 void forEachInstanceName(const Call& call, const PathSink& sink);
 

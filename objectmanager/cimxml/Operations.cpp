@@ -4,7 +4,6 @@
 #include "cimxml/ClassAssociations.h"
 #include "cimxml/IntrinsicCall.h"
 #include "cimxml/PullOperations.h"
-#include "cimxml/Query.h"
 
 #include <algorithm>
 
@@ -189,22 +188,13 @@ void deleteInstance(const Call& call) {
 /** Answered from an enumeration: providers are not asked for queries, which few of them know. */
 void execQuery(const Call& call) {
     const Query query = parseQuery(call.parameters.text("Query"), call.parameters.text("QueryLanguage"));
-    checkQuery(query, declaredClass(call, query.className));
-    PropertyList needed = query.properties;
-    if (needed) {
-        const std::vector<std::string> compared = query.compared();
-        needed->insert(needed->end(), compared.begin(), compared.end());
-    }
     Selection selection;
     selection.properties = query.properties;
-    const ObjectPath classPath{{}, call.nameSpace(), query.className, {}};
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachInstance(call, classPath, needed, [&](Instance&& instance) {
-        if (matches(query, instance)) {
-            call.writer().raw("<VALUE.OBJECT>\n");
-            call.writer().instance(instance, selection);
-            call.writer().raw("</VALUE.OBJECT>\n");
-        }
+    forEachMatch(call, query, [&](Instance&& instance) {
+        call.writer().raw("<VALUE.OBJECT>\n");
+        call.writer().instance(instance, selection);
+        call.writer().raw("</VALUE.OBJECT>\n");
     });
     call.writer().raw("</IRETURNVALUE>\n");
 }
@@ -336,6 +326,12 @@ constexpr IntrinsicMethod intrinsicMethods[] = {
      {"InstanceName", "ResultClass", "Role", "FilterQueryLanguage", "FilterQuery", "OperationTimeout",
       "ContinueOnError", "MaxObjectCount"},
      openReferenceInstancePaths},
+    {"OpenQueryInstances",
+     Access::read,
+     {"FilterQueryLanguage", "FilterQuery", "ReturnQueryResultClass", "OperationTimeout", "ContinueOnError",
+      "MaxObjectCount"},
+     openQueryInstances},
+    {"PullInstances", Access::read, {"EnumerationContext", "MaxObjectCount"}, pullInstances},
     {"PullInstancesWithPath", Access::read, {"EnumerationContext", "MaxObjectCount"}, pullInstancesWithPath},
     {"PullInstancePaths", Access::read, {"EnumerationContext", "MaxObjectCount"}, pullInstancePaths},
     {"CloseEnumeration", Access::read, {"EnumerationContext"}, closeEnumeration},

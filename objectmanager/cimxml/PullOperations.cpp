@@ -16,12 +16,16 @@ EnumerationOwner ownerOf(const Call& call) {
 }
 
 /** Throws where the client asks for what DSP0200 lets a server refuse. */
-void requireSupported(const Call& call) {
+void requireUnfiltered(const Call& call) {
     if (!call.parameters.optionalText("FilterQueryLanguage").empty() ||
         !call.parameters.optionalText("FilterQuery").empty()) {
         throw CimError(filteredEnumerationNotSupported,
                        "found a FilterQuery, expected none: enumerations are not filtered");
     }
+}
+
+/** Throws where the client wants an enumeration to go on behind a failure. */
+void requireEndAtError(const Call& call) {
     if (call.parameters.flag("ContinueOnError", false)) {
         throw CimError(continuationOnErrorNotSupported,
                        "found ContinueOnError, expected FALSE: an enumeration ends where it fails");
@@ -57,7 +61,10 @@ public:
     Opening(const Call& call, Pulled kind)
         : _call(call), _kind(kind), _atOnce(call.parameters.optionalNumber("MaxObjectCount").value_or(0)),
           _time(timeOf(call)) {
-        requireSupported(call);
+        if (kind != Pulled::instances) {
+            requireUnfiltered(call);
+        }
+        requireEndAtError(call);
         call.writer().raw("<IRETURNVALUE>\n");
         _rest = call.writer().size();
     }
@@ -174,6 +181,27 @@ void openReferenceInstancePaths(const Call& call) {
         opening.written();
     }
     opening.finish();
+}
+
+void openQueryInstances(const Call& call) {
+    const Query query = parseQuery(call.parameters.text("FilterQuery"), call.parameters.text("FilterQueryLanguage"));
+    if (call.parameters.flag("ReturnQueryResultClass", false)) {
+        throw CimError(CMPI_RC_ERR_NOT_SUPPORTED, "found ReturnQueryResultClass, expected FALSE: the class of what is "
+                                                  "found is " +
+                                                      query.className);
+    }
+    Selection selection;
+    selection.properties = query.properties;
+    Opening opening(call, Pulled::instances);
+    forEachMatch(call, query, [&](Instance&& instance) {
+        call.writer().instance(instance, selection);
+        opening.written();
+    });
+    opening.finish();
+}
+
+void pullInstances(const Call& call) {
+    pull(call, Pulled::instances);
 }
 
 void pullInstancesWithPath(const Call& call) {

@@ -17,6 +17,9 @@ void openAssociatorInstances(const Call& call);
 void openAssociatorInstancePaths(const Call& call);
 void openReferenceInstances(const Call& call);
 void openReferenceInstancePaths(const Call& call);
+/** What ExecQuery answers: instances without their paths. */
+void openQueryInstances(const Call& call);
+void pullInstances(const Call& call);
 void pullInstancesWithPath(const Call& call);
 void pullInstancePaths(const Call& call);
 void closeEnumeration(const Call& call);

@@ -77,7 +77,8 @@ function(orv_add_test name)
   add_executable(${name} ${arg_SOURCES})
   target_link_libraries(${name} PRIVATE
     orv_options orv_test_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
-  if(TARGET orv_test_headers)
+  # They are headers of C++, and CMake wants them for every language of the program.
+  if(TARGET orv_test_headers AND NOT "${arg_SOURCES}" MATCHES "\\.c(;|$)")
     target_precompile_headers(${name} REUSE_FROM orv_test_headers)
   endif()
   set(filter)

@@ -145,13 +145,13 @@ class Machine:
                 return message["return"]
 
     def wait_for_event(self, name, patience=PATIENCE):
-        """What the guest did to the machine, for example RESET. Returns when, by this machine's monotonic clock."""
+        """What the guest did to the machine, for example RESET. Returns when, as time.time() has it."""
         deadline = time.monotonic() + patience
         while True:
             for event in self._events:
                 if event["event"] == name and event["data"].get("guest"):
                     self._events.remove(event)
-                    return time.monotonic()
+                    return event["timestamp"]["seconds"] + event["timestamp"]["microseconds"] / 1e6
             message = self._qmp.receive(max(deadline - time.monotonic(), 0))
             if message is None:
                 raise MachineError(f"no event {name} of the guest within {patience} s")

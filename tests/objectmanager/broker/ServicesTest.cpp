@@ -70,7 +70,8 @@ TEST_F(KindsTest, EveryObjectKnowsItsTypeAndHasAText) {
     for (const Case& expected :
          {Case{CMNewString(mb, "text", nullptr), "CMPIString", "text"},
           Case{newPath(), "CMPIObjectPath", "root/cimv2:Test_Disk"},
-          Case{instance, "CMPIInstance", "instance of C {\n    A = {\"x\", \"y\"};\n    B = \"root:D\";\n    C = 0.5;\n};\n"},
+          Case{instance, "CMPIInstance",
+               "instance of C {\n    A = {\"x\", \"y\"};\n    B = \"root:D\";\n    C = 0.5;\n};\n"},
           Case{args, "CMPIArgs", "A=5, B=TRUE"}, Case{context, "CMPIContext", "A=NULL"},
           Case{CMNewArray(mb, 2, CMPI_uint16, nullptr), "CMPIArray", "{NULL, NULL}"},
           Case{enumeration, "CMPIEnumeration", "{}"}, Case{dateTime, "CMPIDateTime", "20260228235959.123456+000"},

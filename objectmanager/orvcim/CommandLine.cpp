@@ -35,9 +35,7 @@ public:
         objectCommands();
         associationCommands();
         powerCommands();
-        if constexpr (ORVCIM_SERVES != 0) {
-            addServeOptions(add(_app, "serve", "Answer WBEM clients on the network", serve), _options.serve);
-        }
+        addServeOptions(add(_app, "serve", "Answer WBEM clients on the network", serve), _options.serve);
         add(_app, "check", "Say which providers load and what the agent can do, and what is wrong or missing",
             checkProviders);
     }

@@ -76,7 +76,7 @@ std::string Enumerations::open(const EnumerationOwner& owner, Pulled kind, Objec
     if (bytes > _limits.bytes) {
         throw limitExceeded(std::to_string(bytes) + " bytes", _limits.bytes, "bytes in all enumerations");
     }
-    const std::string context = _newContext();
+    std::string context = _newContext();
     _open.emplace(context, Enumeration{owner, kind, std::move(rest), given, 0, time, _clock() + time});
     return context;
 }

@@ -383,7 +383,7 @@ std::partial_ordering compare(const Value& value, const Value& literal) {
                                                          : std::partial_ordering::unordered;
     }
     if (const auto* text = std::get_if<std::string>(&value.content)) {
-        const std::string& other = std::get<std::string>(literal.content);
+        const auto& other = std::get<std::string>(literal.content);
         return value.type == CMPI_dateTime ? compareTimes(*text, other) : *text <=> other;
     }
     if (const auto* character = std::get_if<char16_t>(&value.content)) {
@@ -395,17 +395,17 @@ std::partial_ordering compare(const Value& value, const Value& literal) {
 bool holds(std::partial_ordering order, Comparison::Operator comparedBy) {
     switch (comparedBy) {
     case Comparison::Operator::equal:
-        return order == 0;
+        return std::is_eq(order);
     case Comparison::Operator::notEqual:
-        return order != 0;
+        return std::is_neq(order);
     case Comparison::Operator::less:
-        return order < 0;
+        return std::is_lt(order);
     case Comparison::Operator::lessOrEqual:
-        return order <= 0;
+        return std::is_lteq(order);
     case Comparison::Operator::greater:
-        return order > 0;
+        return std::is_gt(order);
     default:
-        return order >= 0;
+        return std::is_gteq(order);
     }
 }
 

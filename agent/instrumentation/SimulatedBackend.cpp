@@ -67,7 +67,7 @@ public:
             if (last == requests.end() || !isUnderWay(last->second)) {
                 throw Refusal("no request is in progress");
             }
-            const std::string cancelled = std::string(" (") + last->second.transition->name + ')';
+            std::string cancelled = std::string(" (") + last->second.transition->name + ')';
             if (last->second.after == nullptr) {
                 requests.erase(last);
             } else {

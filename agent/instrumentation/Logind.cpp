@@ -228,8 +228,8 @@ void Logind::askTogether(std::span<const char* const> questions) {
     };
     for (const char* question : questions) {
         const Message call = newQuestion(question);
-        Asked& asked = _asked.emplace_back(question, Message());
-        require(libsystemd().sd_bus_call_async(_bus.get(), nullptr, call.get(), keep, &asked,
+        _asked.push_back({question, Message()});
+        require(libsystemd().sd_bus_call_async(_bus.get(), nullptr, call.get(), keep, &_asked.back(),
                                                std::numeric_limits<std::uint64_t>::max()),
                 question);
     }

@@ -461,14 +461,4 @@ void perform(const Operation& operation) {
     method.answer({operation, Parameters(message, operation.catalogue, method.parameters)});
 }
 
-std::vector<std::string> readingMethods() {
-    std::vector<std::string> names;
-    for (const IntrinsicMethod& method : intrinsicMethods) {
-        if (method.access == Access::read) {
-            names.emplace_back(method.name);
-        }
-    }
-    return names;
-}
-
 } // namespace ObjectManager::CimXml

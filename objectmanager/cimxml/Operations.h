@@ -7,9 +7,6 @@
 #include "cimxml/ResponseWriter.h"
 #include "cimxml/Service.h"
 
-#include <string>
-#include <vector>
-
 namespace ObjectManager::CimXml {
 
 /** One operation, and where its answer goes. */
@@ -29,9 +26,6 @@ struct Operation {
  * written by then is of no use.
  */
 void perform(const Operation& operation);
-
-/** The names of the intrinsic methods that change nothing. */
-std::vector<std::string> readingMethods();
 
 } // namespace ObjectManager::CimXml
 

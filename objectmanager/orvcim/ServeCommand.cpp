@@ -1,6 +1,6 @@
-#include "cimxml/Operations.h"
 #include "cimxml/Service.h"
 #include "orvcim/Commands.h"
+#include "orvcim/ServeLog.h"
 #include "orvcim/ServiceManager.h"
 #include "server/HttpServer.h"
 #include "server/ListenSocket.h"
@@ -12,13 +12,16 @@
 #include <pthread.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
-#include <syslog.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <cstdlib>
+#include <fstream>
 #include <optional>
+#include <string>
+#include <string_view>
 
 namespace ObjectManager::Orvcim {
 
@@ -39,10 +42,6 @@ Server::Settings settingsOf(const ServeOptions& options) {
         settings.tls = Server::Tls{options.certificate, options.key};
     }
     settings.port = options.port.value_or(settings.tls ? httpsPort : httpPort);
-    if (!options.authenticate) {
-        // The machine is a simulated one then, which never waits for anybody else.
-        settings.promptMethods = CimXml::readingMethods();
-    }
     return settings;
 }
 
@@ -75,16 +74,17 @@ void allowFiles(unsigned int connections) {
     }
 }
 
-Server::Log logOf(const ServeOptions& options) {
-    if (options.syslog) {
-        openlog("orvcim", LOG_PID, LOG_DAEMON);
-        return [](const std::string& line) { ::syslog(LOG_WARNING, "%s", line.c_str()); };
-    }
-    return [](const std::string& line) {
-        // In one piece, since several threads log.
-        const std::string text = "orvcim: " + line + '\n';
-        [[maybe_unused]] const ssize_t written = write(STDERR_FILENO, text.data(), text.size());
+/** What follows from a group that the system does not have. */
+void reportMissingGroups(const Server::PamSettings& pam, const Server::Log& log) {
+    const auto report = [&](const std::string& group, const std::string& what) {
+        if (!group.empty() && !Server::groupExists(group)) {
+            log(fmt::format("group {} does not exist: {}", group, what));
+        }
     };
+    report(pam.readGroup, "only those who may change the power state may read");
+    report(pam.powerGroup, pam.allowRoot ? "only root may change the power state"
+                                         : "only root may change the power state, and root may not log in (see "
+                                           "--allow-root)");
 }
 
 timespec timespecOf(std::chrono::microseconds time) {
@@ -112,14 +112,15 @@ bool isServing(const Server::Address& address, std::chrono::microseconds time) {
     return closed;
 }
 
-/** The signals that end the program. Only one thread takes them. */
-class EndSignals {
+/** The signals that tell the program something. Only one thread takes them. */
+class Signals {
 public:
     /** Before any other thread is made, since the others inherit what is blocked here. */
-    EndSignals() {
+    Signals() {
         sigemptyset(&_signals);
-        sigaddset(&_signals, SIGINT);
-        sigaddset(&_signals, SIGTERM);
+        for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGUSR1}) {
+            sigaddset(&_signals, signal);
+        }
         pthread_sigmask(SIG_BLOCK, &_signals, nullptr);
         // A client that goes away is noticed otherwise.
         std::signal(SIGPIPE, SIG_IGN);
@@ -129,21 +130,32 @@ public:
      * Waits for one.
      *
      * @param time without it, there is no end to that.
-     * @return true when one has come, after which the next one ends the program at once.
+     * @return nothing when the time is over.
      */
-    bool waitFor(std::optional<std::chrono::microseconds> time) const {
+    std::optional<int> waitFor(std::optional<std::chrono::microseconds> time) const {
         const timespec limit = timespecOf(time.value_or(std::chrono::microseconds{0}));
         const int signal = time ? sigtimedwait(&_signals, nullptr, &limit) : sigwaitinfo(&_signals, nullptr);
-        if (signal < 0) {
-            return false;
-        }
-        pthread_sigmask(SIG_UNBLOCK, &_signals, nullptr);
-        return true;
+        return signal < 0 ? std::nullopt : std::optional(signal);
     }
+
+    /** From now on they end the program at once. */
+    void release() const { pthread_sigmask(SIG_UNBLOCK, &_signals, nullptr); }
 
 private:
     sigset_t _signals{};
 };
+
+/** How much of the system's memory the program has, for people. */
+std::string memoryText() {
+    std::ifstream status("/proc/self/status");
+    for (std::string line; std::getline(status, line);) {
+        constexpr std::string_view resident = "VmRSS:";
+        if (line.starts_with(resident)) {
+            return line.substr(line.find_first_not_of(" \t", resident.size()));
+        }
+    }
+    return "unknown";
+}
 
 } // namespace
 
@@ -152,20 +164,17 @@ void serve(Session& session) {
     const Server::Settings settings = settingsOf(options);
     requireProtection(session, settings);
     allowFiles(settings.limits.connections);
-    const Server::Log log = logOf(options);
+    const Signals signals;
+    ServeLog serveLog(options.syslog);
+    const Server::Log log = [&serveLog](const std::string& line) { serveLog.write(line); };
 
     std::optional<Server::PamAuthenticator> authenticator;
     if (options.authenticate) {
         authenticator.emplace(options.pam);
-        for (const std::string& group : {options.pam.readGroup, options.pam.powerGroup}) {
-            if (!group.empty() && !Server::groupExists(group)) {
-                log(fmt::format("there is no group {}, so nobody is in it", group));
-            }
-        }
+        reportMissingGroups(options.pam, log);
     }
 
     const ServiceManager manager;
-    const EndSignals signals;
     CimXml::Service service(session.dispatcher(), session.catalogue(), {.enumerations = options.enumerations});
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
         Server::HttpReply reply = service.answer(request, caller);
@@ -173,7 +182,7 @@ void serve(Session& session) {
         session.log().forget();
         return reply;
     };
-    const Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);
+    Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);
     const std::string listening = fmt::format("Listening on {}://{}\n", settings.tls ? "https" : "http",
                                               Server::hostAndPort(settings.address, server.port()));
     session.out() << listening << std::flush;
@@ -181,12 +190,24 @@ void serve(Session& session) {
 
     const Server::Address self(settings.address, server.port());
     const auto interval = manager.watchdogInterval();
-    while (!signals.waitFor(interval)) {
-        if (interval && isServing(self, *interval / 2)) {
+    for (std::optional<int> signal; signal != SIGINT && signal != SIGTERM;) {
+        signal = signals.waitFor(interval);
+        if (signal == SIGHUP) {
+            server.renewKeys();
+        } else if (signal == SIGUSR1) {
+            log(fmt::format("{}, {} of memory", server.health(), memoryText()));
+        } else if (!signal && interval && isServing(self, *interval / 2)) {
             manager.tell("WATCHDOG=1");
         }
     }
+    signals.release();
     manager.tell("STOPPING=1");
+    if (!server.stop()) {
+        // Its threads use what would be taken down otherwise.
+        log("ended although a provider or PAM did not return");
+        serveLog.flush(std::chrono::seconds{1});
+        _exit(EXIT_SUCCESS);
+    }
 }
 
 } // namespace ObjectManager::Orvcim

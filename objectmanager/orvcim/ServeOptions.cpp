@@ -18,7 +18,7 @@ CLI::Option* addText(CLI::App& subcommand, const std::string& option, std::strin
     return subcommand.add_option(option, value, description)->type_name(type)->capture_default_str();
 }
 
-template <class Count>
+template <typename Count>
 void addCount(CLI::App& subcommand, const std::string& option, Count& value, const std::string& description,
               int most = 1'000'000'000) {
     constexpr int least = 1;
@@ -83,18 +83,30 @@ void addServeOptions(CLI::App& command, ServeOptions& options) {
     command.add_option("--pam-folder", options.pam.folder, "Folder of PAM's services, not the system's")
         ->type_name("DIR")
         ->needs(authenticate);
-    addText(command, "--read-group", options.pam.readGroup, "Whose members may read (default: who can log in)", "GROUP")
+    addText(command, "--read-group", options.pam.readGroup,
+            "Group whose members may read (default: everyone who can log in)", "GROUP")
         ->needs(authenticate);
     addText(command, "--power-group", options.pam.powerGroup,
-            "Whose members may read and change the power state, beside root", "GROUP")
+            "Group whose members may read and change the power state, as root may if root may log in", "GROUP")
         ->needs(authenticate);
+    command.add_flag("--allow-root", options.pam.allowRoot, "Root may log in")->needs(authenticate);
+    command
+        .add_flag("--allow-without-shell", options.pam.allowWithoutShell,
+                  "Users may log in who have no log-in shell (see shells(5))")
+        ->needs(authenticate);
+    command
+        .add_option("--host", server.hosts,
+                    "Name by which clients may call this server, beside the machine's; may be given several times")
+        ->type_name("NAME");
     command.add_flag("--syslog", options.syslog, "Log to the system's log, not to standard error");
+    command.add_flag("--access-log", server.accessLog, "Log each request in one line");
     constexpr int mostThreads = 1000;
-    addCount(command, "--threads", server.threads, "Requests served at a time", mostThreads);
+    addCount(command, "--threads", server.threads, "Requests answered at a time", mostThreads);
     addCount(command, "--max-body", limits.bodyBytes, "Bytes of a request's body");
+    addCount(command, "--max-bodies", limits.allBodiesBytes, "Bytes of all bodies together");
     addCount(command, "--max-headers", limits.headerBytes, "Bytes of a request's headers");
     addCount(command, "--max-connections", limits.connections, "Connections at a time");
-    addCount(command, "--max-connections-per-address", limits.connectionsPerAddress, "Connections of one client");
+    addCount(command, "--max-connections-per-address", limits.connectionsPerAddress, "Connections of one network");
     addTime(command, "--request-time", limits.requestTime, "Seconds in which a request has to arrive");
     addTime(command, "--idle-time", limits.idleTime, "Seconds after which an idle connection is closed");
     addCount(command, "--max-enumerations", options.enumerations.count,

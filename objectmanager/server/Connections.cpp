@@ -5,92 +5,90 @@
 #include <sys/socket.h>
 
 #include <algorithm>
-#include <string_view>
 
 namespace ObjectManager::Server {
 
 namespace {
 
-constexpr std::string_view requestTimeout =
-    "HTTP/1.1 408 Request Timeout\r\nConnection: close\r\nContent-Length: 0\r\n\r\n";
-
-double seconds(std::chrono::milliseconds time) {
-    return std::chrono::duration<double>(time).count();
-}
+/** Connections beyond the limit, so that their clients can be told. */
+constexpr std::size_t surplusConnections = 64;
+/** Connections that leave and are not closed yet: of all networks and of one. */
+constexpr std::size_t leavingConnections = 500;
+constexpr std::size_t leavingConnectionsOfNetwork = 100;
 
 } // namespace
 
-Connections::Connections(const Limits& limits, bool encrypted, Log log)
-    : _limits(limits), _encrypted(encrypted), _log(std::move(log)),
-      _lastCrowdReport(Clock::now() - std::chrono::hours{1}) {}
-
-Connections::Connection& Connections::opened(int socket, const std::string& address) {
+Connections::Connection* Connections::opened(int socket, const std::string& address, const std::string& network) {
     const std::lock_guard lock(_mutex);
+    const auto known = _countOfNetwork.find(network);
     bool room = true;
-    if (_countOfAddress[address] >= _limits.connectionsPerAddress) {
-        reportCrowd(fmt::format("{}: more than {} connections: idle ones are closed, others are refused", address,
+    if (known != _countOfNetwork.end() && known->second >= _limits.connectionsPerAddress) {
+        reportCrowd(fmt::format("{}: more than {} connections: idle ones are closed, others are refused", network,
                                 _limits.connectionsPerAddress));
-        room = endOldestIdle(address);
+        room = makeRoom(network);
     } else if (_count >= _limits.connections) {
         reportCrowd(
             fmt::format("more than {} connections: idle ones are closed, others are refused", _limits.connections));
-        room = endOldestIdle("");
+        room = makeRoom(largestNetwork()) || makeRoom("");
+    }
+    _refused += room ? 0 : 1;
+    const auto leaving = _leavingOfNetwork.find(network);
+    if (_count >= _limits.connections + surplusConnections || listOf(State::leaving).size() >= leavingConnections ||
+        (leaving != _leavingOfNetwork.end() && leaving->second >= leavingConnectionsOfNetwork)) {
+        return nullptr;
     }
     List& idle = listOf(State::idle);
     Connection& connection = idle.emplace_back();
     connection.self = std::prev(idle.end());
     connection.socket = socket;
     connection.address = address;
+    connection.network = network;
     connection.surplus = !room;
-    connection.since = Clock::now();
     ++_count;
-    ++_countOfAddress[address];
-    return connection;
+    ++_countOfNetwork[network];
+    return &connection;
 }
 
 void Connections::closed(Connection& connection) {
     const std::lock_guard lock(_mutex);
     move(connection, State::leaving);
+    if (const auto leaving = _leavingOfNetwork.find(connection.network); --leaving->second == 0) {
+        _leavingOfNetwork.erase(leaving);
+    }
     listOf(State::leaving).erase(connection.self);
 }
 
-Connections::State Connections::enter(Connection& connection, State state) {
+bool Connections::enter(Connection& connection, State state) {
     const std::lock_guard lock(_mutex);
-    const State before = connection.state;
     move(connection, state);
-    return before;
+    return connection.state == state;
 }
 
-bool Connections::shutDown(Connection& connection) {
+void Connections::endIdle() {
     const std::lock_guard lock(_mutex);
-    const bool open = connection.state != State::leaving;
-    end(connection);
-    return open;
+    endList(State::idle);
 }
 
-void Connections::endOverdue() {
+void Connections::endAll() {
     const std::lock_guard lock(_mutex);
-    const auto now = Clock::now();
-    List& idle = listOf(State::idle);
-    while (!idle.empty() && idle.front().since + _limits.idleTime <= now) {
-        end(idle.front());
-    }
-    List& receiving = listOf(State::receiving);
-    while (!receiving.empty() && receiving.front().since + _limits.requestTime <= now) {
-        Connection& connection = receiving.front();
-        _log(fmt::format("{}: {}: the request did not arrive within {} s", connection.address,
-                         _encrypted ? "closed" : "answered 408", seconds(_limits.requestTime)));
-        // Nothing of an answer has been written, and the library would close the connection without any.
-        if (!_encrypted) {
-            send(connection.socket, requestTimeout.data(), requestTimeout.size(), MSG_DONTWAIT | MSG_NOSIGNAL);
-        }
-        end(connection);
+    for (const State state : {State::idle, State::receiving, State::loggingIn, State::sending, State::answering}) {
+        endList(state);
     }
 }
 
 bool Connections::waitForAnswers(std::chrono::milliseconds time) {
     std::unique_lock lock(_mutex);
-    return _changed.wait_for(lock, time, [this] { return listOf(State::answering).empty(); });
+    return _changed.wait_for(lock, time, [this] {
+        return listOf(State::loggingIn).empty() && listOf(State::sending).empty() && listOf(State::answering).empty();
+    });
+}
+
+Connections::Counts Connections::counts() {
+    const std::lock_guard lock(_mutex);
+    Counts counts;
+    std::transform(_lists.begin(), _lists.end(), counts.of.begin(), [](const List& list) { return list.size(); });
+    counts.refused = _refused;
+    return counts;
 }
 
 void Connections::move(Connection& connection, State state) {
@@ -100,17 +98,15 @@ void Connections::move(Connection& connection, State state) {
     List& target = listOf(state);
     target.splice(target.end(), listOf(connection.state), connection.self);
     connection.state = state;
-    connection.since = Clock::now();
     if (state == State::leaving) {
         --_count;
-        const auto ofAddress = _countOfAddress.find(connection.address);
-        if (--ofAddress->second == 0) {
-            _countOfAddress.erase(ofAddress);
+        ++_leavingOfNetwork[connection.network];
+        const auto ofNetwork = _countOfNetwork.find(connection.network);
+        if (--ofNetwork->second == 0) {
+            _countOfNetwork.erase(ofNetwork);
         }
     }
-    if (listOf(State::answering).empty()) {
-        _changed.notify_all();
-    }
+    _changed.notify_all();
 }
 
 void Connections::end(Connection& connection) {
@@ -119,22 +115,40 @@ void Connections::end(Connection& connection) {
     move(connection, State::leaving);
 }
 
-bool Connections::endOldestIdle(const std::string& address) {
-    List& idle = listOf(State::idle);
-    const auto oldest = std::find_if(idle.begin(), idle.end(), [&](const Connection& connection) {
-        return address.empty() || connection.address == address;
-    });
-    if (oldest == idle.end()) {
-        return false;
+void Connections::endList(State state) {
+    List& list = listOf(state);
+    while (!list.empty()) {
+        end(list.front());
     }
-    end(*oldest);
-    return true;
+}
+
+bool Connections::makeRoom(const std::string& network) {
+    for (const bool served : {false, true}) {
+        for (const State state : {State::idle, State::receiving, State::loggingIn, State::sending}) {
+            List& list = listOf(state);
+            const auto oldest = std::find_if(list.begin(), list.end(), [&](const Connection& connection) {
+                return connection.served == served && (network.empty() || connection.network == network);
+            });
+            if (oldest != list.end()) {
+                end(*oldest);
+                return true;
+            }
+        }
+    }
+    return false;
+}
+
+const std::string& Connections::largestNetwork() const {
+    return std::max_element(_countOfNetwork.begin(), _countOfNetwork.end(),
+                            [](const auto& left, const auto& right) { return left.second < right.second; })
+        ->first;
 }
 
 void Connections::reportCrowd(const std::string& line) {
-    if (const auto now = Clock::now(); now - _lastCrowdReport >= std::chrono::minutes{1}) {
+    if (const auto now = Clock::now();
+        _lastCrowdReport == Clock::time_point{} || now - _lastCrowdReport >= std::chrono::minutes{1}) {
         _lastCrowdReport = now;
-        _log(line);
+        _events.report(line);
     }
 }
 

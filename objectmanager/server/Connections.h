@@ -1,13 +1,14 @@
-/** The clients' connections: how many there may be, and how long each may keep the server waiting. */
+/** The clients' connections: how many there may be, and which of them makes room for another. */
 #ifndef SERVER_CONNECTIONS_H
 #define SERVER_CONNECTIONS_H
 
+#include "server/EventLog.h"
 #include "server/Settings.h"
 
 #include <array>
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
-#include <functional>
 #include <list>
 #include <map>
 #include <mutex>
@@ -15,12 +16,11 @@
 
 namespace ObjectManager::Server {
 
-/** Takes one line for the person who runs the server. Called by several threads at once; must not throw. */
-using Log = std::function<void(const std::string& line)>;
-
 /**
- * All open connections. Where there are too many, the one that has been idle for longest is closed for a new one; where
- * none is idle, the new one is told so by whoever serves it. Used by several threads at once.
+ * All open connections. Where there are too many, the oldest that waits for its client is shut down for a new one: of
+ * the new one's network where that has too many, otherwise of the network that has most. Those of clients that were
+ * never served go first. Where all wait for the server, the new one is told so by whoever serves it. Used by several
+ * threads at once.
  */
 class Connections {
 public:
@@ -31,46 +31,56 @@ public:
         idle,
         /** A request has begun and is not yet here. */
         receiving,
-        /** The server has the request, and the answer is not sent. */
+        /** The client waits because of its log-in: for its turn, or because it failed. */
+        loggingIn,
+        /** The client takes its answer. */
+        sending,
+        /** The server has the request, and makes the answer. */
         answering,
         /** Shut down by the server, and about to be closed. */
         leaving,
     };
+    static constexpr std::size_t states = 6;
 
     struct Connection {
         int socket;
         /** The client's, for people. */
         std::string address;
+        std::string network;
         /** There was no room for it. */
         bool surplus = false;
-        /** The first line of a request has come. */
-        bool asked = false;
+        /** The client has got what it asked for once. */
+        std::atomic<bool> served = false;
         State state = State::idle;
-        Clock::time_point since;
         /** Where it is in the list of its state. */
-        std::list<Connection>::iterator self;
+        std::list<Connection>::iterator self{};
     };
 
-    /** @param encrypted whether nothing but TLS can be written to the connections. */
-    Connections(const Limits& limits, bool encrypted, Log log);
+    /** How many are in each state, and how many were refused since the start. */
+    struct Counts {
+        std::array<std::size_t, states> of{};
+        std::size_t refused = 0;
+    };
 
-    /** @param socket stays open until `closed`. */
-    Connection& opened(int socket, const std::string& address);
-    void closed(Connection& connection);
-
-    /** Unless it was shut down, which cannot be undone. @return the state before. */
-    State enter(Connection& connection, State state);
-    /** @return false where it already was. */
-    bool shutDown(Connection& connection);
+    Connections(const Limits& limits, EventLog& events) : _limits(limits), _events(events) {}
 
     /**
-     * Shuts down the connections whose time is over: those that were idle for too long, and those whose request should
-     * be here by now.
+     * @param socket stays open until `closed`.
+     * @return null where there is not even room for telling the client so.
      */
-    void endOverdue();
+    Connection* opened(int socket, const std::string& address, const std::string& network);
+    void closed(Connection& connection);
 
-    /** Waits until no connection is being answered. @return false where the time was over before. */
+    /** @return false where it was shut down, which cannot be undone. */
+    bool enter(Connection& connection, State state);
+
+    /** Shuts down those that are in none of the states in which the client will get an answer. */
+    void endIdle();
+    void endAll();
+    /** Waits until no client waits for an answer. @return false where the time was over before. */
     bool waitForAnswers(std::chrono::milliseconds time);
+
+    Counts counts();
 
 private:
     using List = std::list<Connection>;
@@ -78,22 +88,25 @@ private:
     List& listOf(State state) { return _lists[static_cast<std::size_t>(state)]; }
     void move(Connection& connection, State state);
     void end(Connection& connection);
-    /** Of an address; of any where it is empty. @return false where none is. */
-    bool endOldestIdle(const std::string& address);
+    void endList(State state);
+    /** Shuts one down that waits for its client. @param network whose; anybody's where it is empty. */
+    bool makeRoom(const std::string& network);
+    const std::string& largestNetwork() const;
     /** Says it at most once a minute, since it is said of clients who may be many. */
     void reportCrowd(const std::string& line);
 
     const Limits _limits;
-    const bool _encrypted;
-    const Log _log;
+    EventLog& _events;
     std::mutex _mutex;
     std::condition_variable _changed;
     /** One for each state, in the order in which the connections entered it. */
-    std::array<List, 4> _lists;
+    std::array<List, states> _lists;
     /* Without those that leave. */
     unsigned int _count = 0;
-    std::map<std::string, unsigned int> _countOfAddress;
-    Clock::time_point _lastCrowdReport;
+    std::map<std::string, unsigned int> _countOfNetwork;
+    std::map<std::string, unsigned int> _leavingOfNetwork;
+    std::size_t _refused = 0;
+    Clock::time_point _lastCrowdReport{};
 };
 
 } // namespace ObjectManager::Server

@@ -5,6 +5,7 @@
 #include <strings.h>
 
 #include <algorithm>
+#include <functional>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -40,6 +41,8 @@ struct HttpReply {
     std::string body;
     /** Why the request was refused, in a line for the server's log; empty where it was not. */
     std::string problem{};
+    /** The log has to have the line, however many others there are. */
+    bool alwaysLogged = false;
 };
 
 /** Who asks, and what he may do. */
@@ -48,6 +51,9 @@ struct Caller {
     bool mayRead;
     bool mayChangePower;
 };
+
+/** Answers a request. Called by several threads at once; must not throw. */
+using Handler = std::function<HttpReply(const HttpRequest&, const Caller&)>;
 
 } // namespace ObjectManager::Server
 

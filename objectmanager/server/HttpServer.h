@@ -2,32 +2,23 @@
 #ifndef SERVER_HTTPSERVER_H
 #define SERVER_HTTPSERVER_H
 
-#include "server/Connections.h"
+#include "server/EventLog.h"
 #include "server/HttpMessage.h"
 #include "server/LogIns.h"
+#include "server/ServerError.h"
 #include "server/Settings.h"
 
 #include <cstdint>
-#include <functional>
 #include <memory>
-#include <stdexcept>
+#include <string>
 
 namespace ObjectManager::Server {
-
-/** Called by several threads at once; must not throw. */
-using Handler = std::function<HttpReply(const HttpRequest&, const Caller&)>;
-
-/** A server that cannot be started. what() is one line. */
-class ServerError : public std::runtime_error {
-public:
-    using std::runtime_error::runtime_error;
-};
 
 /**
  * Serves from when it is made until it ends.
  *
- * Clients are served by threads of its own: two wait for them, some run the handler, some ask the authenticator. What a
- * client does wrong, and what it is refused, is logged in one line.
+ * One thread accepts connections, and each connection has a thread of its own. What a client does wrong, and what it is
+ * refused, is logged in one line.
  */
 class HttpServer {
 public:
@@ -39,10 +30,26 @@ public:
     HttpServer(const Settings& settings, Handler handler, Authenticator* authenticator, Log log);
     HttpServer(const HttpServer&) = delete;
     HttpServer& operator=(const HttpServer&) = delete;
-    /** Accepts no more connections, sends the answers that are under way, and ends. */
+    /** Stops it, and waits for every handler that still runs, however long that takes. */
     ~HttpServer();
 
     std::uint16_t port() const;
+
+    /**
+     * Accepts no more connections, sends the answers that are under way, and closes the others, within the settings'
+     * stopTime and a second.
+     * @return false where a handler, or the authenticator, still runs then.
+     */
+    bool stop();
+
+    /**
+     * Reads the certificate and its key again. New connections get them; where they are wrong, the old ones stay, and
+     * the log says so.
+     */
+    void renewKeys();
+
+    /** In one line, what it does and has done. */
+    std::string health() const;
 
 private:
     class Implementation;

@@ -1,6 +1,6 @@
 #include "server/ListenSocket.h"
 
-#include "server/HttpServer.h"
+#include "server/ServerError.h"
 
 #include <arpa/inet.h>
 #include <fmt/format.h>
@@ -8,9 +8,11 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstring>
+#include <iterator>
 #include <memory>
 #include <string>
 #include <system_error>
@@ -66,6 +68,17 @@ std::string textOf(const sockaddr& address) {
     return inet_ntop(family, bytes, text.data(), text.size()) == nullptr ? "unknown address" : text.data();
 }
 
+std::string networkOf(const sockaddr& address) {
+    const std::string text = textOf(address);
+    if (text.find(':') == std::string::npos) {
+        return text.starts_with("127.") ? "127.0.0.0/8" : text;
+    }
+    sockaddr_in6 network = asIpv6(address);
+    constexpr std::size_t networkBytes = 8;
+    std::fill(std::begin(network.sin6_addr.s6_addr) + networkBytes, std::end(network.sin6_addr.s6_addr), 0);
+    return textOf(reinterpret_cast<const sockaddr&>(network)) + "/64";
+}
+
 std::string hostAndPort(const std::string& address, std::uint16_t port) {
     return address.find(':') == std::string::npos ? fmt::format("{}:{}", address, port)
                                                   : fmt::format("[{}]:{}", address, port);
@@ -73,7 +86,7 @@ std::string hostAndPort(const std::string& address, std::uint16_t port) {
 
 int listenOn(const std::string& address, std::uint16_t port) {
     const Address where(address, port);
-    const int listener = socket(where.get()->sa_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    const int listener = socket(where.get()->sa_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     constexpr int yes = 1;
     if (listener >= 0 && setsockopt(listener, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes) == 0 &&
         bind(listener, where.get(), where.size()) == 0 && listen(listener, SOMAXCONN) == 0) {

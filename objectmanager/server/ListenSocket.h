@@ -29,6 +29,12 @@ private:
 /** The address of a client, as people write it. */
 std::string textOf(const sockaddr& address);
 
+/**
+ * What counts as one client: the address, and where one client can easily have many, their network, which is
+ * 127.0.0.0/8 and of IPv6 addresses the first 64 bits.
+ */
+std::string networkOf(const sockaddr& address);
+
 /** Whose address, with its port, stands in a URL. */
 std::string hostAndPort(const std::string& address, std::uint16_t port);
 

@@ -3,12 +3,18 @@
 #include <gnutls/crypto.h>
 #include <gnutls/gnutls.h>
 
+#include <algorithm>
 #include <memory>
 #include <stdexcept>
 
 namespace ObjectManager::Server {
 
 namespace {
+
+/** Log-ins that are checked at a time, those of one network among them, and those of one network that may wait. */
+constexpr unsigned int checkedAtATime = 4;
+constexpr unsigned int checkedOfNetwork = 2;
+constexpr unsigned int waitingOfNetwork = 32;
 
 void require(int status, const char* what) {
     if (status != GNUTLS_E_SUCCESS) {
@@ -48,33 +54,77 @@ RecentLogIns::RecentLogIns() {
     require(gnutls_rnd(GNUTLS_RND_KEY, _secret.data(), _secret.size()), "random key");
 }
 
-std::optional<Caller> RecentLogIns::find(const std::string& user, const std::string& password, Clock::time_point now) {
-    const Digest digest = digestOf(user, password);
+std::optional<Caller> RecentLogIns::find(const Credentials& given, Clock::time_point now) {
+    const Digest digest = digestOf(given);
     const std::lock_guard lock(_mutex);
     const auto found = _entries.find(digest);
-    return found == _entries.end() || found->second.until <= now ? std::nullopt : std::optional(found->second.caller);
+    if (found == _entries.end()) {
+        return std::nullopt;
+    }
+    Entry& entry = found->second;
+    if (entry.used + lifetime <= now || entry.checked + longestLifetime <= now) {
+        return std::nullopt;
+    }
+    entry.used = now;
+    return entry.caller;
 }
 
-void RecentLogIns::remember(const std::string& user, const std::string& password, const Caller& caller,
-                            Clock::time_point now) {
-    const Digest digest = digestOf(user, password);
+bool RecentLogIns::isKnown(const Credentials& given, Clock::time_point now) {
+    const Digest digest = digestOf(given);
     const std::lock_guard lock(_mutex);
-    if (_entries.size() >= capacity) {
-        std::erase_if(_entries, [now](const auto& entry) { return entry.second.until <= now; });
-    }
-    if (_entries.size() < capacity) {
-        _entries.insert_or_assign(digest, Entry{caller, now + lifetime});
-    }
+    const auto found = _entries.find(digest);
+    return found != _entries.end() && now < found->second.checked + memory;
 }
 
-RecentLogIns::Digest RecentLogIns::digestOf(const std::string& user, const std::string& password) const {
+void RecentLogIns::remember(const Credentials& given, const Caller& caller, Clock::time_point now) {
+    const Digest digest = digestOf(given);
+    const std::lock_guard lock(_mutex);
+    if (_entries.size() >= capacity && _entries.count(digest) == 0) {
+        _entries.erase(std::min_element(_entries.begin(), _entries.end(), [](const auto& left, const auto& right) {
+            return left.second.used < right.second.used;
+        }));
+    }
+    _entries.insert_or_assign(digest, Entry{caller, now, now});
+}
+
+void RecentLogIns::forget(const Credentials& given) {
+    const Digest digest = digestOf(given);
+    const std::lock_guard lock(_mutex);
+    _entries.erase(digest);
+}
+
+RecentLogIns::Digest RecentLogIns::digestOf(const Credentials& given) const {
     // A user's name has no colon here, as it has none in HTTP.
-    const std::string text = user + ':' + password;
+    const std::string text = given.user + ':' + given.password;
     Digest digest{};
     require(
         gnutls_hmac_fast(GNUTLS_MAC_SHA256, _secret.data(), _secret.size(), text.data(), text.size(), digest.data()),
         "digest");
     return digest;
+}
+
+LogIns::LogIns(Authenticator& authenticator, std::chrono::milliseconds delay)
+    : _authenticator(authenticator), _delay(delay), _turns(checkedAtATime, checkedOfNetwork, waitingOfNetwork) {}
+
+LogIns::Decision LogIns::check(const Credentials& given, const Client& client, Clock::time_point until) {
+    const auto begin = Clock::now();
+    LogIn result;
+    {
+        const Turns::Turn turn = _turns.take(client.network, _recent.isKnown(given), until, client.isGone);
+        if (!turn) {
+            return {Verdict::busy};
+        }
+        result = _authenticator.logIn(given.user, given.password, client.address);
+    }
+    if (result.caller) {
+        ++_good;
+        _recent.remember(given, *result.caller);
+        return {Verdict::in, std::move(result.caller)};
+    }
+    ++_wrong;
+    _recent.forget(given);
+    const auto delays = 1 + (Clock::now() - begin) / _delay;
+    return {Verdict::wrong, std::nullopt, std::move(result.problem), begin + delays * _delay};
 }
 
 } // namespace ObjectManager::Server

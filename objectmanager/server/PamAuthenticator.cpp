@@ -12,6 +12,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <memory>
 #include <optional>
 #include <utility>
@@ -48,7 +49,7 @@ int converse(int count, const pam_message** messages, pam_response** responses, 
     return PAM_SUCCESS;
 }
 
-/** PAM would sleep here after a failure. The server does, without a thread. */
+/** PAM would sleep here after a failure. The server does, when others can have the turn. */
 void doNotSleep(int /*result*/, unsigned int /*microseconds*/, void* /*data*/) {}
 
 /** A conversation with PAM. Every call but the constructor's gives PAM's code. */
@@ -90,7 +91,7 @@ public:
     }
 
 private:
-    template <class Call>
+    template <typename Call>
     void call(Call what) {
         if (_result == PAM_SUCCESS) {
             _result = what();
@@ -103,7 +104,7 @@ private:
 };
 
 /** Calls one of the functions that need room for what they find, with more and more of it. */
-template <class Entry, class Call>
+template <typename Entry, typename Call>
 bool look(Entry& entry, std::vector<char>& room, Call call) {
     constexpr std::size_t firstSize = 1024;
     constexpr std::size_t maximumSize = std::size_t{16} * 1024 * 1024;
@@ -127,9 +128,22 @@ std::optional<gid_t> idOfGroup(const std::string& name) {
     return found ? std::optional(entry.gr_gid) : std::nullopt;
 }
 
+/** Whether shells(5) has the shell, which those of accounts that are no person's are not in. */
+bool isLogInShell(const std::string& shell) {
+    std::ifstream shells("/etc/shells");
+    std::string line;
+    while (std::getline(shells, line)) {
+        if (!shell.empty() && line == shell) {
+            return true;
+        }
+    }
+    return false;
+}
+
 /** What the system knows of a user; nobody is in no group. */
 struct User {
     bool root = false;
+    bool hasShell = false;
     std::vector<gid_t> groups;
 
     bool isIn(const std::string& group) const {
@@ -147,6 +161,7 @@ User userNamed(const std::string& name) {
     });
     if (found) {
         user.root = entry.pw_uid == 0;
+        user.hasShell = isLogInShell(entry.pw_shell);
         int count = 0;
         getgrouplist(name.c_str(), entry.pw_gid, nullptr, &count);
         user.groups.resize(static_cast<std::size_t>(count));
@@ -165,6 +180,12 @@ LogIn PamAuthenticator::logIn(const std::string& user, const std::string& passwo
     }
     const std::string name = conversation.user();
     const User known = userNamed(name);
+    if (known.root && !_settings.allowRoot) {
+        return {std::nullopt, "root may not log in (see --allow-root)"};
+    }
+    if (!known.root && !known.hasShell && !_settings.allowWithoutShell) {
+        return {std::nullopt, "the user has no log-in shell (see --allow-without-shell)"};
+    }
     const bool mayChangePower = known.root || known.isIn(_settings.powerGroup);
     const bool mayRead = mayChangePower || _settings.readGroup.empty() || known.isIn(_settings.readGroup);
     return {Caller{name, mayRead, mayChangePower}, ""};

@@ -17,7 +17,9 @@ struct Limits {
     /** Size of a request's body, and of its first line with its headers. */
     std::size_t bodyBytes = std::size_t{1024} * 1024;
     std::size_t headerBytes = std::size_t{16} * 1024;
-    /** Connections at a time, altogether and from one address. */
+    /** Memory of all bodies beyond the first 16 KiB of each. */
+    std::size_t allBodiesBytes = std::size_t{64} * 1024 * 1024;
+    /** Connections at a time, altogether and from one network (see networkOf). */
     unsigned int connections = 1000;
     unsigned int connectionsPerAddress = 500;
     /** In which a request has to arrive as a whole. */
@@ -41,13 +43,15 @@ struct Settings {
     std::optional<Tls> tls;
     /** Requests that are served at a time. */
     unsigned int threads = 8;
-    /** Values of the header CIMMethod of requests whose answers wait for nothing but the processor. */
-    std::vector<std::string> promptMethods;
+    /** Names in the header Host that clients may use beside addresses, the machine's name and its certificate's. */
+    std::vector<std::string> hosts;
+    /** Logs each request. */
+    bool accessLog = false;
     Limits limits;
     /** After which a failed log-in is answered. */
     std::chrono::milliseconds failedLogInDelay = std::chrono::seconds{2};
     /** How long a stopping server waits for the answers under way. */
-    std::chrono::milliseconds stopTime = std::chrono::seconds{10};
+    std::chrono::milliseconds stopTime = std::chrono::seconds{8};
 };
 
 /** How PAM is asked who a client is, and what his groups let him do. */
@@ -58,8 +62,12 @@ struct PamSettings {
     std::filesystem::path folder;
     /** Whose members may read; empty for every user who can log in. */
     std::string readGroup;
-    /** Whose members may read and change the power state. Root may as well. */
+    /** Whose members may read and change the power state. Root may as well, if root may log in. */
     std::string powerGroup = "orv-power";
+    /** Root may log in. */
+    bool allowRoot = false;
+    /** Users may log in who have no log-in shell (see shells(5)) or are not known to the system. */
+    bool allowWithoutShell = false;
 };
 
 } // namespace ObjectManager::Server

@@ -44,7 +44,7 @@ TEST_F(HttpServerTest, sendsWhatTheHandlerGives) {
     EXPECT_EQ(reply.body, "no");
     EXPECT_EQ(reply.headers.at("cimerror"), "unsupported-operation");
     EXPECT_EQ(reply.headers.at("ext"), "");
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 501: not supported"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 501: not supported"));
 }
 
 TEST_F(HttpServerTest, keepsAConnectionForTheNextRequest) {
@@ -129,7 +129,7 @@ TEST_F(SizeTest, refusesABodyThatIsLarger) {
     EXPECT_EQ(reply.status, 413);
     EXPECT_EQ(reply.body, "the body has 1001 bytes, expected 1000 at most\n");
     EXPECT_EQ(reply.headers.at("connection"), "close");
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 413: the body has 1001 bytes, expected 1000 at most"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 413: the body has 1001 bytes, expected 1000 at most"));
 }
 
 TEST_F(SizeTest, refusesAHugeBodyBeforeItComes) {
@@ -165,7 +165,7 @@ TEST_F(SizeTest, takesHeadersOfTheLargestSizeAndRefusesLarger) {
     };
     EXPECT_EQ(statusOf(2000), 200);
     EXPECT_EQ(statusOf(2001), 431);
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 431: the headers have 2001 bytes, expected 2000 at most"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 431: the headers have 2001 bytes, expected 2000 at most"));
     EXPECT_EQ(statusOf(200'000), 431);
     EXPECT_EQ(logged(2).back(), "127.0.0.1: answered 431: Request Header Fields Too Large");
 }
@@ -176,15 +176,15 @@ TEST_F(HttpServerTest, refusesARequestThatDoesNotArriveInTime) {
     _settings.limits.requestTime = 500ms;
     serve();
     for (const char* begun :
-         {"POST / HTTP/1.1\r\nHost:", "POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 5\r\n\r\nhal"}) {
+         {"POST / HTTP/1.1\r\nHost:", "POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 5\r\n\r\nhal"}) {
         HttpClient slow = client();
         slow.send(begun);
         EXPECT_EQ(ask(post("quick")).body, "quick");
         EXPECT_EQ(slow.receive().status, 408) << begun;
         EXPECT_EQ(slow.receiveAll(), "");
     }
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.1: answered 408: the request did not arrive within 0.5 s",
-                                      "127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 408: the request did not arrive within 0.5 s",
+                                       "127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
 }
 
 TEST_F(HttpServerTest, doesNotCountTheTimeOfTheAnswerAsTheRequests) {
@@ -261,17 +261,18 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidRequest) {
 }
 
 TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
-    const std::string host = "POST / HTTP/1.1\r\nHost: x\r\n";
+    const std::string host = "POST / HTTP/1.1\r\nHost: localhost\r\n";
     const std::string several = "400: found several lengths of the body, expected one";
     const std::pair<std::string, std::string> requests[] = {
-        {host + "Content-Length: much\r\n\r\n", "400: Bad Request"},
+        {host + "Content-Length: much\r\n\r\n", "400: found the Content-Length \"much\", expected a number"},
         {host + "Content-Length: 99999999999999999999999\r\n\r\n", "413: Content Too Large"},
-        {host + "Transfer-Encoding: chunked\r\n\r\nno size\r\n", "400: Bad Request"},
+        {host + "Transfer-Encoding: chunked\r\n\r\nno size\r\n",
+         "400: found the size \"no size\" of a chunk, expected hexadecimal digits"},
         {host + "Content-Length: 1\r\nContent-Length: 2\r\n\r\nx", several},
         {host + "Content-Length: 5\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n", several},
         {host + "Transfer-Encoding: gzip\r\n\r\n", "501: found the Transfer-Encoding \"gzip\", expected chunked"},
-        {"POST / HTTP/7.0\r\nHost: x\r\n\r\n", "505: HTTP Version Not Supported"},
-        {"POST /" + std::string(50'000, 'a') + " HTTP/1.1\r\nHost: x\r\n\r\n", "414: URI Too Long"},
+        {"POST / HTTP/7.0\r\nHost: localhost\r\n\r\n", "505: HTTP Version Not Supported"},
+        {"POST /" + std::string(50'000, 'a') + " HTTP/1.1\r\nHost: localhost\r\n\r\n", "414: URI Too Long"},
         {host + "X: " + std::string(100'000, 'x') + "\r\n\r\n", "431: Request Header Fields Too Large"},
     };
     serve();
@@ -287,7 +288,7 @@ TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
         HttpClient asking = client();
         asking.send(text);
         EXPECT_EQ(asking.receiveAll(), "");
-        EXPECT_EQ(logged(++lines).back(), "127.0.0.1: closed: what it sent is no request of HTTP");
+        EXPECT_EQ(logged(++lines).back(), "127.0.0.1: closed: not an HTTP request");
     }
     client();
     EXPECT_EQ(ask(post("right")).body, "right");
@@ -296,7 +297,8 @@ TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
 
 TEST_F(HttpServerTest, takesALengthThatIsToldTwice) {
     serve();
-    EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: x\r\nContent-Length: 4\r\nContent-Length: 4\r\n\r\ntwin").body, "twin");
+    EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 4\r\nContent-Length: 4\r\n\r\ntwin").body,
+              "twin");
 }
 
 TEST_F(HttpServerTest, closesTheOldestIdleConnectionForANewOne) {
@@ -331,9 +333,7 @@ TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
     for (int i = 1; i <= 3; ++i) {
         clients.push_back(client());
         clients.back().send(post("x"));
-        while (entered < i) {
-            std::this_thread::sleep_for(1ms);
-        }
+        waitUntil([&] { return entered == i; });
     }
     const Reply refused = ask(post("x"));
     EXPECT_EQ(refused.status, 503);
@@ -343,23 +343,27 @@ TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
         EXPECT_EQ(each.receive().status, 200);
     }
     // An answer can be here before the server has noted that it is sent.
+    const auto end = std::chrono::steady_clock::now() + 30s;
     while (ask(post("later")).status == 503) {
+        ASSERT_LT(std::chrono::steady_clock::now(), end);
     }
 }
 
 TEST_F(HttpServerTest, boundsTheConnectionsOfOneClient) {
     _settings.limits.connectionsPerAddress = 2;
+    _settings.address = "::";
     serve();
-    HttpClient other(_server->port(), "127.0.0.1", "127.0.0.3");
+    HttpClient other(_server->port(), "::1");
     HttpClient first(_server->port(), "127.0.0.1", "127.0.0.2");
-    HttpClient second(_server->port(), "127.0.0.1", "127.0.0.2");
-    HttpClient third(_server->port(), "127.0.0.1", "127.0.0.2");
+    HttpClient second(_server->port(), "127.0.0.1", "127.0.0.3");
+    HttpClient third(_server->port(), "127.0.0.1", "127.1.2.3");
     EXPECT_EQ(first.receiveAll(), "");
     for (HttpClient* each : {&other, &second, &third}) {
         each->send(post("x"));
         EXPECT_EQ(each->receive().status, 200);
     }
-    EXPECT_THAT(logged(), ElementsAre("127.0.0.2: more than 2 connections: idle ones are closed, others are refused"));
+    EXPECT_THAT(logged(),
+                ElementsAre("127.0.0.0/8: more than 2 connections: idle ones are closed, others are refused"));
 }
 
 TEST_F(HttpServerTest, isAsQuickBesideThousandsOfIdleConnections) {
@@ -389,9 +393,9 @@ TEST_F(HttpServerTest, listensOnIpv6) {
     HttpClient asking(_server->port(), "::1");
     asking.send(post("six"));
     EXPECT_EQ(asking.receive().body, "six");
-    asking.send("POST / HTTP/1.1\r\nContent-Length: x\r\n\r\n");
+    asking.send("POST / HTTP/1.1\r\nHost: [::1]:5988\r\nContent-Length: x\r\n\r\n");
     asking.receiveAll();
-    EXPECT_THAT(logged(1), ElementsAre("::1: answered 400: Bad Request"));
+    EXPECT_THAT(logged(1), ElementsAre("::1: answered 400: found the Content-Length \"x\", expected a number"));
 }
 
 std::string problemOf(const Server::Settings& settings) {
@@ -438,9 +442,7 @@ TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
         }
         return false;
     };
-    while (!refusesConnections()) {
-        std::this_thread::sleep_for(1ms);
-    }
+    waitUntil(refusesConnections);
     gate.open();
     EXPECT_EQ(asking.receive().body, "before the end");
     EXPECT_EQ(asking.receiveAll(), "");

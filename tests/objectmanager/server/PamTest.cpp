@@ -27,6 +27,8 @@ protected:
                                                 "elsewhere:secret:sshd\n");
         service("");
         _settings.folder = _folder / "";
+        _settings.allowRoot = true;
+        _settings.allowWithoutShell = true;
     }
 
     /** Writes the service file. @param first a line before the others. */
@@ -123,6 +125,22 @@ TEST_F(PamTest, takesRolesFromGroups) {
         EXPECT_EQ(result.caller->mayChangePower, each.mayChangePower)
             << each.user << ' ' << each.readGroup << ' ' << each.powerGroup;
     }
+}
+
+TEST_F(PamTest, letsRootInOnlyWhereItIsToldTo) {
+    EXPECT_TRUE(logIn("root", "top").caller);
+    _settings.allowRoot = false;
+    EXPECT_EQ(logIn("root", "top").problem, "root may not log in (see --allow-root)");
+    EXPECT_EQ(logIn("root", "wrong").problem, "Authentication failure");
+}
+
+TEST_F(PamTest, letsUsersWithoutALogInShellInOnlyWhereItIsToldTo) {
+    _settings.allowWithoutShell = false;
+    // One whose shell lets nobody in, and one who has none, since the system does not know him.
+    for (const auto& [user, password] : {std::pair("nobody", "small"), std::pair("visitor", "hello")}) {
+        EXPECT_EQ(logIn(user, password).problem, "the user has no log-in shell (see --allow-without-shell)") << user;
+    }
+    EXPECT_TRUE(logIn("root", "top").caller);
 }
 
 TEST(GroupTest, existsOrNot) {

@@ -22,6 +22,16 @@ namespace ServerTest {
 using namespace ObjectManager;
 using namespace std::chrono_literals;
 
+/** Waits until it is so; where it does not come to be so, the test fails. */
+template <typename Condition>
+void waitUntil(Condition isSo) {
+    const auto end = std::chrono::steady_clock::now() + 60s;
+    while (!isSo()) {
+        ASSERT_LT(std::chrono::steady_clock::now(), end);
+        std::this_thread::sleep_for(1ms);
+    }
+}
+
 class Served : public testing::Test {
 protected:
     /** What the server answers where a test serves nothing else: the request's body. */
@@ -52,10 +62,7 @@ protected:
 
     /** Waits until so many lines are logged. */
     std::vector<std::string> logged(std::size_t lines) {
-        const auto end = std::chrono::steady_clock::now() + 30s;
-        while (logged().size() < lines && std::chrono::steady_clock::now() < end) {
-            std::this_thread::sleep_for(1ms);
-        }
+        waitUntil([&] { return logged().size() >= lines; });
         return logged();
     }
 

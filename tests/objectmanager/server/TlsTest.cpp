@@ -62,7 +62,7 @@ TEST_F(TlsTest, survivesClientsThatSpeakNoTls) {
     HttpClient plain = client();
     plain.send(post("in the clear"));
     EXPECT_THAT(plain.receiveAll(), testing::Not(HasSubstr("HTTP")));
-    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: closed: what it sent is no request of HTTP"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: closed: no TLS handshake"));
     EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
 }
 
@@ -77,7 +77,7 @@ TEST_F(TlsTest, closesAConnectionWhoseRequestDoesNotArriveInTime) {
     _settings.limits.requestTime = 500ms;
     serve();
     curl(trusted() + " --data x --header 'Content-Length: 50'");
-    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: closed: the request did not arrive within 0.5 s"));
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
 }
 
 TEST_F(TlsTest, doesNotStartWithoutAFile) {

@@ -1,0 +1,113 @@
+#include "orvcim/ServeLog.h"
+
+#include <fmt/format.h>
+
+#include <poll.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <string_view>
+#include <utility>
+
+namespace ObjectManager::Orvcim {
+
+namespace {
+
+constexpr std::chrono::seconds lastTime{1};
+
+/** How often it is looked whether the program ends while nobody reads standard error. */
+constexpr int lookInterval = 100;
+
+} // namespace
+
+ServeLog::ServeLog(bool syslog) : _queue(std::make_shared<Queue>(syslog)) {
+    if (syslog) {
+        openlog("orvcim", LOG_PID, LOG_DAEMON);
+    }
+    _thread = std::thread([queue = _queue] { queue->run(); });
+}
+
+ServeLog::~ServeLog() {
+    flush(lastTime);
+    std::unique_lock lock(_queue->mutex);
+    _queue->ending = true;
+    _queue->changed.notify_all();
+    const bool ended = _queue->changed.wait_for(lock, lastTime, [this] { return _queue->ended; });
+    lock.unlock();
+    if (ended) {
+        _thread.join();
+    } else {
+        // It waits for the system's log.
+        _thread.detach();
+    }
+}
+
+void ServeLog::write(const std::string& line) {
+    {
+        const std::lock_guard lock(_queue->mutex);
+        if (_queue->lines.size() >= room) {
+            ++_queue->leftOut;
+            return;
+        }
+        _queue->lines.push_back(line);
+    }
+    _queue->changed.notify_all();
+}
+
+bool ServeLog::flush(std::chrono::milliseconds time) {
+    std::unique_lock lock(_queue->mutex);
+    return _queue->changed.wait_for(lock, time, [this] { return _queue->lines.empty() && !_queue->writing; });
+}
+
+void ServeLog::Queue::run() {
+    std::unique_lock lock(mutex);
+    while (true) {
+        changed.wait(lock, [this] { return ending || !lines.empty(); });
+        if (ending) {
+            break;
+        }
+        std::string line = std::move(lines.front());
+        lines.pop_front();
+        if (lines.empty() && leftOut > 0) {
+            lines.push_back(fmt::format("{} more lines are left out: whoever reads the log is too slow",
+                                        std::exchange(leftOut, 0)));
+        }
+        writing = true;
+        lock.unlock();
+        put(line);
+        lock.lock();
+        writing = false;
+        changed.notify_all();
+    }
+    ended = true;
+    changed.notify_all();
+}
+
+void ServeLog::Queue::put(const std::string& line) {
+    if (syslog) {
+        ::syslog(LOG_WARNING, "%s", line.c_str());
+        return;
+    }
+    // A pipe that is ready takes this much at once, since lines are short.
+    const std::string text = "orvcim: " + line + '\n';
+    std::string_view rest = text;
+    while (!rest.empty() && !isEnding()) {
+        pollfd target{STDERR_FILENO, POLLOUT, 0};
+        if (poll(&target, 1, lookInterval) <= 0) {
+            continue;
+        }
+        const ssize_t written = ::write(STDERR_FILENO, rest.data(), rest.size());
+        if (written < 0 && errno != EINTR && errno != EAGAIN) {
+            return; // nobody reads it any more
+        }
+        rest.remove_prefix(written > 0 ? static_cast<std::size_t>(written) : 0);
+    }
+}
+
+bool ServeLog::Queue::isEnding() {
+    const std::lock_guard lock(mutex);
+    return ending;
+}
+
+} // namespace ObjectManager::Orvcim

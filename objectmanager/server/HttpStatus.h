@@ -1,0 +1,51 @@
+/** The statuses of HTTP that the server answers with by itself (RFC 9110, section 15). */
+#ifndef SERVER_HTTPSTATUS_H
+#define SERVER_HTTPSTATUS_H
+
+#include <algorithm>
+#include <array>
+#include <string_view>
+#include <utility>
+
+namespace ObjectManager::Server::Status {
+
+constexpr unsigned int badRequest = 400;
+constexpr unsigned int unauthorized = 401;
+constexpr unsigned int forbidden = 403;
+constexpr unsigned int requestTimeout = 408;
+constexpr unsigned int contentTooLarge = 413;
+constexpr unsigned int uriTooLong = 414;
+constexpr unsigned int headersTooLarge = 431;
+constexpr unsigned int notImplemented = 501;
+constexpr unsigned int serviceUnavailable = 503;
+constexpr unsigned int versionNotSupported = 505;
+
+/** What people call a status; "Other" where HTTP has no name for it. */
+constexpr std::string_view reasonOf(unsigned int status) {
+    constexpr std::array<std::pair<unsigned int, std::string_view>, 17> reasons = {{
+        {200, "OK"},
+        {badRequest, "Bad Request"},
+        {unauthorized, "Unauthorized"},
+        {forbidden, "Forbidden"},
+        {404, "Not Found"},
+        {405, "Method Not Allowed"},
+        {406, "Not Acceptable"},
+        {requestTimeout, "Request Timeout"},
+        {contentTooLarge, "Content Too Large"},
+        {uriTooLong, "URI Too Long"},
+        {415, "Unsupported Media Type"},
+        {headersTooLarge, "Request Header Fields Too Large"},
+        {500, "Internal Server Error"},
+        {notImplemented, "Not Implemented"},
+        {serviceUnavailable, "Service Unavailable"},
+        {versionNotSupported, "HTTP Version Not Supported"},
+        {510, "Not Extended"},
+    }};
+    const auto* const found =
+        std::find_if(reasons.begin(), reasons.end(), [status](const auto& reason) { return reason.first == status; });
+    return found == reasons.end() ? "Other" : found->second;
+}
+
+} // namespace ObjectManager::Server::Status
+
+#endif

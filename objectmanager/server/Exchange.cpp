@@ -82,9 +82,10 @@ std::string headOf(const HttpReply& reply, bool keepAlive) {
 
 } // namespace
 
-Shared::Shared(const Settings& given, Handler function, Authenticator* authenticator, Log log)
-    : settings(given), handler(std::move(function)), events(std::move(log)), connections(settings.limits, events),
-      hosts(settings.hosts), handshakes(handshakesAtATime(), handshakesAtATime(), waitingOfNetwork),
+Shared::Shared(Settings given, Handler function, Authenticator* authenticator, Log log)
+    : settings(std::move(given)), handler(std::move(function)), events(std::move(log)),
+      connections(settings.limits, events), hosts(settings.hosts),
+      handshakes(handshakesAtATime(), handshakesAtATime(), waitingOfNetwork),
       // A quarter is for others than the network that has most.
       answers(settings.threads, (3 * settings.threads + 3) / 4, waitingOfNetwork),
       bodies(settings.limits.allBodiesBytes) {

@@ -23,7 +23,7 @@ namespace ObjectManager::Server {
 
 /** What the connections share. */
 struct Shared {
-    Shared(const Settings& settings, Handler handler, Authenticator* authenticator, Log log);
+    Shared(Settings given, Handler function, Authenticator* authenticator, Log log);
 
     const Settings settings;
     const Handler handler;

@@ -60,6 +60,15 @@ std::string requester() {
            (principal == nullptr ? "" : std::string(", on behalf of ") + principal) + ']';
 }
 
+/** In the log, whatever its thresholds. @return whether the request was accepted. */
+bool reported(const PowerRequestOutcome& outcome) {
+    report(alwaysWrittenLevel,
+           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description +
+               requester(),
+           outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD);
+    return outcome.accepted;
+}
+
 } // namespace
 
 class Instrumentation::Implementation {
@@ -139,12 +148,7 @@ bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int
 }
 
 bool Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
-    const PowerRequestOutcome outcome = _implementation->write(property, value);
-    report(alwaysWrittenLevel,
-           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description +
-               requester(),
-           outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD);
-    return outcome.accepted;
+    return reported(_implementation->write(property, value));
 }
 
 } // namespace Norv
@@ -159,4 +163,23 @@ int orvInstrumentationMachine1() {
 
 void orvInstrumentationOnBehalfOf1(const char* whom) {
     Norv::principal = whom;
+}
+
+const char* orvInstrumentationPowerNode1() {
+    static const std::string node = [] {
+        Norv::Backend* const backend = Norv::processBackend();
+        const auto nodes = backend == nullptr ? nullptr : backend->selectPowerManagementNodes();
+        return nodes == nullptr || nodes->size() == 0 ? std::string() : nodes->path(0);
+    }();
+    return node.c_str();
+}
+
+int orvInstrumentationCancelRequest1() {
+    Norv::Backend* const backend = Norv::processBackend();
+    const auto nodes = backend == nullptr ? nullptr : backend->selectPowerManagementNodes();
+    const bool hasNode = nodes != nullptr && nodes->size() > 0;
+    return Norv::reported(hasNode ? nodes->cancelRequest(0)
+                                  : Norv::PowerRequestOutcome{false, "cancellation: no node is offered"})
+               ? 1
+               : 0;
 }

@@ -36,8 +36,25 @@ using Machine1 = int();
  */
 using OnBehalfOf1 = void(const char* whom);
 
+/**
+ * Tells to which node power requests go: the provider writes to the first one, whichever service a client names.
+ *
+ * @return the node's path below the root; empty where there is none. It is the same one for the life of the process.
+ */
+using PowerNode1 = const char*();
+
+/**
+ * Takes back the power request that is under way, by whomever it was made. The log gets a record of it as of a power
+ * request. May be called from any thread, and waits for the machine as a request does.
+ *
+ * @return 1 where the request was taken back, 0 where there is none or it is too late.
+ */
+using CancelRequest1 = int();
+
 /** The names of the functions. */
 inline constexpr const char* machine1Name = "orvInstrumentationMachine1";
+inline constexpr const char* powerNode1Name = "orvInstrumentationPowerNode1";
+inline constexpr const char* cancelRequest1Name = "orvInstrumentationCancelRequest1";
 inline constexpr const char* onBehalfOf1Name = "orvInstrumentationOnBehalfOf1";
 
 } // namespace Norv
@@ -47,5 +64,11 @@ extern "C" int orvInstrumentationMachine1();
 
 /** The embedded agent's function of type Norv::OnBehalfOf1. */
 extern "C" void orvInstrumentationOnBehalfOf1(const char* whom);
+
+/** The embedded agent's function of type Norv::PowerNode1. */
+extern "C" const char* orvInstrumentationPowerNode1();
+
+/** The embedded agent's function of type Norv::CancelRequest1. */
+extern "C" int orvInstrumentationCancelRequest1();
 
 #endif

@@ -3,6 +3,7 @@
 #include <sanitizer/asan_interface.h>
 
 #include <atomic>
+#include <cstdint>
 #include <mutex>
 #include <new>
 
@@ -165,6 +166,10 @@ void Arena::do_deallocate(void* block, std::size_t bytes, std::size_t /*alignmen
 
 void* Arena::allocateLarge(std::size_t bytes) {
     constexpr std::size_t head = roundUp(sizeof(LargeBlock), granule);
+    // No object is larger, and sums with such sizes do not overflow.
+    if (bytes > PTRDIFF_MAX - head) {
+        throw std::bad_alloc();
+    }
     auto* block = new (::operator new(head + bytes)) LargeBlock{_large, nullptr};
     if (_large != nullptr) {
         _large->previous = block;

@@ -55,8 +55,12 @@ void* cmpiMalloc(const CMPIBroker* broker, std::size_t bytes) {
     if (broker == nullptr || request == nullptr || bytes > SIZE_MAX - sizeof(BlockHead)) {
         return nullptr;
     }
-    void* block = request->memory().allocate(sizeof(BlockHead) + bytes, alignof(BlockHead));
-    return new (block) BlockHead{bytes} + 1;
+    try {
+        void* block = request->memory().allocate(sizeof(BlockHead) + bytes, alignof(BlockHead));
+        return new (block) BlockHead{bytes} + 1;
+    } catch (const std::bad_alloc&) {
+        return nullptr;
+    }
 }
 
 void* cmpiCalloc(const CMPIBroker* broker, std::size_t count, std::size_t size) {

@@ -110,6 +110,18 @@ TEST_F(MemoryTest, BlocksKeepWhatIsWritten) {
     EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, SIZE_MAX));
 }
 
+TEST_F(MemoryTest, SizesNearTheMaximumGiveNoBlock) {
+    const CMPIBrokerMemFT* memory = mb->mft;
+    void* const kept = memory->cmpiMalloc(mb, 1);
+    for (std::size_t less = 0; less < 200; ++less) {
+        EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, SIZE_MAX - less)) << less;
+        EXPECT_EQ(nullptr, memory->cmpiCalloc(mb, 1, SIZE_MAX - less)) << less;
+        EXPECT_EQ(nullptr, memory->cmpiRealloc(mb, kept, SIZE_MAX - less)) << less;
+        EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, static_cast<std::size_t>(PTRDIFF_MAX) - less)) << less;
+    }
+    EXPECT_NE(nullptr, memory->cmpiRealloc(mb, kept, 2));
+}
+
 TEST_F(MemoryTest, FreeingAnObjectReleasesIt) {
     const auto check = [&](auto* free, auto* object) {
         free(mb, object);

@@ -76,6 +76,15 @@ void LogTap::attach(void* library) {
     if (auto* const machine = functionOf<Norv::Machine1>(library, Norv::machine1Name)) {
         _machine = machine;
     }
+    if (auto* const node = functionOf<Norv::PowerNode1>(library, Norv::powerNode1Name)) {
+        _powerNode = node;
+    }
+    if (auto* const cancelRequest = functionOf<Norv::CancelRequest1>(library, Norv::cancelRequest1Name)) {
+        _cancelRequest = cancelRequest;
+    }
+    if (auto* const onBehalfOf = functionOf<Norv::OnBehalfOf1>(library, Norv::onBehalfOf1Name)) {
+        _onBehalfOf = onBehalfOf;
+    }
     auto* const observe = functionOf<OrvLog::Observe1>(library, OrvLog::observe1Name);
     const std::lock_guard lock(_mutex);
     if (observe == nullptr || std::ranges::find(_heard, observe, &Heard::observe) != _heard.end()) {
@@ -95,9 +104,31 @@ bool LogTap::isAttached() const {
     return !_heard.empty();
 }
 
+bool LogTap::hearsPowerRequests() const {
+    // An instrumentation that tells nothing of its machine gives its records no numbers either.
+    return isAttached() && _machine != nullptr;
+}
+
 bool LogTap::isSimulated() const {
     Norv::Machine1* const machine = _machine;
     return machine != nullptr && machine() == Norv::SIMULATED_MACHINE;
+}
+
+std::string LogTap::powerNode() const {
+    Norv::PowerNode1* const node = _powerNode;
+    return node == nullptr ? "" : node();
+}
+
+void LogTap::cancelPowerRequest() const {
+    if (Norv::CancelRequest1* const cancel = _cancelRequest) {
+        cancel();
+    }
+}
+
+void LogTap::actFor(const char* whom) const {
+    if (Norv::OnBehalfOf1* const onBehalfOf = _onBehalfOf) {
+        onBehalfOf(whom);
+    }
 }
 
 std::uint64_t LogTap::newest() const {
@@ -121,6 +152,11 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
         if (record.level >= failureLevel && !isNews) {
             failures.emplace_back(messageOf(record.text));
         }
+    }
+    Norv::Machine1* const machine = _machine;
+    if (!failures.empty() && machine != nullptr && machine() == Norv::NO_MACHINE) {
+        // All others follow from the first one, which says what is wrong with the configuration.
+        return {failures.front() + " ('orvcim check' says more)"};
     }
     return failures;
 }

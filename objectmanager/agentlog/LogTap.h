@@ -53,14 +53,23 @@ public:
 
     /** Whether there is an agent that can be listened to. */
     bool isAttached() const;
+    /** Whether every power request to the agent leaves a record here that says what became of it. */
+    bool hearsPowerRequests() const;
     /** Whether the agent says that its machine is a simulated one. */
     bool isSimulated() const;
+    /** The path of the node that power requests go to, whichever service they name; empty where it is not known. */
+    std::string powerNode() const;
+    /** Has the agent take back the power request that is under way, which leaves a record as a request does. Nothing
+     * happens where it cannot be asked. */
+    void cancelPowerRequest() const;
+    /** For whom the calling thread acts from now on; null for nobody. The text is valid until another one is given. */
+    void actFor(const char* whom) const;
 
     /** The sequence number of the calling thread's newest record. */
     std::uint64_t newest() const;
     /** The calling thread's records after the one numbered `sequence`, which stay here. */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
-    /** The messages in those of them that tell a failure. */
+    /** The messages in those of them that tell a failure; one alone where the agent's configuration cannot be used. */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
     /** The calling thread's records, which are gone from here. */
     std::vector<LogRecord> take();
@@ -83,6 +92,9 @@ private:
     mutable std::mutex _mutex;
     std::vector<Heard> _heard;
     std::atomic<Norv::Machine1*> _machine = nullptr;
+    std::atomic<Norv::CancelRequest1*> _cancelRequest = nullptr;
+    std::atomic<Norv::PowerNode1*> _powerNode = nullptr;
+    std::atomic<Norv::OnBehalfOf1*> _onBehalfOf = nullptr;
 };
 
 } // namespace ObjectManager

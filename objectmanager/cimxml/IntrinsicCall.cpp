@@ -20,6 +20,7 @@ CimError failureOf(const std::string& className, const CimError& error) {
 Invocation Call::invocation() const {
     Invocation invocation;
     invocation.principal = operation.caller.user;
+    invocation.address = operation.caller.address;
     invocation.flags = (parameters.flag("IncludeClassOrigin", false) ? CMPI_FLAG_IncludeClassOrigin : 0) |
                        (parameters.flag("DeepInheritance", true) ? CMPI_FLAG_DeepInheritance : 0);
     return invocation;

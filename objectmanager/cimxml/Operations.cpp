@@ -1,11 +1,11 @@
 #include "cimxml/Operations.h"
 
-#include "agentlog/AgentLog.h"
 #include "cimxml/ClassAssociations.h"
 #include "cimxml/IntrinsicCall.h"
 #include "cimxml/PullOperations.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace ObjectManager::CimXml {
 
@@ -385,8 +385,8 @@ std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& me
     return arguments;
 }
 
-/** Calls a class's own method. A power request that the agent refused fails, also where the provider tells of none. */
-void callMethod(const Operation& operation) {
+/** Calls a class's own method. @return what is known of its outcome beyond the return value. */
+std::string callMethod(const Operation& operation) {
     const Message& message = operation.message;
     const ValueReader reader(operation.catalogue, message.nameSpace());
     const bool isClass = message.target().name == "CLASSNAME";
@@ -408,22 +408,13 @@ void callMethod(const Operation& operation) {
     requireServed(operation, path.className);
     Invocation invocation;
     invocation.principal = operation.caller.user;
-    if (!isClass) {
-        operation.dispatcher.requireInstance(invocation, path);
-    }
-    LogTap* log = operation.dispatcher.log();
-    const std::uint64_t before = log != nullptr ? log->newest() : 0;
-    const MethodResult result = operation.dispatcher.invokeMethod(invocation, path, method->name, arguments);
-    if (log != nullptr) {
-        const std::string refusal = powerRequestText(log->since(before), PowerAnswer::refused);
-        if (!refusal.empty()) {
-            throw CimError(CMPI_RC_ERR_FAILED, refusal);
-        }
-    }
-    operation.writer.returnValue(result.returnValue);
-    for (const NamedValue& argument : result.outArguments) {
+    invocation.address = operation.caller.address;
+    MethodOutcome outcome = operation.dispatcher.callMethod(invocation, path, method->name, arguments);
+    operation.writer.returnValue(outcome.result.returnValue);
+    for (const NamedValue& argument : outcome.result.outArguments) {
         operation.writer.parameter(argument);
     }
+    return std::move(outcome.remark);
 }
 
 const IntrinsicMethod& intrinsicMethod(const std::string& name) {
@@ -446,19 +437,19 @@ void requireAccess(const Caller& caller, Access access) {
 
 } // namespace
 
-void perform(const Operation& operation) {
+std::string perform(const Operation& operation) {
     requireAccess(operation.caller, Access::read);
     const Message& message = operation.message;
     if (!message.isIntrinsic()) {
         requireAccess(operation.caller, Access::change);
         operation.dispatcher.registry().requireNameSpace(message.nameSpace());
-        callMethod(operation);
-        return;
+        return callMethod(operation);
     }
     const IntrinsicMethod& method = intrinsicMethod(message.method());
     requireAccess(operation.caller, method.access);
     operation.dispatcher.registry().requireNameSpace(message.nameSpace());
     method.answer({operation, Parameters(message, operation.catalogue, method.parameters)});
+    return {};
 }
 
 } // namespace ObjectManager::CimXml

@@ -22,10 +22,11 @@ struct Operation {
 /**
  * Does what the message asks for, if the caller may, and writes what stands in the IMETHODRESPONSE or METHODRESPONSE.
  *
+ * @return what is known of a method's outcome beyond its return value; mostly nothing.
  * @throws CimError where it fails, ProtocolError where an element lacks what the document type demands. What was
  * written by then is of no use.
  */
-void perform(const Operation& operation);
+std::string perform(const Operation& operation);
 
 } // namespace ObjectManager::CimXml
 

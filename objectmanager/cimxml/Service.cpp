@@ -1,11 +1,12 @@
 #include "cimxml/Service.h"
 
-#include "agentlog/AgentLog.h"
 #include "cimxml/HttpHeaders.h"
 #include "cimxml/Operations.h"
 #include "cimxml/ProtocolError.h"
+#include "cimxml/Recording.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/ResponseWriter.h"
+#include "text/StatusText.h"
 
 #include <unistd.h>
 
@@ -37,10 +38,37 @@ std::string descriptionOf(const CimError& error) {
                : error.what() + reasonsText(error.reasons, error.refused ? ": " : "; the provider logged: ");
 }
 
+} // namespace
+
+Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings)
+    : _dispatcher(dispatcher), _catalogue(catalogue), _clock(settings.clock),
+      _enumerations(settings.enumerations, settings.clock, settings.newContext), _recorder(settings.recorder) {}
+
+/** Does what the message asks for, and records what has to be. */
+void Service::performRecorded(const Operation& operation) {
+    const Message& message = operation.message;
+    const auto record = [&](Audit::Verdict verdict, const std::string& reason) {
+        if (!message.isIntrinsic() || verdict == Audit::Verdict::denied) {
+            _recorder(recordOf(message, operation.caller, _catalogue, verdict, reason));
+        }
+    };
+    std::string remark;
+    try {
+        remark = perform(operation);
+    } catch (const CimError& error) {
+        record(error.code == CMPI_RC_ERR_ACCESS_DENIED ? Audit::Verdict::denied : Audit::Verdict::refused,
+               descriptionOf(error));
+        throw;
+    } catch (const std::exception& error) {
+        record(Audit::Verdict::refused, error.what());
+        throw;
+    }
+    record(Audit::Verdict::accepted, remark);
+}
+
 /** The document that answers the message. */
-std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, Enumerations& enumerations,
-                       const Message& message, const Caller& caller, const std::string& host) {
-    ResponseWriter writer(catalogue, host.empty() ? ownHostName() : host, message.nameSpace());
+std::string Service::documentOf(const Message& message, const Caller& caller, const std::string& host) {
+    ResponseWriter writer(_catalogue, host.empty() ? ownHostName() : host, message.nameSpace());
     const char* const response = message.isIntrinsic() ? "IMETHODRESPONSE" : "METHODRESPONSE";
     writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">\n<MESSAGE");
     writer.attribute("ID", message.id());
@@ -51,7 +79,7 @@ std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, Enume
     writer.raw(">\n");
     const std::size_t start = writer.size();
     try {
-        perform({dispatcher, catalogue, message, caller, writer, enumerations});
+        performRecorded({_dispatcher, _catalogue, message, caller, writer, _enumerations});
     } catch (const CimError& error) {
         writer.truncate(start);
         writer.error(error.code, descriptionOf(error));
@@ -61,12 +89,6 @@ std::string documentOf(Dispatcher& dispatcher, const Catalogue& catalogue, Enume
     writer.raw(">\n</SIMPLERSP>\n</MESSAGE>\n</CIM>\n");
     return writer.take();
 }
-
-} // namespace
-
-Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings)
-    : _dispatcher(dispatcher), _catalogue(catalogue), _clock(settings.clock),
-      _enumerations(settings.enumerations, settings.clock, settings.newContext) {}
 
 HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
     const Enumerations::TimePoint start = _clock();
@@ -78,7 +100,7 @@ HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
         headers.check();
         const Message message(request.body);
         headers.checkAgainst(message);
-        std::string document = documentOf(_dispatcher, _catalogue, _enumerations, message, caller, headers.host());
+        std::string document = documentOf(message, caller, headers.host());
         return {Http::ok, headers.ofAnswer(std::chrono::floor<std::chrono::microseconds>(_clock() - start)),
                 std::move(document)};
     } catch (const ProtocolError& error) {

@@ -2,6 +2,7 @@
 #ifndef CIMXML_SERVICE_H
 #define CIMXML_SERVICE_H
 
+#include "audit/CallRecord.h"
 #include "cimxml/Enumerations.h"
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
@@ -13,11 +14,16 @@ using Server::Caller;
 using Server::HttpReply;
 using Server::HttpRequest;
 
+class Message;
+struct Operation;
+
 struct ServiceSettings {
     EnumerationLimits enumerations;
     /** What the time of answers and of open enumerations is taken from. */
     Enumerations::Clock clock = std::chrono::steady_clock::now;
     Enumerations::NewContext newContext = randomContext;
+    /** Takes every call of a method, whatever became of it, and every other request that its client has no right to. */
+    Audit::Recorder recorder = [](const Audit::CallRecord&) {};
 };
 
 class Service {
@@ -29,10 +35,14 @@ public:
     HttpReply answer(const HttpRequest& request, const Caller& caller);
 
 private:
+    std::string documentOf(const Message& message, const Caller& caller, const std::string& host);
+    void performRecorded(const Operation& operation);
+
     Dispatcher& _dispatcher;
     const Catalogue& _catalogue;
     const Enumerations::Clock _clock;
     Enumerations _enumerations;
+    const Audit::Recorder _recorder;
 };
 
 } // namespace ObjectManager::CimXml

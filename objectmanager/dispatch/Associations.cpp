@@ -19,7 +19,7 @@ const ObjectPath& pathOf(const Instance& instance) {
     return instance.path;
 }
 
-template <class Object>
+template <typename Object>
 void keepFirstOfEachPath(std::vector<Object>& objects) {
     std::unordered_set<ObjectPath, ObjectPathHash> seen;
     std::erase_if(objects, [&](const Object& object) {
@@ -48,7 +48,7 @@ AssociationWalk::AssociationWalk(const Registry& registry, const ClassInformatio
     const std::vector<const Registration*> registrations = registry.all(source.nameSpace, ProviderKind::association);
     const std::string* declared = classes != nullptr ? classes->declaredName(source.className) : nullptr;
     if (declared == nullptr) {
-        throw CimError(CMPI_RC_ERR_INVALID_CLASS, "the class \"" + source.className + "\" is not declared");
+        throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, "the class \"" + source.className + "\" is not declared");
     }
     _source.className = *declared;
     requireDeclared(filter.associationClass, "association class");

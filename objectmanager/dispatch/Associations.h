@@ -32,10 +32,10 @@ public:
     /**
      * `classes` may be null, which knows no class. It and the registry outlive the walk.
      *
-     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE, CMPI_RC_ERR_INVALID_CLASS where the source's class is not
-     * declared, CMPI_RC_ERR_INVALID_PARAMETER where a class of the filter is not, or its association class is no
-     * association, CMPI_RC_ERR_FAILED where a registered association class has not two references, so that nobody knows
-     * what it links.
+     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE, CMPI_RC_ERR_INVALID_PARAMETER where the class of the source
+     * or one of the filter is not declared (DSP0200), or the filter's association class is no association,
+     * CMPI_RC_ERR_FAILED where a registered association class has not two references, so that nobody knows what it
+     * links.
      */
     AssociationWalk(const Registry& registry, const ClassInformation* classes, const ObjectPath& source,
                     const AssociationFilter& filter);

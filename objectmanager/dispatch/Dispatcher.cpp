@@ -1,6 +1,7 @@
 #include "dispatch/Dispatcher.h"
 
 #include "dispatch/ProviderCall.h"
+#include "text/ObjectPathText.h"
 
 #include <algorithm>
 #include <iterator>
@@ -35,16 +36,22 @@ const char* orNull(const std::string& name) {
 }
 
 /** Adds what was found through an association class, if anything was. */
-template <class Object>
+template <typename Object>
 void append(std::vector<Associated<Object>>& found, const AssociationStep& step, std::vector<Object> objects) {
     if (!objects.empty()) {
         found.push_back({step.registration->className, std::move(objects)});
     }
 }
 
+/** Why a provider failed that does not say it. */
+std::string reasonOf(const Registration& registration, CMPIrc code, const std::string& operation) {
+    return registration.provider +
+           (code == CMPI_RC_ERR_NOT_SUPPORTED ? " does not support " + operation : " gave no reason");
+}
+
 /** How a provider ended: throws where it was anything but well. */
-void requireSuccess(const Registration& registration, const CMPIStatus& status, const Request& request,
-                    const Result& result) {
+void requireSuccess(const Registration& registration, const std::string& operation, const CMPIStatus& status,
+                    const Request& request, const Result& result) {
     std::string message = textOf(status.msg);
     if (!request.misuse().empty()) {
         throw CimError(CMPI_RC_ERR_FAILED, registration.provider + ' ' + request.misuse());
@@ -56,7 +63,7 @@ void requireSuccess(const Registration& registration, const CMPIStatus& status, 
         message = message.empty() ? error.what() : message;
     }
     if (code != CMPI_RC_OK) {
-        throw CimError(code, message.empty() ? registration.provider + " gave no reason" : message);
+        throw CimError(code, message.empty() ? reasonOf(registration, code, operation) : message);
     }
 }
 
@@ -90,7 +97,7 @@ std::vector<Instance> instancesOf(const Result& result) {
 enum class Dispatcher::Answer { paths, instances, value, nothing };
 
 Dispatcher::Dispatcher(Registry registry, const Settings& settings)
-    : _registry(std::move(registry)), _log(settings.log), _broker(this, settings.classes),
+    : _registry(std::move(registry)), _rules(settings.rules), _log(settings.log), _broker(this, settings.classes),
       _providers(_broker, settings.folders, [log = settings.log](void* library) {
           if (log != nullptr) {
               log->attach(library);
@@ -98,12 +105,14 @@ Dispatcher::Dispatcher(Registry registry, const Settings& settings)
       }) {}
 
 /**
- * Does one operation: `call` calls the provider with context, result and path, `take` takes what it returned.
- * `unanswered`, where it is one, is thrown where the provider neither returned anything nor closed its result.
+ * Does one operation, which messages call `operation`: `call` calls the provider with context, result and path, `take`
+ * takes what it returned. `unanswered`, where it is one, is thrown where the provider neither returned anything nor
+ * closed its result.
  */
-template <class Call, class Take>
-auto Dispatcher::serve(const Invocation& invocation, const ObjectPath& path, const Registration& registration,
-                       Answer answer, const std::optional<CimError>& unanswered, Call call, Take take) {
+template <typename Call, typename Take>
+auto Dispatcher::serve(const char* operation, const Invocation& invocation, const ObjectPath& path,
+                       const Registration& registration, Answer answer, const std::optional<CimError>& unanswered,
+                       Call call, Take take) {
     const std::uint64_t before = _log != nullptr ? _log->newest() : 0;
     try {
         Request request(_broker);
@@ -122,7 +131,7 @@ auto Dispatcher::serve(const Invocation& invocation, const ObjectPath& path, con
                 callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); })) {
             throw CimError(CMPI_RC_ERR_FAILED, registration.provider + ' ' + *thrown);
         }
-        requireSuccess(registration, status, request, result);
+        requireSuccess(registration, operation, status, request, result);
         if (unanswered && !result.closed() && result.empty()) {
             throw CimError(*unanswered);
         }
@@ -136,6 +145,9 @@ auto Dispatcher::serve(const Invocation& invocation, const ObjectPath& path, con
         if (_log != nullptr) {
             error.reasons = _log->failuresSince(before);
         }
+        if (error.refused && error.reasons.empty()) {
+            error.reasons = {"the provider gave no reason"};
+        }
         throw;
     }
 }
@@ -145,7 +157,7 @@ void Dispatcher::enumerateInstanceNames(const Invocation& invocation, const Obje
     const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     serve(
-        invocation, classPath, registration, Answer::paths, leftOpen(registration),
+        "EnumerateInstanceNames", invocation, classPath, registration, Answer::paths, leftOpen(registration),
         [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
             return mi.ft->enumerateInstanceNames(&mi, context, result, path);
         },
@@ -157,7 +169,7 @@ void Dispatcher::enumerateInstances(const Invocation& invocation, const ObjectPa
     const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     serve(
-        invocation, classPath, registration, Answer::instances, leftOpen(registration),
+        "EnumerateInstances", invocation, classPath, registration, Answer::instances, leftOpen(registration),
         [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
             return mi.ft->enumerateInstances(&mi, context, result, path, request.propertyList(properties));
         },
@@ -168,7 +180,7 @@ Instance Dispatcher::getInstance(const Invocation& invocation, const ObjectPath&
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     return serve(
-        invocation, path, registration, Answer::instances, noInstance(),
+        "GetInstance", invocation, path, registration, Answer::instances, noInstance(),
         [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
             return mi.ft->getInstance(&mi, context, result, target, request.propertyList(properties));
         },
@@ -187,7 +199,7 @@ ObjectPath Dispatcher::createInstance(const Invocation& invocation, const Object
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     return serve(
-        invocation, path, registration, Answer::paths, leftOpen(registration),
+        "CreateInstance", invocation, path, registration, Answer::paths, leftOpen(registration),
         [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
             return mi.ft->createInstance(&mi, context, result, target, request.instance(instance));
         },
@@ -204,7 +216,7 @@ void Dispatcher::modifyInstance(const Invocation& invocation, const ObjectPath& 
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     serve(
-        invocation, path, registration, Answer::nothing, leftOpen(registration),
+        "ModifyInstance", invocation, path, registration, Answer::nothing, leftOpen(registration),
         [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
             return mi.ft->modifyInstance(&mi, context, result, target, request.instance(instance),
                                          request.propertyList(properties));
@@ -216,7 +228,7 @@ void Dispatcher::deleteInstance(const Invocation& invocation, const ObjectPath& 
     const Registration& registration = _registry.find(path.nameSpace, path.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     serve(
-        invocation, path, registration, Answer::nothing, leftOpen(registration),
+        "DeleteInstance", invocation, path, registration, Answer::nothing, leftOpen(registration),
         [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
             return mi.ft->deleteInstance(&mi, context, result, target);
         },
@@ -228,26 +240,105 @@ void Dispatcher::execQuery(const Invocation& invocation, const ObjectPath& class
     const Registration& registration = _registry.find(classPath.nameSpace, classPath.className, ProviderKind::instance);
     CMPIInstanceMI& mi = _providers.instanceProvider(registration);
     serve(
-        invocation, classPath, registration, Answer::instances, leftOpen(registration),
+        "ExecQuery", invocation, classPath, registration, Answer::instances, leftOpen(registration),
         [&](Request&, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
             return mi.ft->execQuery(&mi, context, result, path, query.c_str(), language.c_str());
         },
         [&](const Result& result) { passInstances(result, sink); });
 }
 
-void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath& path) {
-    const std::vector<const Registration*> served = _registry.all(path.nameSpace, ProviderKind::instance);
-    if (std::none_of(served.begin(), served.end(), [&](const Registration* registration) {
-            return equalNames(registration->className, path.className);
-        })) {
-        return;
-    }
+bool Dispatcher::hasInstanceProvider(const ObjectPath& path) const {
+    return std::ranges::any_of(_registry.registrations(), [&](const Registration& registration) {
+        return registration.instance && registration.isIn(path.nameSpace) &&
+               equalNames(registration.className, path.className);
+    });
+}
+
+/** Whether the provider of the path's class names that instance among its own. */
+bool Dispatcher::isNamed(const Invocation& invocation, const ObjectPath& path) {
     bool found = false;
     enumerateInstanceNames(invocation, {{}, path.nameSpace, path.className, {}},
                            [&](const ObjectPath& name) { found = found || name == path; });
-    if (!found) {
+    return found;
+}
+
+/** Of a class that has no provider of instances it is not known what there is, so whatever is named is. */
+void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath& path) {
+    if (hasInstanceProvider(path) && !isNamed(invocation, path)) {
         throw noInstance();
     }
+}
+
+/** Of a value that is a reference, or has references as its elements. */
+void Dispatcher::requireReference(const Invocation& invocation, const std::string& argument, const Value& value) {
+    if (const auto* elements = std::get_if<Value::Array>(&value.content)) {
+        for (const Value& element : *elements) {
+            requireReference(invocation, argument, element);
+        }
+        return;
+    }
+    const auto* const reference = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content);
+    if (reference == nullptr) {
+        return;
+    }
+    const ObjectPath& path = **reference;
+    const auto fail = [&](CMPIrc code, const std::string& what) { throw CimError(code, argument + ": " + what); };
+    if (_broker.classes() != nullptr && _broker.classes()->declaredName(path.className) == nullptr) {
+        fail(CMPI_RC_ERR_INVALID_PARAMETER, "found a path of the class " + path.className +
+                                                ", which is not declared, expected the path of an instance");
+    }
+    if (path.keys.empty()) {
+        fail(CMPI_RC_ERR_INVALID_PARAMETER,
+             "found the class " + path.className + ", expected the path of an instance, with its keys");
+    }
+    if (!hasInstanceProvider(path) || !isNamed(invocation, path)) {
+        fail(CMPI_RC_ERR_NOT_FOUND, "there is no instance " + formatLocalPath(path) + ", expected one of those of " +
+                                        path.className + " that are served in that namespace");
+    }
+}
+
+namespace {
+
+/**
+ * A reference as it is meant. The client wbemcli takes the first name of a namespace for a host's: from
+ * root/cimv2:CLASS it makes the host root and the namespace cimv2. Where there is no such namespace, but one of both
+ * names, it is that one.
+ */
+Value meantReference(const Value& given, const Registry& registry) {
+    const auto* const reference = std::get_if<std::shared_ptr<const ObjectPath>>(&given.content);
+    const auto isServed = [&](std::string_view nameSpace) {
+        return std::ranges::any_of(registry.registrations(),
+                                   [&](const Registration& registration) { return registration.isIn(nameSpace); });
+    };
+    if (reference == nullptr || isServed((*reference)->nameSpace) ||
+        !isServed((*reference)->host + '/' + (*reference)->nameSpace)) {
+        return given;
+    }
+    ObjectPath meant = **reference;
+    meant.nameSpace = meant.host + '/' + meant.nameSpace;
+    meant.host.clear();
+    return referenceValue(std::move(meant));
+}
+
+} // namespace
+
+MethodOutcome Dispatcher::callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
+                                     const std::vector<NamedValue>& given) {
+    std::vector<NamedValue> arguments = given;
+    for (NamedValue& argument : arguments) {
+        argument.value = meantReference(argument.value, _registry);
+    }
+    if (!path.keys.empty()) {
+        requireInstance(invocation, path);
+    }
+    for (const NamedValue& argument : arguments) {
+        requireReference(invocation, argument.name, argument.value);
+    }
+    const auto provider = [&] { return invokeMethod(invocation, path, method, arguments); };
+    const auto rule =
+        std::ranges::find_if(_rules, [&](const MethodRule* each) { return each->isAbout(path.className, method); });
+    return rule == _rules.end() ? MethodOutcome{provider()}
+                                : (*rule)->call({invocation, path, method, arguments}, *this, provider);
 }
 
 MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
@@ -260,7 +351,7 @@ MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const Object
     CMPIMethodMI& mi = _providers.methodProvider(registration);
     const CMPIArgs* answers = nullptr;
     return serve(
-        invocation, path, registration, Answer::value, refused(method),
+        method.c_str(), invocation, path, registration, Answer::value, refused(method),
         [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* target) {
             CMPIArgs* out = request.arguments({});
             answers = out;
@@ -289,14 +380,14 @@ CimError failureOf(const Registration& registration, const CimError& error) {
  * Asks the provider of one association class. It leaves its result open, so that an open result is as complete as a
  * closed one. A failure names the class.
  */
-template <class Call, class Take>
-auto Dispatcher::follow(const Invocation& invocation, const AssociationWalk& walk, const AssociationStep& step,
-                        Answer answer, Call call, Take take) {
+template <typename Call, typename Take>
+auto Dispatcher::follow(const char* operation, const Invocation& invocation, const AssociationWalk& walk,
+                        const AssociationStep& step, Answer answer, Call call, Take take) {
     const Registration& registration = *step.registration;
     try {
         CMPIAssociationMI& mi = _providers.associationProvider(registration);
         return serve(
-            invocation, walk.source(), registration, answer, std::nullopt,
+            operation, invocation, walk.source(), registration, answer, std::nullopt,
             [&](Request& request, const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* source) {
                 return call(mi, request, context, result, source);
             },
@@ -310,14 +401,22 @@ auto Dispatcher::follow(const Invocation& invocation, const AssociationWalk& wal
     }
 }
 
+/** A provider of associations may make up references to a source that is not there. */
+AssociationWalk Dispatcher::walkFrom(const Invocation& invocation, const ObjectPath& source,
+                                     const AssociationFilter& filter) {
+    AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    requireInstance(invocation, walk.source());
+    return walk;
+}
+
 std::vector<Associated<Instance>> Dispatcher::associators(const Invocation& invocation, const ObjectPath& source,
                                                           const AssociationFilter& filter,
                                                           const PropertyList& properties) {
-    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    const AssociationWalk walk = walkFrom(invocation, source, filter);
     std::vector<Associated<Instance>> found;
     for (const AssociationStep& step : walk.steps()) {
         std::vector<Instance> instances = follow(
-            invocation, walk, step, Answer::instances,
+            "Associators", invocation, walk, step, Answer::instances,
             [&](CMPIAssociationMI& mi, Request& request, const CMPIContext* context, const CMPIResult* result,
                 const CMPIObjectPath* path) {
                 return mi.ft->associators(&mi, context, result, path, step.registration->className.c_str(),
@@ -334,11 +433,11 @@ std::vector<Associated<Instance>> Dispatcher::associators(const Invocation& invo
 
 std::vector<Associated<ObjectPath>> Dispatcher::associatorNames(const Invocation& invocation, const ObjectPath& source,
                                                                 const AssociationFilter& filter) {
-    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    const AssociationWalk walk = walkFrom(invocation, source, filter);
     std::vector<Associated<ObjectPath>> found;
     for (const AssociationStep& step : walk.steps()) {
         std::vector<ObjectPath> paths = follow(
-            invocation, walk, step, Answer::paths,
+            "AssociatorNames", invocation, walk, step, Answer::paths,
             [&](CMPIAssociationMI& mi, Request&, const CMPIContext* context, const CMPIResult* result,
                 const CMPIObjectPath* path) {
                 return mi.ft->associatorNames(&mi, context, result, path, step.registration->className.c_str(),
@@ -353,11 +452,11 @@ std::vector<Associated<ObjectPath>> Dispatcher::associatorNames(const Invocation
 
 std::vector<Instance> Dispatcher::references(const Invocation& invocation, const ObjectPath& source,
                                              const AssociationFilter& filter, const PropertyList& properties) {
-    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    const AssociationWalk walk = walkFrom(invocation, source, filter);
     std::vector<Instance> found;
     for (const AssociationStep& step : walk.steps()) {
         std::vector<Instance> instances = follow(
-            invocation, walk, step, Answer::instances,
+            "References", invocation, walk, step, Answer::instances,
             [&](CMPIAssociationMI& mi, Request& request, const CMPIContext* context, const CMPIResult* result,
                 const CMPIObjectPath* path) {
                 return mi.ft->references(&mi, context, result, path, step.registration->className.c_str(),
@@ -372,11 +471,11 @@ std::vector<Instance> Dispatcher::references(const Invocation& invocation, const
 
 std::vector<ObjectPath> Dispatcher::referenceNames(const Invocation& invocation, const ObjectPath& source,
                                                    const AssociationFilter& filter) {
-    const AssociationWalk walk(_registry, _broker.classes(), source, filter);
+    const AssociationWalk walk = walkFrom(invocation, source, filter);
     std::vector<ObjectPath> found;
     for (const AssociationStep& step : walk.steps()) {
         std::vector<ObjectPath> paths = follow(
-            invocation, walk, step, Answer::paths,
+            "ReferenceNames", invocation, walk, step, Answer::paths,
             [&](CMPIAssociationMI& mi, Request&, const CMPIContext* context, const CMPIResult* result,
                 const CMPIObjectPath* path) {
                 return mi.ft->referenceNames(&mi, context, result, path, step.registration->className.c_str(),

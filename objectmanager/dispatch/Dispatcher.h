@@ -7,6 +7,7 @@
 #include "broker/Request.h"
 #include "broker/Result.h"
 #include "dispatch/Associations.h"
+#include "dispatch/MethodRule.h"
 #include "dispatch/Providers.h"
 #include "registry/Registry.h"
 
@@ -32,6 +33,8 @@ public:
         const ClassInformation* classes = nullptr;
         /** Where failures' reasons come from; may be null; outlives the dispatcher. */
         LogTap* log = nullptr;
+        /** Of which the first that is about a method is followed. They outlive the dispatcher. */
+        std::vector<const MethodRule*> rules{};
     };
 
     Dispatcher(Registry registry, const Settings& settings);
@@ -60,17 +63,25 @@ public:
     void execQuery(const Invocation& invocation, const ObjectPath& classPath, const std::string& query,
                    const std::string& language, const InstanceSink& sink) override;
     /**
-     * Throws CMPI_RC_ERR_NOT_FOUND where the provider of the path's class does not name that instance among its own.
-     * Of a class that has no provider of instances it is not known, and taken to be there. A provider of methods may
-     * act whatever instance it is asked for, so a client's path is checked by this before.
+     * Calls a method for a client. A provider of methods may act whatever it is asked for, so this looks before whether
+     * the paths that the client gave name what is there: the target, and each reference among the arguments. Whether
+     * paths are equal is not a matter of host names and of the letter case of names.
+     *
+     * @param path without keys for the class itself.
+     * @param method,arguments named as the class declares them.
+     * @throws CimError with CMPI_RC_ERR_NOT_FOUND where no provider names such an instance, but for a target of a class
+     *         that has no provider of instances; with CMPI_RC_ERR_INVALID_PARAMETER where a reference names a class, or
+     *         its class is not declared; and as the method's rule and invokeMethod throw.
      */
-    void requireInstance(const Invocation& invocation, const ObjectPath& path);
+    MethodOutcome callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
+                             const std::vector<NamedValue>& arguments);
     /** A refusal is a CimError with `refused` set. */
     MethodResult invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                               const std::vector<NamedValue>& arguments) override;
 
     /*
-     * The association operations need the classes. An association class is followed where its declaration says that it
+     * The association operations need the classes, and a source that is there: CMPI_RC_ERR_NOT_FOUND where the provider
+     * of its class does not name it. An association class is followed where its declaration says that it
      * can link the source; its provider is asked for the associations of that class, and told the filter. What the
      * filter leaves out is dropped from the answer too, since a provider need not look at it. One provider's failure is
      * the operation's, and names the class.
@@ -89,14 +100,22 @@ public:
 private:
     enum class Answer;
 
-    template <class Call, class Take>
-    auto serve(const Invocation& invocation, const ObjectPath& path, const Registration& registration, Answer answer,
-               const std::optional<CimError>& unanswered, Call call, Take take);
-    template <class Call, class Take>
-    auto follow(const Invocation& invocation, const AssociationWalk& walk, const AssociationStep& step, Answer answer,
-                Call call, Take take);
+    template <typename Call, typename Take>
+    auto serve(const char* operation, const Invocation& invocation, const ObjectPath& path,
+               const Registration& registration, Answer answer, const std::optional<CimError>& unanswered, Call call,
+               Take take);
+    template <typename Call, typename Take>
+    auto follow(const char* operation, const Invocation& invocation, const AssociationWalk& walk,
+                const AssociationStep& step, Answer answer, Call call, Take take);
+
+    AssociationWalk walkFrom(const Invocation& invocation, const ObjectPath& source, const AssociationFilter& filter);
+    bool hasInstanceProvider(const ObjectPath& path) const;
+    bool isNamed(const Invocation& invocation, const ObjectPath& path);
+    void requireInstance(const Invocation& invocation, const ObjectPath& path);
+    void requireReference(const Invocation& invocation, const std::string& argument, const Value& value);
 
     Registry _registry;
+    std::vector<const MethodRule*> _rules;
     LogTap* _log;
     Broker _broker;
     Providers _providers;

@@ -13,7 +13,7 @@ namespace ObjectManager {
  * Runs code of a provider's. What it throws ends here and is told as the end of a sentence that begins with the
  * provider's name; nothing where it throws nothing.
  */
-template <class Call>
+template <typename Call>
 std::optional<std::string> callProvider(Call call) {
     try {
         call();

@@ -15,7 +15,7 @@ namespace ObjectManager {
 namespace {
 
 /** Of a kind of provider: how its factories end, what its functions are called, and when it is registered. */
-template <class MI>
+template <typename MI>
 struct MIKind;
 
 template <>
@@ -38,7 +38,7 @@ struct MIKind<CMPIAssociationMI> {
 };
 
 /** The first slot of a function table that is null; null where all are set. */
-template <class MI>
+template <typename MI>
 const char* missingSlot(const MI& mi) {
     constexpr auto& names = MIKind<MI>::slots;
     std::array<void (*)(), names.size()> functions{};
@@ -49,7 +49,7 @@ const char* missingSlot(const MI& mi) {
 }
 
 /** What is wrong with a function table, as the end of a sentence about its factory; empty where nothing is. */
-template <class MI>
+template <typename MI>
 std::string tableProblem(const MI& mi) {
     if (mi.ft == nullptr) {
         return "returned a provider without a function table";
@@ -91,11 +91,11 @@ public:
     void* handle() const { return _handle; }
 
     /** Calls the factory where it was not called yet; the provider, null where `report` tells a problem. */
-    template <class MI>
+    template <typename MI>
     MI* provider(const std::string& name, FactoryReport& report);
 
 private:
-    template <class MI>
+    template <typename MI>
     MI* create(FactoryReport& report);
     void complain(const std::string& factory, const std::string& problem) const {
         _broker.message({BrokerMessage::Kind::log, CMPI_SEV_ERROR, factory, problem});
@@ -146,7 +146,7 @@ ProviderLibrary::~ProviderLibrary() {
     }
 }
 
-template <class MI>
+template <typename MI>
 MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
     report.factory = name + MIKind<MI>::suffix;
     if (const auto known = _providers.find(report.factory); known != _providers.end()) {
@@ -172,7 +172,7 @@ MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
     return mi;
 }
 
-template <class MI>
+template <typename MI>
 MI* ProviderLibrary::create(FactoryReport& report) {
     using Factory = MI*(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
     auto* factory = reinterpret_cast<Factory*>(dlsym(_handle, report.factory.c_str()));
@@ -227,9 +227,9 @@ ProviderLibrary& Providers::library(const std::string& location) {
 namespace {
 
 /** Calls the factory of each kind of provider that is registered; `report` gives the place for its report. */
-template <class Report>
+template <typename Report>
 void callFactories(ProviderLibrary& library, const Registration& registration, Report report) {
-    const auto call = [&]<class MI>(bool registered, const MI*) {
+    const auto call = [&]<typename MI>(bool registered, const MI*) {
         if (registered) {
             library.provider<MI>(registration.provider, report());
         }
@@ -241,7 +241,7 @@ void callFactories(ProviderLibrary& library, const Registration& registration, R
 
 } // namespace
 
-template <class MI>
+template <typename MI>
 MI& Providers::provider(const Registration& registration) {
     const std::lock_guard lock(_mutex);
     ProviderLibrary& loaded = library(registration.location);

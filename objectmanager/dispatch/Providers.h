@@ -70,7 +70,7 @@ public:
     ProviderReport check(const Registration& registration);
 
 private:
-    template <class MI>
+    template <typename MI>
     MI& provider(const Registration& registration);
     ProviderLibrary& library(const std::string& location);
 

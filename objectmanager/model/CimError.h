@@ -16,7 +16,8 @@ struct CimError : std::runtime_error {
 
     /** Never CMPI_RC_OK. */
     CMPIrc code;
-    /** The provider ended a method with code OK, but gave no return value and left its result open: it refused. */
+    /** A method was refused, though the provider tells of no failure: what() and the reasons say all there is to say.
+     */
     bool refused = false;
     /** What the provider logged as failures meanwhile, in that order. */
     std::vector<std::string> reasons;

@@ -18,6 +18,8 @@ struct Invocation {
     std::string principal;
     /** Any of the CMPI_FLAG_ bits. */
     CMPIUint32 flags = 0;
+    /** Where the user's client is; empty where it is this process. */
+    std::string address{};
 };
 
 /** The properties wanted of an instance; nothing means all of them. */

@@ -51,6 +51,15 @@ std::string describe(const LogSettings& log) {
 
 } // namespace
 
+std::string problemOfConfiguration() {
+    try {
+        Norv::Agent::loadConfiguration();
+    } catch (const Norv::Agent::ConfigurationError& error) {
+        return error.what();
+    }
+    return "";
+}
+
 AgentExamination examineAgent() {
     AgentExamination found;
     found.facts.emplace_back("user", fmt::format("uid {}", geteuid()));

@@ -17,6 +17,9 @@ struct AgentExamination {
     std::vector<std::string> problems;
 };
 
+/** What is wrong with the agent's configuration, in one line; empty where nothing is. */
+std::string problemOfConfiguration();
+
 /** Reads the agent's configuration and looks at its machine, of which it asks nothing. */
 AgentExamination examineAgent();
 

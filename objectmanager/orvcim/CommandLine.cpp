@@ -1,6 +1,6 @@
 #include "orvcim/CommandLine.h"
 
-#include "agentlog/AgentLog.h"
+#include "orvcim/AgentExamination.h"
 #include "orvcim/Commands.h"
 #include "orvcim/ServeOptions.h"
 #include "text/ObjectPathText.h"
@@ -49,6 +49,28 @@ public:
             throw UsageError(fmt::format("found no command, expected one of {}", fmt::join(_names, ", ")));
         }
         return _command;
+    }
+
+    /** Whether all that the command does depends on the agent. */
+    bool asksTheAgent() const { return _name != "classes" && _name != "check" && _name != "serve"; }
+
+    /** What cannot be told without the agent, as the beginning of a sentence that goes on with the reason. */
+    std::string whatIsMissing() const { return _name == "power status" ? "the power state is unknown: " : ""; }
+
+    /** What is wrong with a command line whose words are no command; empty where they are one. */
+    std::string wrongCommand() const {
+        const std::vector<std::string> words = _app.remaining(true);
+        const std::vector<CLI::App*> given = _app.get_subcommands();
+        if (words.empty() || (!given.empty() && (!given.front()->get_subcommands().empty() ||
+                                                 given.front()->get_subcommands({}).empty()))) {
+            return "";
+        }
+        const std::string group = given.empty() ? "" : given.front()->get_name() + " ";
+        std::vector<std::string> expected;
+        std::ranges::copy_if(_names, std::back_inserter(expected),
+                             [&](const std::string& name) { return name.starts_with(group); });
+        return fmt::format("found no command {}{}, expected one of {}", group, words.front(),
+                           fmt::join(expected, ", "));
     }
 
     /** What the command is about, as errors name it. */
@@ -103,17 +125,18 @@ private:
         addProperties(references);
         addReferences(add(_app, "reference-names", "List the paths of the associations that refer to an instance",
                           listReferenceNames));
-        CLI::App& graph = add(_app, "graph", "Draw all instances with their associations, as DOT", drawGraph);
-        graph.add_option("--svg", _options.picture, "Draw them as SVG into a file, with Graphviz")->type_name("FILE");
+        add(_app, "graph", "Write all instances with their associations as a graph in DOT", writeGraph);
     }
 
     void powerCommands() {
         CLI::App& power = *_app.add_subcommand("power", "See and change the machine's power state");
         power.fallthrough();
         power.footer(footer);
-        add(power, "status", "Show the power states", powerStatus);
+        add(power, "status", "Show the power states", powerStatus)
+            .add_flag("--watch", _options.watch, "Show every change, until the program is ended");
         addPowerRequest(add(power, "reboot", "Reboot the machine", powerReboot));
         addPowerRequest(add(power, "shutdown", "Shut the machine down", powerShutdown));
+        add(power, "cancel", "Take back the reboot or shutdown that is under way", powerCancel);
     }
 
     CLI::App& add(CLI::App& parent, const std::string& name, const std::string& description, Command toDo) {
@@ -175,11 +198,19 @@ private:
     void addPowerRequest(CLI::App& subcommand) {
         subcommand.add_option("--service", _options.service, "Path of the service, where there are several")
             ->type_name("PATH");
+        subcommand
+            .add_flag("--wait{300}", _waitSeconds,
+                      "Wait until it is done, or as many seconds are over (--wait=SECONDS; 300 where none are given)")
+            ->check(CLI::Range(0.0, longestWait))
+            ->each([this](const std::string& seconds) { _options.waitSeconds = std::stod(seconds); });
         subcommand.add_flag("--yes", _options.yes, "Do not ask, whatever the machine is");
     }
 
+    static constexpr double longestWait = 86400;
+
     CLI::App _app;
     Options _options;
+    std::string _waitSeconds;
     /** Of all commands. */
     std::vector<std::string> _names;
     /** Of the one that was asked for. */
@@ -193,8 +224,7 @@ int report(int status, const std::string& message) {
 }
 
 std::string refusalText(const CimError& error) {
-    const std::string reasons = reasonsText(error.reasons, ": ");
-    return error.what() + (reasons.empty() ? ": the provider gave no reason" : reasons);
+    return error.what() + reasonsText(error.reasons, ": ");
 }
 
 std::string failureText(const std::string& subject, const CimError& error) {
@@ -213,10 +243,17 @@ int run(int argc, const char* const* argv) {
     } catch (const CLI::Success& success) {
         return commandLine.app().exit(success);
     } catch (const CLI::ParseError& error) {
+        if (const std::string wrong = commandLine.wrongCommand(); !wrong.empty()) {
+            return report(badUsage, wrong);
+        }
         return report(badUsage, fmt::format("{} (orvcim --help tells what can be done)", error.what()));
     }
     try {
         const Command command = commandLine.command();
+        // Providers would say the same in many words each.
+        if (const std::string problem = commandLine.asksTheAgent() ? problemOfConfiguration() : ""; !problem.empty()) {
+            return report(failed, commandLine.whatIsMissing() + problem + " ('orvcim check' says more)");
+        }
         Session session(commandLine.options(), std::cout);
         command(session);
         // Providers report some failures to nobody but the log, with an answer that is merely empty.

@@ -17,6 +17,8 @@ void enumerateNames(Session& session);
 void enumerateInstances(Session& session);
 /** One instance. */
 void getInstance(Session& session);
+/** Says on standard error where the outcome of a call is not known beyond its return value. */
+void reportUnknown(const MethodOutcome& outcome);
 /** One call of a method. */
 void invokeMethod(Session& session);
 
@@ -27,13 +29,16 @@ void listAssociatorNames(Session& session);
 void listReferences(Session& session);
 void listReferenceNames(Session& session);
 
-/** All instances with their associations, in Graphviz's language or as a picture that it draws. */
-void drawGraph(Session& session);
+/** All instances with their associations, as a graph in the DOT language of Graphviz. */
+void writeGraph(Session& session);
 
-/** The power states of the machine, or what its services can do where nobody serves the states. */
+/** The power states of the machine, or what its services can do where nobody serves the states. Throws Failure, after
+ * its answer, where a state is not known. */
 void powerStatus(Session& session);
 void powerReboot(Session& session);
 void powerShutdown(Session& session);
+/** Takes back the reboot or shutdown that is under way. */
+void powerCancel(Session& session);
 
 /** Answers clients on the network until a signal ends the program. Only where it was built with the server. */
 void serve(Session& session);

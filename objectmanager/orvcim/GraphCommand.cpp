@@ -1,16 +1,29 @@
 #include "orvcim/Commands.h"
-#include "orvcim/Graphviz.h"
 #include "text/ObjectPathText.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
 #include <iterator>
+#include <string_view>
 #include <unordered_map>
 
 namespace ObjectManager::Orvcim {
 
 namespace {
+
+/** A text as a quoted string of the DOT language. */
+std::string dotString(std::string_view text) {
+    std::string quoted = "\"";
+    for (const char c : text) {
+        if (c == '\n') {
+            quoted += "\\n";
+        } else {
+            quoted += c == '"' || c == '\\' ? std::string{'\\', c} : std::string{c};
+        }
+    }
+    return quoted + '"';
+}
 
 /** A graph in the DOT language, whose nodes are instances and whose edges are associations. */
 class Graph {
@@ -97,16 +110,11 @@ Graph graphOf(Session& session) {
 
 } // namespace
 
-void drawGraph(Session& session) {
+void writeGraph(Session& session) {
     if (session.options().format != Format::table) {
-        throw UsageError("found --format, expected none: graph writes DOT, or SVG with --svg");
+        throw UsageError("found --format, expected none: graph writes DOT");
     }
-    const std::string text = graphOf(session).text();
-    if (session.options().picture.empty()) {
-        session.out() << text;
-    } else {
-        drawSvg(text, session.options().picture);
-    }
+    session.out() << graphOf(session).text();
 }
 
 } // namespace ObjectManager::Orvcim

@@ -1,11 +1,11 @@
 #include "orvcim/Arguments.h"
 #include "orvcim/Commands.h"
-#include "orvcim/MethodCall.h"
 
 #include <fmt/format.h>
 #include <fmt/ranges.h>
 
 #include <algorithm>
+#include <iostream>
 
 namespace ObjectManager::Orvcim {
 
@@ -75,13 +75,19 @@ void getInstance(Session& session) {
     session.writer().instance(session.dispatcher().getInstance(Session::invocation(), path, properties));
 }
 
+void reportUnknown(const MethodOutcome& outcome) {
+    if (!outcome.isKnown) {
+        std::cerr << "orvcim: " << outcome.remark << '\n';
+    }
+}
+
 void invokeMethod(Session& session) {
     const ObjectPath path = session.instancePath(session.options().target);
     const Method& method = methodOf(session, path);
     const auto arguments = parseArguments(session.options().arguments, method, session.catalogue(), path.nameSpace);
-    session.dispatcher().requireInstance(Session::invocation(), path);
-    const MethodResult result = callMethod(session, path, method, arguments).result;
-    session.writer().methodResult(method, result.returnValue, result.outArguments);
+    const MethodOutcome outcome = session.dispatcher().callMethod(Session::invocation(), path, method.name, arguments);
+    session.writer().methodResult(method, outcome.result.returnValue, outcome.result.outArguments);
+    reportUnknown(outcome);
 }
 
 } // namespace ObjectManager::Orvcim

@@ -1,15 +1,17 @@
-#include "agentlog/AgentLog.h"
 #include "orvcim/Commands.h"
-#include "orvcim/MethodCall.h"
 #include "text/ObjectPathText.h"
+#include "text/StatusText.h"
 
 #include <fmt/format.h>
 
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
 #include <iostream>
 #include <iterator>
+#include <optional>
+#include <thread>
 
 namespace ObjectManager::Orvcim {
 
@@ -17,7 +19,6 @@ namespace {
 
 constexpr const char* capabilitiesClass = "TALVO_PowerManagementCapabilities";
 constexpr const char* associationClass = "TALVO_AssociatedPowerManagementService";
-constexpr const char* requestMethod = "RequestPowerStateChange";
 
 /** In between: the machine is on its way from one of the other states to another. */
 constexpr std::uint64_t otherPowerState = 1;
@@ -62,11 +63,59 @@ std::string nameBehind(const Session& session, const Instance& instance, const c
     return name == nullptr ? textOf(session, instance, reference) : plainText(name->value, nullptr);
 }
 
+/** A state of the association; nothing where it is not known. */
+std::optional<std::uint64_t> stateOf(const Instance& association) {
+    const NamedValue* const state = find(association.properties, "PowerState");
+    const auto* const number = state == nullptr ? nullptr : std::get_if<std::uint64_t>(&state->value.content);
+    return number == nullptr || *number == 0 ? std::nullopt : std::optional(*number);
+}
+
 /** The power state for people, to whom "Other" alone says nothing. */
 std::string stateText(const Session& session, const Instance& association) {
-    const NamedValue* state = find(association.properties, "PowerState");
-    const bool other = state != nullptr && state->value == unsignedValue(CMPI_uint16, otherPowerState);
-    return textOf(session, association, "PowerState") + (other ? ", as while it reboots or shuts down" : "");
+    const std::optional<std::uint64_t> state = stateOf(association);
+    return !state ? "unknown"
+                  : textOf(session, association, "PowerState") +
+                        (*state == otherPowerState ? ", as while it reboots or shuts down" : "");
+}
+
+using Rows = std::vector<std::vector<std::string>>;
+
+Rows rowsOf(const Session& session, const std::vector<Instance>& states) {
+    Rows rows = {{"SYSTEM", "SERVICE", "POWER STATE"}};
+    for (const Instance& state : states) {
+        rows.push_back({nameBehind(session, state, "UserOfService"), nameBehind(session, state, "ServiceProvided"),
+                        stateText(session, state)});
+    }
+    return rows;
+}
+
+/** Throws where nothing is known of a machine's state. */
+void requireKnown(Session& session, const std::vector<Instance>& states) {
+    if (states.empty() ||
+        !std::ranges::all_of(states, [](const Instance& each) { return stateOf(each).has_value(); })) {
+        const std::string reasons = reasonsText(session.log().failuresSince(0), ": ");
+        throw Failure("the power state is unknown" +
+                      (reasons.empty() ? ": 'orvcim check' says what is wrong" : reasons));
+    }
+}
+
+/** How often the state is looked at that is waited for. */
+constexpr std::chrono::milliseconds lookAgain{200};
+
+/** Shows the states whenever they change, until the program is ended. */
+[[noreturn]] void watch(Session& session) {
+    Rows shown;
+    for (;;) {
+        const std::vector<Instance> states = instancesOf(session, associationClass);
+        requireKnown(session, states);
+        if (Rows rows = rowsOf(session, states); rows != shown) {
+            session.writer().summary(rows, states);
+            session.out() << std::flush;
+            shown = std::move(rows);
+        }
+        session.log().forget();
+        std::this_thread::sleep_for(lookAgain);
+    }
 }
 
 /** The service that the command is about. */
@@ -105,73 +154,93 @@ void confirm(Session& session, const PowerRequest& request, const std::string& s
     }
 }
 
-/** The text of a key that the service must have. */
-Value keyOf(const ObjectPath& service, const char* name) {
-    const NamedValue* key = find(service.keys, name);
-    if (key == nullptr) {
-        throw Failure(
-            fmt::format("found no key {} in {}, expected it to name the machine", name, formatLocalPath(service)));
+/** The one machine whose power the service manages. */
+ObjectPath systemOf(Session& session, const ObjectPath& service) {
+    const std::vector<ObjectPath> systems = systemsOf(service, Session::invocation(), session.dispatcher());
+    if (systems.size() != 1) {
+        throw Failure(fmt::format("found {} systems that are associated with {}, expected one", systems.size(),
+                                  formatLocalPath(service)));
     }
-    return key->value;
+    return systems.front();
 }
 
-/** The agent's own word on the request. Throws where it is known that there was none. */
-std::string confirmationOf(const CallOutcome& outcome) {
-    std::string accepted = powerRequestText(outcome.records, PowerAnswer::accepted);
-    if (accepted.empty() && !outcome.records.empty()) {
-        throw Failure(
-            fmt::format("{} ended without a failure, but the agent accepted no power request", requestMethod));
+/** The name for people. */
+std::string nameOf(const ObjectPath& system) {
+    const NamedValue* const name = find(system.keys, "Name");
+    return name == nullptr ? formatLocalPath(system) : plainText(name->value, nullptr);
+}
+
+/** Waits until the service's system is on its way no longer, and says in which state it is. */
+void waitForEnd(Session& session, const ObjectPath& service) {
+    using Clock = std::chrono::steady_clock;
+    const std::chrono::duration<double> longest(*session.options().waitSeconds);
+    const Clock::time_point start = Clock::now();
+    for (;; std::this_thread::sleep_for(lookAgain)) {
+        std::vector<Instance> states = instancesOf(session, associationClass);
+        std::erase_if(states, [&](const Instance& state) {
+            const NamedValue* const end = find(state.properties, "ServiceProvided");
+            return end == nullptr || !(end->value == referenceValue(service));
+        });
+        requireKnown(session, states);
+        if (stateOf(states.front()) != otherPowerState) {
+            session.out() << nameBehind(session, states.front(), "UserOfService") << ": "
+                          << stateText(session, states.front()) << '\n';
+            return;
+        }
+        if (Clock::now() - start >= longest) {
+            throw Failure(fmt::format(
+                "the request is not done after {} s: 'orvcim power status' shows what comes of it", longest.count()));
+        }
     }
-    return accepted;
 }
 
 void requestPowerState(Session& session, const PowerRequest& request) {
     const ObjectPath service = serviceOf(session);
-    const ObjectPath system{
-        {},
-        service.nameSpace,
-        "TALVO_ComputerSystem",
-        {{"CreationClassName", keyOf(service, "SystemCreationClassName")}, {"Name", keyOf(service, "SystemName")}}};
-    confirm(session, request, plainText(keyOf(service, "SystemName"), nullptr));
+    const ObjectPath system = systemOf(session, service);
+    confirm(session, request, nameOf(system));
 
     const Class* known = session.catalogue().find(powerServiceClass);
-    const Method* method = known == nullptr ? nullptr : known->method(requestMethod);
+    const Method* method = known == nullptr ? nullptr : known->method(requestPowerStateChangeMethod);
     if (method == nullptr) {
-        throw Failure(fmt::format("found no method {} of {} in {}, expected its declaration", requestMethod,
-                                  powerServiceClass, session.schemaFolder().string()));
+        throw Failure(fmt::format("found no method {} of {} in {}, expected its declaration",
+                                  requestPowerStateChangeMethod, powerServiceClass, session.schemaFolder().string()));
     }
-    const CallOutcome outcome = callMethod(
-        session, service, *method,
+    const MethodOutcome outcome = session.dispatcher().callMethod(
+        Session::invocation(), service, method->name,
         {{"PowerState", unsignedValue(CMPI_uint16, request.powerState)}, {"ManagedElement", referenceValue(system)}});
-    const std::string text = plainText(outcome.result.returnValue, method);
-    if (outcome.result.returnValue != unsignedValue(CMPI_uint32, 0)) {
-        throw Failure(fmt::format("{} failed with {}", requestMethod, text));
+    const Value& returnValue = outcome.result.returnValue;
+    if (returnValue != unsignedValue(CMPI_uint32, 0)) {
+        throw Failure(fmt::format("{} failed with {}", method->name, plainText(returnValue, method)));
     }
-    const std::string accepted = confirmationOf(outcome);
-    if (session.options().format != Format::table || accepted.empty()) {
-        session.writer().methodResult(*method, outcome.result.returnValue, outcome.result.outArguments);
+    if (session.options().format != Format::table || !outcome.isKnown) {
+        session.writer().methodResult(*method, returnValue, outcome.result.outArguments);
+        reportUnknown(outcome);
     } else {
-        session.out() << accepted << '\n';
+        session.out() << outcome.remark << '\n' << std::flush;
+    }
+    if (session.options().waitSeconds) {
+        waitForEnd(session, service);
     }
 }
 
 } // namespace
 
 void powerStatus(Session& session) {
-    std::vector<std::vector<std::string>> rows;
     if (isServed(session, associationClass)) {
-        const std::vector<Instance> states = instancesOf(session, associationClass);
-        rows.push_back({"SYSTEM", "SERVICE", "POWER STATE"});
-        for (const Instance& state : states) {
-            rows.push_back({nameBehind(session, state, "UserOfService"), nameBehind(session, state, "ServiceProvided"),
-                            stateText(session, state)});
+        if (session.options().watch) {
+            watch(session);
         }
-        session.writer().summary(rows, states);
+        const std::vector<Instance> states = instancesOf(session, associationClass);
+        if (!states.empty()) {
+            session.writer().summary(rowsOf(session, states), states);
+        }
+        requireKnown(session, states);
         return;
     }
     std::cerr << fmt::format("orvcim: the power state itself is not served: {} is not registered in {}\n",
                              associationClass, session.options().nameSpace);
     std::vector<Instance> instances = instancesOf(session, powerServiceClass);
+    Rows rows;
     rows.push_back({"SERVICE OR CAPABILITIES", "POWER STATES THAT CAN BE ASKED FOR"});
     std::vector<Instance> capabilities = instancesOf(session, capabilitiesClass);
     std::move(capabilities.begin(), capabilities.end(), std::back_inserter(instances));
@@ -179,6 +248,7 @@ void powerStatus(Session& session) {
         rows.push_back({textOf(session, instance, "ElementName"), textOf(session, instance, "PowerStatesSupported")});
     }
     session.writer().summary(rows, instances);
+    throw Failure("the power state is unknown: nobody serves it");
 }
 
 void powerReboot(Session& session) {
@@ -187,6 +257,11 @@ void powerReboot(Session& session) {
 
 void powerShutdown(Session& session) {
     requestPowerState(session, shutdown);
+}
+
+void powerCancel(Session& session) {
+    session.loadAgent();
+    session.out() << cancelPowerRequest(session.log()) << '\n';
 }
 
 } // namespace ObjectManager::Orvcim

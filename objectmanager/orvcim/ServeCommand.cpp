@@ -1,3 +1,4 @@
+#include "audit/CallRecord.h"
 #include "cimxml/Service.h"
 #include "orvcim/Commands.h"
 #include "orvcim/ServeLog.h"
@@ -175,7 +176,8 @@ void serve(Session& session) {
     }
 
     const ServiceManager manager;
-    CimXml::Service service(session.dispatcher(), session.catalogue(), {.enumerations = options.enumerations});
+    CimXml::Service service(session.dispatcher(), session.catalogue(),
+                            {.enumerations = options.enumerations, .recorder = Audit::makeRecorder(log)});
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
         Server::HttpReply reply = service.answer(request, caller);
         // What the agent logged meanwhile was of interest to this request only.

@@ -46,7 +46,8 @@ std::vector<std::filesystem::path> libraryFoldersOf(const Options& options) {
 
 Session::Session(const Options& options, std::ostream& out)
     : _options(options), _schemaFolder(schemaFolderOf(options)), _catalogue(readCatalogue(_schemaFolder)),
-      _dispatcher(Registry(readRegistrations(_schemaFolder)), {libraryFoldersOf(options), &_catalogue, &_log}),
+      _powerRequests(_catalogue, _log), _dispatcher(Registry(readRegistrations(_schemaFolder)),
+                                                    {libraryFoldersOf(options), &_catalogue, &_log, {&_powerRequests}}),
       _out(out), _writer(makeWriter(options.format, out, _catalogue)) {}
 
 ObjectPath Session::classPath(std::string_view text) const {
@@ -87,13 +88,17 @@ PropertyList Session::propertiesOf(const ObjectPath& path) const {
     return properties;
 }
 
+void Session::loadAgent() {
+    try {
+        _dispatcher.enumerateInstanceNames(invocation(), {{}, _options.nameSpace, powerServiceClass, {}});
+    } catch (const CimError&) {
+        // Where nobody knows its power services, nothing is known of the agent, which its users look for.
+    }
+}
+
 bool Session::isSimulated() {
     if (!_log.isSimulated()) {
-        try {
-            _dispatcher.enumerateInstanceNames(invocation(), {{}, _options.nameSpace, powerServiceClass, {}});
-        } catch (const CimError&) {
-            return false; // where nobody knows its power services, the machine may be any
-        }
+        loadAgent();
     }
     return _log.isSimulated();
 }

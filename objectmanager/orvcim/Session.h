@@ -8,10 +8,12 @@
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
 #include "orvcim/ServeOptions.h"
+#include "power/PowerRequests.h"
 #include "text/Writer.h"
 
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -36,6 +38,10 @@ struct Options {
     bool yes = false;
     /** The path of the service to use; empty where there is one only. */
     std::string service;
+    /** How long to wait for what was asked for to be done; not at all where it is not given. */
+    std::optional<double> waitSeconds;
+    /** Show every change of the power states until the program is ended. */
+    bool watch = false;
     /** CLASS or PATH. */
     std::string target;
     std::string method;
@@ -43,8 +49,6 @@ struct Options {
     std::vector<std::string> arguments;
     /** Which associations to follow, and to what. */
     AssociationFilter filter;
-    /** Where to draw a picture; empty where its description is wanted. */
-    std::filesystem::path picture;
     ServeOptions serve;
 };
 
@@ -98,7 +102,9 @@ public:
      */
     PropertyList propertiesOf(const ObjectPath& path) const;
 
-    /** Whether the agent says that the machine is a simulated one. Loads the provider that knows the agent. */
+    /** Loads the provider that knows the agent, where it can be loaded. */
+    void loadAgent();
+    /** Whether the agent says that the machine is a simulated one. Loads it. */
     bool isSimulated();
 
     /** Who asks for the operations: the user of the program. */
@@ -109,6 +115,7 @@ private:
     std::filesystem::path _schemaFolder;
     Catalogue _catalogue;
     LogTap _log;
+    PowerRequestRule _powerRequests;
     Dispatcher _dispatcher;
     std::ostream& _out;
     std::unique_ptr<Writer> _writer;

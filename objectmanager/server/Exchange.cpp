@@ -157,7 +157,8 @@ bool Exchange::serve() {
         Budget::Share share(_shared.bodies, _connection.network);
         readHead();
         check();
-        const Caller caller = logIn();
+        Caller caller = logIn();
+        caller.address = _connection.address;
         readBody(&share);
         reply = answer(caller);
         keepAlive = _head.keepAlive;

@@ -50,6 +50,8 @@ struct Caller {
     std::string user;
     bool mayRead;
     bool mayChangePower;
+    /** Where the client is, as the log names it. */
+    std::string address{};
 };
 
 /** Answers a request. Called by several threads at once; must not throw. */

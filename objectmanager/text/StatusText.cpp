@@ -48,4 +48,14 @@ std::string statusText(CMPIrc code) {
     return std::string(name) + " (" + std::to_string(static_cast<int>(code)) + ")";
 }
 
+std::string reasonsText(const std::vector<std::string>& messages, const char* introduction) {
+    std::string text;
+    for (auto message = messages.begin(); message != messages.end(); ++message) {
+        if (std::find(messages.begin(), message, *message) == message) {
+            text += (text.empty() ? introduction : "; ") + *message;
+        }
+    }
+    return text;
+}
+
 } // namespace ObjectManager

@@ -1,5 +1,5 @@
 /**
- * The names of return codes.
+ * Why an operation failed, in words.
  */
 #ifndef TEXT_STATUSTEXT_H
 #define TEXT_STATUSTEXT_H
@@ -7,6 +7,7 @@
 #include "cmpidt.h"
 
 #include <string>
+#include <vector>
 
 namespace ObjectManager {
 
@@ -15,6 +16,9 @@ namespace ObjectManager {
  * those of the provider interface, "return code (1234)" for any other.
  */
 std::string statusText(CMPIrc code);
+
+/** What failures the messages tell of, each said once; begins with `introduction` where they tell of any. */
+std::string reasonsText(const std::vector<std::string>& messages, const char* introduction);
 
 } // namespace ObjectManager
 

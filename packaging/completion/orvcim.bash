@@ -6,7 +6,7 @@ _orvcim_listed() {
   shift
   orvcim "$@" --help 2>/dev/null | awk -v part="$part:" '
     /^[A-Za-z]/ { inside = $0 == part }
-    inside && /^  [^ ]/ { count = split($1, words, ","); for (i = 1; i <= count; i++) { sub("=.*", "", words[i]); print words[i] } }'
+    inside && /^  [^ ]/ { count = split($1, words, ","); for (i = 1; i <= count; i++) { sub("[={].*", "", words[i]); print words[i] } }'
 }
 
 _orvcim() {
@@ -22,7 +22,7 @@ _orvcim() {
   --format)
     found='table json mof'
     ;;
-  --schema | --provider-path | --tls-cert | --tls-key | --pam-folder | --svg)
+  --schema | --provider-path | --tls-cert | --tls-key | --pam-folder)
     mapfile -t COMPREPLY < <(compgen -f -- "$current")
     return
     ;;

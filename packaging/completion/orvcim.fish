@@ -7,7 +7,7 @@ function __orvcim_listed --argument-names part
         inside && /^  [^ ]/ {
             text = substr($0, 3)
             meaning = text; if (sub(/^.*   */, "", meaning) == 0) meaning = ""
-            name = text; sub(/ .*/, "", name); sub(/=.*/, "", name); sub(/^.*,/, "", name)
+            name = text; sub(/ .*/, "", name); sub(/[={].*/, "", name); sub(/^.*,/, "", name)
             print name "\t" meaning
         }'
 end
@@ -36,7 +36,7 @@ function __orvcim_words
 end
 
 complete --command orvcim --no-files --arguments '(__orvcim_words)'
-for option in schema provider-path tls-cert tls-key pam-folder svg
+for option in schema provider-path tls-cert tls-key pam-folder
     complete --command orvcim --long-option $option --require-parameter --force-files
 end
 complete --command orvcim --long-option format --exclusive --arguments 'table json mof'

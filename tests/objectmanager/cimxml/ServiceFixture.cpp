@@ -1,5 +1,6 @@
 #include "ServiceFixture.h"
 
+#include "power/PowerRequests.h"
 #include "registry/RegistrationReader.h"
 
 #include <cerrno>
@@ -49,8 +50,9 @@ struct World {
     AgentFolder agent;
     Catalogue catalogue = readCatalogue(TEST_SCHEMA);
     LogTap log;
+    PowerRequestRule powerRequests{catalogue, log};
     Dispatcher dispatcher{Registry(readRegistrations(std::filesystem::path(TEST_SCHEMA))),
-                          {{TEST_LIBRARIES, TEST_PROVIDERS}, &catalogue, &log}};
+                          {{TEST_LIBRARIES, TEST_PROVIDERS}, &catalogue, &log, {&powerRequests}}};
     Service service{dispatcher, catalogue};
 
     World() {

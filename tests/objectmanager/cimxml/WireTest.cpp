@@ -48,12 +48,16 @@ TEST_P(WireTest, isAnsweredExactly) {
     std::string recorded;
     for (const WireCase& given : readWireCases(contentOf(GetParam()))) {
         now += given.pause;
+        const std::string machine = contentOf(stateFile());
         const HttpReply reply = service.answer(given.request(), given.caller);
         recorded += (recorded.empty() ? "" : std::string(requestSeparator)) + given.requestText +
                     std::string(replySeparator) + textOf(reply);
         if (std::getenv("ORV_RECORD_CASES") == nullptr) {
             EXPECT_EQ(textOf(reply), given.reply);
             EXPECT_TRUE(reply.status != 200 || isValid(reply.body));
+            if (reply.status != 200 || reply.body.find("<ERROR ") != std::string::npos) {
+                EXPECT_EQ(contentOf(stateFile()), machine) << "the machine moved";
+            }
         }
     }
     if (std::getenv("ORV_RECORD_CASES") != nullptr) {

@@ -227,8 +227,9 @@ TEST_F(AssociationsTest, RefuseWhatIsNotDeclaredOrServed) {
     const auto failure = [&](const ObjectPath& source, const AssociationFilter& filter) {
         return errorOf([&] { served.associatorNames(invocation, source, filter); });
     };
+    EXPECT_THAT(failure(disk("nobody"), {}), isError(CMPI_RC_ERR_NOT_FOUND, "there is no such instance"));
     EXPECT_THAT(failure(path("Test_Guest", "g"), {}),
-                isError(CMPI_RC_ERR_INVALID_CLASS, "the class \"Test_Guest\" is not declared"));
+                isError(CMPI_RC_ERR_INVALID_PARAMETER, "the class \"Test_Guest\" is not declared"));
     EXPECT_THAT(failure(host, {"Test_Lends", "", "", ""}),
                 isError(CMPI_RC_ERR_INVALID_PARAMETER, "the association class \"Test_Lends\" is not declared"));
     EXPECT_THAT(failure(host, {"", "Test_Guest", "", ""}),

@@ -139,19 +139,38 @@ TEST_F(DispatcherTest, InvokesMethods) {
     EXPECT_EQ(stringValue("Format"), result.outArguments[2].value);
 }
 
-TEST_F(DispatcherTest, KnowsWhetherThereIsAnInstance) {
-    dispatcher.requireInstance(invocation, disk("b"));
-    dispatcher.requireInstance(invocation, {"host", "ROOT/cimv2", "TEST_DISK", {{"NAME", stringValue("b")}}});
-    for (const ObjectPath& wrong : {disk("c"), disk("B"), path("Test_Disk")}) {
-        EXPECT_THAT(errorOf([&] { dispatcher.requireInstance(invocation, wrong); }),
-                    isError(CMPI_RC_ERR_NOT_FOUND, "there is no such instance"));
+TEST_F(DispatcherTest, CallsMethodsForClientsOfInstancesThatAreThere) {
+    const auto call = [&](const ObjectPath& target) { dispatcher.callMethod(invocation, target, "Format", {}); };
+    call(disk("b"));
+    call({"host", "ROOT/cimv2", "TEST_DISK", {{"NAME", stringValue("b")}}});
+    for (const ObjectPath& wrong : {disk("c"), disk("B")}) {
+        EXPECT_THAT(errorOf([&] { call(wrong); }), isError(CMPI_RC_ERR_NOT_FOUND, "there is no such instance"));
     }
+    EXPECT_THAT(errorOf([&] {
+                    call(path("Test_Fails", {{"Name", stringValue("f")}}));
+                }),
+                isError(CMPI_RC_ERR_ACCESS_DENIED, "not for you"));
 }
 
-TEST_F(DispatcherTest, TakesAnInstanceToBeThereThatNobodyServes) {
-    dispatcher.requireInstance(invocation, path("Test_Tape", {{"Name", stringValue("t")}}));
-    EXPECT_THAT(errorOf([&] { dispatcher.requireInstance(invocation, path("Test_Fails")); }),
-                isError(CMPI_RC_ERR_ACCESS_DENIED, "not for you"));
+TEST_F(DispatcherTest, CallsMethodsForClientsWithReferencesToInstancesThatAreThere) {
+    const auto call = [&](const Value& argument) {
+        return dispatcher.callMethod(invocation, disk("a"), "Format", {{"Disk", argument}}).result.returnValue;
+    };
+    EXPECT_EQ(unsignedValue(CMPI_uint32, 1), call(referenceValue(disk("b"))));
+    EXPECT_EQ(unsignedValue(CMPI_uint32, 1),
+              call(arrayValue(CMPI_ref, {referenceValue(disk("a")), nullValue(CMPI_ref)})));
+    EXPECT_THAT(errorOf([&] {
+                    call(arrayValue(CMPI_ref, {referenceValue(disk("a")), referenceValue(disk("c"))}));
+                }),
+                isError(CMPI_RC_ERR_NOT_FOUND, "Disk: there is no instance root/cimv2:Test_Disk.Name=\"c\", expected "
+                                               "one of those of Test_Disk that are served in that namespace"));
+    for (const ObjectPath& unserved :
+         {path("Test_Tape", {{"Name", stringValue("t")}}), ObjectPath{"", "root/x", "Test_Disk", disk("a").keys}}) {
+        EXPECT_EQ(CMPI_RC_ERR_NOT_FOUND, errorOf([&] { call(referenceValue(unserved)); }).code);
+    }
+    EXPECT_THAT(errorOf([&] { call(referenceValue(path("Test_Disk"))); }),
+                isError(CMPI_RC_ERR_INVALID_PARAMETER,
+                        "Disk: found the class Test_Disk, expected the path of an instance, with its keys"));
 }
 
 TEST_F(DispatcherTest, GivesTheProviderItsOwnSpellingOfTheClass) {
@@ -196,7 +215,8 @@ INSTANTIATE_TEST_SUITE_P(
         Misbehaviour{"Test_Throws", CMPI_RC_ERR_FAILED, "TestProvider threw an exception: out of disks"},
         Misbehaviour{"Test_ThrowsNumber", CMPI_RC_ERR_FAILED, "TestProvider threw an exception of unknown type"},
         Misbehaviour{"Test_Fails", CMPI_RC_ERR_ACCESS_DENIED, "not for you"},
-        Misbehaviour{"Test_FailsSilently", CMPI_RC_ERR_NOT_SUPPORTED, "TestProvider gave no reason"},
+        Misbehaviour{"Test_FailsSilently", CMPI_RC_ERR_NOT_SUPPORTED,
+                     "TestProvider does not support EnumerateInstances"},
         Misbehaviour{"Test_FailsWithReleasedMessage", CMPI_RC_ERR_FAILED,
                      "TestProvider used a CMPIString after it was released"},
         Misbehaviour{"Test_ReturnsError", CMPI_RC_ERR_ACCESS_DENIED, "the disk is on fire"},

@@ -51,6 +51,8 @@ TEST_F(LogTapTest, IsNotAttachedByALibraryWhoseAgentCannotBeListenedTo) {
     tap.attach(other);
     EXPECT_FALSE(tap.isAttached());
     EXPECT_FALSE(tap.isSimulated());
+    EXPECT_FALSE(tap.hearsPowerRequests());
+    EXPECT_EQ("", tap.powerNode());
     dlclose(other);
 }
 

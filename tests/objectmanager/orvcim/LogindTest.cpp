@@ -13,6 +13,7 @@ namespace {
 using AgentTest::PrivateBus;
 using testing::AllOf;
 using testing::ElementsAre;
+using testing::EndsWith;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::MatchesRegex;
@@ -110,8 +111,10 @@ TEST_F(LogindTest, showsThatThereIsNoSystemdLogind) {
         StartsWith("orvcim: Power request refused: reboot of this machine, node system: systemd-logind is not on "
                    "the system bus: org.freedesktop.DBus.Error.ServiceUnknown: "));
     const Outcome status = run({"power", "status"});
-    EXPECT_THAT(status.err, StartsWith("orvcim: the provider logged: The power state of this machine cannot be told: "
-                                       "systemd-logind is not on the system bus: "));
+    EXPECT_THAT(status.err, StartsWith("orvcim: the power state is unknown: The power state of this machine cannot be "
+                                       "told: systemd-logind is not on the system bus: "));
+    EXPECT_THAT(status.out, EndsWith("  unknown\n"));
+    EXPECT_EQ(status.status, 1);
 }
 
 TEST_F(LogindTest, showsThatTheLibraryOfSystemdIsMissing) {

@@ -79,12 +79,12 @@ TEST(Orvcim, takesClassesAndPropertiesInAnyLetterCase) {
 }
 
 TEST(Orvcim, passesArgumentsInTheTypesOfTheMethod) {
-    expectDone(orvcim({"invoke", thing, "Add", "left=65535", "RIGHT=1", "Right=2", "Other=Test_Thing.Name=\"a b\"",
-                       "When=00000000000001.500000:000"}),
+    expectDone(orvcim({"invoke", thing, "Add", "left=65535", "RIGHT=1", "Right=2",
+                       "Other=//elsewhere/ROOT/cimv2:test_thing.NAME=\"one\"", "When=00000000000001.500000:000"}),
                "Add\n"
                "    ReturnValue  1 (Not Added)\n"
                "    Sum          65538\n"
-               "    Seen         other root/cimv2 a b when 1500000\n");
+               "    Seen         other ROOT/cimv2 one when 1500000\n");
     expectDone(orvcim({"invoke", thing, "add", "Left=1", "--format", "json"}), R"({
   "method": "Add",
   "returnValue": 1,
@@ -123,22 +123,29 @@ TEST_P(MistakeTest, getsOneClearLineAndItsStatus) {
 
 const std::string noCommand =
     "found no command, expected one of classes, names, instances, get, invoke, associators, associator-names, "
-    "references, reference-names, graph, power status, power reboot, power shutdown, serve, check";
+    "references, reference-names, graph, power status, power reboot, power shutdown, power cancel, serve, check";
+
+std::string withoutCommand(const std::string& word) {
+    return "found no command " + word + noCommand.substr(std::string("found no command").size());
+}
 
 INSTANTIATE_TEST_SUITE_P(
     ofTheCommandLine, MistakeTest,
     testing::Values(Mistake{{}, 2, noCommand}, Mistake{{"power"}, 2, noCommand},
                     Mistake{{"names"}, 2, "CLASS is required (orvcim --help tells what can be done)"},
-                    Mistake{{"nonsense"},
+                    Mistake{{"nonsense"}, 2, withoutCommand("nonsense")},
+                    Mistake{{"power", "off"},
                             2,
-                            "The following argument was not expected: nonsense (orvcim --help tells what can be done)"},
+                            "found no command power off, expected one of power status, power reboot, power shutdown, "
+                            "power cancel"},
+                    Mistake{{"names", "Test_Thing", "more"},
+                            2,
+                            "The following argument was not expected: more (orvcim --help tells what can be done)"},
                     Mistake{{"classes", "--format", "xml"},
                             2,
                             "--format: xml not in {json,mof,table} (orvcim --help tells what can be done)"},
                     Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
-                    Mistake{{"graph", "--format", "json"},
-                            2,
-                            "found --format, expected none: graph writes DOT, or SVG with --svg"}));
+                    Mistake{{"graph", "--format", "json"}, 2, "found --format, expected none: graph writes DOT"}));
 
 INSTANTIATE_TEST_SUITE_P(
     ofNames, MistakeTest,

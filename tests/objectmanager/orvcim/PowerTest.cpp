@@ -16,6 +16,8 @@ using testing::StartsWith;
 
 using Environment = std::map<std::string, std::string>;
 
+constexpr const char* unknownOutcome =
+    "orvcim: the outcome is not known beyond the return value: the agent cannot be observed\n";
 const Environment simulated = {};
 const Environment real = {{"ORVCIM_TEST_MACHINE", "real"}};
 
@@ -92,7 +94,7 @@ TEST(Power, failsWhereTheAgentSaidNothingOfARequest) {
 
 TEST(Power, givesTheResultOfTheMethodWhereTheAgentCannotBeHeard) {
     const Outcome outcome = orvcim({"power", "reboot", "--yes"}, {{"ORVCIM_TEST_MACHINE", "silent"}});
-    EXPECT_EQ(outcome.err, "");
+    EXPECT_EQ(outcome.err, unknownOutcome);
     EXPECT_EQ(outcome.out, "RequestPowerStateChange\n    ReturnValue  0 (Completed with No Error)\n");
     EXPECT_EQ(outcome.status, 0);
 }
@@ -126,8 +128,73 @@ TEST(Power, doesNotTakeAServiceThatIsNotThere) {
     EXPECT_EQ(wrong.status, 1);
 }
 
+/* With what a request names, by the path of the service and of the element. */
+
+const std::string service =
+    "TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\",Name=\"service1\","
+    "SystemCreationClassName=\"TALVO_ComputerSystem\",SystemName=\"testhost\"";
+
+std::string system(const std::string& name) {
+    return "TALVO_ComputerSystem.CreationClassName=\"TALVO_ComputerSystem\",Name=\"" + name + '"';
+}
+
+Outcome request(const std::vector<std::string>& arguments, const Environment& environment = simulated) {
+    std::vector<std::string> command = {"invoke", service, "RequestPowerStateChange"};
+    command.insert(command.end(), arguments.begin(), arguments.end());
+    return orvcim(command, environment);
+}
+
+TEST(PowerRequest, isMadeForTheSystemOfTheService) {
+    for (const std::string& element :
+         {system("testhost"), "//elsewhere.example/root/cimv2:" + system("testhost"),
+          "ROOT/CIMV2:" + system("testhost"),
+          std::string("talvo_computersystem.NAME=\"testhost\",creationCLASSname=\"TALVO_ComputerSystem\"")}) {
+        const Outcome outcome = request({"PowerState=5", "ManagedElement=" + element});
+        EXPECT_EQ(outcome.err, "") << element;
+        EXPECT_EQ(outcome.status, 0) << element;
+    }
+}
+
+TEST(PowerRequest, saysThatItsOutcomeIsNotKnownWhereTheAgentCannotBeHeard) {
+    const Outcome outcome =
+        request({"PowerState=5", "ManagedElement=" + system("testhost")}, {{"ORVCIM_TEST_MACHINE", "silent"}});
+    EXPECT_EQ(outcome.err, unknownOutcome);
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(PowerRequest, isNotMadeWhereNothingIsAssociatedWithTheService) {
+    const Outcome outcome = orvcim({"invoke", "root/unassociated:" + service, "RequestPowerStateChange", "PowerState=5",
+                                    "ManagedElement=" + system("testhost")},
+                                   simulated);
+    EXPECT_THAT(outcome.err, EndsWith("expected an element whose power the service manages: none: the service is "
+                                      "associated with no system\n"));
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST(Power, waitsUntilTheMachineIsThere) {
+    const Outcome outcome = orvcim({"power", "reboot", "--wait"}, simulated);
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_THAT(outcome.out, EndsWith("\ntesthost: 2 (On)\n"));
+    EXPECT_EQ(outcome.status, 0);
+}
+
+TEST(Power, waitsNoLongerThanItIsTold) {
+    const Outcome outcome = orvcim({"power", "shutdown", "--wait=0.01"}, {{"ORVCIM_TEST_STATE", "1"}});
+    EXPECT_EQ(outcome.err,
+              "orvcim: the request is not done after 0.01 s: 'orvcim power status' shows what comes of it\n");
+    EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 8 "));
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST(Power, saysThatItsAgentCannotTakeBackARequest) {
+    const Outcome outcome = orvcim({"power", "cancel"}, simulated);
+    EXPECT_EQ(outcome.err, "orvcim: power cancel: CIM_ERR_NOT_SUPPORTED (7): the agent cannot be asked to take back a "
+                           "power request\n");
+    EXPECT_EQ(outcome.status, 1);
+}
+
 TEST(PowerStatus, showsTheStatesWhereTheyAreServed) {
-    const Outcome outcome = orvcim({"power", "status", "--namespace", "root/associated"}, simulated);
+    const Outcome outcome = orvcim({"power", "status"}, simulated);
     EXPECT_EQ(outcome.err, "");
     EXPECT_EQ(outcome.out, "SYSTEM    SERVICE   POWER STATE\n"
                            "testhost  service1  2 (On)\n");
@@ -135,21 +202,32 @@ TEST(PowerStatus, showsTheStatesWhereTheyAreServed) {
 }
 
 TEST(PowerStatus, givesProgramsTheInstances) {
-    const Outcome outcome = orvcim({"power", "status", "--namespace", "root/associated", "--format", "mof"}, simulated);
+    const Outcome outcome = orvcim({"power", "status", "--format", "mof"}, simulated);
     EXPECT_THAT(outcome.out, StartsWith("instance of TALVO_AssociatedPowerManagementService {\n"
                                         "    ServiceProvided = \""));
     EXPECT_THAT(outcome.out, EndsWith("    PowerState = 2;\n};\n"));
     EXPECT_EQ(outcome.status, 0);
 }
 
+TEST(PowerStatus, failsWhereTheStateIsNotKnown) {
+    for (const char* state : {"0", "none"}) {
+        const Outcome outcome = orvcim({"power", "status"}, {{"ORVCIM_TEST_STATE", state}});
+        EXPECT_EQ(outcome.err, "orvcim: the power state is unknown: 'orvcim check' says what is wrong\n");
+        EXPECT_EQ(outcome.out, "SYSTEM    SERVICE   POWER STATE\n"
+                               "testhost  service1  unknown\n");
+        EXPECT_EQ(outcome.status, 1);
+    }
+}
+
 TEST(PowerStatus, showsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
-    const Outcome outcome = orvcim({"power", "status"}, simulated);
+    const Outcome outcome = orvcim({"power", "status", "--namespace", "root/unassociated"}, simulated);
     EXPECT_EQ(outcome.err, "orvcim: the power state itself is not served: TALVO_AssociatedPowerManagementService is "
-                           "not registered in root/cimv2\n");
+                           "not registered in root/unassociated\n"
+                           "orvcim: the power state is unknown: nobody serves it\n");
     EXPECT_EQ(outcome.out, "SERVICE OR CAPABILITIES  POWER STATES THAT CAN BE ASKED FOR\n"
                            "service1\n"
                            "capabilities1            5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n");
-    EXPECT_EQ(outcome.status, 0);
+    EXPECT_EQ(outcome.status, 1);
 }
 
 } // namespace

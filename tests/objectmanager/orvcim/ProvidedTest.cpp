@@ -170,6 +170,90 @@ TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
     EXPECT_EQ(rebootsIn("3600"), heading + "1 (Other), as while it reboots or shuts down\n");
 }
 
+TEST_F(ProvidedTest, takesBackWhatIsUnderWay) {
+    EXPECT_THAT(orvcim({"power", "cancel"}).err, HasSubstr("no request is in progress"));
+    configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
+    answerOf({"power", "reboot"});
+    EXPECT_THAT(answerOf({"power", "cancel"}), StartsWith("Power request accepted: cancellation of the request of "));
+    EXPECT_THAT(answerOf({"power", "status"}), HasSubstr("2 (On)"));
+    EXPECT_EQ(orvcim({"power", "cancel"}).status, 1);
+}
+
+TEST_F(ProvidedTest, waitsForARebootAndShowsEveryState) {
+    configure("reboot-time = 1\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
+    EXPECT_THAT(answerOf({"power", "reboot", "--wait"}), HasSubstr("\nmachine.example: 2 (On)\n"));
+}
+
+TEST_F(ProvidedTest, switchesNoOtherNodeThanTheOneThatIsNamed) {
+    configure("[[instrumentation.simulated.node]]\npath = \"z\"\n"
+              "[[instrumentation.simulated.node]]\npath = \"a\"\n");
+    const auto service = [](const std::string& node) {
+        return "TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\","
+               "Name=\"PowerStateManagement_" +
+               node + "\",SystemCreationClassName=\"TALVO_ComputerSystem\",SystemName=\"machine.example\"";
+    };
+    const std::vector<std::vector<std::string>> requests = {
+        {"power", "reboot", "--service", service("a")},
+        {"invoke", service("a"), "RequestPowerStateChange", "PowerState=5", "ManagedElement=" + _system}};
+    for (const std::vector<std::string>& request : requests) {
+        const Outcome outcome = orvcim(request);
+        EXPECT_THAT(outcome.err, HasSubstr("found the service PowerStateManagement_a, expected PowerStateManagement_z: "
+                                           "the agent's node z takes all power requests"));
+        EXPECT_EQ(outcome.status, 1);
+    }
+    EXPECT_FALSE(std::filesystem::exists(_folder / "state.json"));
+    EXPECT_THAT(answerOf({"power", "reboot", "--service", service("z")}), HasSubstr("node z"));
+}
+
+TEST_F(ProvidedTest, failsWhereNoStateCanBeRead) {
+    configure("backend = 5\n");
+    const Outcome outcome = orvcim({"power", "status"});
+    EXPECT_THAT(outcome.err, HasSubstr("unknown"));
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+/* Every element that is not the machine: it stays as it is. */
+
+TEST_F(ProvidedTest, makesNoRequestForAnotherElementThanTheMachine) {
+    std::string other = _system;
+    other.replace(other.find("machine.example"), 15, "other.example");
+    const std::pair<std::string, std::string> elements[] = {
+        {"ManagedElement=root/cimv2:TALVO_ComputerSystem", "expected the path of an instance, with its keys"},
+        {"ManagedElement=No_Such.Name=\"machine.example\"", "which is not declared, expected the path of an instance"},
+        {"ManagedElement=machine.example, please", "object path machine.example, please"},
+        {"ManagedElement=", "ManagedElement: "},
+        {"ManagedElement=5", "ManagedElement: "},
+        {"ManagedElement=root/interop" + _system.substr(_system.find(':')), "whose power the service manages"},
+        {"ManagedElement=root/nowhere" + _system.substr(_system.find(':')), "there is no instance root/nowhere:"},
+        {"ManagedElement=" + other, "there is no instance root/cimv2:TALVO_ComputerSystem"},
+        {"ManagedElement=" + _capabilities, "whose power the service manages: root/cimv2:TALVO_ComputerSystem."},
+        {"ManagedElement=" + _service, "whose power the service manages: root/cimv2:TALVO_ComputerSystem."},
+    };
+    for (const auto& [element, reason] : elements) {
+        const Outcome outcome = orvcim({"invoke", _service, "RequestPowerStateChange", "PowerState=5", element});
+        EXPECT_THAT(outcome.err, HasSubstr(reason)) << element;
+        EXPECT_EQ(outcome.out, "") << element;
+        EXPECT_EQ(outcome.status, 1) << element;
+    }
+    const Outcome missing = orvcim({"invoke", _service, "RequestPowerStateChange", "PowerState=5"});
+    EXPECT_THAT(missing.err, HasSubstr("found no argument ManagedElement"));
+    const Outcome twice = orvcim({"invoke", _service, "RequestPowerStateChange", "PowerState=5",
+                                  "ManagedElement=" + _system, "ManagedElement=" + _system});
+    EXPECT_THAT(twice.err, HasSubstr("ManagedElement: found 2 values, expected one"));
+    EXPECT_FALSE(std::filesystem::exists(_folder / "state.json")) << "the machine moved";
+}
+
+TEST_F(ProvidedTest, followsAssociationsOfInstancesOnlyThatAreThere) {
+    std::string other = _service;
+    other.replace(other.find("blade1"), 6, "blade2");
+    for (const char* command : {"associators", "associator-names", "references", "reference-names"}) {
+        EXPECT_EQ(orvcim({command, other}).err,
+                  "orvcim: " + other + ": CIM_ERR_NOT_FOUND (6): there is no such instance\n");
+        EXPECT_THAT(orvcim({command, "No_Such.Name=\"x\""}).err, HasSubstr("CIM_ERR_INVALID_PARAMETER (4)"));
+    }
+}
+
 TEST_F(ProvidedTest, offersNoServiceWhereTheConfigurationIsWrong) {
     configure("backend = 5\n");
     const Outcome outcome = orvcim({"power", "reboot", "--yes"});

@@ -3,8 +3,11 @@
  * whose machine is described by environment variables,
  *
  *     ORVCIM_TEST_SERVICES   how many services there are (1)
- *     ORVCIM_TEST_MACHINE    simulated, real, or silent: an agent whose log cannot be heard (simulated)
+ *     ORVCIM_TEST_STATE      the number of its power state, or none (2)
+ *     ORVCIM_TEST_MACHINE    simulated, real (simulated)
  *     ORVCIM_TEST_ANSWER     accepted, refused, nothing, or the number that the method returns (accepted)
+ *
+ * Built with ORVCIM_TEST_SILENT it has an agent that cannot be observed.
  */
 #include "Norv/Machine.h"
 #include "OrvLog/Observer.h"
@@ -31,7 +34,7 @@ const OrvLog::Observer1* observer = nullptr;
 
 /** Writes a record as the agent's log library does. */
 void log(int level, const std::string& category, const std::string& text, int kind = OrvLog::ORDINARY_RECORD) {
-    if (observer != nullptr && setting("ORVCIM_TEST_MACHINE", "simulated") != "silent") {
+    if (observer != nullptr) {
         const OrvLog::ObservedRecord1 record{kind, level, category.data(), category.size(), text.data(), text.size()};
         observer->record(observer->context, &record);
     }
@@ -252,22 +255,71 @@ struct PowerCapabilities {
     }
 };
 
+struct ComputerSystem {
+    static Instances instances(const CMPIObjectPath* request, const char** properties) {
+        Instances result;
+        for (const char* name : {"testhost", "otherhost"}) {
+            result.push_back(
+                newInstance(request, systemClass, {{"CreationClassName", systemClass}, {"Name", name}}, properties));
+        }
+        return result;
+    }
+};
+
+/** Only the first system is associated with a service: with all of them. */
 struct PowerAssociation {
     static Instances instances(const CMPIObjectPath* request, const char** properties) {
         CMPIObjectPath* service = CMGetObjectPath(PowerService::instances(request, nullptr).front(), nullptr);
-        CMPIObjectPath* system = CMGetObjectPath(
-            newInstance(request, systemClass, {{"CreationClassName", systemClass}, {"Name", "testhost"}}, nullptr),
-            nullptr);
+        CMPIObjectPath* system = CMGetObjectPath(ComputerSystem::instances(request, nullptr).front(), nullptr);
         CMPIInstance* instance = newInstance(request, "TALVO_AssociatedPowerManagementService", {}, properties);
-        CMPIUint16 state = 2;
+        const std::string given = setting("ORVCIM_TEST_STATE", "2");
         CMSetProperty(instance, "ServiceProvided", &service, CMPI_ref);
         CMSetProperty(instance, "UserOfService", &system, CMPI_ref);
-        CMSetProperty(instance, "PowerState", &state, CMPI_uint16);
+        if (given != "none") {
+            const auto state = static_cast<CMPIUint16>(std::stoi(given));
+            CMSetProperty(instance, "PowerState", &state, CMPI_uint16);
+        }
         return {instance};
+    }
+
+    static CMPIStatus associatorNames(CMPIAssociationMI*, const CMPIContext*, const CMPIResult* result,
+                                      const CMPIObjectPath* source, const char*, const char*, const char*,
+                                      const char*) {
+        const bool fromSystem = textOf(CMGetClassName(source, nullptr)) == systemClass;
+        const Instances found = fromSystem ? PowerService::instances(source, nullptr)
+                                           : Instances{ComputerSystem::instances(source, nullptr).front()};
+        for (CMPIInstance* instance : found) {
+            CMReturnObjectPath(result, CMGetObjectPath(instance, nullptr));
+        }
+        return done(result);
+    }
+
+    static CMPIAssociationMI* associationMI(const CMPIBroker* given) {
+        using Path = const CMPIObjectPath*;
+        static CMPIAssociationMIFT table = {
+            CMPIVersion200,
+            CMPIVersion200,
+            "associationPowerAssociation",
+            [](CMPIAssociationMI*, const CMPIContext*, CMPIBoolean) {
+                return CMPIStatus{CMPI_RC_OK, nullptr};
+            },
+            [](CMPIAssociationMI*, const CMPIContext*, const CMPIResult*, Path, const char*, const char*, const char*,
+               const char*, const char**) { return Provider<Thing>::refuse(); },
+            associatorNames,
+            [](CMPIAssociationMI*, const CMPIContext*, const CMPIResult*, Path, const char*, const char*,
+               const char**) { return Provider<Thing>::refuse(); },
+            [](CMPIAssociationMI*, const CMPIContext*, const CMPIResult*, Path, const char*, const char*) {
+                return Provider<Thing>::refuse();
+            }};
+        static CMPIAssociationMI mi = {nullptr, &table};
+        broker = given;
+        return &mi;
     }
 };
 
 } // namespace
+
+#ifndef ORVCIM_TEST_SILENT
 
 void orvLogObserve1(const OrvLog::Observer1* given) {
     observer = given;
@@ -276,6 +328,8 @@ void orvLogObserve1(const OrvLog::Observer1* given) {
 int orvInstrumentationMachine1() {
     return setting("ORVCIM_TEST_MACHINE", "simulated") == "simulated" ? Norv::SIMULATED_MACHINE : Norv::REAL_MACHINE;
 }
+
+#endif
 
 #define INSTANCE_FACTORY(P)                                                                                            \
     CMPI_EXTERN_C CMPIInstanceMI* P##_Create_InstanceMI(const CMPIBroker* given, const CMPIContext*, CMPIStatus*) {    \
@@ -292,3 +346,9 @@ INSTANCE_FACTORY(PowerService)
 METHOD_FACTORY(PowerService)
 INSTANCE_FACTORY(PowerCapabilities)
 INSTANCE_FACTORY(PowerAssociation)
+INSTANCE_FACTORY(ComputerSystem)
+
+CMPI_EXTERN_C CMPIAssociationMI* PowerAssociation_Create_AssociationMI(const CMPIBroker* given, const CMPIContext*,
+                                                                       CMPIStatus*) {
+    return PowerAssociation::associationMI(given);
+}

@@ -1,0 +1,83 @@
+#include "audit/CallRecord.h"
+
+#include "audit/Journal.h"
+
+#include <fmt/chrono.h>
+#include <fmt/format.h>
+
+#include <memory>
+#include <utility>
+
+namespace ObjectManager::Audit {
+
+namespace {
+
+bool isControl(unsigned char c) {
+    constexpr unsigned char blank = 0x20;
+    constexpr unsigned char del = 0x7f;
+    return c < blank || c == del;
+}
+
+bool continuesCharacter(unsigned char c) {
+    constexpr unsigned char mask = 0xc0;
+    constexpr unsigned char continuation = 0x80;
+    return (c & mask) == continuation;
+}
+
+/** The journal's fields; those of systemd.journal-fields(7) and our own. */
+Journal::Fields fieldsOf(const CallRecord& record) {
+    // The priorities of syslog(3): notice and warning.
+    const char* const priority = record.verdict == Verdict::accepted ? "5" : "4";
+    return {{"MESSAGE", messageOf(record)},      {"PRIORITY", priority},
+            {"SYSLOG_IDENTIFIER", "orvcim"},     {"ORV_USER", record.user},
+            {"ORV_ADDRESS", record.address},     {"ORV_TARGET", record.target},
+            {"ORV_CLASS", record.className},     {"ORV_METHOD", record.method},
+            {"ORV_ARGUMENTS", record.arguments}, {"ORV_OUTCOME", std::string(nameOf(record.verdict))},
+            {"ORV_REASON", record.reason}};
+}
+
+} // namespace
+
+std::string_view nameOf(Verdict verdict) {
+    switch (verdict) {
+    case Verdict::accepted:
+        return "accepted";
+    case Verdict::refused:
+        return "refused";
+    case Verdict::denied:
+        break;
+    }
+    return "denied";
+}
+
+std::string inOneLine(std::string_view text, std::size_t longest) {
+    std::string line;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (line.size() >= longest && !continuesCharacter(byte)) {
+            return line + "...";
+        }
+        line += isControl(byte) ? fmt::format("\\x{:02x}", byte) : std::string(1, c);
+    }
+    return line;
+}
+
+std::string messageOf(const CallRecord& record) {
+    return fmt::format("{} {}: {}{}{}({}) of {}: {}{}{}", record.address,
+                       record.user.empty() ? "somebody without a log-in" : record.user, record.className,
+                       record.className.empty() ? "" : ".", record.method, record.arguments, record.target,
+                       nameOf(record.verdict), record.reason.empty() ? "" : ": ", record.reason);
+}
+
+Recorder makeRecorder(std::function<void(const std::string& line)> log) {
+    const auto journal = std::make_shared<const Journal>();
+    return [journal, log = std::move(log)](const CallRecord& record) {
+        if (!journal->write(fieldsOf(record))) {
+            const auto time = std::chrono::floor<std::chrono::seconds>(record.time);
+            log(fmt::format("{:%Y-%m-%dT%H:%M:%SZ} {}", fmt::gmtime(std::chrono::system_clock::to_time_t(time)),
+                            messageOf(record)));
+        }
+    };
+}
+
+} // namespace ObjectManager::Audit

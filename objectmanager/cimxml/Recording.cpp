@@ -1,0 +1,92 @@
+#include "cimxml/Recording.h"
+
+#include "cimxml/ValueReader.h"
+#include "text/MofText.h"
+#include "text/ObjectPathText.h"
+
+#include <algorithm>
+#include <functional>
+#include <string_view>
+
+namespace ObjectManager::CimXml {
+
+namespace {
+
+using Audit::inOneLine;
+
+/** Without quotes where nobody can take it for more than one word. */
+std::string valueText(const std::string& text) {
+    constexpr std::string_view wordCharacters = "+-.0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
+    return !text.empty() && text.find_first_not_of(wordCharacters) == std::string::npos ? text
+                                                                                        : mofLiteral(stringValue(text));
+}
+
+std::string attributeOf(const XmlElement& element, std::string_view name) {
+    const std::string* const value = element.attribute(name);
+    return value == nullptr ? std::string() : *value;
+}
+
+/** The path that `read` gives; `otherwise` where there is none to be read. */
+std::string pathText(const std::function<ObjectPath()>& read, const std::string& otherwise) {
+    try {
+        return formatObjectPath(read());
+    } catch (const std::exception&) {
+        return otherwise;
+    }
+}
+
+std::string textOf(const XmlElement& element, const ValueReader& reader) {
+    if (element.name == "VALUE") {
+        return valueText(element.text);
+    }
+    if (element.name == "VALUE.REFERENCE") {
+        return pathText([&] { return reader.reference(element); }, "a reference that names nothing");
+    }
+    if (element.name == "INSTANCENAME") {
+        return pathText([&] { return reader.instanceName(element); }, attributeOf(element, "CLASSNAME"));
+    }
+    if (element.name == "CLASSNAME") {
+        return attributeOf(element, "NAME");
+    }
+    std::string text;
+    for (const XmlElement& child : element.children) {
+        text += (text.empty() ? "" : ", ") + textOf(child, reader);
+    }
+    return element.name + " {" + text + '}';
+}
+
+std::string argumentsText(const Message& message, const ValueReader& reader) {
+    std::string text;
+    for (const Argument& argument : message.arguments()) {
+        text += (text.empty() ? "" : ", ") + argument.name + '=' +
+                (argument.content == nullptr ? "NULL" : textOf(*argument.content, reader));
+    }
+    return text;
+}
+
+} // namespace
+
+Audit::CallRecord recordOf(const Message& message, const Server::Caller& caller, const Catalogue& catalogue,
+                           Audit::Verdict verdict, const std::string& reason) {
+    const ValueReader reader(catalogue, message.nameSpace());
+    std::string target = message.nameSpace();
+    std::string className;
+    if (!message.isIntrinsic()) {
+        const XmlElement& named = message.target();
+        const bool isClass = named.name == "CLASSNAME";
+        className = attributeOf(named, isClass ? "NAME" : "CLASSNAME");
+        target = pathText([&] { return isClass ? reader.className(named) : reader.instanceName(named); },
+                          target + ':' + className);
+    }
+    return {std::chrono::system_clock::now(),
+            caller.address,
+            caller.user,
+            inOneLine(target),
+            inOneLine(className),
+            inOneLine(message.method()),
+            inOneLine(argumentsText(message, reader)),
+            verdict,
+            inOneLine(reason)};
+}
+
+} // namespace ObjectManager::CimXml

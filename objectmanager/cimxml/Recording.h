@@ -1,0 +1,20 @@
+/** What is recorded of a message: who asked for what, in the client's own words. */
+#ifndef CIMXML_RECORDING_H
+#define CIMXML_RECORDING_H
+
+#include "audit/CallRecord.h"
+#include "cimxml/RequestReader.h"
+#include "classes/Catalogue.h"
+#include "server/HttpMessage.h"
+
+#include <string>
+
+namespace ObjectManager::CimXml {
+
+/** Texts are in one line and bounded. What makes no sense is given as far as it can be read. */
+Audit::CallRecord recordOf(const Message& message, const Server::Caller& caller, const Catalogue& catalogue,
+                           Audit::Verdict verdict, const std::string& reason);
+
+} // namespace ObjectManager::CimXml
+
+#endif

@@ -1,0 +1,193 @@
+/* Every wrong way to ask for a reboot: the machine does not move, the client knows why, and the log says who. */
+#include "Serving.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <array>
+
+namespace OrvcimTest {
+namespace {
+
+using testing::AllOf;
+using testing::EndsWith;
+using testing::HasSubstr;
+using testing::MatchesRegex;
+using testing::Not;
+
+constexpr const char* alice = "root:top";
+constexpr const char* bob = "nobody:small";
+
+class WrongRequestTest : public ServingTest {
+protected:
+    using Environment = std::map<std::string, std::string>;
+
+    /** Serves root, who may do everything, and nobody, who may read. */
+    void serveUsers(const Environment& environment = {}, std::vector<std::string> options = {}) {
+        std::vector<std::string> arguments = {
+            ORVCIM_PROGRAM, "serve", "--port=0", "--authenticate", "--pam-folder", makeUsers(), "--power-group=daemon"};
+        arguments.insert(arguments.end(), options.begin(), options.end());
+        Environment all = {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"LC_ALL", "C"}};
+        all.insert(environment.begin(), environment.end());
+        _server = std::make_unique<RunningProcess>(arguments, all);
+        const std::string line = _server->firstLine();
+        ASSERT_NE(line, "") << _server->err();
+        _port = line.substr(line.rfind(':') + 1);
+    }
+
+    Outcome reboot(const std::string& element, const std::string& user = alice) const {
+        return wbemcli({"cm", url(_service, user), "RequestPowerStateChange.PowerState=5,ManagedElement=" + element});
+    }
+
+    /** The machine is as it was, the client was told `reason`, and the log names him beside it. */
+    void expectRefused(const Outcome& outcome, const std::string& reason, const std::string& user = "root",
+                       const std::string& verdict = "refused") const {
+        EXPECT_NE(outcome.status, 0);
+        EXPECT_THAT(outcome.out + outcome.err, HasSubstr(reason));
+        EXPECT_FALSE(std::filesystem::exists(_folder / "state.json")) << "the machine moved";
+        EXPECT_THAT(_server->err(),
+                    AllOf(HasSubstr("Z 127.0.0.1 " + user +
+                                    ": TALVO_PowerManagementService.RequestPowerStateChange(PowerState=5, "
+                                    "ManagedElement="),
+                          HasSubstr(": " + verdict + ": "), HasSubstr(reason)));
+    }
+};
+
+TEST_F(WrongRequestTest, namesAnotherMachine) {
+    serveUsers();
+    std::string other = _system;
+    other.replace(other.find("machine.example"), 15, "other.example");
+    expectRefused(reboot(other), "there is no instance root/cimv2:TALVO_ComputerSystem.");
+}
+
+TEST_F(WrongRequestTest, namesAnotherClass) {
+    serveUsers();
+    expectRefused(reboot(_capabilities), "expected an element whose power the service manages: root/cimv2:TALVO_Comp");
+}
+
+TEST_F(WrongRequestTest, namesNoInstance) {
+    serveUsers();
+    expectRefused(reboot("root/cimv2:TALVO_ComputerSystem"), "ManagedElement: found ");
+}
+
+TEST_F(WrongRequestTest, hasAnotherType) {
+    serveUsers();
+    expectRefused(reboot("5"), "ManagedElement: ");
+}
+
+TEST_F(WrongRequestTest, comesFromAUserWithoutRights) {
+    serveUsers();
+    expectRefused(reboot(_system, bob), "nobody may read, but not change anything", "nobody", "denied");
+}
+
+TEST_F(WrongRequestTest, findsNoAgent) {
+    std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
+    serveUsers();
+    expectRefused(reboot(_system), "expected \"simulated\"");
+}
+
+TEST_F(WrongRequestTest, findsAFullDisk) {
+    // Nothing can be logged by the agent either.
+    serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, {"TEST_FULL_FOLDER", _folder.string()}});
+    expectRefused(reboot(_system), "No space left on device");
+}
+
+TEST_F(WrongRequestTest, isNotHeardToHaveBeenAccepted) {
+    serveUsers({{"ORVCIM_TEST_ANSWER", "nothing"}},
+               {"--schema", ORVCIM_TEST_SCHEMA, "--provider-path", ORVCIM_TEST_LIBRARIES});
+    const std::string service =
+        "root/cimv2:TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\",Name=\"service1\","
+        "SystemCreationClassName=\"TALVO_ComputerSystem\",SystemName=\"testhost\"";
+    expectRefused(wbemcli({"cm", url(service, alice),
+                           "RequestPowerStateChange.PowerState=5,ManagedElement=root/cimv2:TALVO_ComputerSystem."
+                           "CreationClassName=\"TALVO_ComputerSystem\",Name=\"testhost\""}),
+                  "ended without a failure, but the agent accepted no power request");
+}
+
+/* The right way, to compare, and requests that are none for another power state. */
+
+TEST_F(WrongRequestTest, isNoneWhereEverythingIsRight) {
+    serveUsers();
+    EXPECT_THAT(reboot(_system).out, EndsWith("RequestPowerStateChange: 0\n"));
+    EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
+    EXPECT_THAT(_server->err(), AllOf(HasSubstr("Z 127.0.0.1 root: TALVO_PowerManagementService.Request"),
+                                      HasSubstr(": accepted: Power request accepted: reboot of simulated node"),
+                                      HasSubstr("on behalf of root from 127.0.0.1]\n")));
+}
+
+TEST_F(WrongRequestTest, isRecordedWhateverItAsksFor) {
+    serveUsers();
+    wbemcli({"di", url(_system, bob)});
+    EXPECT_THAT(_server->err(), MatchesRegex("orvcim: [0-9TZ:-]* 127.0.0.1 nobody: DeleteInstance\\(InstanceName=.*\\) "
+                                             "of root/cimv2: denied: nobody may read, but not change anything\n"));
+    wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", bob)});
+    EXPECT_THAT(_server->err(), Not(HasSubstr("EnumerateInstanceNames")));
+}
+
+/** A socket that takes what is sent to the journal. */
+class Journal {
+public:
+    explicit Journal(const std::filesystem::path& file) {
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        file.string().copy(static_cast<char*>(address.sun_path), sizeof address.sun_path - 1);
+        EXPECT_EQ(bind(_socket, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        const timeval longest{30, 0};
+        setsockopt(_socket, SOL_SOCKET, SO_RCVTIMEO, &longest, sizeof longest);
+    }
+    Journal(const Journal&) = delete;
+    Journal& operator=(const Journal&) = delete;
+    ~Journal() { close(_socket); }
+
+    /** The next entry, when it has come. */
+    std::string entry() const {
+        std::array<char, 65536> bytes{};
+        const ssize_t size = recv(_socket, bytes.data(), bytes.size(), 0);
+        return {bytes.data(), size < 0 ? 0 : static_cast<std::size_t>(size)};
+    }
+
+private:
+    const int _socket = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+};
+
+TEST_F(WrongRequestTest, isAnEntryOfTheJournalWithFieldsUnderSystemd) {
+    const Journal journal(_folder / "journal");
+    const std::vector<std::string> command = {"/bin/sh",
+                                              "-c",
+                                              "JOURNAL_STREAM=$(stat -L -c %d:%i /proc/self/fd/2) exec \"$0\" \"$@\"",
+                                              ORVCIM_PROGRAM,
+                                              "serve",
+                                              "--port=0",
+                                              "--authenticate",
+                                              "--pam-folder",
+                                              makeUsers(),
+                                              "--power-group=daemon"};
+    _server =
+        std::make_unique<RunningProcess>(command, Environment{{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
+                                                              {"LC_ALL", "C"},
+                                                              {"LD_PRELOAD", TEST_JOURNAL_REDIRECT},
+                                                              {"TEST_JOURNAL_SOCKET", (_folder / "journal").string()}});
+    const std::string line = _server->firstLine();
+    ASSERT_NE(line, "") << _server->err();
+    _port = line.substr(line.rfind(':') + 1);
+
+    reboot(_system, bob);
+    const std::string entry = journal.entry();
+    for (const char* field :
+         {"ORV_USER=nobody\n", "ORV_ADDRESS=127.0.0.1\n", "ORV_CLASS=TALVO_PowerManagementService\n",
+          "ORV_METHOD=RequestPowerStateChange\n", "ORV_ARGUMENTS=PowerState=5, ManagedElement=", "ORV_OUTCOME=denied\n",
+          "ORV_REASON=nobody may read, but not change anything\n", "PRIORITY=4\n", "SYSLOG_IDENTIFIER=orvcim\n",
+          "MESSAGE=127.0.0.1 nobody: TALVO_PowerManagementService.Request"}) {
+        EXPECT_THAT(entry, HasSubstr(field));
+    }
+    reboot(_system, alice);
+    EXPECT_THAT(journal.entry(), AllOf(HasSubstr("ORV_USER=root\n"), HasSubstr("ORV_OUTCOME=accepted\n"),
+                                       HasSubstr("ORV_REASON=Power request accepted: reboot of simulated node")));
+    EXPECT_EQ(_server->err(), "");
+}
+
+} // namespace
+} // namespace OrvcimTest

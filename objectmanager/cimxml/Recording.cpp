@@ -14,6 +14,10 @@ namespace {
 
 using Audit::inOneLine;
 
+/* In bytes, so that a line of the log, which is cut at 1000, has room for what became of the call. */
+constexpr std::size_t longestText = 300;
+constexpr std::size_t longestName = 80;
+
 /** Without quotes where nobody can take it for more than one word. */
 std::string valueText(const std::string& text) {
     constexpr std::string_view wordCharacters = "+-.0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
@@ -81,10 +85,10 @@ Audit::CallRecord recordOf(const Message& message, const Server::Caller& caller,
     return {std::chrono::system_clock::now(),
             caller.address,
             caller.user,
-            inOneLine(target),
-            inOneLine(className),
-            inOneLine(message.method()),
-            inOneLine(argumentsText(message, reader)),
+            inOneLine(target, longestText),
+            inOneLine(className, longestName),
+            inOneLine(message.method(), longestName),
+            inOneLine(argumentsText(message, reader), longestText),
             verdict,
             inOneLine(reason)};
 }

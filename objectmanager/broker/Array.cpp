@@ -69,7 +69,7 @@ CMPIBoolean hasNext(const CMPIEnumeration* self, CMPIStatus* rc) {
     return enumeration != nullptr && enumeration->next < enumeration->elements.count ? 1 : 0;
 }
 
-/** All elements, those that getNext gave already among them. */
+/** All elements, including those that getNext has already given. */
 CMPIArray* toArray(const CMPIEnumeration* self, CMPIStatus* rc) {
     const EnumerationContent* enumeration = contentOf(self, rc);
     return enumeration != nullptr ? returnedCopy<CMPIArray>(enumeration->elements, rc) : nullptr;

@@ -6,14 +6,14 @@ namespace ObjectManager {
 
 namespace {
 
-template <class T>
+template <typename T>
 T scalarOf(const Item& item) {
     T value{};
     std::memcpy(&value, &item.content.scalar, sizeof value);
     return value;
 }
 
-template <class T>
+template <typename T>
 Item scalarItem(CMPIType type, T value) {
     Item item{type, false, 0, {}};
     std::memcpy(&item.content.scalar, &value, sizeof value);

@@ -32,7 +32,7 @@ void dropText(Memory& memory, Text text);
 void assignText(Memory& memory, Text& target, std::string_view text);
 
 /** A growing array. */
-template <class T>
+template <typename T>
 struct List {
     T* items = nullptr;
     std::uint32_t size = 0;
@@ -190,13 +190,13 @@ void drop(Memory& memory, DateTimeContent& dateTime);
 void drop(Memory& memory, ErrorContent& error);
 
 /** A copy of `content` in a block of its own. */
-template <class T>
+template <typename T>
 T* place(Memory& memory, const T& content) {
     return new (memory.allocate(sizeof(T), alignof(T))) T(copy(memory, content));
 }
 
 /** Drops `content` and its block. */
-template <class T>
+template <typename T>
 void displace(Memory& memory, T* content) {
     drop(memory, *content);
     memory.deallocate(content, sizeof(T), alignof(T));

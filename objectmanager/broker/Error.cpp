@@ -23,7 +23,7 @@ CMPIStatus setText(const CMPIError* self, const char* text) {
     return status;
 }
 
-/** What an unset code reads as is 0, as everywhere in CIM_Error. */
+/** A code that was not set reads as 0, as everywhere in CIM_Error. */
 template <auto member>
 auto getCode(const CMPIError* self, CMPIStatus* rc) {
     const ErrorContent* error = contentOf(self, rc);

@@ -174,7 +174,7 @@ CMPIString* toString(const CMPIBroker*, const void* object, CMPIStatus* rc) {
     return text;
 }
 
-template <class Handle>
+template <typename Handle>
 const char* kindName(const Handle*) {
     return Kind<Handle>::name;
 }

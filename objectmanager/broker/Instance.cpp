@@ -82,7 +82,7 @@ CMPIStatus setObjectPath(const CMPIInstance* self, const CMPIObjectPath* path) {
     return status;
 }
 
-/** Where a property was declared is for the schema to say. */
+/** The class of origin is ignored: the schema says where a property was declared. */
 CMPIStatus setPropertyWithOrigin(const CMPIInstance* self, const char* name, const CMPIValue* value,
                                  const CMPIType type, const char*) {
     return setProperty(self, name, value, type);

@@ -5,7 +5,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** In front of each block that a provider gets, since it gives back the address alone. */
+/** Stands in front of each block that a provider gets: the provider gives back the address, not the size. */
 struct alignas(std::max_align_t) BlockHead {
     std::size_t bytes;
 };
@@ -14,7 +14,7 @@ BlockHead* headOf(void* block) {
     return static_cast<BlockHead*>(block) - 1;
 }
 
-/** A mark in a request in which nothing was made yet; marks are the newest object's address otherwise. */
+/** The mark of a request in which no object was made yet. Every other mark is the address of the newest object. */
 char emptyMark;
 
 CMPIGcStat* mark(const CMPIBroker* broker, CMPIStatus* rc) {
@@ -25,7 +25,7 @@ CMPIGcStat* mark(const CMPIBroker* broker, CMPIStatus* rc) {
     return request->newest() != nullptr ? static_cast<void*>(request->newest()) : &emptyMark;
 }
 
-/** Releases what was made since the mark and not released yet. */
+/** Releases the objects that were made since the mark and are not released yet. */
 CMPIStatus releaseMark(const CMPIBroker* broker, const CMPIGcStat* mark) {
     CMPIStatus status;
     const Request* request = requestFor(&status);
@@ -41,7 +41,7 @@ CMPIStatus releaseMark(const CMPIBroker* broker, const CMPIGcStat* mark) {
         return statusOf(CMPI_RC_ERR_INVALID_HANDLE);
     }
     for (object = request->newest(); object != last; object = object->previous) {
-        visitObject(object, [&]<class Handle>(const Handle*) {
+        visitObject(object, [&]<typename Handle>(const Handle*) {
             if (object->hdl != nullptr) {
                 dropContent<Handle>(*object);
             }
@@ -95,7 +95,7 @@ char* cmpiStrDup(const CMPIBroker* broker, const char* text) {
     return copy != nullptr ? static_cast<char*>(std::memcpy(copy, text, bytes)) : nullptr;
 }
 
-template <class Handle>
+template <typename Handle>
 void freeObject(const CMPIBroker*, Handle* object) {
     release(object);
 }

@@ -46,7 +46,7 @@ CMPIrc readText(Memory& memory, CMPIType type, const char* text, Item& item) {
 }
 
 /** Reads the object of an encapsulated type: `store` copies its content into the item. */
-template <class Handle, class Store>
+template <typename Handle, typename Store>
 CMPIrc readObject(CMPIType type, const Handle* object, Item& item, Store store) {
     Item read{type, object == nullptr, 0, {}};
     if (object != nullptr) {
@@ -83,8 +83,8 @@ CMPIrc readArray(Memory& memory, CMPIType type, const CMPIArray* array, Item& it
     return CMPI_RC_OK;
 }
 
-/** Calls `add` with each property that is a key, where the path has no keys and all of them are set. */
-template <class Add>
+/** Where the path has no keys and every key property is set, calls `add` with each of these properties. */
+template <typename Add>
 void forMissingKeys(const InstanceContent& instance, const ClassInformation* classes, Add add) {
     if (instance.path.keys.size != 0) {
         return;

@@ -39,10 +39,10 @@ extern const CMPIBrokerExtFT operatingSystemTable;
 extern const CMPIBrokerMemFT memoryTable;
 
 /** Of a handle type: what its `hdl` points to, its function table and its name. */
-template <class Handle>
+template <typename Handle>
 struct Kind;
 
-template <class ContentType, const auto& functionTable>
+template <typename ContentType, const auto& functionTable>
 struct KindOf {
     using Content = ContentType;
     static constexpr const auto& table = functionTable;
@@ -103,14 +103,14 @@ struct ObjectHeader {
 };
 
 /** The handle that providers hold, and behind it what is ours; laid out as ObjectHeader. */
-template <class Handle>
+template <typename Handle>
 struct Shell {
     Handle handle;
     Memory* memory;
     ObjectHeader* previous;
 };
 
-template <class Handle>
+template <typename Handle>
 Handle* newShell(Memory& memory, void* content) {
     static_assert(sizeof(Shell<Handle>) == sizeof(ObjectHeader) && alignof(Shell<Handle>) == alignof(ObjectHeader));
     auto* shell = new (memory.allocate(sizeof(ObjectHeader), alignof(ObjectHeader)))
@@ -118,7 +118,7 @@ Handle* newShell(Memory& memory, void* content) {
     return &shell->handle;
 }
 
-template <class Handle>
+template <typename Handle>
 ObjectHeader& headerOf(const Handle* object) {
     return *reinterpret_cast<ObjectHeader*>(const_cast<Handle*>(object));
 }
@@ -155,7 +155,7 @@ inline CMPIData noData(CMPIStatus* rc, CMPIrc code) {
 void reportMisuse(const std::string& what);
 
 /** What the object holds; null, with `rc` set, where it holds nothing. Sets `rc` to CMPI_RC_OK otherwise. */
-template <class Handle>
+template <typename Handle>
 typename Kind<Handle>::Content* contentOf(const Handle* object, CMPIStatus* rc) {
     if (object == nullptr || object->ft != &Kind<Handle>::table) {
         return failure(rc, CMPI_RC_ERR_INVALID_HANDLE);
@@ -169,7 +169,7 @@ typename Kind<Handle>::Content* contentOf(const Handle* object, CMPIStatus* rc) 
 }
 
 /** As `contentOf`, of a path or instance that is to be changed: what a result keeps of it stays as it is. */
-template <class Handle>
+template <typename Handle>
 typename Kind<Handle>::Content* changeableContentOf(const Handle* object, CMPIStatus* rc) {
     auto* content = contentOf(object, rc);
     if (content == nullptr || !content->returned) {
@@ -182,7 +182,7 @@ typename Kind<Handle>::Content* changeableContentOf(const Handle* object, CMPISt
 }
 
 /** An object of the current request that takes over `content`, which lies in the request's memory. */
-template <class Handle>
+template <typename Handle>
 Handle* newObject(Request& request, typename Kind<Handle>::Content* content) {
     auto* object = newShell<Handle>(request.memory(), content);
     request.adopt(headerOf(object));
@@ -190,7 +190,7 @@ Handle* newObject(Request& request, typename Kind<Handle>::Content* content) {
 }
 
 /** An object of the current request that takes over what `content` points to. */
-template <class Handle>
+template <typename Handle>
 Handle* newObjectOf(Request& request, const typename Kind<Handle>::Content& content) {
     using Content = typename Kind<Handle>::Content;
     return newObject<Handle>(request,
@@ -206,14 +206,14 @@ Request* requestFor(CMPIStatus* rc);
 CMPIString* returnedString(const char* text, CMPIStatus* rc);
 
 /** An object of its own with a copy of `content`, or null with `rc` set where the thread has no request. */
-template <class Handle>
+template <typename Handle>
 Handle* returnedCopy(const typename Kind<Handle>::Content& content, CMPIStatus* rc) {
     Request* request = requestFor(rc);
     return request != nullptr ? newObject<Handle>(*request, place(request->memory(), content)) : nullptr;
 }
 
 /** Gives back what an object holds and nobody else keeps. */
-template <class Handle>
+template <typename Handle>
 void dropContent(ObjectHeader& object) {
     auto* content = static_cast<typename Kind<Handle>::Content*>(std::exchange(object.hdl, nullptr));
     if constexpr (std::is_same_v<Handle, CMPIString>) {
@@ -234,7 +234,7 @@ void deleteShell(ObjectHeader& clone);
 
 /* The slots that are the same for every kind. */
 
-template <class Handle>
+template <typename Handle>
 CMPIStatus release(Handle* object) {
     if (object == nullptr || object->ft != &Kind<Handle>::table) {
         return statusOf(CMPI_RC_ERR_INVALID_HANDLE);
@@ -251,7 +251,7 @@ CMPIStatus release(Handle* object) {
     return statusOf(CMPI_RC_OK);
 }
 
-template <class Handle>
+template <typename Handle>
 Handle* clone(const Handle* object, CMPIStatus* rc) {
     const auto* content = contentOf(object, rc);
     if (content == nullptr) {
@@ -268,7 +268,7 @@ Handle* clone(const Handle* object, CMPIStatus* rc) {
 }
 
 /** Calls `visit` with the object as what it is; whether it is a CMPI object of ours. */
-template <class Visitor>
+template <typename Visitor>
 bool visitObject(const void* object, Visitor visit) {
     struct {
         void* hdl;
@@ -278,7 +278,7 @@ bool visitObject(const void* object, Visitor visit) {
         return false;
     }
     std::memcpy(&handle, object, sizeof handle);
-    const auto tryKind = [&]<class Handle>(const Handle*) {
+    const auto tryKind = [&]<typename Handle>(const Handle*) {
         if (handle.ft != &Kind<Handle>::table) {
             return false;
         }

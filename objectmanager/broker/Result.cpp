@@ -5,14 +5,14 @@ namespace ObjectManager {
 namespace {
 
 /** Calls a member of the result that the handle stands for. */
-template <class... Arguments>
+template <typename... Arguments>
 CMPIStatus forward(const CMPIResult* self, CMPIStatus (Result::*member)(Arguments...), Arguments... arguments) {
     CMPIStatus status;
     Result* result = contentOf(self, &status);
     return result != nullptr ? (result->*member)(arguments...) : status;
 }
 
-/** A result is the object manager's own, of which there is one. */
+/** An operation has one result, which belongs to the object manager: it cannot be copied. */
 CMPIResult* refuseClone(const CMPIResult* self, CMPIStatus* rc) {
     return contentOf(self, rc) != nullptr ? failure(rc, CMPI_RC_ERR_NOT_SUPPORTED) : nullptr;
 }
@@ -38,7 +38,7 @@ CMPIStatus returnError(const CMPIResult* self, const CMPIError* error) {
 }
 
 /** The content of an object that a provider returned; where there is none, the request learns what was wrong. */
-template <class Handle>
+template <typename Handle>
 auto* returned(Request& request, const Handle* object, CMPIStatus& status) {
     auto* content = contentOf(object, &status);
     if (content == nullptr) {
@@ -67,8 +67,11 @@ bool Result::open(const char* attempt) {
     return !_closed;
 }
 
-/** The content as it is now: the object parts with it before it is changed, or a copy where it is not ours. */
-template <class Handle, class Content>
+/**
+ * The content as it is now. An object of this request is marked, so that it copies its content before it is changed;
+ * the content of any other object is copied here.
+ */
+template <typename Handle, typename Content>
 const Content* Result::keep(const Handle* object, Content& content) {
     if (headerOf(object).memory != &_request.memory()) {
         return place(_request.memory(), content);

@@ -50,7 +50,7 @@ public:
 
 private:
     bool open(const char* attempt);
-    template <class Handle, class Content>
+    template <typename Handle, typename Content>
     const Content* keep(const Handle* object, Content& content);
 
     Request& _request;

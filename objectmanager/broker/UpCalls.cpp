@@ -30,10 +30,10 @@ CMPIStatus failed(CMPIrc code, const std::string& message) {
 }
 
 /**
- * Does one up-call: `call` gets what answers it, the request to make objects in, and who asks. What it throws becomes
- * the status.
+ * Does one up-call: `call` gets the operations that answer it, the request in which it makes objects, and on whose
+ * behalf the provider asks. What `call` throws becomes the status.
  */
-template <class Call>
+template <typename Call>
 CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call call) {
     if (handle == nullptr) {
         return statusOf(CMPI_RC_ERR_INVALID_HANDLE);
@@ -64,7 +64,7 @@ CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call cal
 }
 
 /** As `upCall`, for calls on an object path. */
-template <class Call>
+template <typename Call>
 CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path, Call call) {
     CMPIStatus status;
     const PathContent* content = contentOf(path, &status);
@@ -77,7 +77,7 @@ CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const 
 }
 
 /** As `pathCall`, for calls that bring an instance. */
-template <class Call>
+template <typename Call>
 CMPIStatus instanceCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                         const CMPIInstance* instance, Call call) {
     CMPIStatus status;
@@ -97,7 +97,7 @@ class Elements {
 public:
     Elements(Request& request, CMPIType type) : _request(request), _type(type) {}
 
-    template <class Object>
+    template <typename Object>
     void add(Object&& object) {
         const Value value{_type, std::make_shared<const Object>(std::forward<Object>(object))};
         _items.push_back(fromModel(_request.memory(), value));
@@ -116,8 +116,8 @@ private:
     std::vector<Item> _items;
 };
 
-/** Gives `object` where the call went well; the status, where it is wanted. */
-template <class Handle>
+/** The object, or null where the call failed. Sets `rc`, where it is not null, to the status. */
+template <typename Handle>
 Handle* answer(Handle* object, const CMPIStatus& status, CMPIStatus* rc) {
     if (rc != nullptr) {
         *rc = status;
@@ -244,7 +244,7 @@ AssociationFilter filterOf(const char* associationClass, const char* resultClass
 }
 
 /** Does one association call: `call` gets what answers it, who asks, the source, and what takes the objects. */
-template <class Call>
+template <typename Call>
 CMPIEnumeration* associationCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                                  CMPIType type, CMPIStatus* rc, Call call) {
     CMPIEnumeration* result = nullptr;

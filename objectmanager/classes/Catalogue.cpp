@@ -18,7 +18,7 @@ void inheritQualifiers(Element& element, const Element& inherited, const Qualifi
     element.qualifiers = types.merged(inherited.qualifiers, std::move(element.qualifiers));
 }
 
-/** So do the parameters, which an overriding method has in the same order. */
+/** Parameters inherit the qualifiers of the parameters of the same names. */
 void inheritQualifiers(Method& method, const Method& inherited, const QualifierTypes& types) {
     method.qualifiers = types.merged(inherited.qualifiers, std::move(method.qualifiers));
     for (Parameter& parameter : method.parameters) {

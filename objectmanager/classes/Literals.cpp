@@ -114,7 +114,7 @@ Value integerOfText(std::string_view text, CMPIType type) {
     if (!isSigned(type)) {
         return unsignedValue(type, integer->magnitude);
     }
-    // Negated as unsigned, where the smallest value has its magnitude too.
+    // The number is negated while it is unsigned: no signed integer holds the magnitude of the smallest value.
     return signedValue(type,
                        static_cast<std::int64_t>(integer->negative ? 0 - integer->magnitude : integer->magnitude));
 }

@@ -33,7 +33,7 @@ std::size_t hashOfName(std::string_view name) {
     });
 }
 
-/** Of the content; the types of values need not tell hashes apart. */
+/** The hash of a value's content. Values of different types may have the same hash. */
 struct HashOfContent {
     std::size_t operator()(std::monostate) const { return 0; }
     std::size_t operator()(const std::shared_ptr<const ObjectPath>& path) const { return ObjectPathHash()(*path); }
@@ -41,7 +41,7 @@ struct HashOfContent {
         return ObjectPathHash()(instance->path);
     }
     std::size_t operator()(const Value::Array& array) const { return array.size(); }
-    template <class T>
+    template <typename T>
     std::size_t operator()(const T& scalar) const {
         return std::hash<T>()(scalar);
     }
@@ -50,7 +50,7 @@ struct HashOfContent {
 } // namespace
 
 bool equalNames(std::string_view left, std::string_view right) {
-    // Most are written alike.
+    // Most names that are the same are also written in the same letter case.
     return left.size() == right.size() && (left == right || std::equal(left.begin(), left.end(), right.begin(), alike));
 }
 

@@ -44,7 +44,7 @@ struct AssociationFilter {
 };
 
 /** The objects that are associated with a source through the associations of one class. */
-template <class Object>
+template <typename Object>
 struct Associated {
     std::string associationClass;
     std::vector<Object> objects;

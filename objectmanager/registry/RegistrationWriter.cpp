@@ -39,7 +39,7 @@ std::vector<int> capabilities(const Registration& registration) {
     return numbers;
 }
 
-/** The location of all, which is that of the first. */
+/** The location that all registrations have. */
 const std::string& locationOf(const std::vector<Registration>& registrations) {
     if (registrations.empty()) {
         throw std::invalid_argument("found no registration, expected those of a library");

@@ -11,7 +11,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** By how many columns what belongs to something is indented under it. */
+/** Details are indented by so many columns under the line that they belong to. */
 constexpr std::size_t step = 2;
 
 /** The text on one line: control characters escaped, quotes left alone. */

@@ -12,7 +12,7 @@ namespace {
 class SlotsTest : public RequestTest {
 protected:
     /** The slots of a table are all pointers, from its first function on. */
-    template <class Table, class Function>
+    template <typename Table, typename Function>
     static std::vector<const void*> slots(const Table* table, const Function* first) {
         const auto* begin = reinterpret_cast<const char*>(first);
         const auto* end = reinterpret_cast<const char*>(table) + sizeof(Table);
@@ -21,7 +21,7 @@ protected:
         return functions;
     }
 
-    template <class Object>
+    template <typename Object>
     static void expectWhole(const Object* object) {
         EXPECT_EQ(CMPIVersion200, object->ft->ftVersion);
         EXPECT_THAT(slots(object->ft, &object->ft->release), testing::Each(testing::NotNull()));

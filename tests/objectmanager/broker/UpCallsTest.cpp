@@ -43,7 +43,7 @@ public:
 class UpCallsTest : public testing::Test {
 protected:
     /** An action that passes objects to the sink, the call's last argument. */
-    template <class Object>
+    template <typename Object>
     static auto giving(const std::vector<Object>& objects) {
         return [objects](const auto&... arguments) {
             const auto& sink = std::get<sizeof...(arguments) - 1>(std::tie(arguments...));

@@ -2,7 +2,7 @@
 #ifndef CIMXML_INTRINSICCALL_H
 #define CIMXML_INTRINSICCALL_H
 
-#include "cimxml/Operations.h"
+#include "cimxml/MethodTable.h"
 #include "cimxml/Parameters.h"
 #include "cimxml/Query.h"
 

@@ -1,7 +1,7 @@
 #include "cimxml/Service.h"
 
 #include "cimxml/HttpHeaders.h"
-#include "cimxml/Operations.h"
+#include "cimxml/MethodTable.h"
 #include "cimxml/ProtocolError.h"
 #include "cimxml/Recording.h"
 #include "cimxml/RequestReader.h"

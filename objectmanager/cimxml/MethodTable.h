@@ -1,6 +1,6 @@
 /** The operations that a message can ask for. */
-#ifndef CIMXML_OPERATIONS_H
-#define CIMXML_OPERATIONS_H
+#ifndef CIMXML_METHODTABLE_H
+#define CIMXML_METHODTABLE_H
 
 #include "cimxml/Enumerations.h"
 #include "cimxml/RequestReader.h"

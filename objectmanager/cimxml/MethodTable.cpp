@@ -1,4 +1,4 @@
-#include "cimxml/Operations.h"
+#include "cimxml/MethodTable.h"
 
 #include "cimxml/ClassAssociations.h"
 #include "cimxml/IntrinsicCall.h"

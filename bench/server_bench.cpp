@@ -223,6 +223,8 @@ public:
     }
 
     const std::string& reply() const { return _received; }
+    /** Without the headers, of which one tells how long the server took. */
+    std::size_t bodySize() const { return _bodySize; }
     double latency() const { return Milliseconds(_end - _begin).count(); }
     double firstByte() const { return Milliseconds(_firstByte - _begin).count(); }
 
@@ -232,7 +234,8 @@ private:
         constexpr std::string_view length = "Content-Length: ";
         const std::size_t headers = _received.find(end);
         if (headers != std::string::npos) {
-            _size = headers + end.size() + std::stoul(_received.substr(_received.find(length) + length.size()));
+            _bodySize = std::stoul(_received.substr(_received.find(length) + length.size()));
+            _size = headers + end.size() + _bodySize;
         }
     }
 
@@ -240,12 +243,13 @@ private:
     std::string _received;
     /** Of the reply; 0 while it is not known. */
     std::size_t _size = 0;
+    std::size_t _bodySize = 0;
     Clock::time_point _begin;
     Clock::time_point _firstByte;
     Clock::time_point _end;
 };
 
-/** What every reply must be as long as, once it is known to be right. */
+/** How many bytes the body of every reply must have, as one has that was looked at. */
 std::size_t expectedSize(std::uint16_t port, const std::string& request, std::size_t objects) {
     Client client(port);
     client.ask(request);
@@ -260,7 +264,7 @@ std::size_t expectedSize(std::uint16_t port, const std::string& request, std::si
     if (found != objects) {
         throw std::runtime_error("expected " + std::to_string(objects) + " instances: " + client.reply());
     }
-    return client.reply().size();
+    return client.bodySize();
 }
 
 /**
@@ -309,7 +313,7 @@ Measurement measure(std::string name, const ServerProcess& server, const std::st
             if (!client.take()) {
                 continue;
             }
-            if (client.reply().size() != size || !client.reply().starts_with("HTTP/1.1 200 ")) {
+            if (client.bodySize() != size || !client.reply().starts_with("HTTP/1.1 200 ")) {
                 throw std::runtime_error("wrong reply: " + client.reply());
             }
             result.latencies.push_back(client.latency());

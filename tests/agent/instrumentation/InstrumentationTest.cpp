@@ -40,8 +40,9 @@ TEST(InstrumentationLibrary, ExportsItsMembersTheOptionalFunctionsAndNothingElse
     EXPECT_THAT(
         AgentTest::exportedSymbols(ORV_INSTRUMENTATION_LIBRARY),
         UnorderedElementsAre(
-            "orvInstrumentationMachine1", "orvInstrumentationOnBehalfOf1", "_ZN4Norv15InstrumentationC1Ev",
-            "_ZN4Norv15InstrumentationC2Ev", "_ZN4Norv15InstrumentationD1Ev", "_ZN4Norv15InstrumentationD2Ev",
+            "orvInstrumentationMachine1", "orvInstrumentationOnBehalfOf1", "orvInstrumentationPowerNode1",
+            "orvInstrumentationCancelRequest1", "_ZN4Norv15InstrumentationC1Ev", "_ZN4Norv15InstrumentationC2Ev",
+            "_ZN4Norv15InstrumentationD1Ev", "_ZN4Norv15InstrumentationD2Ev",
             "_ZN4Norv15Instrumentation10selectNodeENS_11NodeLexicon8NodeTypeE", "_ZN4Norv15InstrumentationcvbEv",
             "_ZN4Norv15InstrumentationppEv", "_ZN4Norv15Instrumentation13getPathToNodeB5cxx11Ev",
             "_ZN4Norv15Instrumentation19convertPathToStringERKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE",
@@ -53,6 +54,8 @@ TEST(InstrumentationLibrary, ExportsItsMembersTheOptionalFunctionsAndNothingElse
 TEST(InstrumentationLibrary, HasTheOptionalFunctionsUnderTheNamesThatTheHeaderGives) {
     EXPECT_EQ(dlsym(RTLD_DEFAULT, machine1Name), reinterpret_cast<void*>(&orvInstrumentationMachine1));
     EXPECT_EQ(dlsym(RTLD_DEFAULT, onBehalfOf1Name), reinterpret_cast<void*>(&orvInstrumentationOnBehalfOf1));
+    EXPECT_EQ(dlsym(RTLD_DEFAULT, powerNode1Name), reinterpret_cast<void*>(&orvInstrumentationPowerNode1));
+    EXPECT_EQ(dlsym(RTLD_DEFAULT, cancelRequest1Name), reinterpret_cast<void*>(&orvInstrumentationCancelRequest1));
 }
 
 /** Who asks for what this process does. */

@@ -54,7 +54,7 @@ protected:
         return texts;
     }
 
-    const std::string _record = "log 10000 Corvane\\.Instrumentation setProperty "
+    const std::string _record = "log 10000 Corvane\\.Instrumentation reported "
                                 "agent/instrumentation/Instrumentation\\.cpp:[0-9]+ ";
     const std::string _asked = " \\[asked by orvcim, process N, uid N\\]";
     PrivateBus _bus;

@@ -192,7 +192,7 @@ INSTANTIATE_TEST_SUITE_P(
     ofAssociations, MistakeTest,
     testing::Values(Mistake{{"associators", "Nothing.Name=\"x\""},
                             1,
-                            "Nothing.Name=\"x\": CIM_ERR_INVALID_CLASS (5): the class \"Nothing\" is not declared"},
+                            "Nothing.Name=\"x\": CIM_ERR_INVALID_PARAMETER (4): the class \"Nothing\" is not declared"},
                     Mistake{{"associator-names", thing, "--assoc-class", "Nothing"},
                             1,
                             std::string(thing) + ": CIM_ERR_INVALID_PARAMETER (4): the association class \"Nothing\" "

@@ -27,8 +27,9 @@ protected:
 
     /** Serves root, who may do everything, and nobody, who may read. */
     void serveUsers(const Environment& environment = {}, std::vector<std::string> options = {}) {
-        std::vector<std::string> arguments = {
-            ORVCIM_PROGRAM, "serve", "--port=0", "--authenticate", "--pam-folder", makeUsers(), "--power-group=daemon"};
+        std::vector<std::string> arguments = {ORVCIM_PROGRAM,         "serve",        "--port=0",
+                                              "--authenticate",       "--pam-folder", makeUsers(),
+                                              "--power-group=daemon", "--allow-root", "--allow-without-shell"};
         arguments.insert(arguments.end(), options.begin(), options.end());
         Environment all = {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"LC_ALL", "C"}};
         all.insert(environment.begin(), environment.end());
@@ -164,7 +165,9 @@ TEST_F(WrongRequestTest, isAnEntryOfTheJournalWithFieldsUnderSystemd) {
                                               "--authenticate",
                                               "--pam-folder",
                                               makeUsers(),
-                                              "--power-group=daemon"};
+                                              "--power-group=daemon",
+                                              "--allow-root",
+                                              "--allow-without-shell"};
     _server =
         std::make_unique<RunningProcess>(command, Environment{{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
                                                               {"LC_ALL", "C"},

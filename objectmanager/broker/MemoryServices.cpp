@@ -10,6 +10,9 @@ struct alignas(std::max_align_t) BlockHead {
     std::size_t bytes;
 };
 
+/** A size beyond is a provider's error, not a wish. */
+constexpr std::size_t maximumBlock = std::size_t{1} << 30U;
+
 BlockHead* headOf(void* block) {
     return static_cast<BlockHead*>(block) - 1;
 }
@@ -52,7 +55,7 @@ CMPIStatus releaseMark(const CMPIBroker* broker, const CMPIGcStat* mark) {
 
 void* cmpiMalloc(const CMPIBroker* broker, std::size_t bytes) {
     Request* request = Request::current();
-    if (broker == nullptr || request == nullptr || bytes > SIZE_MAX - sizeof(BlockHead)) {
+    if (broker == nullptr || request == nullptr || bytes > maximumBlock) {
         return nullptr;
     }
     try {

@@ -110,7 +110,7 @@ TEST_F(MemoryTest, BlocksKeepWhatIsWritten) {
     EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, SIZE_MAX));
 }
 
-TEST_F(MemoryTest, SizesNearTheMaximumGiveNoBlock) {
+TEST_F(MemoryTest, SizesBeyondAGigabyteGiveNoBlock) {
     const CMPIBrokerMemFT* memory = mb->mft;
     void* const kept = memory->cmpiMalloc(mb, 1);
     for (std::size_t less = 0; less < 200; ++less) {
@@ -119,6 +119,8 @@ TEST_F(MemoryTest, SizesNearTheMaximumGiveNoBlock) {
         EXPECT_EQ(nullptr, memory->cmpiRealloc(mb, kept, SIZE_MAX - less)) << less;
         EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, static_cast<std::size_t>(PTRDIFF_MAX) - less)) << less;
     }
+    constexpr std::size_t largest = std::size_t{1} << 30U;
+    EXPECT_EQ(nullptr, memory->cmpiMalloc(mb, largest + 1));
     EXPECT_NE(nullptr, memory->cmpiRealloc(mb, kept, 2));
 }
 

@@ -4,7 +4,6 @@
 #ifndef CONFIG_POWERSTATES_H
 #define CONFIG_POWERSTATES_H
 
-#include <algorithm>
 #include <array>
 #include <string>
 #include <string_view>
@@ -40,10 +39,22 @@ inline constexpr std::array<std::pair<std::string_view, unsigned int>, 15> suppo
     {"power-cycle-off-hard-graceful", 16},
 }};
 
-/** What property 123 reads, for people. */
-inline std::string nodePowerStateText(unsigned int state) {
-    const auto* const found = std::ranges::find(nodePowerStates, state, [](const auto& each) { return each.second; });
-    return found == nodePowerStates.end() ? "power state " + std::to_string(state) : std::string(found->first);
+/** What clients see of a value of property 123, in the words of CIM_AssociatedPowerManagementService.PowerState (DMTF).
+ */
+inline std::string shownPowerState(unsigned int state) {
+    constexpr unsigned int running = 1;
+    constexpr unsigned int hibernating = 8;
+    constexpr unsigned int off = 10;
+    switch (state) {
+    case running:
+        return "2 (On)";
+    case hibernating:
+        return "7 (Hibernate (Off - Soft))";
+    case off:
+        return "12 (Off - Soft Graceful)";
+    default:
+        return "1 (Other), as while it reboots or shuts down";
+    }
 }
 
 } // namespace Norv::Agent

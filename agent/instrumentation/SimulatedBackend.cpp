@@ -145,7 +145,7 @@ MachineReport SimulatedBackend::examine() {
     try {
         const Selection nodes(*this, _stateFile.read());
         for (std::size_t node = 0; node < nodes.size(); ++node) {
-            found.facts.push_back({"node " + nodes.path(node), nodePowerStateText(*nodes.powerState(node))});
+            found.facts.push_back({"node " + nodes.path(node), shownPowerState(*nodes.powerState(node))});
         }
         if (const std::string text = warning(); !text.empty()) {
             found.facts.push_back({"warning", text});

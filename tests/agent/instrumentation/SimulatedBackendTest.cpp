@@ -441,14 +441,15 @@ TEST_F(Simulated, WarnsOfMoreNodesThanCanBeCounted) {
     EXPECT_EQ(facts.back().value, machine.warning());
 }
 
-TEST_F(Simulated, TellsItsStatesByNameToWhoeverExaminesIt) {
+TEST_F(Simulated, TellsItsStatesAsClientsSeeThemToWhoeverExaminesIt) {
     select()->requestPowerState(system, 12);
     std::vector<std::string> facts;
     for (const auto& [name, value] : backend->examine().facts) {
         facts.push_back(name + ": " + value);
     }
-    EXPECT_THAT(facts, ElementsAre("node system: shutting-down", "node chassis/blade1: shutting-down",
-                                   "node chassis/blade2: power state 6"));
+    EXPECT_THAT(facts, ElementsAre("node system: 1 (Other), as while it reboots or shuts down",
+                                   "node chassis/blade1: 1 (Other), as while it reboots or shuts down",
+                                   "node chassis/blade2: 1 (Other), as while it reboots or shuts down"));
 }
 
 TEST_F(Simulated, NeitherReadsNorReplacesAFileThatIsLargerThanAnyOfItsOwn) {

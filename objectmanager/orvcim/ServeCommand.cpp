@@ -6,9 +6,9 @@
 #include "server/HttpServer.h"
 #include "server/ListenSocket.h"
 #include "server/PamAuthenticator.h"
+#include "text/StatusText.h"
 
 #include <fmt/format.h>
-#include <fmt/ranges.h>
 
 #include <pthread.h>
 #include <sys/resource.h>
@@ -54,11 +54,15 @@ void requireProtection(Session& session, const Server::Settings& settings) {
                                      "or a loopback address",
                                      settings.address));
     }
-    if (!authenticated && !session.isSimulated()) {
-        const std::vector<std::string> reasons = session.log().failuresSince(0);
-        throw Failure(fmt::format("the machine is not known to be a simulated one{}{}: expected --authenticate, so "
-                                  "that not everybody on it can switch it off",
-                                  reasons.empty() ? "" : "; the agent logged: ", fmt::join(reasons, "; ")));
+    if (authenticated) {
+        return;
+    }
+    const std::string problem = session.loadAgent();
+    if (!session.log().isSimulated()) {
+        const std::string logged = reasonsText(session.log().failuresSince(0), "; the agent logged: ");
+        throw Failure(fmt::format("the machine is not known to be a simulated one{}: expected --authenticate, so that "
+                                  "not everybody on it can switch it off",
+                                  logged.empty() && !problem.empty() ? "; " + problem : logged));
     }
 }
 

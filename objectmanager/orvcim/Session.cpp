@@ -88,12 +88,13 @@ PropertyList Session::propertiesOf(const ObjectPath& path) const {
     return properties;
 }
 
-void Session::loadAgent() {
+std::string Session::loadAgent() {
     try {
         _dispatcher.enumerateInstanceNames(invocation(), {{}, _options.nameSpace, powerServiceClass, {}});
-    } catch (const CimError&) {
-        // Where nobody knows its power services, nothing is known of the agent, which its users look for.
+    } catch (const CimError& error) {
+        return error.what();
     }
+    return "";
 }
 
 bool Session::isSimulated() {

@@ -102,8 +102,12 @@ public:
      */
     PropertyList propertiesOf(const ObjectPath& path) const;
 
-    /** Loads the provider that knows the agent, where it can be loaded. */
-    void loadAgent();
+    /**
+     * Loads the provider that knows the agent.
+     *
+     * @return why it cannot be used, in one line; empty where it can.
+     */
+    std::string loadAgent();
     /** Whether the agent says that the machine is a simulated one. Loads it. */
     bool isSimulated();
 

@@ -138,25 +138,42 @@ RunningProcess::~RunningProcess() {
 }
 
 std::string RunningProcess::firstLine() const {
+    const std::string output = outputWith("\n");
+    return output.substr(0, output.find('\n'));
+}
+
+std::string RunningProcess::outputWith(const std::string& text) const {
+    return waitFor(text, Stream::out);
+}
+
+std::string RunningProcess::errWith(const std::string& text) const {
+    return waitFor(text, Stream::err);
+}
+
+std::string RunningProcess::waitFor(const std::string& text, Stream stream) const {
     siginfo_t ended{};
     const auto end = std::chrono::steady_clock::now() + std::chrono::minutes{1};
     while (std::chrono::steady_clock::now() < end) {
         const bool running =
             waitid(P_PID, static_cast<id_t>(_process), &ended, WEXITED | WNOHANG | WNOWAIT) == 0 && ended.si_pid == 0;
-        const std::string text = _files->out.content();
-        if (const std::size_t length = text.find('\n'); length != std::string::npos) {
-            return text.substr(0, length);
+        const std::string written = contentOf(stream);
+        if (written.find(text) != std::string::npos) {
+            return written;
         }
         if (!running) {
             return "";
         }
         std::this_thread::sleep_for(std::chrono::milliseconds{2});
     }
-    throw std::runtime_error("the program prints no line within a minute");
+    throw std::runtime_error("the program does not write \"" + text + "\" within a minute");
 }
 
 std::string RunningProcess::err() const {
-    return _files->err.content();
+    return contentOf(Stream::err);
+}
+
+std::string RunningProcess::contentOf(Stream stream) const {
+    return stream == Stream::out ? _files->out.content() : _files->err.content();
 }
 
 void RunningProcess::send(int signal) const {

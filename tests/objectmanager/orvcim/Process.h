@@ -37,11 +37,15 @@ public:
     ~RunningProcess();
 
     /**
-     * Waits until it has written a line to its standard output, for a minute at most. @return empty where it ended
-     * before.
+     * Waits until it has written a text to its standard output, for a minute at most. @return what it has written so
+     * far; empty where it ended before.
      * @throws std::runtime_error after that minute.
      */
+    std::string outputWith(const std::string& text) const;
+    /** As `outputWith`, for the first line, without its end. */
     std::string firstLine() const;
+    /** As `outputWith`, of standard error. */
+    std::string errWith(const std::string& text) const;
     /** What it has written to its standard error so far. */
     std::string err() const;
     void send(int signal) const;
@@ -50,6 +54,10 @@ public:
 
 private:
     class Files;
+    enum class Stream { out, err };
+    std::string contentOf(Stream stream) const;
+    std::string waitFor(const std::string& text, Stream stream) const;
+
     std::unique_ptr<Files> _files;
     pid_t _process = -1;
 };

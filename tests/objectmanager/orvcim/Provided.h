@@ -45,10 +45,15 @@ protected:
             << nodes;
     }
 
-    Outcome orvcim(std::vector<std::string> arguments, std::map<std::string, std::string> environment = {}) const {
+    /** The variables with which a program finds the machine. */
+    std::map<std::string, std::string> environment() const {
+        return {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"LC_ALL", "C"}};
+    }
+
+    Outcome orvcim(std::vector<std::string> arguments, std::map<std::string, std::string> variables = {}) const {
         arguments.insert(arguments.begin(), ORVCIM_PROGRAM);
-        environment.insert({{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"LC_ALL", "C"}});
-        return runProcess(arguments, environment);
+        variables.merge(environment());
+        return runProcess(arguments, variables);
     }
 
     std::string answerOf(const std::vector<std::string>& arguments) const {

@@ -31,7 +31,7 @@ TEST_F(ProvidedTest, checksTheAgent) {
                                                "  machine              a simulated machine (1 node, state in " +
                                                (_folder / "state.json").string() +
                                                ")\n"
-                                               "  node chassis/blade1  running\n"));
+                                               "  node chassis/blade1  2 (On)\n"));
 }
 
 TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
@@ -179,9 +179,33 @@ TEST_F(ProvidedTest, takesBackWhatIsUnderWay) {
     EXPECT_EQ(orvcim({"power", "cancel"}).status, 1);
 }
 
-TEST_F(ProvidedTest, waitsForARebootAndShowsEveryState) {
+TEST_F(ProvidedTest, waitsForARebootUntilTheMachineIsOnAgain) {
     configure("reboot-time = 1\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     EXPECT_THAT(answerOf({"power", "reboot", "--wait"}), HasSubstr("\nmachine.example: 2 (On)\n"));
+}
+
+TEST_F(ProvidedTest, showsTheStateWheneverItChanges) {
+    configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
+    const std::string on = answerOf({"power", "status"});
+    const RunningProcess watch({ORVCIM_PROGRAM, "power", "status", "--watch"}, environment());
+    EXPECT_EQ(watch.outputWith(on), on);
+    answerOf({"power", "reboot"});
+    const std::string rebooting = answerOf({"power", "status"});
+    EXPECT_EQ(watch.outputWith(on + rebooting), on + rebooting);
+    answerOf({"power", "cancel"});
+    EXPECT_EQ(watch.outputWith(on + rebooting + on), on + rebooting + on);
+}
+
+TEST_F(ProvidedTest, namesTheLibraryThatIsMissingWhereTheMachineIsNotKnown) {
+    std::filesystem::create_directories(_folder / "bin");
+    std::filesystem::copy_file(ORVCIM_PROGRAM, _folder / "bin" / "orvcim");
+    const Outcome outcome = runProcess(
+        {(_folder / "bin" / "orvcim").string(), "--schema", ORV_SCHEMA_FOLDER, "serve", "--port=0"}, environment());
+    EXPECT_THAT(outcome.err, HasSubstr("the machine is not known to be a simulated one; provider library "
+                                       "liborvpowerstatemanagementprovider.so.1 or "
+                                       "liborvpowerstatemanagementprovider.so not found in " +
+                                       _folder.string()));
+    EXPECT_EQ(outcome.status, 1);
 }
 
 TEST_F(ProvidedTest, switchesNoOtherNodeThanTheOneThatIsNamed) {

@@ -25,6 +25,9 @@ class WrongRequestTest : public ServingTest {
 protected:
     using Environment = std::map<std::string, std::string>;
 
+    /** Where the program has AddressSanitizer, which else refuses to run behind a library that is loaded before it. */
+    inline static const Environment::value_type sanitizersGoSecond{"ASAN_OPTIONS", "verify_asan_link_order=0"};
+
     /** Serves root, who may do everything, and nobody, who may read. */
     void serveUsers(const Environment& environment = {}, std::vector<std::string> options = {}) {
         std::vector<std::string> arguments = {ORVCIM_PROGRAM,         "serve",        "--port=0",
@@ -49,11 +52,11 @@ protected:
         EXPECT_NE(outcome.status, 0);
         EXPECT_THAT(outcome.out + outcome.err, HasSubstr(reason));
         EXPECT_FALSE(std::filesystem::exists(_folder / "state.json")) << "the machine moved";
-        EXPECT_THAT(_server->err(),
+        EXPECT_THAT(_server->errWith(": " + verdict + ": "),
                     AllOf(HasSubstr("Z 127.0.0.1 " + user +
                                     ": TALVO_PowerManagementService.RequestPowerStateChange(PowerState=5, "
                                     "ManagedElement="),
-                          HasSubstr(": " + verdict + ": "), HasSubstr(reason)));
+                          HasSubstr(reason)));
     }
 };
 
@@ -92,7 +95,7 @@ TEST_F(WrongRequestTest, findsNoAgent) {
 
 TEST_F(WrongRequestTest, findsAFullDisk) {
     // Nothing can be logged by the agent either.
-    serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, {"TEST_FULL_FOLDER", _folder.string()}});
+    serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, sanitizersGoSecond, {"TEST_FULL_FOLDER", _folder.string()}});
     expectRefused(reboot(_system), "No space left on device");
 }
 
@@ -114,18 +117,26 @@ TEST_F(WrongRequestTest, isNoneWhereEverythingIsRight) {
     serveUsers();
     EXPECT_THAT(reboot(_system).out, EndsWith("RequestPowerStateChange: 0\n"));
     EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
-    EXPECT_THAT(_server->err(), AllOf(HasSubstr("Z 127.0.0.1 root: TALVO_PowerManagementService.Request"),
-                                      HasSubstr(": accepted: Power request accepted: reboot of simulated node"),
-                                      HasSubstr("on behalf of root from 127.0.0.1]\n")));
+    EXPECT_THAT(_server->errWith(": accepted: "),
+                AllOf(HasSubstr("Z 127.0.0.1 root: TALVO_PowerManagementService.Request"),
+                      HasSubstr(": accepted: Power request accepted: reboot of simulated node"),
+                      HasSubstr("on behalf of root from 127.0.0.1]\n")));
 }
 
 TEST_F(WrongRequestTest, isRecordedWhateverItAsksFor) {
     serveUsers();
     wbemcli({"di", url(_system, bob)});
-    EXPECT_THAT(_server->err(), MatchesRegex("orvcim: [0-9TZ:-]* 127.0.0.1 nobody: DeleteInstance\\(InstanceName=.*\\) "
-                                             "of root/cimv2: denied: nobody may read, but not change anything\n"));
+    EXPECT_THAT(_server->errWith("change anything\n"),
+                MatchesRegex("orvcim: [0-9TZ:-]* 127.0.0.1 nobody: DeleteInstance\\(InstanceName=.*\\) "
+                             "of root/cimv2: denied: nobody may read, but not change anything\n"));
+}
+
+TEST_F(WrongRequestTest, isNotRecordedWhereItOnlyReads) {
+    serveUsers();
     wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", bob)});
-    EXPECT_THAT(_server->err(), Not(HasSubstr("EnumerateInstanceNames")));
+    // Lines are written in the order of what they tell.
+    wbemcli({"di", url(_system, bob)});
+    EXPECT_THAT(_server->errWith("change anything\n"), Not(HasSubstr("EnumerateInstanceNames")));
 }
 
 /** A socket that takes what is sent to the journal. */
@@ -172,6 +183,7 @@ TEST_F(WrongRequestTest, isAnEntryOfTheJournalWithFieldsUnderSystemd) {
         std::make_unique<RunningProcess>(command, Environment{{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
                                                               {"LC_ALL", "C"},
                                                               {"LD_PRELOAD", TEST_JOURNAL_REDIRECT},
+                                                              sanitizersGoSecond,
                                                               {"TEST_JOURNAL_SOCKET", (_folder / "journal").string()}});
     const std::string line = _server->firstLine();
     ASSERT_NE(line, "") << _server->err();

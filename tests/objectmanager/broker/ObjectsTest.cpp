@@ -273,10 +273,11 @@ TEST_F(ArrayTest, TakesTextsAsTheTypeThatItWasMadeForOnly) {
     EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(strings, 0, &value, CMPI_string).rc);
     EXPECT_EQ("text", text(CMGetArrayElementAt(strings, 0, nullptr)));
 
-    const CMPIArray* chars = CMClone(CMNewArray(mb, 1, CMPI_chars, nullptr), nullptr);
+    CMPIArray* chars = CMClone(CMNewArray(mb, 1, CMPI_chars, nullptr), nullptr);
     EXPECT_EQ(CMPI_RC_ERR_TYPE_MISMATCH, CMSetArrayElementAt(chars, 0, &value, CMPI_string).rc);
     EXPECT_EQ(CMPI_RC_OK, CMSetArrayElementAt(chars, 0, "text", CMPI_chars).rc);
     EXPECT_EQ("text", text(CMGetArrayElementAt(chars, 0, nullptr)));
+    CMRelease(chars);
 }
 
 TEST_F(ArrayTest, TakesNullsOfItsOwnTypeOrOfNone) {

@@ -39,8 +39,11 @@ struct ObjectTexts {
     /** Where each object ends. */
     std::vector<std::size_t> ends;
 
-    /** What they take of the memory. */
-    std::size_t bytes() const { return text.size() + ends.size() * sizeof(std::size_t); }
+    /** How much of an enumeration's limit the end of an object takes: the same on all machines. */
+    static constexpr std::size_t bytesOfEnd = 8;
+
+    /** How much of an enumeration's limit they take. */
+    std::size_t bytes() const { return text.size() + ends.size() * bytesOfEnd; }
 };
 
 /**

@@ -92,7 +92,9 @@ Connections::Counts Connections::counts() {
 }
 
 void Connections::move(Connection& connection, State state) {
-    if (connection.state == State::leaving) {
+    // A connection keeps its place in the state that it is in: of two new ones, the one that was accepted first is the
+    // older, whichever thread begins first.
+    if (connection.state == State::leaving || connection.state == state) {
         return;
     }
     List& target = listOf(state);

@@ -140,7 +140,8 @@ void Exchange::begin() {
     };
     if (_stream->shakeHands(Clock::now() + _limits.idleTime, compute) != Stream::Outcome::done) {
         if (_stream->hasReceived() && !_shared.stopping) {
-            report("closed: no TLS handshake");
+            const std::string& problem = _stream->handshakeProblem();
+            report("closed: the TLS handshake failed: " + (problem.empty() ? "it did not end in time" : problem));
         }
         throw Ended{};
     }

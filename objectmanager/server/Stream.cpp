@@ -70,6 +70,10 @@ Stream::Outcome Stream::shakeHands(Clock::time_point until,
         }
         outcome = proceed(code, until);
         if (outcome == Outcome::gone) {
+            _handshakeProblem =
+                code == GNUTLS_E_FATAL_ALERT_RECEIVED
+                    ? std::string("the client refused: ") + gnutls_alert_get_name(gnutls_alert_get(_session.get()))
+                    : gnutls_strerror(code);
             gnutls_alert_send_appropriate(_session.get(), code);
         }
     }

@@ -45,6 +45,10 @@ public:
      */
     Outcome shakeHands(Clock::time_point until, const std::function<bool(const std::function<void()>& step)>& compute);
 
+    /** Why client and server could not agree, in the words of the TLS library; empty where they could, or time ran out.
+     */
+    const std::string& handshakeProblem() const { return _handshakeProblem; }
+
     /** Waits for bytes, and appends them. */
     Outcome receive(std::string& to, Clock::time_point until);
 
@@ -79,6 +83,7 @@ private:
     const std::shared_ptr<const TlsKeys> _keys;
     std::unique_ptr<std::remove_pointer_t<gnutls_session_t>, EndSession> _session;
     bool _hasReceived = false;
+    std::string _handshakeProblem;
 };
 
 } // namespace ObjectManager::Server

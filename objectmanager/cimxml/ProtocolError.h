@@ -2,6 +2,8 @@
 #ifndef CIMXML_PROTOCOLERROR_H
 #define CIMXML_PROTOCOLERROR_H
 
+#include "server/HttpStatus.h"
+
 #include <stdexcept>
 #include <string>
 
@@ -22,18 +24,7 @@ private:
     const char* _cimError;
 };
 
-namespace Http {
-
-constexpr unsigned int ok = 200;
-constexpr unsigned int badRequest = 400;
-constexpr unsigned int methodNotAllowed = 405;
-constexpr unsigned int notAcceptable = 406;
-constexpr unsigned int unsupportedMediaType = 415;
-constexpr unsigned int internalServerError = 500;
-constexpr unsigned int notImplemented = 501;
-constexpr unsigned int notExtended = 510;
-
-} // namespace Http
+namespace Http = Server::Status;
 
 /** The body is no XML. */
 inline ProtocolError notWellFormed(const std::string& message) {

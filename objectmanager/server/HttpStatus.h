@@ -1,4 +1,4 @@
-/** The statuses of HTTP that the server answers with by itself (RFC 9110, section 15). */
+/** The statuses of HTTP that requests are answered with (RFC 9110, section 15, and RFC 2774). */
 #ifndef SERVER_HTTPSTATUS_H
 #define SERVER_HTTPSTATUS_H
 
@@ -9,37 +9,43 @@
 
 namespace ObjectManager::Server::Status {
 
+constexpr unsigned int ok = 200;
 constexpr unsigned int badRequest = 400;
 constexpr unsigned int unauthorized = 401;
 constexpr unsigned int forbidden = 403;
+constexpr unsigned int methodNotAllowed = 405;
+constexpr unsigned int notAcceptable = 406;
 constexpr unsigned int requestTimeout = 408;
 constexpr unsigned int contentTooLarge = 413;
 constexpr unsigned int uriTooLong = 414;
+constexpr unsigned int unsupportedMediaType = 415;
 constexpr unsigned int headersTooLarge = 431;
+constexpr unsigned int internalServerError = 500;
 constexpr unsigned int notImplemented = 501;
 constexpr unsigned int serviceUnavailable = 503;
 constexpr unsigned int versionNotSupported = 505;
+constexpr unsigned int notExtended = 510;
 
 /** What people call a status; "Other" where HTTP has no name for it. */
 constexpr std::string_view reasonOf(unsigned int status) {
     constexpr std::array<std::pair<unsigned int, std::string_view>, 17> reasons = {{
-        {200, "OK"},
+        {ok, "OK"},
         {badRequest, "Bad Request"},
         {unauthorized, "Unauthorized"},
         {forbidden, "Forbidden"},
         {404, "Not Found"},
-        {405, "Method Not Allowed"},
-        {406, "Not Acceptable"},
+        {methodNotAllowed, "Method Not Allowed"},
+        {notAcceptable, "Not Acceptable"},
         {requestTimeout, "Request Timeout"},
         {contentTooLarge, "Content Too Large"},
         {uriTooLong, "URI Too Long"},
-        {415, "Unsupported Media Type"},
+        {unsupportedMediaType, "Unsupported Media Type"},
         {headersTooLarge, "Request Header Fields Too Large"},
-        {500, "Internal Server Error"},
+        {internalServerError, "Internal Server Error"},
         {notImplemented, "Not Implemented"},
         {serviceUnavailable, "Service Unavailable"},
         {versionNotSupported, "HTTP Version Not Supported"},
-        {510, "Not Extended"},
+        {notExtended, "Not Extended"},
     }};
     const auto* const found =
         std::find_if(reasons.begin(), reasons.end(), [status](const auto& reason) { return reason.first == status; });

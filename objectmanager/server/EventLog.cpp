@@ -14,9 +14,9 @@ std::string cut(const std::string& line) {
 
 } // namespace
 
-void EventLog::report(const std::string& network, const std::string& line, bool always, Clock::time_point now) {
-    if (!always) {
-        settle(now);
+void EventLog::report(const std::string& network, const std::string& line, Clock::time_point now) {
+    settle(now);
+    {
         const std::lock_guard lock(_mutex);
         // Networks may be as many as there are lines.
         if (_all.lines >= linesOfAll) {

@@ -28,9 +28,7 @@ public:
 
     explicit EventLog(Log log) : _log(std::move(log)) {}
 
-    /** @param always the line is never left out. */
-    void report(const std::string& network, const std::string& line, bool always = false,
-                Clock::time_point now = Clock::now());
+    void report(const std::string& network, const std::string& line, Clock::time_point now = Clock::now());
 
     /** Of no client; never left out. */
     void report(const std::string& line);

@@ -366,7 +366,7 @@ HttpReply Exchange::answer(const Caller& caller) {
 
 void Exchange::send(HttpReply reply, bool keepAlive) {
     if (!reply.problem.empty()) {
-        report(fmt::format("answered {}: {}", reply.status, printable(reply.problem)), reply.alwaysLogged);
+        report(fmt::format("answered {}: {}", reply.status, printable(reply.problem)));
     }
     enter(State::sending);
     std::string head = headOf(reply, keepAlive);
@@ -423,8 +423,8 @@ void Exchange::endEarly() {
     throw Ended{};
 }
 
-void Exchange::report(const std::string& what, bool always) {
-    _shared.events.report(_connection.network, fmt::format("{}: {}", _connection.address, what), always);
+void Exchange::report(const std::string& what) {
+    _shared.events.report(_connection.network, fmt::format("{}: {}", _connection.address, what));
 }
 
 } // namespace ObjectManager::Server

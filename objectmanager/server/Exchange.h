@@ -88,7 +88,7 @@ private:
     void enter(State state);
     [[noreturn]] void endLate();
     [[noreturn]] void endEarly();
-    void report(const std::string& what, bool always = false);
+    void report(const std::string& what);
 
     Shared& _shared;
     const Limits& _limits;

@@ -41,8 +41,6 @@ struct HttpReply {
     std::string body;
     /** Why the request was refused, in a line for the server's log; empty where it was not. */
     std::string problem{};
-    /** The log has to have the line, however many others there are. */
-    bool alwaysLogged = false;
 };
 
 /** Who asks, and what he may do. */

@@ -27,22 +27,22 @@ TEST_F(EventLogTest, cutsLongLines) {
 
 TEST_F(EventLogTest, countsWhatItLeavesOutOfOneNetwork) {
     for (unsigned int i = 0; i < EventLog::linesOfNetwork + 7; ++i) {
-        _log.report("192.0.2.1", "bad", false, _start);
+        _log.report("192.0.2.1", "bad", _start);
     }
     EXPECT_EQ(_lines.size(), EventLog::linesOfNetwork);
-    _log.report("192.0.2.2", "of another", false, _start);
+    _log.report("192.0.2.2", "of another", _start);
     EXPECT_EQ(_lines.back(), "of another");
-    _log.report("192.0.2.1", "of the switch", true, _start);
-    EXPECT_EQ(_lines.back(), "of the switch");
+    _log.report("of no client");
+    EXPECT_EQ(_lines.back(), "of no client");
     _log.settle(_start + EventLog::period);
     EXPECT_EQ(_lines.back(), "192.0.2.1: 7 more lines in a minute are left out");
-    _log.report("192.0.2.1", "later", false, _start + EventLog::period);
+    _log.report("192.0.2.1", "later", _start + EventLog::period);
     EXPECT_EQ(_lines.back(), "later");
 }
 
 TEST_F(EventLogTest, countsWhatItLeavesOutOfAllNetworks) {
     for (unsigned int i = 0; i < EventLog::linesOfAll + 5; ++i) {
-        _log.report(std::to_string(i), "bad", false, _start);
+        _log.report(std::to_string(i), "bad", _start);
     }
     EXPECT_EQ(_lines.size(), EventLog::linesOfAll);
     _log.settle(_start + EventLog::period);

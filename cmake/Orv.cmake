@@ -86,7 +86,7 @@ function(orv_add_test name)
     set(filter "--gtest_filter=-${arg_EXCEPT}")
   endif()
   add_test(NAME ${name} COMMAND ${name} ${filter})
-  set_tests_properties(${name} PROPERTIES TIMEOUT 1500)
+  set_tests_properties(${name} PROPERTIES TIMEOUT 600)
 endfunction()
 
 # orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema

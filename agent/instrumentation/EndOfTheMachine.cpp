@@ -37,7 +37,7 @@ std::optional<EndOfTheMachine::Node> EndOfTheMachine::nodeSince(bool begun) cons
     if (!_note || (begun && !_note->begun)) {
         return std::nullopt;
     }
-    const auto since = std::chrono::system_clock::now() - _note->when;
+    const Time::duration since = std::chrono::floor<Time::duration>(std::chrono::system_clock::now()) - _note->when;
     const bool isNow = since >= Time::duration::zero() && since < longestEnd;
     return isNow ? std::optional(_note->node) : std::nullopt;
 }

@@ -15,7 +15,8 @@ namespace Norv::Agent {
 /** Used by several threads at once. */
 class EndOfTheMachine {
 public:
-    using Time = std::chrono::system_clock::time_point;
+    /** In microseconds, as systemd-logind tells it: far more years than in nanoseconds. */
+    using Time = std::chrono::sys_time<std::chrono::microseconds>;
 
     /** What is read of the machine's node from then on. */
     struct Node {

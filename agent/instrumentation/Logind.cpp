@@ -307,7 +307,9 @@ ScheduledShutdown Logind::scheduledShutdown() {
     const char* type = nullptr;
     std::uint64_t time = 0;
     require(libsystemd().sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
-    return {printable(type), WallTime(std::chrono::microseconds(time))};
+    // Of all numbers, the largest means never.
+    const auto latest = static_cast<std::uint64_t>(endOfTime.time_since_epoch().count());
+    return {printable(type), WallTime(std::chrono::microseconds(std::min(time, latest)))};
 }
 
 std::string Logind::can(const char* method) {

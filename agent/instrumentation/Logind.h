@@ -48,6 +48,9 @@ private:
 
 using WallTime = std::chrono::sys_time<std::chrono::microseconds>;
 
+/** The last time whose year has four digits. Whatever is later is shown as this. */
+constexpr WallTime endOfTime{std::chrono::seconds{253'402'300'799}};
+
 struct ScheduledShutdown {
     /** "reboot", "poweroff" and the like; empty where nothing is scheduled. */
     std::string type;

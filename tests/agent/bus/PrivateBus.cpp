@@ -57,7 +57,11 @@ void forgetSystemBus() {
 }
 
 Child::Child(const std::vector<std::string>& arguments, int inherited, const std::string& errors) {
+    // A test program that is killed takes it along; it would hold the program's output open otherwise.
     std::vector<char*> pointers;
+    for (const char* argument : {"/usr/bin/setpriv", "--pdeathsig", "KILL", "--"}) {
+        pointers.push_back(const_cast<char*>(argument));
+    }
     for (const std::string& argument : arguments) {
         pointers.push_back(const_cast<char*>(argument.c_str()));
     }

@@ -131,19 +131,21 @@ TEST_P(MachineUnderWay, TellsSoAndRefusesAnotherRequest) {
 
 INSTANTIATE_TEST_SUITE_P(
     All, MachineUnderWay,
-    testing::Values(UnderWay{"RebootIsScheduled", R"({"ScheduledShutdown": ["reboot", 1795177867000000]})", 9,
-                             "reboot is scheduled for 2026-11-20T12:31:07Z"},
-                    UnderWay{"ShutdownIsScheduled", R"({"ScheduledShutdown": ["poweroff", 1795177867000000]})", 12,
-                             "poweroff is scheduled for 2026-11-20T12:31:07Z"},
-                    UnderWay{"SomethingElseIsScheduled", R"({"ScheduledShutdown": ["halt", 1795177867000000]})", 12,
-                             "halt is scheduled for 2026-11-20T12:31:07Z"},
-                    UnderWay{"ItIsScheduledForAnotherAge", R"({"ScheduledShutdown": ["reboot", 253402300799000000]})",
-                             9, "reboot is scheduled for 9999-12-31T23:59:59Z"},
-                    UnderWay{"RebootHasBegun",
-                             R"({"ScheduledShutdown": ["reboot", 1795177867000000], "PreparingForShutdown": true})", 9,
-                             "reboot is under way"},
-                    UnderWay{"NobodyKnowsWhatHasBegun", R"({"PreparingForShutdown": true})", 12,
-                             "the machine is going down"}),
+    testing::Values(
+        UnderWay{"RebootIsScheduled", R"({"ScheduledShutdown": ["reboot", 1795177867000000]})", 9,
+                 "reboot is scheduled for 2026-11-20T12:31:07Z"},
+        UnderWay{"ShutdownIsScheduled", R"({"ScheduledShutdown": ["poweroff", 1795177867000000]})", 12,
+                 "poweroff is scheduled for 2026-11-20T12:31:07Z"},
+        UnderWay{"SomethingElseIsScheduled", R"({"ScheduledShutdown": ["halt", 1795177867000000]})", 12,
+                 "halt is scheduled for 2026-11-20T12:31:07Z"},
+        UnderWay{"ItIsScheduledForAnotherAge", R"({"ScheduledShutdown": ["reboot", 253402300799000000]})", 9,
+                 "reboot is scheduled for 9999-12-31T23:59:59Z"},
+        UnderWay{"ItIsScheduledForTheEndOfTime", R"({"ScheduledShutdown": ["reboot", 18446744073709551615]})", 9,
+                 "reboot is scheduled for 9999-12-31T23:59:59Z"},
+        UnderWay{"RebootHasBegun",
+                 R"({"ScheduledShutdown": ["reboot", 1795177867000000], "PreparingForShutdown": true})", 9,
+                 "reboot is under way"},
+        UnderWay{"NobodyKnowsWhatHasBegun", R"({"PreparingForShutdown": true})", 12, "the machine is going down"}),
     [](const auto& each) { return std::string(each.param.name); });
 
 struct Request {

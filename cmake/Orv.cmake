@@ -70,10 +70,11 @@ add_library(orv_test_options INTERFACE)
 target_compile_options(orv_test_options INTERFACE -O0 -g1 -U_FORTIFY_SOURCE
   $<$<NOT:$<EQUAL:${position},-1>>:-fno-sanitize=null,alignment,vptr>)
 
-# orv_add_test(NAME SOURCES... LIBRARIES... [EXCEPT PATTERN]): a GoogleTest program that ctest runs; with EXCEPT, without
-# the tests whose names match, which are run by a test of their own.
+# orv_add_test(NAME [THREADS] SOURCES... LIBRARIES... [EXCEPT PATTERN]): a GoogleTest program that ctest runs; with EXCEPT,
+# without the tests whose names match, which are run by a test of their own. With THREADS it is one of those that
+# ThreadSanitizer watches: the target threaded_tests builds them, the label threads selects them.
 function(orv_add_test name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "" "EXCEPT" "SOURCES;LIBRARIES")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "THREADS" "EXCEPT" "SOURCES;LIBRARIES")
   add_executable(${name} ${arg_SOURCES})
   target_link_libraries(${name} PRIVATE
     orv_options orv_test_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
@@ -87,6 +88,10 @@ function(orv_add_test name)
   endif()
   add_test(NAME ${name} COMMAND ${name} ${filter})
   set_tests_properties(${name} PROPERTIES TIMEOUT 600)
+  if(arg_THREADS)
+    set_property(TEST ${name} APPEND PROPERTY LABELS threads)
+    add_dependencies(threaded_tests ${name})
+  endif()
 endfunction()
 
 # orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema

@@ -51,7 +51,7 @@ public:
         }
     }
 
-    int answers = 0;
+    std::atomic<int> answers = 0;
     std::vector<std::string> errors;
     std::chrono::steady_clock::duration longest{};
 

@@ -14,13 +14,13 @@ namespace {
 constexpr int lowestLevel = 5000;
 
 struct ThreadRecords {
-    /** The tap that they are of. */
+    /** The number of the tap that received the records. */
     std::uint64_t tap = 0;
     std::uint64_t newest = 0;
     std::deque<LogRecord> records;
 };
 
-/** Set when the thread's records are gone, while other destructors of the thread may still log. */
+/** Set when the ending thread has destroyed its records: its other destructors may still log. */
 constinit thread_local bool isEnding = false;
 
 struct EndingThreadRecords : ThreadRecords {
@@ -30,7 +30,7 @@ struct EndingThreadRecords : ThreadRecords {
     ~EndingThreadRecords() { isEnding = true; }
 };
 
-/** The calling thread's records of a tap. */
+/** The records that a tap received in the calling thread. */
 ThreadRecords& recordsOf(std::uint64_t tap) {
     thread_local EndingThreadRecords own;
     if (own.tap != tap) {
@@ -105,7 +105,7 @@ bool LogTap::isAttached() const {
 }
 
 bool LogTap::hearsPowerRequests() const {
-    // An instrumentation that tells nothing of its machine gives its records no numbers either.
+    // An instrumentation without Norv::Machine1 does not number its records of power requests either.
     return isAttached() && _machine != nullptr;
 }
 
@@ -146,7 +146,7 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     constexpr int failureLevel = 6000;
     std::vector<std::string> failures;
     for (const LogRecord& record : since(sequence)) {
-        // What the agent says of the machine, and of requests that it accepted, is no failure, whatever its level.
+        // Records about the machine, and about accepted power requests, are not failures, whatever their level.
         const bool isNews =
             record.kind == OrvLog::MACHINE_RECORD || record.kind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD;
         if (record.level >= failureLevel && !isNews) {
@@ -155,7 +155,7 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     }
     Norv::Machine1* const machine = _machine;
     if (!failures.empty() && machine != nullptr && machine() == Norv::NO_MACHINE) {
-        // All others follow from the first one, which says what is wrong with the configuration.
+        // The first failure says what is wrong with the configuration; the others follow from it.
         return {failures.front() + " ('orvcim check' says more)"};
     }
     return failures;
@@ -188,7 +188,7 @@ void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept
                                own.newest + 1});
         ++own.newest;
     } catch (const std::bad_alloc&) {
-        // Nobody hears of the record. A power request of which nobody heard that it was accepted counts as refused.
+        // The record is lost. A power request without a record that says "accepted" counts as refused.
     }
 }
 

@@ -1,5 +1,4 @@
-/** What the agent tells the object manager about the machine, and providers write to its log while they serve a
- * request. */
+/** What the agent tells the object manager about the machine, and what providers log while they serve a request. */
 #ifndef AGENTLOG_LOGTAP_H
 #define AGENTLOG_LOGTAP_H
 
@@ -16,12 +15,12 @@
 namespace ObjectManager {
 
 struct LogRecord {
-    /** An OrvLog::RecordKind, or another number of an agent that knows more of them. */
+    /** An OrvLog::RecordKind, or a number beyond them if the agent is newer. */
     int kind = OrvLog::ORDINARY_RECORD;
     std::string category;
     int level = 0;
     std::string text;
-    /** Grows from record to record of a thread. */
+    /** Increases with each record of a thread. */
     std::uint64_t sequence = 0;
 };
 
@@ -29,14 +28,14 @@ struct LogRecord {
 std::string_view messageOf(std::string_view text);
 
 /**
- * Receives the records of the agent's log library in this process, of level 5000 and above, whatever its thresholds.
+ * Receives the records of level 5000 and above from the agent's log library in this process, whatever its thresholds.
  *
- * Each thread has its own records: those that were logged in it. There is one tap at most in a process, and it outlives
- * every call of a provider. Used by several threads at once.
+ * Each thread has the records that were logged in it. A process has one tap at most, and the tap outlives every call of
+ * a provider. Used by several threads at once.
  */
 class LogTap {
 public:
-    /** How many ordinary records are kept for a thread that does not take them. */
+    /** How many ordinary records a thread keeps until it takes them; beyond that, the oldest one is dropped. */
     static constexpr std::size_t recordsPerThread = 1000;
 
     LogTap();
@@ -45,49 +44,54 @@ public:
     ~LogTap();
 
     /**
-     * Listens from now on to the agent's libraries that a library uses, where they can be listened to.
+     * Listens from now on to the agent's libraries that a provider library is linked to, as far as they offer that.
      *
-     * @param library as dlopen gave it.
+     * @param library the handle from dlopen.
      */
     void attach(void* library);
 
-    /** Whether there is an agent that can be listened to. */
+    /** Whether any log library of an agent is listened to. */
     bool isAttached() const;
-    /** Whether every power request to the agent leaves a record here that says what became of it. */
+    /** Whether the agent reports the outcome of every power request in a record here. */
     bool hearsPowerRequests() const;
     /** Whether the agent says that its machine is a simulated one. */
     bool isSimulated() const;
-    /** The path of the node that power requests go to, whichever service they name; empty where it is not known. */
+    /**
+     * The path of the node that gets every power request, whichever service the client names; empty if it is not known.
+     */
     std::string powerNode() const;
-    /** Has the agent take back the power request that is under way, which leaves a record as a request does. Nothing
-     * happens where it cannot be asked. */
+    /** Has the agent cancel the power request that is under way; the agent reports the outcome in a record. Does
+     * nothing if the agent does not offer it. */
     void cancelPowerRequest() const;
-    /** For whom the calling thread acts from now on; null for nobody. The text is valid until another one is given. */
+    /**
+     * Tells the agent for whom the calling thread acts from now on; null for nobody. `whom` must stay valid until the
+     * next call.
+     */
     void actFor(const char* whom) const;
 
-    /** The sequence number of the calling thread's newest record. */
+    /** The sequence number of the calling thread's newest record; 0 before the first. */
     std::uint64_t newest() const;
-    /** The calling thread's records after the one numbered `sequence`, which stay here. */
+    /** Copies of the calling thread's records after the one numbered `sequence`. */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
-    /** The messages in those of them that tell a failure; one alone where the agent's configuration cannot be used. */
+    /** The messages of those of them that are failures; only the first if the agent's configuration cannot be used. */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
-    /** The calling thread's records, which are gone from here. */
+    /** Moves the calling thread's records out of here. */
     std::vector<LogRecord> take();
     /** Drops the calling thread's records. */
     void forget();
 
 private:
-    /** A library of the agent whose log is listened to. */
+    /** A log library that is listened to. */
     struct Heard {
         OrvLog::Observe1* observe;
-        /** A reference of our own, since the function is called once more at the end. */
+        /** Our own handle: it keeps the library loaded, since `observe` is called once more by the destructor. */
         void* library;
     };
 
     static void keep(void* context, const OrvLog::ObservedRecord1* record) noexcept;
 
     const OrvLog::Observer1 _observer;
-    /** Tells the records of this tap from those that another one has left in a thread. */
+    /** Tells this tap's records from those that an earlier tap left in a thread. */
     const std::uint64_t _number;
     mutable std::mutex _mutex;
     std::vector<Heard> _heard;

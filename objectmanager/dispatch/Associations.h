@@ -1,4 +1,4 @@
-/** Which associations a walk follows, and what of their providers' answers it keeps. */
+/** Which associations are followed from an instance, and which of their providers' objects stay in the answer. */
 #ifndef DISPATCH_ASSOCIATIONS_H
 #define DISPATCH_ASSOCIATIONS_H
 
@@ -10,46 +10,49 @@
 
 namespace ObjectManager {
 
-/** An association class whose provider is asked. */
+/** One step of a walk: an association class whose provider is asked. */
 struct AssociationStep {
     const Registration* registration;
     /** The references that may lead to an associated object. */
     std::vector<ReferenceEnd> farEnds;
-    /** The result class that the provider is told; empty where every object at the far ends is of the one asked for. */
+    /**
+     * The result class that the provider is called with; empty if every object at the far ends is of the class that the
+     * client asked for.
+     */
     std::string resultClass;
 };
 
-/** Keeps the first of the objects that have the same path. Without keys a path is no object's, and the same as none. */
+/** Of objects with equal paths, keeps the first. A path without keys names no object: it is equal to no other path. */
 void dropDuplicates(std::vector<ObjectPath>& paths);
 void dropDuplicates(std::vector<Instance>& instances);
 
 /**
- * A walk from an instance over the registered associations, by what the schema says of them: an association class is
- * followed where one of its references can refer to the source and another to what is looked for.
+ * A walk from an instance over the registered associations. The schema decides which classes it follows: those with one
+ * reference that can refer to the source and another one that can refer to what the client looks for.
  */
 class AssociationWalk {
 public:
     /**
-     * `classes` may be null, which knows no class. It and the registry outlive the walk.
+     * `classes` may be null: then no class is known. Registry and classes must outlive the walk.
      *
-     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE, CMPI_RC_ERR_INVALID_PARAMETER where the class of the source
-     * or one of the filter is not declared (DSP0200), or the filter's association class is no association,
-     * CMPI_RC_ERR_FAILED where a registered association class has not two references, so that nobody knows what it
-     * links.
+     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE; with CMPI_RC_ERR_INVALID_PARAMETER if the class of the
+     * source or a class of the filter is not declared (DSP0200), or the filter's association class is not an
+     * association; with CMPI_RC_ERR_FAILED if a registered association class is declared with fewer than two
+     * references, so that the objects that it links are not known.
      */
     AssociationWalk(const Registry& registry, const ClassInformation* classes, const ObjectPath& source,
                     const AssociationFilter& filter);
 
-    /** The source, its class spelled as it is declared. */
+    /** The source; its class name is spelled as the class is declared. */
     const ObjectPath& source() const { return _source; }
     const AssociationFilter& filter() const { return _filter; }
-    /** In the order of registration. */
+    /** The steps, in the order in which their classes are registered. */
     const std::vector<AssociationStep>& steps() const { return _steps; }
 
-    /** Drops from the associated objects that were found what the filter leaves out. */
+    /** Drops those of the associated objects that the filter excludes. */
     void keepAsked(const AssociationStep& step, std::vector<ObjectPath>& paths) const;
     void keepAsked(const AssociationStep& step, std::vector<Instance>& instances) const;
-    /** Drops from instances what is neither key nor wanted property. */
+    /** Drops the properties that are neither keys nor among the wanted ones. */
     void keepWanted(std::vector<Instance>& instances, const PropertyList& properties) const;
 
 private:

@@ -1,4 +1,4 @@
-/** From an operation on values to the provider that serves it, and back. */
+/** Turns operations on values into calls of CMPI providers. */
 #ifndef DISPATCH_DISPATCHER_H
 #define DISPATCH_DISPATCHER_H
 
@@ -20,20 +20,20 @@
 namespace ObjectManager {
 
 /**
- * Serves the CIM operations through registered providers. Every operation throws CimError where it fails, with the
- * provider's code and message, or CMPI_RC_ERR_FAILED and what the provider did where it broke the rules of the
- * interface; what it did costs its own request only. Used by several threads at once.
+ * Serves the CIM operations through registered providers. A failed operation throws CimError: with the provider's code
+ * and message, or, if the provider broke the rules of CMPI, with CMPI_RC_ERR_FAILED and a message that says what it
+ * did. A provider that breaks the rules fails its own request only; others go on. Used by several threads at once.
  */
 class Dispatcher final : public Operations {
 public:
     struct Settings {
-        /** Where provider libraries are, in order. */
+        /** The folders that are searched for provider libraries, in this order. */
         std::vector<std::filesystem::path> folders;
         /** May be null; outlives the dispatcher. */
         const ClassInformation* classes = nullptr;
         /** Where failures' reasons come from; may be null; outlives the dispatcher. */
         LogTap* log = nullptr;
-        /** Of which the first that is about a method is followed. They outlive the dispatcher. */
+        /** A call follows the first rule that is about its method. The rules must outlive the dispatcher. */
         std::vector<const MethodRule*> rules{};
     };
 
@@ -44,7 +44,7 @@ public:
     /** Where failures' reasons come from; may be null. */
     LogTap* log() { return _log; }
 
-    /** What is found of a registered provider. */
+    /** Loads a registered provider, and reports whether it can be used. */
     ProviderReport check(const Registration& registration) { return _providers.check(registration); }
 
     using Operations::enumerateInstanceNames;
@@ -63,28 +63,29 @@ public:
     void execQuery(const Invocation& invocation, const ObjectPath& classPath, const std::string& query,
                    const std::string& language, const InstanceSink& sink) override;
     /**
-     * Calls a method for a client. A provider of methods may act whatever it is asked for, so this looks before whether
-     * the paths that the client gave name what is there: the target, and each reference among the arguments. Whether
-     * paths are equal is not a matter of host names and of the letter case of names.
+     * Calls a method for a client. Since a method provider may act without a look at the paths that it is given, this
+     * checks first that they name instances that exist: the target, and each reference among the arguments. Host names,
+     * and the letter case of names, do not matter.
      *
-     * @param path without keys for the class itself.
-     * @param method,arguments named as the class declares them.
-     * @throws CimError with CMPI_RC_ERR_NOT_FOUND where no provider names such an instance, but for a target of a class
-     *         that has no provider of instances; with CMPI_RC_ERR_INVALID_PARAMETER where a reference names a class, or
-     *         its class is not declared; and as the method's rule and invokeMethod throw.
+     * @param path names the instance whose method is called; without keys it names the class itself.
+     * @param method,arguments have the names that the class declares.
+     * @throws CimError with CMPI_RC_ERR_NOT_FOUND if no provider lists such an instance (a target whose class has no
+     *         instance provider is not checked); with CMPI_RC_ERR_INVALID_PARAMETER if a reference names a class
+     *         instead of an instance, or its class is not declared; and whatever the method's rule and invokeMethod
+     *         throw.
      */
     MethodOutcome callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                              const std::vector<NamedValue>& arguments);
-    /** A refusal is a CimError with `refused` set. */
+    /** Calls the method without those checks. If the provider refuses, the CimError has `refused` set. */
     MethodResult invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                               const std::vector<NamedValue>& arguments) override;
 
     /*
-     * The association operations need the classes, and a source that is there: CMPI_RC_ERR_NOT_FOUND where the provider
-     * of its class does not name it. An association class is followed where its declaration says that it
-     * can link the source; its provider is asked for the associations of that class, and told the filter. What the
-     * filter leaves out is dropped from the answer too, since a provider need not look at it. One provider's failure is
-     * the operation's, and names the class.
+     * The association operations need the class declarations, and a source that exists: if the provider of its class
+     * does not list it, they throw CMPI_RC_ERR_NOT_FOUND. They follow each association class whose declaration lets it
+     * refer to the source, and call its provider with the filter. Since a provider need not apply the filter, they
+     * apply it to the provider's objects once more. If one provider fails, the whole operation fails, with a message
+     * that names the association class.
      */
 
     std::vector<Associated<Instance>> associators(const Invocation& invocation, const ObjectPath& source,

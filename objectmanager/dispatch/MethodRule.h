@@ -1,4 +1,4 @@
-/** What holds for calls of one method beyond what holds for all. */
+/** Rules for calls of particular methods, beyond those for all methods. */
 #ifndef DISPATCH_METHODRULE_H
 #define DISPATCH_METHODRULE_H
 
@@ -11,25 +11,25 @@
 
 namespace ObjectManager {
 
-/** A client's call of a method: of an instance that is there, with references to instances that are there. */
+/** A client's call of a method. The target, and every instance that its arguments refer to, is known to exist. */
 struct MethodCall {
     const Invocation& invocation;
     const ObjectPath& target;
-    /** As the class declares it. */
+    /** Spelled as the class declares it. */
     const std::string& method;
     const std::vector<NamedValue>& arguments;
 };
 
-/** A call that its provider answered. */
+/** The outcome of a call that the provider answered. */
 struct MethodOutcome {
     MethodResult result;
-    /** What is known of the outcome beyond the return value, or why nothing is; may be empty. */
+    /** What is known about the outcome beyond the return value, or why nothing is known; may be empty. */
     std::string remark{};
-    /** False where success is not known beyond the return value. */
+    /** False if nothing but the return value says that the call succeeded. */
     bool isKnown = true;
 };
 
-/** Used by several threads at once. */
+/** A rule for one or more methods. Used by several threads at once. */
 class MethodRule {
 public:
     MethodRule() = default;
@@ -37,15 +37,16 @@ public:
     MethodRule& operator=(const MethodRule&) = delete;
     virtual ~MethodRule() = default;
 
-    /** Whether the rule is about a method of a class. */
+    /** Whether the rule holds for this method of this class. */
     virtual bool isAbout(std::string_view className, std::string_view method) const = 0;
 
     /**
-     * Makes the call, if it may be made.
+     * Calls the provider if the rule permits it.
      *
-     * @param operations answers what the rule has to ask before.
-     * @param provider calls the provider.
-     * @throws CimError where the call was not made, or failed, also where the provider tells of no failure.
+     * @param operations are for what the rule has to find out first.
+     * @param provider makes the call.
+     * @throws CimError if the rule forbids the call, if the provider fails, or if the call failed although the provider
+     * reports success.
      */
     virtual MethodOutcome call(const MethodCall& call, Operations& operations,
                                const std::function<MethodResult()>& provider) const = 0;

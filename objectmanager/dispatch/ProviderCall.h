@@ -1,4 +1,4 @@
-/** Calling into providers. */
+/** Calls provider code and catches what it throws. */
 #ifndef DISPATCH_PROVIDERCALL_H
 #define DISPATCH_PROVIDERCALL_H
 
@@ -10,14 +10,14 @@
 namespace ObjectManager {
 
 /**
- * Runs code of a provider's. What it throws ends here and is told as the end of a sentence that begins with the
- * provider's name; nothing where it throws nothing.
+ * Runs a provider's code and catches every exception. @return the exception in words, to follow the provider's name in
+ * a message ("threw an exception: ..."); no value if the code threw none.
  */
 template <typename Call>
 std::optional<std::string> callProvider(Call call) {
     try {
         call();
-    } catch (const abi::__forced_unwind&) { // the thread is being ended, which cannot be stopped here
+    } catch (const abi::__forced_unwind&) { // pthread_cancel ends the thread; that must not be caught
         throw;
     } catch (const std::exception& exception) {
         return std::string("threw an exception: ") + exception.what();

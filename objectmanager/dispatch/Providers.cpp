@@ -14,7 +14,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** Of a kind of provider: how its factories end, what its functions are called, and when it is registered. */
+/** What is particular to one kind of provider: the suffix of its factory functions, and the names of its functions. */
 template <typename MI>
 struct MIKind;
 
@@ -37,7 +37,7 @@ struct MIKind<CMPIAssociationMI> {
     static constexpr std::array slots{"cleanup", "associators", "associatorNames", "references", "referenceNames"};
 };
 
-/** The first slot of a function table that is null; null where all are set. */
+/** The name of the first function that is null in a function table; null if the table is complete. */
 template <typename MI>
 const char* missingSlot(const MI& mi) {
     constexpr auto& names = MIKind<MI>::slots;
@@ -48,7 +48,9 @@ const char* missingSlot(const MI& mi) {
     return missing != functions.end() ? names[static_cast<std::size_t>(missing - functions.begin())] : nullptr;
 }
 
-/** What is wrong with a function table, as the end of a sentence about its factory; empty where nothing is. */
+/**
+ * What is wrong with a function table, as the end of a sentence that begins with its factory; empty if it is correct.
+ */
 template <typename MI>
 std::string tableProblem(const MI& mi) {
     if (mi.ft == nullptr) {
@@ -77,7 +79,7 @@ std::string joined(const std::vector<std::filesystem::path>& folders) {
 
 } // namespace
 
-/** A loaded library with the providers that its factories made. */
+/** A loaded library, with the providers that its factory functions made. */
 class ProviderLibrary {
 public:
     ProviderLibrary(const Broker& broker, const std::string& location,
@@ -86,11 +88,14 @@ public:
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
     ~ProviderLibrary();
 
-    /** With every symbolic link resolved. */
+    /** The library's file, with every symbolic link resolved. */
     const std::filesystem::path& file() const { return _file; }
     void* handle() const { return _handle; }
 
-    /** Calls the factory where it was not called yet; the provider, null where `report` tells a problem. */
+    /**
+     * The provider of one kind; its factory is called the first time. @return null if the factory failed: `report` says
+     * why.
+     */
     template <typename MI>
     MI* provider(const std::string& name, FactoryReport& report);
 
@@ -104,7 +109,7 @@ private:
     struct Loaded {
         void* mi;
         FactoryReport report;
-        /** The provider's cleanup; whether the library may be unloaded after it. */
+        /** Calls the provider's cleanup function. @return whether the library may be unloaded afterwards. */
         std::function<bool()> cleanup;
     };
 
@@ -226,7 +231,10 @@ ProviderLibrary& Providers::library(const std::string& location) {
 
 namespace {
 
-/** Calls the factory of each kind of provider that is registered; `report` gives the place for its report. */
+/**
+ * Calls the factory of each kind of provider that is registered; each call of `report` returns the report to fill in
+ * next.
+ */
 template <typename Report>
 void callFactories(ProviderLibrary& library, const Registration& registration, Report report) {
     const auto call = [&]<typename MI>(bool registered, const MI*) {
@@ -246,7 +254,7 @@ MI& Providers::provider(const Registration& registration) {
     const std::lock_guard lock(_mutex);
     ProviderLibrary& loaded = library(registration.location);
     FactoryReport report;
-    // Factories of one provider may write what its operations read: none is called once an operation can be running.
+    // A provider's factories may write data that its operations read, so all of them run before its first operation.
     if (_begun.insert(&registration).second) {
         callFactories(loaded, registration, [&]() -> FactoryReport& { return report = FactoryReport(); });
     }

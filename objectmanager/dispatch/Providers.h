@@ -1,4 +1,4 @@
-/** Provider libraries and what they export. */
+/** Provider libraries and the providers that their factory functions make. */
 #ifndef DISPATCH_PROVIDERS_H
 #define DISPATCH_PROVIDERS_H
 
@@ -16,25 +16,25 @@
 
 namespace ObjectManager {
 
-/** One factory of a registered provider, as found. */
+/** The result of calling one factory of a registered provider. */
 struct FactoryReport {
-    /** For example "PowerManagementServiceProvider_Create_InstanceMI". */
+    /** The factory's name, for example "PowerManagementServiceProvider_Create_InstanceMI". */
     std::string factory;
-    /** The name and versions in the function table; where there is a problem, as far as they could be read. */
+    /** The name and the versions in the function table. If there is a problem, those of them that could be read. */
     std::string miName;
     int tableVersion = 0;
     int miVersion = 0;
-    /** One line; empty where nothing is wrong. */
+    /** What is wrong, in one line; empty if the factory can be used. */
     std::string problem;
 };
 
-/** A registered provider, as found. */
+/** What was found when a registered provider was loaded. */
 struct ProviderReport {
-    /** The library's file with every symbolic link resolved; empty where it was not found or did not load. */
+    /** The library's file with every symbolic link resolved; empty if it was not found or does not load. */
     std::filesystem::path library;
-    /** Why the library or the registration cannot be used, in one line; empty where it can. */
+    /** Why the library or the registration cannot be used, in one line; empty if it can. */
     std::string problem;
-    /** One for each kind that is registered; none where the library cannot be used. */
+    /** One report for each kind of provider that is registered; none if the library cannot be used. */
     std::vector<FactoryReport> factories;
 
     bool usable() const;
@@ -43,30 +43,32 @@ struct ProviderReport {
 class ProviderLibrary;
 
 /**
- * Loads provider libraries when they are first needed, calls all factories of a provider before its first operation,
- * and keeps both, with the function tables that the factories gave, until it ends; then every provider's cleanup is
- * called and the libraries are unloaded, but for those that object to it. Used by several threads at once.
+ * Loads each provider library when it is first needed, and calls all factories of a provider before its first
+ * operation. Libraries and function tables stay until this object is destroyed: then it calls every provider's cleanup
+ * function and unloads the libraries, except those whose cleanup says that they must stay. Used by several threads at
+ * once.
  */
 class Providers {
 public:
-    /** What is done with each library, as dlopen gave it, before anything in it is called. */
+    /** Called with each library's handle from dlopen, before any function of the library is called. */
     using Loaded = std::function<void(void* library)>;
 
-    /** Libraries are looked for in `folders`, in that order, as lib<location>.so.1, then as lib<location>.so. */
+    /** Searches `folders` in their order for lib<location>.so.1, then for lib<location>.so. */
     Providers(
         const Broker& broker, std::vector<std::filesystem::path> folders, Loaded loaded = [](void* /*library*/) {});
     Providers(const Providers&) = delete;
     Providers& operator=(const Providers&) = delete;
     ~Providers();
 
-    /* A registered provider of one kind; the registration outlives this. Throws CimError with CMPI_RC_ERR_FAILED where
-       it cannot be had: one line that says which library or factory, and what is wrong with it. */
+    /* These return the function table of a registered provider; the registration must outlive this object. They throw
+       CimError with CMPI_RC_ERR_FAILED if it cannot be used; the message is one line that names the library or the
+       factory, and what is wrong with it. */
 
     CMPIInstanceMI& instanceProvider(const Registration& registration);
     CMPIMethodMI& methodProvider(const Registration& registration);
     CMPIAssociationMI& associationProvider(const Registration& registration);
 
-    /** Loads what the registration names, and says what was found. */
+    /** Loads the provider that the registration names, and reports what was found. */
     ProviderReport check(const Registration& registration);
 
 private:
@@ -77,10 +79,10 @@ private:
     const Broker& _broker;
     std::vector<std::filesystem::path> _folders;
     Loaded _loaded;
-    /** Recursive, since a factory may ask the object manager for something on its own. */
+    /** Recursive, since a factory may call the object manager in its turn. */
     std::recursive_mutex _mutex;
     std::map<std::string, std::unique_ptr<ProviderLibrary>> _libraries;
-    /** Those of which a provider was asked for. */
+    /** The registrations whose factories were called. */
     std::set<const Registration*> _begun;
 };
 

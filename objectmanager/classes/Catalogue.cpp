@@ -18,7 +18,7 @@ void inheritQualifiers(Element& element, const Element& inherited, const Qualifi
     element.qualifiers = types.merged(inherited.qualifiers, std::move(element.qualifiers));
 }
 
-/** Parameters inherit the qualifiers of the parameters of the same names. */
+/** A parameter inherits the qualifiers of the inherited method's parameter of the same name. */
 void inheritQualifiers(Method& method, const Method& inherited, const QualifierTypes& types) {
     method.qualifiers = types.merged(inherited.qualifiers, std::move(method.qualifiers));
     for (Parameter& parameter : method.parameters) {
@@ -28,7 +28,7 @@ void inheritQualifiers(Method& method, const Method& inherited, const QualifierT
     }
 }
 
-/** Adds the elements of a class to those that it inherits. */
+/** Adds the elements that a class declares to those that it inherits. */
 template <typename T>
 void addElements(std::vector<T>& elements, const std::vector<T>& own, const Class& owner, const QualifierTypes& types) {
     for (T element : own) {
@@ -51,10 +51,10 @@ void addElements(std::vector<T>& elements, const std::vector<T>& own, const Clas
     }
 }
 
-/** Declarations by name, and with what each of them inherits. */
+/** Completes class declarations with what they inherit. */
 class Completion {
 public:
-    /** @param types lives longer. */
+    /** @param types must outlive this object. */
     Completion(std::vector<Class> declarations, const QualifierTypes& types) : _types(types) {
         for (Class& declared : declarations) {
             convertQualifiers(declared);
@@ -77,7 +77,7 @@ public:
     }
 
 private:
-    /** The qualifiers of the class and of its elements get values of their types. */
+    /** Converts the qualifiers of the class and of its elements to their types. */
     void convertQualifiers(Class& declared) const {
         _types.convert(declared.qualifiers, declared.place);
         for (Property& property : declared.properties) {
@@ -91,7 +91,9 @@ private:
         }
     }
 
-    /** `descendants` counts the classes on the way down to the one that is completed. */
+    /**
+     * `descendants` counts the classes between `declared` and the class whose completion began this: it finds cycles.
+     */
     Class complete(const Class& declared, std::size_t descendants) const {
         Class whole = declared;
         whole.properties.clear();

@@ -1,5 +1,5 @@
 /**
- * The classes that an object manager knows, with what they inherit.
+ * The classes that an object manager knows, each with the elements that it inherits.
  */
 #ifndef CLASSES_CATALOGUE_H
 #define CLASSES_CATALOGUE_H
@@ -18,32 +18,35 @@
 
 namespace ObjectManager {
 
-/** Class declarations that fit together. Never changed once it is made, so several threads may use it at once. */
+/**
+ * A consistent set of class declarations. It is never changed after construction, so several threads may use it at
+ * once.
+ */
 class Catalogue final : public ClassInformation {
 public:
     /**
      * @param declarations in any order, superclasses included.
-     * @throws SchemaError where a class is declared twice, a superclass or the class of a reference is not declared, a
-     *         class is its own ancestor, an inherited property or method is redeclared with another type, or a
-     *         qualifier has no value of its type.
+     * @throws SchemaError if a class is declared twice, a superclass or the class of a reference is not declared, a
+     *         class is its own ancestor, an inherited property or method is redeclared with another type, or the value
+     *         of a qualifier does not fit its type.
      */
     explicit Catalogue(Declarations declarations);
 
     const QualifierTypes& qualifierTypes() const { return _qualifierTypes; }
 
     /**
-     * The class with everything that it inherits, the ancestors' elements first. An element that is declared again
-     * stands in the ancestor's place. It has its own qualifiers and those of the ancestor's that go to subclasses, as
-     * the class has its superclass's.
+     * The class with everything that it inherits; its ancestors' elements come first. An element that the class
+     * overrides stands in the ancestor's place, and has its own qualifiers and those of the ancestor's qualifiers that
+     * subclasses inherit. The class inherits qualifiers of its superclass in the same way.
      *
-     * @return null where no such class is known.
+     * @return null if no class has that name.
      */
     const Class* find(std::string_view name) const;
 
-    /** All classes, by name. */
+    /** All classes, sorted by name. */
     std::vector<const Class*> all() const;
 
-    /** Whether the class is `ancestor` or descends from it. An unknown class is nothing but itself. */
+    /** Whether the class is `ancestor` or descends from it. An unknown class descends from no other. */
     bool isA(std::string_view name, std::string_view ancestor) const override;
 
     std::span<const std::string> keyNames(std::string_view name) const override;
@@ -62,9 +65,9 @@ private:
 };
 
 /**
- * The classes of all .mof files of a folder.
+ * Reads the classes in all .mof files of a folder.
  *
- * @throws SchemaError also where the folder or a file cannot be read.
+ * @throws SchemaError if a declaration is wrong, or the folder or a file cannot be read.
  */
 Catalogue readCatalogue(const std::filesystem::path& folder);
 

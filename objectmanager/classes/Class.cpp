@@ -11,7 +11,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** The texts of a qualifier that is an array of strings, or none. */
+/** The elements of a qualifier that is an array of strings; none if there is no such qualifier. */
 std::vector<std::string> textsOf(const Qualifiers& qualifiers, std::string_view name) {
     std::vector<std::string> texts;
     const NamedValue* qualifier = find(qualifiers, name);
@@ -25,7 +25,7 @@ std::vector<std::string> textsOf(const Qualifiers& qualifiers, std::string_view 
     return texts;
 }
 
-/** An integer, whether it has a sign or not. */
+/** A signed or unsigned integer. */
 using Integer = std::variant<std::uint64_t, std::int64_t>;
 
 std::optional<Integer> integerOf(const Value& value) {

@@ -1,5 +1,5 @@
 /**
- * Class declarations: what an object manager knows of a class beside its provider.
+ * Class declarations: the names, types and qualifiers of a class and of its elements.
  */
 #ifndef CLASSES_CLASS_H
 #define CLASSES_CLASS_H
@@ -13,10 +13,10 @@
 
 namespace ObjectManager {
 
-/** Qualifiers by name. One without a value is TRUE; numbers are sint64, uint64 or real64. */
+/** Qualifiers by name. A qualifier that is written without a value is TRUE; numbers are sint64, uint64 or real64. */
 using Qualifiers = std::vector<NamedValue>;
 
-/** Whether the boolean qualifier `name` is there and TRUE. */
+/** Whether the boolean qualifier `name` is present and TRUE. */
 bool hasFlag(const Qualifiers& qualifiers, std::string_view name);
 
 struct Class;
@@ -24,13 +24,13 @@ struct Class;
 /** What a property, a parameter and a method's return value have in common. */
 struct Element {
     std::string name;
-    /** CMPI_ARRAY included where it is an array. */
+    /** Includes CMPI_ARRAY if the element is an array. */
     CMPIType type = CMPI_null;
-    /** The class that is referred to, where the type is CMPI_ref. */
+    /** The class that a reference refers to; empty unless the type is CMPI_ref. */
     std::string referenceClass;
     Qualifiers qualifiers;
-    /* In a catalogue: the class that declared the element first, and the one whose declaration this is. They differ
-       where the element was overridden; a parameter has neither. */
+    /* Set in a catalogue only, and not for parameters: the class that declared the element first, and the class whose
+       declaration this is. They differ if the element was overridden. */
     std::string origin;
     std::string declaredBy;
 
@@ -38,40 +38,40 @@ struct Element {
 };
 
 /**
- * What a value of the element means by its qualifiers ValueMap and Values.
+ * The meaning of a value of the element, according to its qualifiers ValueMap and Values.
  *
- * @param value no array; of an array element, one of its elements.
- * @return nothing where the element has no such qualifiers or they do not speak of the value.
+ * @param value one value: for an element that is an array, one element of the array.
+ * @return no value if the element has no such qualifiers, or they do not list the value.
  */
 std::optional<std::string> meaning(const Element& element, const Value& value);
 
 struct Property : Element {
-    /** Null where the declaration has none. */
+    /** Null if the declaration gives none. */
     Value defaultValue;
 
     bool isKey() const { return hasFlag(qualifiers, "Key"); }
 };
 
 struct Parameter : Element {
-    /** A parameter is an input unless its qualifier says otherwise. */
+    /** A parameter is an input unless its qualifier In is FALSE. */
     bool isIn() const;
     bool isOut() const { return hasFlag(qualifiers, "Out"); }
 };
 
-/** The element is the return value. */
+/** A method; as an element, it is the return value. */
 struct Method : Element {
     std::vector<Parameter> parameters;
 };
 
 struct Class {
     std::string name;
-    /** Empty where there is none. */
+    /** Empty if the class has none. */
     std::string superClass;
     Qualifiers qualifiers;
-    /** References included. */
+    /** Properties and references. */
     std::vector<Property> properties;
     std::vector<Method> methods;
-    /** Where the declaration stands, "file:line". */
+    /** The place of the declaration, "file:line". */
     std::string place;
 
     const Property* property(std::string_view name) const;
@@ -79,7 +79,7 @@ struct Class {
     std::vector<const Property*> keys() const;
 };
 
-/** The element called `name`, letter case ignored, or null. */
+/** The element called `name`, letter case ignored; null if there is none. */
 template <typename T>
 const T* findElement(const std::vector<T>& elements, std::string_view name) {
     for (const T& element : elements) {

@@ -12,13 +12,13 @@
 namespace ObjectManager {
 
 /**
- * The files of a folder that end in `extension`, by name.
+ * The files of a folder whose names end in `extension`, sorted by name.
  *
- * @throws SchemaError where the folder cannot be read.
+ * @throws SchemaError if the folder cannot be read.
  */
 std::vector<std::filesystem::path> filesOf(const std::filesystem::path& folder, std::string_view extension);
 
-/** @throws SchemaError where the file cannot be read. */
+/** The content of a file. @throws SchemaError if it cannot be read. */
 std::string readFile(const std::filesystem::path& file);
 
 } // namespace ObjectManager

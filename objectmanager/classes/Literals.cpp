@@ -20,7 +20,7 @@ struct TypeName {
     CMPIType type;
 };
 
-/** The types that can be declared by name. */
+/** The types that a MOF declaration can name. */
 constexpr std::array<TypeName, 14> typeNames{{{"boolean", CMPI_boolean},
                                               {"char16", CMPI_char16},
                                               {"uint8", CMPI_uint8},
@@ -41,7 +41,7 @@ struct Digits {
     int base;
 };
 
-/** The digits of an integer without sign, and their base by the forms of DSP0004. */
+/** The digits of an unsigned integer and their base, which prefix or suffix tell (DSP0004). */
 Digits digitsOf(std::string_view text) {
     if (text.starts_with("0x") || text.starts_with("0X")) {
         return {text.substr(2), 16};
@@ -58,7 +58,7 @@ Digits digitsOf(std::string_view text) {
 struct Integer {
     bool negative;
     std::uint64_t magnitude;
-    /** The magnitude does not fit. */
+    /** Whether the magnitude does not fit into 64 bits. */
     bool tooLarge;
 };
 
@@ -92,7 +92,7 @@ std::optional<double> parseReal(std::string_view text) {
     throw LiteralError(0, fmt::format("found '{}', expected {}", text, expected));
 }
 
-/** Bits of an integer type: the type codes of each sign stand in the order of their sizes. */
+/** The number of bits of an integer type. The type codes of signed and of unsigned types each grow with the size. */
 int bitsOf(CMPIType type) {
     return 8 << (((type & ~CMPI_ARRAY) >> 4) & 3);
 }
@@ -114,7 +114,7 @@ Value integerOfText(std::string_view text, CMPIType type) {
     if (!isSigned(type)) {
         return unsignedValue(type, integer->magnitude);
     }
-    // The number is negated while it is unsigned: no signed integer holds the magnitude of the smallest value.
+    // The number is negated while it is unsigned, since no signed integer holds the magnitude of the smallest value.
     return signedValue(type,
                        static_cast<std::int64_t>(integer->negative ? 0 - integer->magnitude : integer->magnitude));
 }
@@ -152,7 +152,10 @@ void appendUtf8(std::string& text, char16_t character) {
     }
 }
 
-/** The one character of a text in UTF-8, where it is one and fits into a char16. */
+/**
+ * The character of a text in UTF-8 that consists of one character; no value if there are more or it does not fit into a
+ * char16.
+ */
 std::optional<char16_t> singleCharacter(std::string_view text) {
     const auto byte = [&](std::size_t index) { return static_cast<unsigned char>(text[index]); };
     const auto continues = [&](std::size_t index) { return (byte(index) & 0xc0) == 0x80; };
@@ -173,11 +176,11 @@ struct Escape {
     char character;
 };
 
-/** The escapes of one letter; \x with up to four hexadecimal digits is the other one. */
+/** The escape sequences of one letter. The only other one is \x with up to four hexadecimal digits. */
 constexpr std::array<Escape, 8> escapes{
     {{'b', '\b'}, {'t', '\t'}, {'n', '\n'}, {'f', '\f'}, {'r', '\r'}, {'"', '"'}, {'\'', '\''}, {'\\', '\\'}}};
 
-/** Reads what follows a backslash at `position`. */
+/** Reads the escape sequence whose letter is at `position`, behind the backslash. */
 void readEscape(std::string_view text, std::size_t& position, std::string& result) {
     const std::size_t start = position;
     const char letter = text[position++];

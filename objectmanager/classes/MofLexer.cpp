@@ -41,7 +41,7 @@ public:
     }
 
 private:
-    /** Moves to the next token. Returns whether there is one. */
+    /** Moves to the next token. @return whether there is one. */
     bool skipBlanks() {
         while (_position < _text.size()) {
             const std::string_view rest = _text.substr(_position);
@@ -62,7 +62,7 @@ private:
         return false;
     }
 
-    /** A directive is "#pragma name(text)"; it concerns MOF compilers. */
+    /** Skips a compiler directive, "#pragma name(text)". */
     void skipDirective() {
         const std::size_t end = _text.find(')', _position);
         if (!_text.substr(_position).starts_with("#pragma") || end == std::string_view::npos) {

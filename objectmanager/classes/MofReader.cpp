@@ -12,7 +12,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** What a flavor says of a qualifier type. */
+/** What a flavor changes in a qualifier type. */
 struct Flavor {
     std::string_view name;
     bool QualifierType::*member;
@@ -42,7 +42,7 @@ public:
     }
 
 private:
-    /** What follows the word Qualifier: "Name : type [] = default, Scope(...), Flavor(...);". */
+    /** Reads what follows the word Qualifier: "Name : type [] = default, Scope(...), Flavor(...);". */
     QualifierType qualifierType() {
         QualifierType declared;
         declared.place = placeOf(_file, peek().line);
@@ -116,7 +116,7 @@ private:
         return declared;
     }
 
-    /** A property, a reference or a method. */
+    /** Reads a property, a reference or a method. */
     void feature(Class& declared) {
         Element element = typedElement("a property, a method or '}'");
         if (accept("(")) {
@@ -147,7 +147,7 @@ private:
         return result;
     }
 
-    /** Qualifiers, type and name. */
+    /** Reads the qualifiers, the type and the name of an element. */
     Element typedElement(const char* expected) {
         Element element;
         element.qualifiers = qualifierList();
@@ -165,7 +165,7 @@ private:
         return element;
     }
 
-    /** The type, as that of an array where brackets follow. */
+    /** The type; the array type of it if brackets follow. */
     CMPIType arrayBrackets(CMPIType type) {
         if (!accept("[")) {
             return type;
@@ -221,7 +221,7 @@ private:
         return arrayValue(type, std::move(elements));
     }
 
-    /** A literal where no type is declared. */
+    /** Reads a literal whose type is not declared. */
     Value untypedLiteral() {
         const Token& token = peek();
         ++_next;
@@ -261,7 +261,7 @@ private:
         return arrayValue(elementType, std::move(elements));
     }
 
-    /** A literal of a declared type. */
+    /** Reads a literal of a declared type. */
     Value literal(CMPIType type) {
         const Token& token = peek();
         ++_next;
@@ -333,7 +333,7 @@ private:
         throw SchemaError(placeOf(_file, token.line), fmt::format("found {}, expected {}", describe(token), expected));
     }
 
-    /** Reports what stands before the next token. */
+    /** Fails because of what stands before the next token. */
     [[noreturn]] void failBefore(const std::string& found, const std::string& expected) const {
         throw SchemaError(placeOf(_file, _tokens[_next - 1].line),
                           fmt::format("found {}, expected {}", found, expected));

@@ -13,18 +13,18 @@
 
 namespace ObjectManager {
 
-/** What a text declares, each kind in its order. */
+/** The declarations in a text; each kind in the order of the text. */
 struct Declarations {
     std::vector<Class> classes;
     std::vector<QualifierType> qualifierTypes;
 };
 
 /**
- * The classes and qualifier types that a text declares. Compiler directives, and flavors where a qualifier is used, are
- * read over.
+ * Reads the classes and qualifier types that a text declares. Compiler directives are ignored, and so are flavors that
+ * stand behind a qualifier of a class or of an element.
  *
- * @param file the name that errors give.
- * @throws SchemaError also where the text has anything else than declarations of classes and qualifier types.
+ * @param file the file's name, for error messages.
+ * @throws SchemaError if the text has mistakes, or contains anything but declarations of classes and qualifier types.
  */
 Declarations readMof(std::string_view text, std::string_view file);
 

@@ -16,7 +16,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** Of the meta and standard qualifiers of DSP0004. */
+/** A row of the table of meta and standard qualifiers in DSP0004. */
 struct StandardType {
     std::string_view name;
     CMPIType type;
@@ -24,7 +24,7 @@ struct StandardType {
     bool toSubclass;
     bool translatable;
     Scopes scopes;
-    /** Null where there is none. */
+    /** Null if the qualifier has none. */
     const char* defaultValue;
 };
 
@@ -99,7 +99,7 @@ bool isSame(const QualifierType& left, const QualifierType& right) {
     return asTuple(left) == asTuple(right) && left.defaultValue == right.defaultValue;
 }
 
-/** The value in a type that is no array, or nothing where it is none of it. */
+/** The value, converted to a type that is not an array; no value if it does not fit the type. */
 std::optional<Value> scalarOf(const Value& value, CMPIType type) {
     if (value.isNull()) {
         return nullValue(type);

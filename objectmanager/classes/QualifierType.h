@@ -1,5 +1,5 @@
 /**
- * Qualifier types (DSP0004): what is known of a qualifier beside its value.
+ * Qualifier types (DSP0004): type, default value, scopes and flavors of qualifiers.
  */
 #ifndef CLASSES_QUALIFIERTYPE_H
 #define CLASSES_QUALIFIERTYPE_H
@@ -14,7 +14,7 @@
 
 namespace ObjectManager {
 
-/** What a qualifier may stand at: bits that are or-ed. */
+/** The kinds of elements that may have a qualifier, as bits that are or-ed. */
 using Scopes = unsigned int;
 
 constexpr Scopes aClass = 1;
@@ -24,7 +24,7 @@ constexpr Scopes aProperty = 8;
 constexpr Scopes aMethod = 16;
 constexpr Scopes aParameter = 32;
 constexpr Scopes anIndication = 64;
-/** Written as "any". */
+/** Every kind; MOF writes it as "any". */
 constexpr Scopes anyScope = 127;
 
 struct ScopeName {
@@ -40,48 +40,48 @@ constexpr std::array<ScopeName, 7> scopeNames{{{"class", aClass},
                                                {"parameter", aParameter},
                                                {"indication", anIndication}}};
 
-/** The flavors are those that a qualifier type has where its declaration gives none. */
+/** A qualifier type. The initial flavors hold if its declaration gives none. */
 struct QualifierType {
     std::string name;
-    /** CMPI_ARRAY included where it is an array. */
+    /** Includes CMPI_ARRAY if values are arrays. */
     CMPIType type = CMPI_null;
     /** Whether a subclass may give the qualifier another value. */
     bool overridable = true;
-    /** Whether a class inherits the qualifier, and an element that is declared again. */
+    /** Whether subclasses, and elements that override others, inherit the qualifier. */
     bool toSubclass = true;
     bool translatable = false;
     Scopes scopes = 0;
-    /** What the qualifier is where it is not given; null where the declaration says nothing. */
+    /** The value of the qualifier if an element does not have it; null if the declaration gives none. */
     Value defaultValue{};
-    /** Where the declaration stands, "file:line"; empty for those that every schema has. */
+    /** The place of the declaration, "file:line"; empty for the qualifier types that DSP0004 defines. */
     std::string place;
 };
 
-/** Qualifier types by name. Those that DSP0004 defines for every schema are always there. */
+/** Qualifier types by name. The qualifier types that DSP0004 defines are always among them. */
 class QualifierTypes {
 public:
     /**
-     * @param declared takes the place of what DSP0004 defines; may declare one type several times, as long as it does
-     *                 so in the same way.
-     * @throws SchemaError where declarations of one type differ.
+     * @param declared replaces definitions of DSP0004. It may declare a type several times if the declarations are
+     *                 equal.
+     * @throws SchemaError if declarations of one type differ.
      */
     explicit QualifierTypes(const std::vector<QualifierType>& declared);
 
-    /** The type called `name`, letter case ignored, or null. */
+    /** The type called `name`, letter case ignored; null if there is none. */
     const QualifierType* find(std::string_view name) const;
 
-    /** All types, by name. */
+    /** All types, sorted by name. */
     std::vector<const QualifierType*> all() const;
 
     /**
-     * Gives each qualifier a value of its type. One that has no type keeps what it has.
+     * Converts the value of each qualifier to its declared type. A qualifier without a declared type keeps its value.
      *
-     * @param place what errors give, "file:line".
-     * @throws SchemaError where a value is none of its qualifier's type.
+     * @param place of the qualifiers, "file:line", for error messages.
+     * @throws SchemaError if a value does not fit its qualifier's type.
      */
     void convert(Qualifiers& qualifiers, const std::string& place) const;
 
-    /** What a class, or an element that is declared again, has as qualifiers: its own, and what it inherits. */
+    /** The qualifiers of a class, or of an element that overrides another: its own, and those that it inherits. */
     Qualifiers merged(const Qualifiers& inherited, Qualifiers own) const;
 
 private:

@@ -13,10 +13,10 @@
 namespace ObjectManager {
 
 struct ProviderType {
-    /** As .reg files have it. */
+    /** The name in .reg files. */
     std::string_view name;
     bool Registration::*flag;
-    /** As PG_ProviderCapabilities.ProviderType has it. */
+    /** The number in PG_ProviderCapabilities.ProviderType; no value if that property has no number for it. */
     std::optional<int> capability;
 };
 

@@ -122,7 +122,7 @@ private:
     std::string_view _file;
     std::size_t _line = 0;
     std::size_t _sectionLine = 0;
-    /** Of the section that is being read. */
+    /** The keys that the current section has had so far. */
     std::vector<std::string> _keys;
     std::vector<Registration> _registrations;
 };

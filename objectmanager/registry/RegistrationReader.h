@@ -1,5 +1,5 @@
 /**
- * Reads provider registrations: which library serves which class. Files have one section a class,
+ * Reads provider registrations: which library serves which class. A file has one section for each class,
  *
  *     [CLASS]
  *        provider: NAME
@@ -8,9 +8,9 @@
  *        namespace: NAMESPACE NAMESPACE
  *        methods: METHOD METHOD
  *
- * with lines in any order, and comments behind #. Without "methods", the provider is taken to implement every method of
- * the class. "unload" and "group" are for object managers that run providers in processes of their own; they are read
- * over.
+ * with lines in any order, and comments behind #. Without "methods", the provider counts as one that implements every
+ * method of the class. The keys "unload" and "group" are for object managers that run providers in separate processes;
+ * they are ignored here.
  */
 #ifndef REGISTRY_REGISTRATIONREADER_H
 #define REGISTRY_REGISTRATIONREADER_H
@@ -24,9 +24,9 @@
 namespace ObjectManager {
 
 /**
- * The registrations in a text, in its order.
+ * The registrations in a text, in the order of the text.
  *
- * @param file the name that errors give.
+ * @param file the file's name, for error messages.
  * @throws SchemaError
  */
 std::vector<Registration> readRegistrations(std::string_view text, std::string_view file);
@@ -34,7 +34,7 @@ std::vector<Registration> readRegistrations(std::string_view text, std::string_v
 /**
  * The registrations in all .reg files of a folder.
  *
- * @throws SchemaError also where the folder or a file cannot be read.
+ * @throws SchemaError if a file has mistakes, or the folder or a file cannot be read.
  */
 std::vector<Registration> readRegistrations(const std::filesystem::path& folder);
 

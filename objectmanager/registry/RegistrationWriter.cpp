@@ -39,7 +39,7 @@ std::vector<int> capabilities(const Registration& registration) {
     return numbers;
 }
 
-/** The location that all registrations have. */
+/** The location that all registrations have in common. */
 const std::string& locationOf(const std::vector<Registration>& registrations) {
     if (registrations.empty()) {
         throw std::invalid_argument("found no registration, expected those of a library");

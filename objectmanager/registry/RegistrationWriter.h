@@ -1,5 +1,5 @@
 /**
- * Writes provider registrations in the forms that object managers take.
+ * Writes provider registrations in the formats that object managers read.
  */
 #ifndef REGISTRY_REGISTRATIONWRITER_H
 #define REGISTRY_REGISTRATIONWRITER_H
@@ -22,12 +22,12 @@ struct ProviderModule {
 };
 
 /**
- * The instances of PG_ProviderModule, PG_Provider and PG_ProviderCapabilities in MOF: one for the module, one for each
- * provider, and one for each class.
+ * The registrations in MOF: an instance of PG_ProviderModule, one of PG_Provider for each provider, and one of
+ * PG_ProviderCapabilities for each class.
  *
  * @param registrations of one library.
- * @throws std::invalid_argument where there is none, where they are of several libraries, or where a class has a kind
- * of provider that these instances have no number for.
+ * @throws std::invalid_argument if there are no registrations, if they name several libraries, or if a class has a kind
+ * of provider that PG_ProviderCapabilities has no number for.
  */
 std::string registrationInstances(const std::vector<Registration>& registrations, const ProviderModule& module);
 

@@ -1,4 +1,4 @@
-/** Which provider serves which class. */
+/** Registrations: which provider serves which class. */
 #ifndef REGISTRY_REGISTRY_H
 #define REGISTRY_REGISTRY_H
 
@@ -10,12 +10,12 @@
 
 namespace ObjectManager {
 
-/** That one provider of a library serves one class. */
+/** The statement that a provider of a library serves a class. */
 struct Registration {
     std::string className;
-    /** Names the factories: <provider>_Create_InstanceMI and so on. */
+    /** The provider's name, with which its factory functions begin: <provider>_Create_InstanceMI and so on. */
     std::string provider;
-    /** The library without "lib" and ".so.1". */
+    /** The library's file name without "lib" and ".so.1". */
     std::string location;
     std::vector<std::string> nameSpaces;
     bool instance = false;
@@ -23,7 +23,7 @@ struct Registration {
     bool association = false;
     bool property = false;
     bool indication = false;
-    /** Those that the provider of methods implements; none where the registration does not tell. */
+    /** The methods that the provider implements; empty if the registration does not list them. */
     std::vector<std::string> methods;
 
     /** Whether the class is served in the namespace; letter case is ignored. */
@@ -35,7 +35,7 @@ struct Registration {
 
 enum class ProviderKind { instance, method, association };
 
-/** All registrations. Not changed once made, so used by several threads at once. */
+/** All registrations. The registry does not change, so several threads may use it at once. */
 class Registry {
 public:
     explicit Registry(std::vector<Registration> registrations) : _registrations(std::move(registrations)) {}
@@ -48,14 +48,15 @@ public:
     /**
      * The first registration that serves the class in the namespace; letter case is ignored.
      *
-     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace,
-     * CMPI_RC_ERR_INVALID_CLASS where none in it names the class, and where those that do have no provider of this
-     * kind, CMPI_RC_ERR_METHOD_NOT_AVAILABLE for methods, else CMPI_RC_ERR_NOT_SUPPORTED.
+     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE if no registration names the namespace; with
+     * CMPI_RC_ERR_INVALID_CLASS if none in the namespace names the class; if those that name it have no provider of
+     * this kind, with CMPI_RC_ERR_METHOD_NOT_AVAILABLE for methods, else with CMPI_RC_ERR_NOT_SUPPORTED.
      */
     const Registration& find(std::string_view nameSpace, std::string_view className, ProviderKind kind) const;
 
     /**
-     * The registrations of providers of one kind in the namespace, in order, for each class the first.
+     * The registrations in the namespace that have a provider of this kind, in their order; of several for one class,
+     * the first.
      *
      * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace.
      */

@@ -24,7 +24,7 @@ bool continuesCharacter(unsigned char c) {
     return (c & mask) == continuation;
 }
 
-/** The journal's fields; those of systemd.journal-fields(7) and our own. */
+/** The record as fields of the journal: those of systemd.journal-fields(7), and fields of our own. */
 Journal::Fields fieldsOf(const CallRecord& record) {
     // The priorities of syslog(3): notice and warning.
     const char* const priority = record.verdict == Verdict::accepted ? "5" : "4";

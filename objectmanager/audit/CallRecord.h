@@ -1,4 +1,4 @@
-/** Who called which method, and what became of it. */
+/** Records of who called which method, and with which outcome. */
 #ifndef AUDIT_CALLRECORD_H
 #define AUDIT_CALLRECORD_H
 
@@ -10,49 +10,53 @@
 namespace ObjectManager::Audit {
 
 enum class Verdict {
-    /** The method was called, and did not fail. */
+    /** The method was called and did not fail. */
     accepted,
-    /** The call was not made, or failed. */
+    /** The call was not made, or it failed. */
     refused,
-    /** The client has not the right to it. */
+    /** The client does not have the right to make the request. */
     denied,
 };
 
-/** A client's call of a method, or another request that he has not the right to. Every text is one line. */
+/**
+ * A client's call of a method, or another request that the client did not have the right to make. Every text is one
+ * line.
+ */
 struct CallRecord {
     std::chrono::system_clock::time_point time;
     std::string address;
-    /** Empty where clients need not log in. */
+    /** The client's user name; empty if clients need not log in. */
     std::string user;
-    /** The path of the instance or class; of another request the namespace. */
+    /** The path of the instance or class whose method was called; for other requests, the namespace. */
     std::string target;
-    /** Empty of another request. */
+    /** Empty for other requests. */
     std::string className;
     std::string method;
-    /** Name=value, ... */
+    /** The input arguments: "name=value, ...". */
     std::string arguments;
     Verdict verdict = Verdict::refused;
-    /** Why it was not accepted, or what is known of what was; may be empty. */
+    /** Why the request was not accepted, or what is known about the outcome of an accepted one; may be empty. */
     std::string reason;
 };
 
-/** Takes each record as it comes. Called from several threads at once; must not throw. */
+/** Called with each record, from several threads at once. Must not throw. */
 using Recorder = std::function<void(const CallRecord&)>;
 
-/** accepted, refused or denied. */
+/** The verdict in a word: accepted, refused or denied. */
 std::string_view nameOf(Verdict verdict);
 
-/** A text in one line: control characters are written as \xNN, and what is beyond `longest` bytes as "...". */
+/** The text as one line: control characters become \xNN, and bytes beyond the first `longest` become "...". */
 std::string inOneLine(std::string_view text, std::size_t longest = 2000);
 
 /** The record as one line, without its time. */
 std::string messageOf(const CallRecord& record);
 
 /**
- * A recorder that writes to the system's journal, with fields, where the process's standard error is the journal's;
- * else a line to the log, which begins with the time in UTC. What the journal does not take goes to the log.
+ * Makes a recorder. If the process's standard error goes to the system's journal, it writes records to the journal,
+ * with fields; else, and if the journal does not take a record, it writes a line to the log that begins with the time
+ * in UTC.
  *
- * @param log takes one line, without a line end. Called from several threads at once.
+ * @param log writes one line, which has no line end. Called from several threads at once.
  */
 Recorder makeRecorder(std::function<void(const std::string& line)> log);
 

@@ -11,7 +11,10 @@ namespace ObjectManager::Audit {
 
 namespace {
 
-/** What systemd.exec(5) says of JOURNAL_STREAM: it names the device and inode of the stream to the journal. */
+/**
+ * Compares standard error with the device and inode of the stream to the journal, which JOURNAL_STREAM gives
+ * (systemd.exec(5)).
+ */
 bool isStandardErrorTheJournal() {
     const char* const stream = std::getenv("JOURNAL_STREAM");
     struct stat status {};

@@ -1,4 +1,4 @@
-/** The system's journal, which keeps fields beside a message. */
+/** Writes to the system's journal, which stores fields with each message. */
 #ifndef AUDIT_JOURNAL_H
 #define AUDIT_JOURNAL_H
 
@@ -11,23 +11,23 @@ struct iovec;
 namespace ObjectManager::Audit {
 
 /**
- * The journal of systemd, where the process's standard error goes to it. systemd's library is loaded then only, so that
- * others do without. Used by several threads at once.
+ * Access to systemd's journal for a process whose standard error goes there. systemd's library is loaded in such a
+ * process only. Used by several threads at once.
  */
 class Journal {
 public:
-    /** Names, in the form that systemd.journal-fields(7) demands, and values of any bytes. */
+    /** Names in the form that systemd.journal-fields(7) demands, with values that may contain any bytes. */
     using Fields = std::vector<std::pair<std::string, std::string>>;
 
     Journal();
 
-    /** One entry, without the fields whose value is empty. @return false where the journal did not take it. */
+    /** Writes one entry; fields with empty values are left out. @return false if the journal did not take it. */
     bool write(const Fields& fields) const;
 
 private:
     using Send = int(const iovec* fields, int count);
 
-    /** sd_journal_sendv(3); null where there is no journal. */
+    /** sd_journal_sendv(3); null if the process has no journal. */
     Send* _send = nullptr;
 };
 

@@ -116,7 +116,7 @@ Json toJson(const Class& known) {
 
 void write(std::ostream& out, const Json& json) {
     constexpr int indent = 2;
-    // A text from a provider that is no UTF-8 must not end the answer.
+    // A provider's text that is not valid UTF-8 must not make the whole answer fail.
     out << json.dump(indent, ' ', false, Json::error_handler_t::replace) << '\n';
 }
 

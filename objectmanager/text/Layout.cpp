@@ -6,7 +6,7 @@
 namespace ObjectManager {
 
 std::size_t columnsOf(std::string_view text) {
-    // Continuation bytes have no column of their own.
+    // Continuation bytes of UTF-8 fill no column of their own.
     return static_cast<std::size_t>(
         std::count_if(text.begin(), text.end(), [](char c) { return (static_cast<unsigned char>(c) & 0xc0) != 0x80; }));
 }

@@ -24,7 +24,7 @@ struct Literal {
     std::string operator()(std::uint64_t value) const { return std::to_string(value); }
     std::string operator()(std::int64_t value) const { return std::to_string(value); }
     std::string operator()(double value) const {
-        // A real32 is written with the digits that a real32 has.
+        // A real32 is written with no more digits than it has.
         return type == CMPI_real32 ? fmt::format("{:#}", static_cast<float>(value)) : fmt::format("{:#}", value);
     }
     std::string operator()(const std::string& value) const { return inQuotes(value); }
@@ -41,7 +41,7 @@ struct Literal {
     }
 };
 
-/** `indent` is the column at which the value begins. */
+/** `indent` is the column in which the value begins. */
 std::string qualifierText(const NamedValue& qualifier, std::size_t indent) {
     const auto* array = std::get_if<Value::Array>(&qualifier.value.content);
     if (array == nullptr) {
@@ -56,7 +56,7 @@ std::string qualifierText(const NamedValue& qualifier, std::size_t indent) {
                             : qualifier.name + '{' + filled(elements, indent + qualifier.name.size() + 1);
 }
 
-/** The qualifiers, one a line, and a line end; nothing where there are none. */
+/** The qualifiers, each on a line of its own, and a line end; empty if there are none. */
 std::string qualifierList(const Qualifiers& qualifiers, std::size_t indent) {
     std::string text;
     for (const NamedValue& qualifier : qualifiers) {
@@ -66,7 +66,7 @@ std::string qualifierList(const Qualifiers& qualifiers, std::size_t indent) {
     return text.empty() ? text : text + "]\n";
 }
 
-/** Type and name, with the qualifiers before them. */
+/** The qualifiers, type and name of an element. */
 std::string elementText(const Element& element, std::size_t indent) {
     const bool array = (element.type & CMPI_ARRAY) != 0;
     const std::string type = element.referenceClass.empty()

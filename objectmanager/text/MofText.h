@@ -11,7 +11,10 @@
 
 namespace ObjectManager {
 
-/** The value as a literal: 5, "text", TRUE, {1, 2}, NULL; a reference or embedded instance as text in quotes. */
+/**
+ * The value as a literal: 5, "text", TRUE, {1, 2} or NULL. A reference or an embedded instance becomes a text in
+ * quotes.
+ */
 std::string mofLiteral(const Value& value);
 
 /** "instance of CLASS { ... };" and a line end. */

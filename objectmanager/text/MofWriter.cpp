@@ -8,7 +8,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** The class that the common model's indications give to the arguments and results of a method call. */
+/** The class in which CIM indications embed the arguments and results of a method call. */
 constexpr const char* methodParametersClass = "__MethodParameters";
 
 } // namespace

@@ -59,7 +59,7 @@ private:
         accept('/');
     }
 
-    /** What stands before a colon, where the colon comes before anything that no namespace has. */
+    /** Reads a namespace: the text before the first colon, if only characters of a namespace stand before it. */
     void nameSpace() {
         const auto belongs = [](char c) { return isNameCharacter(c) || c == '/' || c == '-'; };
         const std::string_view rest = _text.substr(_position);
@@ -194,7 +194,7 @@ private:
 
 std::string format(const ObjectPath& path, bool withHosts);
 
-/** The value as a key binding has it. */
+/** The value in the form that it has in an object path's key. */
 std::string keyText(const Value& value, bool withHosts) {
     const auto* reference = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content);
     return reference == nullptr ? mofLiteral(value) : inQuotes(format(**reference, withHosts));

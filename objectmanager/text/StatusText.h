@@ -12,12 +12,12 @@
 namespace ObjectManager {
 
 /**
- * The code by name and number: "CIM_ERR_NOT_FOUND (6)" for those of CIM operations, "CMPI_RC_ERROR_SYSTEM (100)" for
- * those of the provider interface, "return code (1234)" for any other.
+ * The name and number of a code: "CIM_ERR_NOT_FOUND (6)" for status codes of CIM operations, "CMPI_RC_ERROR_SYSTEM
+ * (100)" for codes of CMPI, "return code (1234)" for any other number.
  */
 std::string statusText(CMPIrc code);
 
-/** What failures the messages tell of, each said once; begins with `introduction` where they tell of any. */
+/** Joins the messages, each of them once, behind `introduction`; empty if there are no messages. */
 std::string reasonsText(const std::vector<std::string>& messages, const char* introduction);
 
 } // namespace ObjectManager

@@ -11,10 +11,10 @@ namespace ObjectManager {
 
 namespace {
 
-/** Details are indented by so many columns under the line that they belong to. */
+/** How many columns details are indented below the line that they belong to. */
 constexpr std::size_t step = 2;
 
-/** The text on one line: control characters escaped, quotes left alone. */
+/** The text on one line. A text with control characters becomes a quoted literal, in which they are escaped. */
 std::string oneLine(const std::string& text) {
     const bool plain = std::none_of(text.begin(), text.end(),
                                     [](char c) { return static_cast<unsigned char>(c) < 0x20 || c == 0x7f; });
@@ -37,7 +37,7 @@ std::string embeddedText(const Instance& instance) {
     return instance.path.className + " {" + joined(properties) + "}";
 }
 
-/** The text of a value as pieces between which a line may be broken. */
+/** The text of a value, as pieces between which a line may be broken. */
 std::vector<std::string> piecesOf(const Value& value, const Element* element) {
     const auto* array = std::get_if<Value::Array>(&value.content);
     if (array == nullptr) {
@@ -86,7 +86,7 @@ void TableWriter::instance(const Instance& instance) {
     write({instance}, 0);
 }
 
-/* Under the class of the associations, what they lead to. */
+/* Each association class is followed by the objects that it leads to. */
 
 void TableWriter::associatedNames(const std::vector<Associated<ObjectPath>>& found) {
     for (const Associated<ObjectPath>& each : found) {

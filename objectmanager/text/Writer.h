@@ -1,5 +1,5 @@
 /**
- * The answers of operations, written for people (table), for programs (JSON) or in the Managed Object Format.
+ * Writes the answers of operations: for people as a table, for programs as JSON, or in the Managed Object Format.
  */
 #ifndef TEXT_WRITER_H
 #define TEXT_WRITER_H
@@ -26,26 +26,26 @@ public:
     virtual void instance(const Instance& instance) = 0;
     virtual void associatedNames(const std::vector<Associated<ObjectPath>>& found) = 0;
     virtual void associatedInstances(const std::vector<Associated<Instance>>& found) = 0;
-    /** @param classes with everything that they inherit. */
+    /** @param classes include the elements that they inherit. */
     virtual void classes(const std::vector<Class>& classes) = 0;
     /** @param outputs the output arguments. */
     virtual void methodResult(const Method& method, const Value& returnValue,
                               const std::vector<NamedValue>& outputs) = 0;
     /**
-     * Instances summed up: people get the rows, programs the instances.
+     * Writes a summary of instances: the table format shows the rows, the other formats the instances.
      *
-     * @param rows as many cells each; the first has the names of the columns.
+     * @param rows all have the same number of cells; the first one has the names of the columns.
      */
     virtual void summary(const std::vector<std::vector<std::string>>& rows, const std::vector<Instance>& instances) = 0;
 };
 
-/** @param out,catalogue are used as long as the writer lives. */
+/** Makes the writer for a format. @param out,catalogue must outlive the writer. */
 std::unique_ptr<Writer> makeWriter(Format format, std::ostream& out, const Catalogue& catalogue);
 
 /**
- * A value for people: texts without quotes, one line, and behind a code what it means.
+ * A value for people, on one line: strings without quotes, codes followed by their meaning.
  *
- * @param element the declaration of what has the value; null where it is not known.
+ * @param element the declaration of the property or parameter that has the value; null if it is not known.
  */
 std::string plainText(const Value& value, const Element* element);
 

@@ -1,5 +1,5 @@
 /**
- * The kinds of writers, one a format. Private to this folder: `makeWriter` chooses.
+ * The writers, one for each format. Private to this folder: others call `makeWriter`.
  */
 #ifndef TEXT_WRITERS_H
 #define TEXT_WRITERS_H
@@ -8,7 +8,7 @@
 
 namespace ObjectManager {
 
-/** For people: one path a line, an instance as a block of aligned lines, codes with what they mean. */
+/** Writes for people: one path a line, an instance as a block of aligned lines, codes with their meaning. */
 class TableWriter : public Writer {
 public:
     TableWriter(std::ostream& out, const Catalogue& catalogue) : _out(out), _catalogue(catalogue) {}
@@ -29,7 +29,7 @@ private:
     const Catalogue& _catalogue;
 };
 
-/** For programs: one JSON document an answer; codes are numbers, paths and datetimes texts. */
+/** Writes for programs: one JSON document for each answer. Codes are numbers; paths and datetimes are strings. */
 class JsonWriter : public Writer {
 public:
     explicit JsonWriter(std::ostream& out) : _out(out) {}
@@ -47,7 +47,7 @@ private:
     std::ostream& _out;
 };
 
-/** The Managed Object Format: a name is an instance that has its keys only. */
+/** Writes the Managed Object Format. An object path is written as an instance that has only its keys. */
 class MofWriter : public Writer {
 public:
     explicit MofWriter(std::ostream& out) : _out(out) {}

@@ -1,5 +1,5 @@
 /**
- * The embedded agent as it would be in a process of this user, now.
+ * Examines the embedded agent as a provider of this user would find it now.
  */
 #ifndef ORVCIM_AGENTEXAMINATION_H
 #define ORVCIM_AGENTEXAMINATION_H
@@ -11,16 +11,16 @@
 namespace ObjectManager::Orvcim {
 
 struct AgentExamination {
-    /** What was found, by name: the configuration file, the machine, what it can do. */
+    /** Facts as name and value: the configuration file, the log, the machine and what it can do. */
     std::vector<std::pair<std::string, std::string>> facts;
-    /** What is wrong or missing, each with what to do about it. */
+    /** What is wrong or missing, and what to do about each. */
     std::vector<std::string> problems;
 };
 
-/** What is wrong with the agent's configuration, in one line; empty where nothing is. */
+/** What is wrong with the agent's configuration, in one line; empty if it can be used. */
 std::string problemOfConfiguration();
 
-/** Reads the agent's configuration and looks at its machine, of which it asks nothing. */
+/** Reads the agent's configuration and examines its machine, without any change to the machine. */
 AgentExamination examineAgent();
 
 } // namespace ObjectManager::Orvcim

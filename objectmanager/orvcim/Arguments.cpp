@@ -63,7 +63,7 @@ Value elementOf(const std::string& text, const Parameter& parameter, const Catal
     }
 }
 
-/** What the elements are together. */
+/** The value of a parameter, made from the values that were given for it. */
 Value valueOf(Value::Array elements, const Parameter& parameter) {
     if ((parameter.type & CMPI_ARRAY) != 0) {
         return arrayValue(static_cast<CMPIType>(parameter.type & ~CMPI_ARRAY), std::move(elements));

@@ -14,13 +14,13 @@
 namespace ObjectManager::Orvcim {
 
 /**
- * The input arguments that texts of the form NAME=VALUE say, in the order of the method's parameters. An argument for
- * an array parameter is given once for each element.
+ * Parses input arguments of the form NAME=VALUE. @return them in the order of the method's parameters. For an array
+ * parameter, NAME=VALUE is given once for each element.
  *
- * @param nameSpace of references that name none.
- * @throws UsageError where a text has another form; CimError with CMPI_RC_ERR_INVALID_PARAMETER where there is no such
- *         input parameter, one that is required is missing, one that is no array is given twice, or a value is none of
- *         its type.
+ * @param nameSpace is used for references that name no namespace.
+ * @throws UsageError if a text is not of the form NAME=VALUE; CimError with CMPI_RC_ERR_INVALID_PARAMETER if the method
+ *         has no such input parameter, a required one is missing, one that is not an array is given twice, or a value
+ *         does not fit its type.
  */
 std::vector<NamedValue> parseArguments(const std::vector<std::string>& texts, const Method& method,
                                        const Catalogue& catalogue, std::string_view nameSpace);

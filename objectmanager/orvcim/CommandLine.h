@@ -1,5 +1,5 @@
 /**
- * The program orvcim: from its command line to its exit status.
+ * The program orvcim.
  */
 #ifndef ORVCIM_COMMANDLINE_H
 #define ORVCIM_COMMANDLINE_H
@@ -7,10 +7,10 @@
 namespace ObjectManager::Orvcim {
 
 /**
- * Does what the command line asks for.
+ * Runs the command that the command line names.
  *
- * @return the exit status: 0 done, 1 failed, 2 a command line that cannot be done. Failures are one line on standard
- *         error.
+ * @return the exit status: 0 if the command succeeded, 1 if it failed, 2 if the command line is wrong. A failure is
+ *         reported in one line on standard error.
  */
 int run(int argc, const char* const* argv);
 

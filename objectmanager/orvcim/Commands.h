@@ -1,6 +1,6 @@
 /**
- * What the program can do. Every command writes its answer to the session's stream and throws where it fails: CimError,
- * Failure, UsageError, ObjectPathError.
+ * The commands of the program. Each writes its answer to the session's stream, and throws CimError, Failure, UsageError
+ * or ObjectPathError if it fails.
  */
 #ifndef ORVCIM_COMMANDS_H
 #define ORVCIM_COMMANDS_H
@@ -9,42 +9,42 @@
 
 namespace ObjectManager::Orvcim {
 
-/** The registered classes of the namespace. */
+/** Lists the registered classes of the namespace. */
 void listClasses(Session& session);
-/** The paths of a class's instances. */
+/** Lists the paths of a class's instances. */
 void enumerateNames(Session& session);
-/** A class's instances. */
+/** Shows the instances of a class. */
 void enumerateInstances(Session& session);
-/** One instance. */
+/** Shows one instance. */
 void getInstance(Session& session);
-/** Says on standard error where the outcome of a call is not known beyond its return value. */
+/** Reports on standard error if nothing but the return value says how a call ended. */
 void reportUnknown(const MethodOutcome& outcome);
-/** One call of a method. */
+/** Calls a method. */
 void invokeMethod(Session& session);
 
-/** The instances that are associated with one. */
+/** Shows the instances that are associated with an instance. */
 void listAssociators(Session& session);
 void listAssociatorNames(Session& session);
-/** The associations that refer to an instance. */
+/** Shows the associations that refer to an instance. */
 void listReferences(Session& session);
 void listReferenceNames(Session& session);
 
-/** All instances with their associations, as a graph in the DOT language of Graphviz. */
+/** Writes all instances with their associations as a graph in the DOT language of Graphviz. */
 void writeGraph(Session& session);
 
-/** The power states of the machine, or what its services can do where nobody serves the states. Throws Failure, after
- * its answer, where a state is not known. */
+/** Shows the power states of the machine; if no provider serves them, the states that its services can be asked for.
+ * Throws Failure after the answer if a state is not known. */
 void powerStatus(Session& session);
 void powerReboot(Session& session);
 void powerShutdown(Session& session);
-/** Takes back the reboot or shutdown that is under way. */
+/** Cancels the reboot or shutdown that is under way. */
 void powerCancel(Session& session);
 
-/** Answers clients on the network until a signal ends the program. Only where it was built with the server. */
+/** Serves clients on the network until a signal ends the program. Only in builds with the server. */
 void serve(Session& session);
 
-/** What is found of every registered provider and of the embedded agent. Throws Failure, after its answer, where
- * something is wrong. */
+/** Reports on every registered provider and on the embedded agent. Throws Failure after the answer if something is
+ * wrong. */
 void checkProviders(Session& session);
 
 } // namespace ObjectManager::Orvcim

@@ -32,7 +32,10 @@ public:
 
     void addInstance(const ObjectPath& path) { nodeOf(path); }
 
-    /** An edge from the first reference to each other one, labelled with what the association says beside. */
+    /**
+     * Adds an edge from the object of the first reference to those of the others; the association's other properties
+     * are the label.
+     */
     void addAssociation(const Instance& association) {
         const Class* known = _catalogue.find(association.path.className);
         std::string label = association.path.className;
@@ -53,7 +56,7 @@ public:
     std::string text() const { return "digraph orvcim {\n    node [shape=box];\n" + _nodes + _edges + "}\n"; }
 
 private:
-    /** The name of the path's node, which is added where there is none. */
+    /** The name of the path's node; adds the node if the graph does not have it yet. */
     std::string nodeOf(const ObjectPath& path) {
         const auto [known, added] = _names.try_emplace(path, fmt::format("n{}", _names.size() + 1));
         if (added) {
@@ -62,7 +65,7 @@ private:
         return known->second;
     }
 
-    /** The class, and below it the keys but for those that only tell a class. */
+    /** The class, and below it the keys, except those that repeat class names. */
     static std::string labelOf(const ObjectPath& path) {
         std::string label = path.className;
         for (const NamedValue& key : path.keys) {

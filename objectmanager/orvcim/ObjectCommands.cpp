@@ -16,9 +16,9 @@ bool serves(const Registration& registration, std::string_view nameSpace) {
                        [nameSpace](const std::string& served) { return equalNames(served, nameSpace); });
 }
 
-/** The declaration of a method, for the types of its arguments. */
+/** The declaration of the method to call, which has the types of its arguments. */
 const Method& methodOf(Session& session, const ObjectPath& path) {
-    // A class that nobody serves is reported as that, whether it is declared or not.
+    // Throws if no provider serves the class, even if it is declared.
     session.dispatcher().registry().find(path.nameSpace, path.className, ProviderKind::method);
     const Class* known = session.catalogue().find(path.className);
     if (known == nullptr) {

@@ -31,7 +31,7 @@ namespace {
 constexpr std::uint16_t httpPort = 5988;
 constexpr std::uint16_t httpsPort = 5989;
 
-/** Files that are open beside the connections, at most. */
+/** The largest number of file descriptors that are in use beside those of the connections. */
 constexpr rlim_t otherFiles = 200;
 
 Server::Settings settingsOf(const ServeOptions& options) {
@@ -46,7 +46,10 @@ Server::Settings settingsOf(const ServeOptions& options) {
     return settings;
 }
 
-/** Nobody is to reach the server who should not, by oversight. */
+/**
+ * Refuses settings that would let others in unprotected: another address than loopback needs TLS and log-ins, and a
+ * machine that is not simulated needs log-ins.
+ */
 void requireProtection(Session& session, const Server::Settings& settings) {
     const bool authenticated = session.options().serve.authenticate;
     if (!Server::Address(settings.address).isLoopback() && !(settings.tls && authenticated)) {
@@ -66,7 +69,10 @@ void requireProtection(Session& session, const Server::Settings& settings) {
     }
 }
 
-/** The system's default is made for programs that cannot have many files. */
+/**
+ * Raises the soft limit on file descriptors to the hard limit: the default of most systems is too low for many
+ * connections.
+ */
 void allowFiles(unsigned int connections) {
     rlimit limit{};
     getrlimit(RLIMIT_NOFILE, &limit);
@@ -79,7 +85,7 @@ void allowFiles(unsigned int connections) {
     }
 }
 
-/** What follows from a group that the system does not have. */
+/** Logs which configured groups do not exist, and what follows from that. */
 void reportMissingGroups(const Server::PamSettings& pam, const Server::Log& log) {
     const auto report = [&](const std::string& group, const std::string& what) {
         if (!group.empty() && !Server::groupExists(group)) {
@@ -97,11 +103,12 @@ timespec timespecOf(std::chrono::microseconds time) {
     return {static_cast<time_t>(seconds.count()), static_cast<long>(std::chrono::nanoseconds(time - seconds).count())};
 }
 
-/** Whether the server takes a connection and, since that asks for nothing, closes it again. */
+/** Whether the server accepts a connection and closes it when the client ends it without a request. */
 bool isServing(const Server::Address& address, std::chrono::microseconds time) {
     const int client = socket(address.get()->sa_family, SOCK_STREAM | SOCK_CLOEXEC, 0);
     if (client < 0) {
-        // Too many open files, for example: that says nothing against the server.
+        // The socket failed here, for example for lack of file descriptors: that does not mean that the server is
+        // stuck.
         return true;
     }
     const timespec limit = timespecOf(time);
@@ -117,25 +124,25 @@ bool isServing(const Server::Address& address, std::chrono::microseconds time) {
     return closed;
 }
 
-/** The signals that tell the program something. Only one thread takes them. */
+/** The signals that control the program. They are blocked in all threads; one thread waits for them. */
 class Signals {
 public:
-    /** Before any other thread is made, since the others inherit what is blocked here. */
+    /** Must be constructed before any other thread starts, since threads inherit the signals that are blocked. */
     Signals() {
         sigemptyset(&_signals);
         for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGUSR1}) {
             sigaddset(&_signals, signal);
         }
         pthread_sigmask(SIG_BLOCK, &_signals, nullptr);
-        // A client that goes away is noticed otherwise.
+        // A write to a connection that the client has closed fails with EPIPE instead.
         std::signal(SIGPIPE, SIG_IGN);
     }
 
     /**
-     * Waits for one.
+     * Waits for a signal.
      *
-     * @param time without it, there is no end to that.
-     * @return nothing when the time is over.
+     * @param time how long to wait; without a value, for ever.
+     * @return the signal; no value when the time is over.
      */
     std::optional<int> waitFor(std::optional<std::chrono::microseconds> time) const {
         const timespec limit = timespecOf(time.value_or(std::chrono::microseconds{0}));
@@ -143,14 +150,14 @@ public:
         return signal < 0 ? std::nullopt : std::optional(signal);
     }
 
-    /** From now on they end the program at once. */
+    /** Unblocks the signals: from now on each of them ends the program at once. */
     void release() const { pthread_sigmask(SIG_UNBLOCK, &_signals, nullptr); }
 
 private:
     sigset_t _signals{};
 };
 
-/** How much of the system's memory the program has, for people. */
+/** The program's resident memory, for people. */
 std::string memoryText() {
     std::ifstream status("/proc/self/status");
     for (std::string line; std::getline(status, line);) {
@@ -184,7 +191,7 @@ void serve(Session& session) {
                             {.enumerations = options.enumerations, .recorder = Audit::makeRecorder(log)});
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
         Server::HttpReply reply = service.answer(request, caller);
-        // What the agent logged meanwhile was of interest to this request only.
+        // The records of the agent's log concern this request only.
         session.log().forget();
         return reply;
     };
@@ -209,7 +216,7 @@ void serve(Session& session) {
     signals.release();
     manager.tell("STOPPING=1");
     if (!server.stop()) {
-        // Its threads use what would be taken down otherwise.
+        // The server's threads still use objects that a regular end would destroy.
         log("ended although a provider or PAM did not return");
         serveLog.flush(std::chrono::seconds{1});
         _exit(EXIT_SUCCESS);

@@ -1,4 +1,4 @@
-/** Where the server's log lines go, without anybody waiting for that. */
+/** Writes the server's log without making any caller wait. */
 #ifndef ORVCIM_SERVELOG_H
 #define ORVCIM_SERVELOG_H
 
@@ -14,28 +14,28 @@
 namespace ObjectManager::Orvcim {
 
 /**
- * Writes lines to standard error or to the system's log, in a thread of its own: whoever logs never waits for a reader
- * who does not read. Lines that there is no room for are counted, and the count is logged when there is. Used by
- * several threads at once.
+ * Writes lines to standard error or to the system's log, in a thread of its own, so that callers never wait for a slow
+ * reader. Lines that the full queue has no room for are dropped and counted; the count is logged later. Used by several
+ * threads at once.
  */
 class ServeLog {
 public:
-    /** Lines that may wait. */
+    /** How many lines the queue holds. */
     static constexpr std::size_t room = 4000;
 
-    /** @param syslog to the system's log, see syslog(3). */
+    /** @param syslog whether lines go to the system's log, syslog(3), and not to standard error. */
     explicit ServeLog(bool syslog);
     ServeLog(const ServeLog&) = delete;
     ServeLog& operator=(const ServeLog&) = delete;
-    /** Gives the lines that wait a second. */
+    /** Waits at most a second for the lines in the queue to be written. */
     ~ServeLog();
 
     void write(const std::string& line);
-    /** Waits until everything is written. @return false where the time was over before. */
+    /** Waits until all lines are written. @return false if the time was over before. */
     bool flush(std::chrono::milliseconds time);
 
 private:
-    /** What the thread uses, which cannot be ended while it waits for somebody. */
+    /** What the thread uses. The thread shares its ownership, since it may outlive the ServeLog while a write hangs. */
     struct Queue {
         explicit Queue(bool toSyslog) : syslog(toSyslog) {}
 

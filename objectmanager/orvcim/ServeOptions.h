@@ -1,5 +1,5 @@
 /**
- * The part of the command line that is about serving clients on the network.
+ * The options of the command `serve`.
  */
 #ifndef ORVCIM_SERVEOPTIONS_H
 #define ORVCIM_SERVEOPTIONS_H
@@ -17,19 +17,20 @@ class App;
 
 namespace ObjectManager::Orvcim {
 
-/** What `serve` is asked for. */
+/** The values of the options. */
 struct ServeOptions {
-    /** Its port is that of the protocol where none is asked for. */
+    /** The server's settings. Its port and TLS files are not set by the options, but by the members below. */
     Server::Settings server;
     CimXml::EnumerationLimits enumerations;
+    /** No value for the protocol's own port: 5988, with TLS 5989. */
     std::optional<std::uint16_t> port;
-    /** Empty where there is no TLS. */
+    /** The files of the certificate and its key; empty without TLS. */
     std::filesystem::path certificate;
     std::filesystem::path key;
-    /** Clients have to log in. */
+    /** Whether clients must log in. */
     bool authenticate = false;
     Server::PamSettings pam;
-    /** Log to the system's log rather than to standard error. */
+    /** Whether to log to the system's log instead of standard error. */
     bool syslog = false;
 };
 

@@ -18,7 +18,7 @@ std::string environment(const char* name) {
     return value == nullptr ? "" : value;
 }
 
-/** Not set where the text is something else. */
+/** The number that a text consists of; no value if it is something else. */
 std::optional<long> numberIn(const std::string& text) {
     long number = 0;
     const char* const end = text.data() + text.size();
@@ -44,7 +44,7 @@ void ServiceManager::tell(std::string_view assignments) const {
         return;
     }
     std::memcpy(static_cast<char*>(address.sun_path), _socket.data(), _socket.size());
-    // An at sign stands for the null byte that begins a name outside of the file system.
+    // An at sign stands for the null byte with which the name of an abstract socket begins.
     if (address.sun_path[0] == '@') {
         address.sun_path[0] = '\0';
     }

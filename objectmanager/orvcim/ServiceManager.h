@@ -1,4 +1,4 @@
-/** What a program that runs as a service tells whoever started it: the protocol of sd_notify(3). */
+/** Notifies the service manager that started the program, by the protocol of sd_notify(3). */
 #ifndef ORVCIM_SERVICEMANAGER_H
 #define ORVCIM_SERVICEMANAGER_H
 
@@ -10,7 +10,7 @@
 namespace ObjectManager::Orvcim {
 
 /**
- * The service manager, as far as one has started the program and wants to hear of it. The protocol is spoken without
+ * The service manager that started the program, if one did and wants notifications. Implements the protocol without
  * systemd's library, which is larger than the program and would be loaded with each command.
  */
 class ServiceManager {
@@ -18,14 +18,14 @@ public:
     /** Reads the environment variables NOTIFY_SOCKET, WATCHDOG_USEC and WATCHDOG_PID. */
     ServiceManager();
 
-    /** How often it wants to hear that the service is alive; not set where it does not. */
+    /** How often the service manager expects a notification that the service is alive; no value if it expects none. */
     std::optional<std::chrono::microseconds> watchdogInterval() const { return _watchdogInterval; }
 
-    /** Tells it assignments, for example "READY=1". What it does not take is lost: the service goes on without it. */
+    /** Sends assignments, for example "READY=1". A failure is ignored: the service goes on. */
     void tell(std::string_view assignments) const;
 
 private:
-    /** As the environment variable has it; empty where nobody listens. */
+    /** The value of NOTIFY_SOCKET; empty if no service manager listens. */
     std::string _socket;
     std::optional<std::chrono::microseconds> _watchdogInterval;
 };

@@ -17,8 +17,8 @@ namespace ObjectManager::Orvcim {
 
 namespace {
 
-/* Where an installed program finds its parts, seen from the folder that it is in; in a build tree they lie the same way
-   or in lib beside it. */
+/* The folders of an installed program's parts, relative to the program's folder. In a build tree the parts are in the
+   same places, or in lib beside the program's folder. */
 constexpr const char* schemaFolderFromProgram = ORVCIM_SCHEMA_FOLDER;
 constexpr std::array<const char*, 2> libraryFoldersFromProgram = {"../lib", ORVCIM_LIBRARY_FOLDER};
 

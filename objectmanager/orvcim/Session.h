@@ -1,5 +1,5 @@
 /**
- * One run of the program: what the person asked for, and the object manager that answers.
+ * One run of the program: its options, and the object manager that answers.
  */
 #ifndef ORVCIM_SESSION_H
 #define ORVCIM_SESSION_H
@@ -22,43 +22,43 @@
 
 namespace ObjectManager::Orvcim {
 
-/** The class whose instances are what the machine's power is managed by. */
+/** The class whose instances manage the machine's power. */
 inline constexpr const char* powerServiceClass = "TALVO_PowerManagementService";
 
-/** The command line. */
+/** The options and arguments of the command line. */
 struct Options {
     std::string nameSpace = "root/cimv2";
     Format format = Format::table;
     PropertyList properties;
-    /** Searched before the program's own folders. */
+    /** Folders that are searched for provider libraries before the program's own ones. */
     std::vector<std::filesystem::path> providerFolders;
-    /** Empty where the program's own is meant. */
+    /** The folder of class declarations and registrations; empty for the program's own. */
     std::filesystem::path schemaFolder;
-    /** Do not ask before acting on a machine. */
+    /** Whether to change the power state of any machine without asking for confirmation. */
     bool yes = false;
-    /** The path of the service to use; empty where there is one only. */
+    /** The path of the service to use; empty to use the only one. */
     std::string service;
-    /** How long to wait for what was asked for to be done; not at all where it is not given. */
+    /** How long to wait until the request is done; no value to return without waiting. */
     std::optional<double> waitSeconds;
-    /** Show every change of the power states until the program is ended. */
+    /** Whether to show every change of the power states until the program is interrupted. */
     bool watch = false;
-    /** CLASS or PATH. */
+    /** The argument CLASS or PATH. */
     std::string target;
     std::string method;
-    /** NAME=VALUE. */
+    /** The arguments NAME=VALUE. */
     std::vector<std::string> arguments;
-    /** Which associations to follow, and to what. */
+    /** Which associations to follow, and to which objects. */
     AssociationFilter filter;
     ServeOptions serve;
 };
 
-/** A command line that cannot be done. what() is one line. */
+/** A wrong command line. what() is one line. */
 class UsageError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
 };
 
-/** A command that failed otherwise than with a CIM error. what() is one line. */
+/** A failure of a command that is not a CIM error. what() is one line. */
 class Failure : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
@@ -68,7 +68,7 @@ public:
 class Session {
 public:
     /**
-     * @param options,out live longer.
+     * @param options,out must outlive the session.
      * @throws SchemaError
      */
     Session(const Options& options, std::ostream& out);
@@ -82,36 +82,36 @@ public:
     std::ostream& out() { return _out; }
 
     /**
-     * The class that a text names, as a path without keys.
+     * Parses the name of a class. @return a path without keys.
      *
      * @throws UsageError, ObjectPathError
      */
     ObjectPath classPath(std::string_view text) const;
 
     /**
-     * The instance that a text names.
+     * Parses the path of an instance.
      *
-     * @throws ObjectPathError, and CimError where a key of the class is missing.
+     * @throws ObjectPathError if the text is not an object path, CimError if a key of the class is missing.
      */
     ObjectPath instancePath(std::string_view text) const;
 
     /**
-     * The properties that were asked for, spelled as the class declares them.
+     * The properties that the command line asks for, spelled as the class declares them.
      *
-     * @throws CimError where the class has no such property.
+     * @throws CimError if the class has no such property.
      */
     PropertyList propertiesOf(const ObjectPath& path) const;
 
     /**
-     * Loads the provider that knows the agent.
+     * Loads a provider of power management, which loads the agent's libraries.
      *
-     * @return why it cannot be used, in one line; empty where it can.
+     * @return why the provider cannot be used, in one line; empty if it can.
      */
     std::string loadAgent();
-    /** Whether the agent says that the machine is a simulated one. Loads it. */
+    /** Whether the agent says that the machine is a simulated one. Loads the agent first. */
     bool isSimulated();
 
-    /** Who asks for the operations: the user of the program. */
+    /** The caller on whose behalf all operations run: the user of the program. */
     static Invocation invocation();
 
 private:

@@ -6,7 +6,7 @@
 
 namespace Norv::Agent {
 
-/** Milliseconds of a clock that nobody sets; exact to a few of them, and a fraction of the price of others. */
+/** Milliseconds of a monotonic clock. It is exact to a few milliseconds, and much cheaper to read than others. */
 inline std::int64_t coarseMilliseconds() {
     timespec now{};
     clock_gettime(CLOCK_MONOTONIC_COARSE, &now);

@@ -6,17 +6,17 @@
 
 namespace Norv::Agent {
 
-/** The time that everything an operation waits for may take together. */
+/** A limit for the total time that an operation may wait. */
 class Deadline {
 public:
     explicit Deadline(std::chrono::milliseconds whole) : Deadline(whole, whole) {}
-    /** @param left what is left of it now. */
+    /** @param left what remains of the whole time now. */
     Deadline(std::chrono::milliseconds whole, std::chrono::milliseconds left)
         : _whole(whole), _end(std::chrono::steady_clock::now() + left) {}
 
     std::chrono::milliseconds whole() const { return _whole; }
 
-    /** Not negative. */
+    /** The time that remains; never negative. */
     std::chrono::microseconds remaining() const {
         const auto left = std::chrono::floor<std::chrono::microseconds>(_end - std::chrono::steady_clock::now());
         return std::max(left, std::chrono::microseconds{0});

@@ -7,10 +7,10 @@
 
 namespace Norv::Agent {
 
-/** An open file that is closed with the object. */
+/** A file descriptor that is closed when the object is destroyed. */
 class Descriptor {
 public:
-    /** @param number as open(2) gave it; its errno stays the caller's. */
+    /** @param number the result of open(2), -1 included; errno is not changed. */
     explicit Descriptor(int number) : _number(number) {}
     ~Descriptor() {
         if (isOpen()) {

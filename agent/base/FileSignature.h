@@ -7,12 +7,12 @@
 
 namespace Norv::Agent {
 
-/** Tells one content of a file from every other. */
+/** Identifies the content of a file: it differs if another file has taken the name or the content was changed. */
 struct FileSignature {
     dev_t device;
     ino_t inode;
     off_t size;
-    /** Since 1970 (UTC). */
+    /** The time of the last change, since 1970 (UTC). */
     std::chrono::nanoseconds modified;
 
     explicit FileSignature(const struct stat& status)

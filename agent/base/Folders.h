@@ -7,21 +7,24 @@
 
 namespace Norv::Agent {
 
-/** As mkdir -p does, with a mode that gives nobody else more than reading. @throws std::system_error */
+/**
+ * Makes a folder and its missing parents, as mkdir -p does, writable only for their owner. @throws std::system_error
+ */
 void createMissingFolders(const std::filesystem::path& folder);
 
 /**
- * Whether files can be made in a folder, or in the one in which the first missing folder would be made.
+ * Checks that files can be made in a folder; if the folder is missing, that it can be made in its nearest existing
+ * parent.
  *
- * @throws std::system_error where they cannot; what() names the folder.
+ * @throws std::system_error if not; what() names the folder.
  */
 void requireWritable(std::filesystem::path folder);
 
 /**
- * Gives a file that root has just made to the owner of its folder: a service with a user of its own has the folder, and
- * could not use a file in it that is root's. A file of another user's making stays his.
+ * Gives a file that root has just made to the owner of its folder: if a service with a user of its own owns the folder,
+ * it could not use a file there that root owns. Files that other users make stay theirs.
  *
- * @return whether it is so; errno says why not.
+ * @return false if the owner could not be changed; errno says why.
  */
 bool giveToOwnerOfFolder(const Descriptor& made, const std::string& path);
 

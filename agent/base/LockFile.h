@@ -9,16 +9,17 @@
 namespace Norv::Agent {
 
 /**
- * A file that one thread of one process has at a time. It is made where it is missing, for the owner of its folder
- * only, so that nobody else can take it and keep the owner waiting; what others have put in its place is refused.
- * Whoever has the file is named in it.
+ * A lock on a file, which one thread of one process holds at a time. A missing file is made, for the owner of its
+ * folder only, so that no other user can lock it and keep the owner waiting; a file that another user has put in its
+ * place is refused. The process that holds the lock is named in the file.
  */
 class LockFile {
 public:
     /**
-     * Waits until nobody else has the file.
+     * Waits until no other thread or process holds the lock, and takes it.
      *
-     * @throws std::system_error where the file cannot be used, or somebody has it until the deadline; what() names him.
+     * @throws std::system_error if the file cannot be used, or another process holds the lock until the deadline;
+     * what() names the file and that process.
      */
     LockFile(const std::filesystem::path& file, const Deadline& deadline);
     ~LockFile();

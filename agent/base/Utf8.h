@@ -7,10 +7,10 @@
 
 namespace Norv::Agent {
 
-/** The text in UTF-8; what is no Unicode character becomes U+FFFD. */
+/** Converts a text to UTF-8; a wide character that is not a Unicode character becomes U+FFFD. */
 std::string utf8From(std::wstring_view text);
 
-/** The text that is given in UTF-8; nothing where it is something else. */
+/** Converts a text from UTF-8; no value if it is not valid UTF-8. */
 std::optional<std::wstring> wideFrom(std::string_view text);
 
 } // namespace Norv::Agent

@@ -12,10 +12,13 @@ namespace Norv {
 
 namespace {
 
-/** How deep references in the keys of references are followed. A path that refers to itself ends here, as unequal. */
+/**
+ * How deep references in the keys of references are followed. Deeper paths, such as one that refers to itself, count as
+ * unequal.
+ */
 constexpr unsigned int deepestReference = 16;
 
-/** What is compared of a path beside its class name and keys. */
+/** Which parts of a path are compared beside its class name and keys. */
 struct Extent {
     bool nameSpace;
     bool host;
@@ -35,7 +38,10 @@ struct Character {
     bool operator==(const Character&) const = default;
 };
 
-/** Texts and paths are the object manager's. A date and time is its text, since some object managers keep it so. */
+/**
+ * The value of a key. Texts and paths belong to the object manager. A date and time is compared as text, since some
+ * object managers store it so.
+ */
 using KeyValue = std::variant<bool, Integer, double, Character, std::string_view, const CMPIObjectPath*>;
 
 struct Key {
@@ -49,7 +55,7 @@ bool areEqualNames(std::string_view left, std::string_view right) {
     return std::ranges::equal(left, right, {}, folded, folded);
 }
 
-/** Not set where there is no text. */
+/** The text of a string object; no value if there is none. */
 std::optional<std::string_view> textOf(const CMPIString* string) {
     const char* text = CMIsNullObject(string) ? nullptr : CMGetCharPtr(string);
     return text == nullptr ? std::nullopt : std::optional<std::string_view>(text);
@@ -57,7 +63,7 @@ std::optional<std::string_view> textOf(const CMPIString* string) {
 
 using TextGetter = CMPIString* (*CMPIObjectPathFT::*)(const CMPIObjectPath*, CMPIStatus*);
 
-/** Empty where the path does not have the text; not set where the object manager cannot tell. */
+/** A text of a path; empty if the path does not have it, no value if the object manager fails. */
 std::optional<std::string_view> textOf(const CMPIObjectPath* path, TextGetter getter) {
     CMPIStatus status = {CMPI_RC_OK, nullptr};
     const CMPIString* text = (path->ft->*getter)(path, &status);
@@ -69,7 +75,7 @@ Integer integer(Number number) {
     return {number < 0, static_cast<std::uint64_t>(number)};
 }
 
-/** Not set where the key has no value, or one of a type that no key has. */
+/** The value of a key; no value if it is null, or of a type that keys cannot have. */
 std::optional<KeyValue> valueOf(const CMPIData& data) {
     if ((data.state & ~CMPI_keyValue) != CMPI_goodValue) {
         return std::nullopt;
@@ -113,7 +119,7 @@ std::optional<KeyValue> valueOf(const CMPIData& data) {
     }
 }
 
-/** Not set where the object manager cannot tell, or the key is unusable. */
+/** A key of a path; no value if the object manager fails, or the key has no usable value. */
 std::optional<Key> keyAt(const CMPIObjectPath* path, CMPICount index) {
     CMPIStatus status = {CMPI_RC_OK, nullptr};
     CMPIString* string = nullptr;
@@ -126,7 +132,7 @@ std::optional<Key> keyAt(const CMPIObjectPath* path, CMPICount index) {
     return name && value ? std::optional<Key>({*name, *value}) : std::nullopt;
 }
 
-/** The key of a name, looked for first at `likely`: most paths have their keys in the same order. */
+/** The key of a given name. The search begins at index `likely`: most paths have their keys in the same order. */
 std::optional<Key> findKey(const CMPIObjectPath* path, CMPICount count, std::string_view name, CMPICount likely) {
     for (CMPICount step = 0; step < count; ++step) {
         auto key = keyAt(path, (likely + step) % count);

@@ -14,7 +14,7 @@ namespace Norv {
 
 namespace {
 
-/** What hosts file or name service call the host in full; not set where they do not. */
+/** The fully qualified name of the host in the hosts file or the name service; no value if they have none. */
 std::optional<std::string> canonicalName(const std::string& hostName) {
     addrinfo hints{};
     hints.ai_flags = AI_CANONNAME;
@@ -52,7 +52,7 @@ std::string determineSystemName() {
             return *std::move(configured);
         }
     } catch (const Agent::ConfigurationError&) {
-        // Reported by the log library; the host has a name all the same.
+        // The log library reports the error; the host's own name does not need the configuration.
     }
     return hostsName();
 }
@@ -60,7 +60,7 @@ std::string determineSystemName() {
 } // namespace
 
 std::string getSystemName() {
-    // Never destroyed: a host's threads may ask until the very end of the process.
+    // Never destroyed: threads of the host program may ask for it until the process ends.
     static const std::string& name = *new std::string(determineSystemName());
     return name;
 }

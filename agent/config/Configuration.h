@@ -1,6 +1,6 @@
 /**
- * The agent's configuration file, orv-agent.toml(5). Each of the agent's libraries links this privately and reads the
- * file on its own; whether the whole file is right is decided here, the same way for all of them.
+ * The agent's configuration file, orv-agent.toml(5). Each of the agent's libraries links this code privately and reads
+ * the file itself; since all use this code and check the whole file, they agree on whether it is correct.
  */
 #ifndef AGENT_CONFIGURATION_H
 #define AGENT_CONFIGURATION_H
@@ -15,10 +15,12 @@
 
 namespace Norv::Agent {
 
-/** Records of this level pass every threshold that can be configured: power requests and configuration errors. */
+/** The level of power requests and configuration errors: such records pass every threshold that can be configured. */
 inline constexpr int alwaysWrittenLevel = 10000;
 
-/** Thresholds of the categories that begin with a prefix; what is not set is taken from the general threshold. */
+/**
+ * Thresholds of the categories that begin with a prefix. The general threshold holds instead of one that has no value.
+ */
 struct CategoryThreshold {
     std::string prefix;
     std::optional<int> logLevel;
@@ -30,7 +32,7 @@ struct LogSettings {
     enum class Destination { standardError, file, syslog };
 
     Destination destination = Destination::standardError;
-    /** Where the destination is a file. */
+    /** The path, if the destination is a file. */
     std::filesystem::path file;
     /** Size in bytes at which the file is rotated; 0 never rotates it. */
     std::uint64_t rotateSize = 10ULL * 1024 * 1024;
@@ -39,23 +41,23 @@ struct LogSettings {
     /** Thresholds, 0 to alwaysWrittenLevel: a record at or above its threshold is written. */
     int logLevel = 6000;
     int traceLevel = alwaysWrittenLevel;
-    /** The longest prefix that matches decides. */
+    /** For a category, the longest prefix that matches decides. */
     std::vector<CategoryThreshold> categories;
 };
 
 /** Element of [[instrumentation.simulated.node]]: a power-management node of the simulated machine. */
 struct SimulatedNode {
-    /** Names from the root down, separated by slashes, for example "chassis/blade1". Unique. */
+    /** The names of the nodes from the root down, separated by slashes, for example "chassis/blade1". Unique. */
     std::string path;
-    /** What property 123 reads until the first write. */
+    /** The value of property 123 until the first power request. */
     unsigned int powerState = 1;
-    /** What property 125 reads. */
+    /** The value of property 125. */
     std::vector<unsigned int> powerStates = {2, 5, 8};
 };
 
 /** Table [instrumentation.simulated]. */
 struct SimulatedSettings {
-    /** Where the simulated machine's state is kept, shared by every process. Empty where the machine is another one. */
+    /** The file that holds the simulated machine's state; all processes share it. Empty for another backend. */
     std::filesystem::path stateFile;
     std::chrono::milliseconds rebootTime{10'000};
     std::chrono::milliseconds shutdownTime{5'000};
@@ -64,17 +66,23 @@ struct SimulatedSettings {
 
 /** Table [instrumentation.logind]. */
 struct LogindSettings {
-    /** From an accepted request until the machine goes down, so that the answer reaches who asked; 0 for at once. */
+    /**
+     * The time between an accepted request and the end of the machine, in which the answer can reach the client; 0 for
+     * at once.
+     */
     std::chrono::milliseconds delay{5'000};
-    /** How long an operation may wait for the bus and for systemd-logind, all in all. */
+    /** The longest time that an operation may wait for the bus and for systemd-logind together. */
     std::chrono::milliseconds timeout{5'000};
-    /** Locked while a request is made, so that of two that are made at once the second finds the first. */
+    /**
+     * The file that is locked while a request is made, so that of two simultaneous requests the second one finds the
+     * first.
+     */
     std::filesystem::path lockFile;
 };
 
 /** Table [instrumentation]. */
 struct InstrumentationSettings {
-    /** Builds without systemd's library have no logind: a file that asks for it cannot be used. */
+    /** In builds without systemd's library, a file that asks for logind is an error. */
     enum class Backend { simulated, logind };
 
     Backend backend = Backend::simulated;
@@ -83,29 +91,32 @@ struct InstrumentationSettings {
 };
 
 struct Configuration {
-    /** The file that was read; empty where there is none and the built-in defaults hold. */
+    /** The file that was read; empty if there is none and the built-in defaults hold. */
     std::filesystem::path source;
-    /** [system] name; not set where the host's own name is meant. */
+    /** [system] name; no value for the host's own name. */
     std::optional<std::string> systemName;
     LogSettings log;
     InstrumentationSettings instrumentation;
 };
 
-/** A configuration that cannot be used. what() is one line naming file, line, key, value and what was expected. */
+/**
+ * A configuration that cannot be used. what() is one line that names file, line, key and value, and what was expected.
+ */
 class ConfigurationError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
 };
 
-/** The file that the environment variable ORV_AGENT_CONFIG names, else /etc/orv/agent.toml, whether it exists or not.
- */
+/** The path of the configuration file, whether the file exists or not: the value of the environment variable
+ * ORV_AGENT_CONFIG, else /etc/orv/agent.toml. */
 std::string configurationFile();
 
 /**
- * Reads the file that the environment variable ORV_AGENT_CONFIG names, else /etc/orv/agent.toml where it exists, else
- * gives the built-in defaults. Keys that the file leaves out have their defaults.
+ * Reads the file that the environment variable ORV_AGENT_CONFIG names. If the variable is not set, reads
+ * /etc/orv/agent.toml; if that does not exist, returns the built-in defaults. Keys that the file leaves out have their
+ * defaults.
  *
- * @throws ConfigurationError where the file cannot be read or anything in it is wrong or unknown.
+ * @throws ConfigurationError if the file cannot be read, or anything in it is wrong or unknown.
  */
 Configuration loadConfiguration();
 

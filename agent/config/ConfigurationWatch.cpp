@@ -11,7 +11,7 @@ namespace Norv::Agent {
 namespace {
 
 constexpr std::int64_t interval = 1000;
-// More than file systems need to tell two changes apart, and less than the time until the next look.
+// Longer than the resolution of file systems' time stamps, and shorter than the time between two looks.
 constexpr std::chrono::milliseconds exactness{900};
 
 } // namespace

@@ -11,19 +11,18 @@
 namespace Norv::Agent {
 
 /**
- * Notices that the configuration file has become another one, was changed, made or removed. Asked as often as one
- * likes: it looks at the file once a second at most. Used by several threads at a time; takes no lock and allocates
- * nothing.
+ * Notices when the configuration file was changed, replaced, made or removed. It may be asked at any rate: it looks at
+ * the file once a second at most. Used by several threads at a time; takes no lock and allocates nothing.
  */
 class ConfigurationWatch {
 public:
-    /** Takes the file as it is now for known. */
+    /** Takes the file's present state as the known one. */
     ConfigurationWatch();
 
     /**
-     * Has `action` act where the file has changed since the last time, or since the beginning, and once more where that
-     * was so recent that another change could look the same. Only one thread at a time does so; others go on meanwhile,
-     * and so does `action` where it comes here itself.
+     * Calls `action` if the file has changed since the last look, and once more at the next look if the change was so
+     * recent that a further change could have the same time stamp. Only one thread at a time looks and calls `action`;
+     * other threads return at once, and so does a call from within `action`.
      */
     void onChange(const auto& action) {
         if (!isDue() || _looking.test_and_set(std::memory_order_acquire)) {
@@ -48,17 +47,17 @@ private:
     };
 
     bool isDue() const;
-    /** Looks at the file. @return whether it is, or may be, another one than the last time. */
+    /** Looks at the file. @return whether it has changed since the last look, or may have. */
     bool look();
     std::optional<FileSignature> signature() const;
     static bool isRecent(const std::optional<FileSignature>& signature);
 
     const std::string _file;
-    /** When to look again, in milliseconds of a clock of its own. */
+    /** When to look again, in milliseconds of coarseMilliseconds(). */
     std::atomic<std::int64_t> _next;
     /** Set while a thread looks. */
     std::atomic_flag _looking;
-    // These belong to the thread that looks.
+    // Only the thread that looks uses these.
     std::optional<FileSignature> _known;
     bool _recent;
 };

@@ -1,5 +1,5 @@
 /**
- * The names of power states in the configuration file and in texts for people.
+ * The names of power states, for the configuration file and for texts for people.
  */
 #ifndef CONFIG_POWERSTATES_H
 #define CONFIG_POWERSTATES_H
@@ -11,7 +11,10 @@
 
 namespace Norv::Agent {
 
-/** As property 123 of a power-management node counts them. There may be other numbers; they have no name. */
+/**
+ * Power states by their numbers in property 123 of a power-management node. Other numbers are possible; they have no
+ * names.
+ */
 inline constexpr std::array<std::pair<std::string_view, unsigned int>, 5> nodePowerStates{{
     {"running", 1},
     {"hibernating", 8},
@@ -20,7 +23,10 @@ inline constexpr std::array<std::pair<std::string_view, unsigned int>, 5> nodePo
     {"shutting-down", 12},
 }};
 
-/** As property 125 counts them: the values of CIM_PowerManagementCapabilities.PowerStatesSupported (DMTF). */
+/**
+ * Power states by their numbers in property 125: the values of CIM_PowerManagementCapabilities.PowerStatesSupported
+ * (DMTF).
+ */
 inline constexpr std::array<std::pair<std::string_view, unsigned int>, 15> supportedPowerStates{{
     {"on", 2},
     {"sleep-light", 3},
@@ -39,8 +45,8 @@ inline constexpr std::array<std::pair<std::string_view, unsigned int>, 15> suppo
     {"power-cycle-off-hard-graceful", 16},
 }};
 
-/** What clients see of a value of property 123, in the words of CIM_AssociatedPowerManagementService.PowerState (DMTF).
- */
+/** The value of CIM_AssociatedPowerManagementService.PowerState (DMTF) that clients see for a value of property 123,
+ * with its meaning. */
 inline std::string shownPowerState(unsigned int state) {
     constexpr unsigned int running = 1;
     constexpr unsigned int hibernating = 8;

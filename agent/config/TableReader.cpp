@@ -11,7 +11,7 @@ namespace Norv::Agent {
 
 namespace {
 
-// The value as it could stand in the file, on one line.
+// The value in the notation of the file, on one line.
 std::string describe(const toml::node& node) {
     if (node.is_table()) {
         return "a table";
@@ -25,7 +25,8 @@ std::string describe(const toml::node& node) {
     return text.str();
 }
 
-// The key as it would stand in the file: names that are more than letters, digits, dashes and underscores are quoted.
+// The key in the notation of the file: a name with other characters than letters, digits, dashes and underscores is
+// quoted.
 std::string describe(const toml::key& key) {
     const auto isBare = [](char character) {
         return std::isalnum(character, std::locale::classic()) || character == '-' || character == '_';
@@ -52,7 +53,7 @@ std::optional<std::chrono::milliseconds> Seconds::accept(const toml::node& node)
         return std::nullopt;
     }
     const double value = *node.value<double>();
-    // In this form "not a number" is out of range, too.
+    // Written so that "not a number" is out of range, too.
     if (!(value >= secondsOf(low) && value <= secondsOf(high))) {
         return std::nullopt;
     }

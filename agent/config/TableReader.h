@@ -1,6 +1,5 @@
 /**
- * Reading a table of a TOML file strictly: a value has the type and range that is expected of it, and a key that nobody
- * asked for is an error.
+ * Reads a table of a TOML file strictly: a value must have the expected type and range, and an unknown key is an error.
  */
 #ifndef AGENT_TABLEREADER_H
 #define AGENT_TABLEREADER_H
@@ -20,15 +19,15 @@
 
 namespace Norv::Agent {
 
-// What a value can be asked to be. Each kind has
-//   expected()      its description, as it completes "expected ..."
-//   accept(node)    the value, or nothing where the node is something else.
+// The kinds of values that a key can require. Each kind has
+//   expected()      its description, which completes "expected ..." in a message
+//   accept(node)    the value of a node; no value if the node is of another kind.
 
 /** Names that stand for values. */
 template <typename T>
 using Names = std::span<const std::pair<std::string_view, T>>;
 
-/** The names in quotation marks. */
+/** The names in quotation marks, with separators between them. */
 template <typename T>
 std::string listOf(Names<T> names, const char* separator) {
     std::string text;
@@ -38,7 +37,7 @@ std::string listOf(Names<T> names, const char* separator) {
     return text;
 }
 
-/** Not set where the node is not one of the names. */
+/** The value that a name stands for; no value if the node is none of the names. */
 template <typename T>
 std::optional<T> valueOf(Names<T> names, const toml::node& node) {
     for (const auto& [name, value] : names) {
@@ -64,7 +63,7 @@ struct Integer {
     }
 };
 
-/** One of `names`, or a number that may be among those for which they stand. */
+/** One of `names`, or a number in a range; the number may be one that a name stands for. */
 template <typename T>
 struct NumberOrName {
     Integer<T> numbers;
@@ -77,7 +76,7 @@ struct NumberOrName {
     }
 };
 
-/** Seconds, whole or with decimals. */
+/** A number of seconds, with or without decimals. */
 struct Seconds {
     std::chrono::milliseconds low;
     std::chrono::milliseconds high;
@@ -86,13 +85,13 @@ struct Seconds {
     std::optional<std::chrono::milliseconds> accept(const toml::node& node) const;
 };
 
-/** Text that is not empty. */
+/** A text that is not empty. */
 struct Text {
     static std::string expected() { return "a text that is not empty"; }
     static std::optional<std::string> accept(const toml::node& node);
 };
 
-/** A path that means the same in every process, whatever its working directory. */
+/** An absolute path, which means the same in every process, whatever its working directory. */
 struct AbsolutePath {
     static std::string expected() { return "an absolute path"; }
     static std::optional<std::filesystem::path> accept(const toml::node& node);
@@ -115,15 +114,15 @@ struct Choice {
 
 class TableReader {
 public:
-    /** The table and `file`, the file's name for messages, must outlive the reader. */
+    /** @param table,file must outlive the reader; `file` is the file's name, for messages. */
     TableReader(const toml::table& table, const std::string& file, std::string name = "")
         : _table(table), _file(file), _name(std::move(name)) {}
 
     /**
-     * Sets `target` to the key's value; leaves it alone where the table has no such key.
+     * Sets `target` to the key's value; leaves it unchanged if the table has no such key.
      *
      * @return whether the table has the key.
-     * @throws ConfigurationError, as every other member, where the value is not of that kind.
+     * @throws ConfigurationError if the value is not of that kind. The other members throw it in the same case.
      */
     template <typename Kind, typename Target>
     bool read(const char* key, const Kind& kind, Target& target) {
@@ -134,7 +133,7 @@ public:
         return node != nullptr;
     }
 
-    /** The same for a key that must be there. */
+    /** The same for a key that must be present. */
     template <typename Kind, typename Target>
     void require(const char* key, const Kind& kind, Target& target) {
         if (!read(key, kind, target)) {
@@ -156,20 +155,20 @@ public:
         return true;
     }
 
-    /** Has `read` read the table behind the key, where there is one. */
+    /** Calls `read` with a reader of the table behind the key, if there is one. */
     void readTable(const char* key, const std::function<void(TableReader&)>& read);
 
     /**
-     * Has `read` read each table of the list behind the key, in order.
+     * Calls `read` with a reader of each table in the list behind the key, in their order.
      *
      * @return whether the table has the key.
      */
     bool readTables(const char* key, const std::function<void(TableReader&)>& read);
 
-    /** Reports the key's value, or that it is missing. */
+    /** Reports that the key's value is wrong, or that the key is missing. */
     [[noreturn]] void reject(const char* key, const std::string& expected) const;
 
-    /** Reports a key that was not asked for. Called when everything known has been read. */
+    /** Reports a key that no other call has read. Called after all known keys have been read. */
     void finish() const;
 
 private:

@@ -1,6 +1,6 @@
 /**
- * What stands behind the cursor of Norv::Instrumentation: a backend gives the nodes of one kind of machine. Each
- * process has one backend, which any number of threads use at once.
+ * The seam between the cursor Norv::Instrumentation and the machine: a backend provides the nodes of one kind of
+ * machine. A process has one backend, which any number of threads may use at once.
  */
 #ifndef INSTRUMENTATION_BACKEND_H
 #define INSTRUMENTATION_BACKEND_H
@@ -16,22 +16,22 @@
 
 namespace Norv::Agent {
 
-/** How a request for another power state, or its cancellation, ended. */
+/** The outcome of a request for another power state, or of its cancellation. */
 struct PowerRequestOutcome {
     bool accepted;
-    /** For people: what was asked of which node, and when it will be over or why it was refused. */
+    /** For people: which request was made of which node, and when it will be done or why it was refused. */
     std::string description;
 };
 
-/** Why a request is not even tried. what() is the reason, for people. */
+/** A refusal of a request that is not even tried. what() is the reason, for people. */
 class Refusal : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
 };
 
 /**
- * The power-management nodes as they stood when they were selected. Belongs to one thread at a time and must not
- * outlive its backend. Every `node` is an index below `size()`.
+ * The power-management nodes and their states at the time of the selection. It belongs to one thread at a time and must
+ * not outlive its backend. Every `node` is an index below `size()`.
  */
 class NodeSelection {
 public:
@@ -39,37 +39,42 @@ public:
 
     virtual std::size_t size() const = 0;
 
-    /** Names from the root down, separated by slashes, without one in front: the node's identity. */
+    /**
+     * The names from the root down to the node, separated by slashes, without a leading slash. The path is the node's
+     * identity.
+     */
     virtual const std::string& path(std::size_t node) const = 0;
 
-    /** What the node does now; not set where the backend cannot tell. The reason is in the log. */
+    /**
+     * The node's power state, as property 123 counts them; no value if the backend does not know it: the log says why.
+     */
     virtual std::optional<unsigned int> powerState(std::size_t node) const = 0;
 
     virtual const std::vector<unsigned int>& powerStates(std::size_t node) const = 0;
 
     /**
-     * Asks for another power state; an accepted one shows in `powerState` of this selection at once. Refused where
-     * another request is under way.
+     * Requests another power state. If the request is accepted, `powerState` of this selection shows it at once. It is
+     * refused if another request is under way.
      */
     virtual PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) = 0;
 
     /**
-     * Takes back the request that is under way, by whomever it was made; the node is then as it was before. Refused
-     * where there is none, or where it is too late.
+     * Cancels the request that is under way, whoever made it; the node then has its former state again. It is refused
+     * if there is no request, or if it is too late.
      */
     virtual PowerRequestOutcome cancelRequest(std::size_t node) = 0;
 };
 
-/** The machine behind the nodes, for people who want to know whether it can do what it is there for. */
+/** What was found out about the machine, for people who want to know whether power requests can succeed. */
 struct MachineReport {
     struct Fact {
         std::string name;
         std::string value;
     };
 
-    /** What it does now, what it can be asked to do, and what it warns of. */
+    /** The machine's state, the requests that it can carry out, and warnings. */
     std::vector<Fact> facts;
-    /** What is missing, and what to do about it. */
+    /** What is missing, each with what to do about it. */
     std::vector<std::string> problems;
 };
 
@@ -77,23 +82,23 @@ class Backend {
 public:
     virtual ~Backend() = default;
 
-    /** Whether nothing real happens whatever is asked of it. */
+    /** Whether the machine is simulated: requests change nothing but a file. */
     virtual bool isSimulated() const = 0;
 
-    /** The machine, for people, as it completes "Power management of". */
+    /** A description of the machine that completes "Power management of", for people. */
     virtual std::string machine() const = 0;
 
-    /** Why clients will not see the machine as it is configured, for people; empty where they will. */
+    /** Why clients cannot see all of the configured machine, for people; empty if they can. */
     virtual std::string warning() const { return {}; }
 
-    /** Never null; without nodes where the machine has none. */
+    /** Selects the nodes. The result is never null; it is empty if the machine has no nodes. */
     virtual std::unique_ptr<NodeSelection> selectPowerManagementNodes() = 0;
 
-    /** Looks at the machine and asks nothing of it. */
+    /** Examines the machine without any request to it. */
     virtual MachineReport examine() = 0;
 };
 
-/** The backend of the configuration. Nothing is asked of its machine yet. */
+/** Makes the configured backend, which does not contact its machine yet. */
 std::unique_ptr<Backend> makeBackend(const Configuration& configuration);
 
 } // namespace Norv::Agent

@@ -6,14 +6,14 @@ namespace Norv::Agent {
 
 namespace {
 
-/** A machine that still runs so long after its end has begun has failed to go down. */
+/** A machine that still runs this long after it began to go down has failed to do so. */
 constexpr std::chrono::minutes longestEnd{2};
 
 } // namespace
 
 void EndOfTheMachine::note(Time when, bool begun, Node node) {
     const std::lock_guard guard(_mutex);
-    // It began when it was first seen to.
+    // The end keeps the time at which it was first seen.
     if (!(begun && _note && _note->begun)) {
         _note = {when, begun, std::move(node)};
     }

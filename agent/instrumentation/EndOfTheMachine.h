@@ -1,6 +1,6 @@
 /**
- * What is known of the machine's end, for when nobody can be asked any more: systemd-logind is stopped beside whoever
- * asks.
+ * Remembers that the machine goes down. While it does, systemd-logind is stopped together with the processes that ask
+ * for the state, so they must know it themselves.
  */
 #ifndef INSTRUMENTATION_ENDOFTHEMACHINE_H
 #define INSTRUMENTATION_ENDOFTHEMACHINE_H
@@ -12,28 +12,30 @@
 
 namespace Norv::Agent {
 
-/** Used by several threads at once. */
+/** What is known about the machine's end. Used by several threads at once. */
 class EndOfTheMachine {
 public:
-    /** In microseconds, as systemd-logind tells it: far more years than in nanoseconds. */
+    /** In microseconds, as in systemd-logind's answers: nanoseconds would overflow at times that it can give. */
     using Time = std::chrono::sys_time<std::chrono::microseconds>;
 
-    /** What is read of the machine's node from then on. */
+    /** The state of the machine's node from then on. */
     struct Node {
         unsigned int state;
         std::vector<unsigned int> powerStates;
     };
 
-    /** Notes that the machine goes down, and when. @param begun whether it already does. */
+    /** Notes that the machine goes down, and when. @param begun whether it is already going down. */
     void note(Time when, bool begun, Node node);
 
-    /** Notes that nothing is under way. */
+    /** Notes that no shutdown is under way. */
     void forget();
 
-    /** Set where the machine was seen going down: it does not come back from that. */
+    /** The node, if the machine was seen going down: that cannot be stopped any more. Else no value. */
     std::optional<Node> begun() const;
 
-    /** Set also where the time has come at which it was to go down, unless it was told otherwise since. */
+    /**
+     * The node, also if only the noted time for the shutdown has come and nothing newer was noted since. Else no value.
+     */
     std::optional<Node> due() const;
 
 private:

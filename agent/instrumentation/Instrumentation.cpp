@@ -33,7 +33,7 @@ std::unique_ptr<Backend> createBackend() {
         }
         return backend;
     } catch (const ConfigurationError&) {
-        // The log library says what is wrong, on its first use: now at the latest.
+        // The log library reports the mistake when it is first used, which this record ensures.
         OrvLog::OrvLogger::traceLevelMessage(static_cast<const char*>(__func__), __FILE__, __LINE__,
                                              instrumentationCategory, failureLevel, nullptr, 0, 0,
                                              "No power-management node is offered: the configuration cannot be used");
@@ -42,25 +42,25 @@ std::unique_ptr<Backend> createBackend() {
 }
 
 /**
- * The backend of this process; null where the configuration cannot be used. It is never destroyed: a host's threads may
- * use cursors until the very end of the process.
+ * The backend of this process; null if the configuration cannot be used. It is never destroyed: a host's threads may
+ * use cursors until the process ends.
  */
 Backend* processBackend() {
     static Backend* const backend = createBackend().release();
     return backend;
 }
 
-/** What the thread gave to orvInstrumentationOnBehalfOf1. */
+/** The text that the thread passed to orvInstrumentationOnBehalfOf1. */
 constinit thread_local const char* principal = nullptr;
 
-/** Who asks, as far as a library can know: on whose behalf the host acts, only the host can tell. */
+/** The requester for the log: the host program, and the user on whose behalf it acts, if it has told that. */
 std::string requester() {
     return std::string(" [asked by ") + program_invocation_short_name + ", process " + std::to_string(getpid()) +
            ", uid " + std::to_string(geteuid()) +
            (principal == nullptr ? "" : std::string(", on behalf of ") + principal) + ']';
 }
 
-/** In the log, whatever its thresholds. @return whether the request was accepted. */
+/** Logs the outcome, whatever the log's thresholds. @return whether the request was accepted. */
 bool reported(const PowerRequestOutcome& outcome) {
     report(alwaysWrittenLevel,
            (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description +
@@ -74,7 +74,7 @@ bool reported(const PowerRequestOutcome& outcome) {
 class Instrumentation::Implementation {
 public:
     Backend* const backend = processBackend();
-    /** Null until nodes were selected. */
+    /** The selected nodes; null before the first selection. */
     std::unique_ptr<NodeSelection> nodes;
     std::size_t node = 0;
 
@@ -120,7 +120,7 @@ Instrumentation& Instrumentation::operator++() {
     return *this;
 }
 
-// The tree's root is written in a path, as in a file's; people know the node by its path below the root.
+// A path begins with a slash for the root, like a file's; texts for people leave that slash out.
 std::string Instrumentation::getPathToNode() {
     return _implementation->isOnNode() ? '/' + _implementation->nodes->path(_implementation->node) : std::string();
 }

@@ -25,19 +25,19 @@ constexpr const char* propertiesInterface = "org.freedesktop.DBus.Properties";
 
 using Kind = LogindError::Kind;
 
-/** Errors by which the bus says that nobody can answer. */
+/** The bus's errors for a service that is not there. */
 constexpr std::array<std::string_view, 3> noServiceErrors = {
     SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER, "org.freedesktop.systemd1.NoSuchUnit"};
-/** Errors by which systemd says that a service must not be started. */
+/** systemd's errors for a service that must not be started. */
 constexpr std::array<std::string_view, 1> maskedErrors = {"org.freedesktop.systemd1.UnitMasked"};
-/** Errors by which the bus says that whoever should have answered is gone. */
+/** The bus's errors for a service that ended before it answered. */
 constexpr std::array<std::string_view, 2> unansweredErrors = {SD_BUS_ERROR_NO_REPLY, SD_BUS_ERROR_DISCONNECTED};
 
 std::string textOf(int error) {
     return std::generic_category().message(error);
 }
 
-/** What others say, without what would break a line or change a terminal. Null is empty. */
+/** A text of another program, without characters that would break a line or control a terminal. Null becomes empty. */
 std::string printable(const char* text) {
     std::string result(text == nullptr ? "" : text);
     std::ranges::replace_if(
@@ -46,8 +46,8 @@ std::string printable(const char* text) {
 }
 
 /**
- * The library that speaks to the bus. It is loaded when it is first needed, and stays: with all that it brings along it
- * is larger than the agent, and hosts of a simulated machine never need it.
+ * systemd's library, which implements D-Bus. It is loaded when it is first needed, and stays loaded: together with its
+ * dependencies it is larger than the agent, and hosts of a simulated machine never need it.
  */
 class Libsystemd {
 public:
@@ -87,7 +87,7 @@ private:
     }
 };
 
-/** @throws LogindError where there is none. The next call tries again. */
+/** @throws LogindError if the library cannot be loaded. The next call tries again. */
 const Libsystemd& libsystemd() {
     static const Libsystemd library;
     return library;
@@ -124,14 +124,14 @@ private:
                                        " cannot be reached: " + reason);
 }
 
-/** `result` as sd-bus gives it, for what fails only where memory is short or an answer has another form. */
+/** Checks a result of sd-bus of a call that fails only if memory is short or an answer has an unexpected type. */
 void require(int result, const char* method) {
     if (result < 0) {
         throw LogindError(Kind::refused, std::string(method) + ": " + textOf(-result));
     }
 }
 
-/** Whether a list of names separated by colons has a name. */
+/** Whether a list of names, separated by colons, contains a name. */
 bool contains(std::string_view list, std::string_view name) {
     for (;;) {
         const std::size_t end = list.find(':');
@@ -168,7 +168,7 @@ Logind::Logind(const Deadline& deadline) : _deadline(deadline) {
     waitUntilConnected();
 }
 
-// A first call would do this, too, but without an end where somebody listens at the address and says nothing.
+// The first call would connect, too, but without a timeout if the bus accepts the connection and never answers.
 void Logind::waitUntilConnected() {
     for (;;) {
         const int ready = libsystemd().sd_bus_is_ready(_bus.get());
@@ -208,7 +208,7 @@ Logind::Message Logind::newQuestion(const char* question) {
 Logind::Message Logind::send(const Message& call, const char* method) {
     const auto remaining = static_cast<std::uint64_t>(_deadline.remaining().count());
     if (remaining == 0) {
-        // To sd-bus this would mean a time of its own.
+        // sd-bus would take 0 for its default timeout.
         failToAnswer(method, -ETIMEDOUT);
     }
     BusErrorText error;
@@ -233,7 +233,7 @@ void Logind::askTogether(std::span<const char* const> questions) {
                                                std::numeric_limits<std::uint64_t>::max()),
                 question);
     }
-    // Where the connection is lost or the time is over, those without an answer say so.
+    // If the connection is lost or the time is over, the questions without an answer report it later.
     while (std::ranges::any_of(_asked, [](const Asked& asked) { return asked.answer == nullptr; })) {
         int result = libsystemd().sd_bus_process(_bus.get(), nullptr);
         if (result == 0) {
@@ -273,7 +273,7 @@ void Logind::failToAnswer(const char* method, int result, const std::string& err
     if (_deadline.remaining().count() == 0) {
         throw unanswered("systemd-logind does not answer within " + inSeconds(_deadline.whole()));
     }
-    // An answer leaves the connection open.
+    // An error with an open connection is an answer; with a closed one, there is none.
     if (libsystemd().sd_bus_is_open(_bus.get()) <= 0) {
         throw unanswered("the connection to the system bus was lost: " + textOf(-result));
     }
@@ -307,7 +307,7 @@ ScheduledShutdown Logind::scheduledShutdown() {
     const char* type = nullptr;
     std::uint64_t time = 0;
     require(libsystemd().sd_bus_message_read(reply.get(), "v", "(st)", &type, &time), name);
-    // Of all numbers, the largest means never.
+    // The largest number means "never".
     const auto latest = static_cast<std::uint64_t>(endOfTime.time_since_epoch().count());
     return {printable(type), WallTime(std::chrono::microseconds(std::min(time, latest)))};
 }
@@ -337,7 +337,7 @@ std::vector<Inhibitor> Logind::shutdownInhibitors() {
         if (result == 0) {
             return inhibitors;
         }
-        // The other mode is "delay".
+        // The modes "block" and "block-weak" forbid a shutdown; the mode "delay" does not.
         if (contains(what, "shutdown") && std::string_view(mode).starts_with("block")) {
             inhibitors.push_back({printable(who), printable(why), uid, pid});
         }

@@ -20,21 +20,21 @@ struct sd_bus_message;
 
 namespace Norv::Agent {
 
-/** A call that did not do what it should. what() is the reason, for people. */
+/** A call that failed. what() is the reason, for people. */
 class LogindError : public std::runtime_error {
 public:
     enum class Kind {
-        /** There is no way to the bus. */
+        /** The bus cannot be reached. */
         noBus,
-        /** Nobody on the bus is systemd-logind, and nobody starts it. */
+        /** systemd-logind is not on the bus, and cannot be started. */
         noService,
-        /** Systemd-logind must not be started. */
+        /** systemd-logind is masked: it must not be started. */
         masked,
-        /** Systemd-logind answers, but polkit, which it has to ask about this user, must not be started. */
+        /** systemd-logind answers, but polkit, which it has to ask about this user, is masked. */
         polkitMasked,
-        /** Systemd-logind, or the bus in its place, said no. */
+        /** systemd-logind, or the policy of the bus, refused the call. */
         refused,
-        /** No answer came: whether the call did something is not known. */
+        /** No answer came: it is not known whether the call had an effect. */
         unanswered,
     };
 
@@ -48,16 +48,16 @@ private:
 
 using WallTime = std::chrono::sys_time<std::chrono::microseconds>;
 
-/** The last time whose year has four digits. Whatever is later is shown as this. */
+/** The last time whose year has four digits. Later times are shown as this one. */
 constexpr WallTime endOfTime{std::chrono::seconds{253'402'300'799}};
 
 struct ScheduledShutdown {
-    /** "reboot", "poweroff" and the like; empty where nothing is scheduled. */
+    /** "reboot", "poweroff" or another type; empty if no shutdown is scheduled. */
     std::string type;
     WallTime time;
 };
 
-/** Something on the machine that does not want it to go down. */
+/** A program's lock against shutdown. */
 struct Inhibitor {
     std::string who;
     std::string why;
@@ -66,27 +66,27 @@ struct Inhibitor {
 };
 
 /**
- * A connection to systemd-logind, for one thread and one operation: none is kept, so that nothing depends on what a
- * host does with its descriptors, or whether it forks, and a bus that was restarted is found again.
+ * A connection to systemd-logind, for one thread and one operation. No connection is kept, so that a host may close
+ * descriptors or fork, and a bus that was restarted is found again.
  *
- * Every member throws LogindError, at the latest when the time is over.
+ * Every member throws LogindError if it fails, at the latest when the deadline is over.
  */
 class Logind {
 public:
-    /** Connects to the bus that DBUS_SYSTEM_BUS_ADDRESS names, else to the machine's. */
+    /** Connects to the bus that DBUS_SYSTEM_BUS_ADDRESS names, else to the machine's system bus. */
     explicit Logind(const Deadline& deadline);
 
-    /** Questions that are not methods without arguments, but properties. */
+    /** Properties that `askTogether` can read; its other questions are methods without arguments. */
     static constexpr const char* preparingForShutdown = "PreparingForShutdown";
     static constexpr const char* scheduledShutdownProperty = "ScheduledShutdown";
-    /** The question behind shutdownInhibitors. */
+    /** The method that shutdownInhibitors calls. */
     static constexpr const char* listInhibitors = "ListInhibitors";
 
     /**
-     * Asks several questions at once, so that all of them take the time of one. Their answers are what the members
-     * below return when they are next called; an answer that is an error is thrown then.
+     * Sends several questions at once, so that together they take the time of one. The members below return these
+     * answers when they are next called, and throw the errors among them then.
      *
-     * @param questions those above, and methods for `can`.
+     * @param questions the constants above, and methods for `can`.
      */
     void askTogether(std::span<const char* const> questions);
 
@@ -94,13 +94,13 @@ public:
 
     ScheduledShutdown scheduledShutdown();
 
-    /** What a method such as CanReboot answers: "yes" or why not. */
+    /** The answer of a method such as CanReboot: "yes", or why not ("no", "na", "challenge"). */
     std::string can(const char* method);
 
-    /** Those that forbid a shutdown, not those that merely delay it. */
+    /** The inhibitors that forbid a shutdown, without those that only delay it. */
     std::vector<Inhibitor> shutdownInhibitors();
 
-    /** Calls Reboot or PowerOff. Never lets polkit ask anybody. */
+    /** Calls Reboot or PowerOff, not interactively: polkit asks nobody for a password. */
     void shutDown(const char* method);
 
     void scheduleShutdown(const ScheduledShutdown& shutdown);
@@ -108,7 +108,7 @@ public:
     /** Cancels the scheduled shutdown. @return whether there was one. */
     bool cancelScheduledShutdown();
 
-    /** Asks for the scheduled shutdown to be cancelled, without waiting for an answer. Does not throw. */
+    /** Asks systemd-logind to cancel the scheduled shutdown, without waiting for an answer. */
     void takeBackScheduledShutdown() noexcept;
 
 private:
@@ -125,22 +125,25 @@ private:
     Message newQuestion(const char* question);
     Message send(const Message& call, const char* method);
     Message answerTo(const char* question);
-    /** Throws what it means that a call has no answer, or an error: its name and text, which are empty else. */
+    /**
+     * Throws the LogindError for a call without an answer, or with an error as its answer: then `error` and `text` are
+     * that error's name and text.
+     */
     [[noreturn]] void failToAnswer(const char* method, int result, const std::string& error = "",
                                    const std::string& text = "");
 
-    /** A question that was asked together with others. */
+    /** A question of `askTogether`. */
     struct Asked {
         const char* question;
-        /** Null until it comes. */
+        /** Null until the answer comes. */
         Message answer;
     };
 
     Deadline _deadline;
-    /** What sd-bus calls back writes here; the bus goes first. */
+    /** Callbacks of sd-bus write into this list, so _bus must be destroyed before it. */
     std::list<Asked> _asked;
     std::unique_ptr<sd_bus, Closer> _bus;
-    /** Whether systemd-logind has answered anything. */
+    /** Whether systemd-logind has answered any call. */
     bool _answers = false;
 };
 

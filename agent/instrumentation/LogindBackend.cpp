@@ -23,22 +23,22 @@ namespace {
 
 constexpr const char* nodePath = "system";
 
-/** Property 123 while the machine runs. */
+/** The value of property 123 while the machine runs. */
 constexpr unsigned int running = 1;
-/** Property 123 while the machine goes down and nobody can say for what. */
+/** The value of property 123 while the machine goes down for an unknown reason. */
 constexpr unsigned int goingDown = 12;
 
-/** What the machine can be asked to do. */
+/** A request that the machine can carry out. */
 struct Transition {
-    /** What is written to property 123, and what it reads from then on. */
+    /** The value that is written to property 123, and that it has from then on. */
     unsigned int state;
     const char* name;
-    /** Methods of systemd-logind. */
+    /** The methods of systemd-logind. */
     const char* method;
     const char* canMethod;
-    /** What systemd-logind calls it where it is scheduled. */
+    /** systemd-logind's name for it as a scheduled shutdown. */
     const char* scheduledType;
-    /** The rights that it needs. */
+    /** The actions of polkit that it needs. */
     const char* actions;
 };
 
@@ -55,10 +55,10 @@ struct ListedState {
     const char* canMethod;
 };
 
-/** As CIM numbers power states: sleep - deep, power cycle, hibernate, off - soft. */
+/** By CIM's numbers of power states: sleep - deep, power cycle (off - soft), hibernate, off - soft. */
 constexpr std::array listedStates = {ListedState{4, "CanSuspend"}, ListedState{5, "CanReboot"},
                                      ListedState{7, "CanHibernate"}, ListedState{8, "CanPowerOff"}};
-/** The machine that runs this is on, and stays so where nothing else is asked of it. */
+/** CIM's power state "on": the machine that runs this program is always in it. */
 constexpr unsigned int listedOn = 2;
 
 constexpr const char* yes = "yes";
@@ -67,7 +67,7 @@ std::string user() {
     return "uid " + std::to_string(geteuid());
 }
 
-/** Why a machine does not do what it was asked whether it can. */
+/** What the answer of a method such as CanReboot means, if it is not "yes". */
 std::string meaningOf(const std::string& answer, const Transition& transition) {
     if (answer == "na") {
         return "this machine cannot do it";
@@ -99,14 +99,14 @@ std::string describe(const std::vector<Inhibitor>& inhibitors) {
     return text;
 }
 
-/** A shutdown that is under way, asked for by whomever. */
+/** A shutdown that is under way, whoever requested it. */
 struct Pending {
     unsigned int state;
-    /** For people: what, and when. */
+    /** Its kind and time, for people. */
     std::string description;
-    /** Whether the machine already goes down. */
+    /** Whether the machine is already going down. */
     bool begun;
-    /** When it does. */
+    /** When the machine goes down. */
     WallTime time;
 };
 
@@ -118,7 +118,7 @@ std::optional<Pending> pendingOn(Logind& logind) {
         return preparing ? std::optional(Pending{goingDown, "the machine is going down", true, now}) : std::nullopt;
     }
     const auto* const transition = std::ranges::find(transitions, scheduled.type, &Transition::scheduledType);
-    // There are others, such as "halt" and "kexec".
+    // Other types are possible, such as "halt" and "kexec".
     const unsigned int state = transition != transitions.end() ? transition->state : goingDown;
     if (preparing) {
         return Pending{state, scheduled.type + " is under way", true, now};
@@ -128,14 +128,14 @@ std::optional<Pending> pendingOn(Logind& logind) {
         false, scheduled.time};
 }
 
-/** @throws Refusal where something speaks against it now. */
+/** @throws Refusal if the machine cannot carry the request out now. */
 void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
     logind.askTogether(std::array{Logind::preparingForShutdown, Logind::scheduledShutdownProperty,
                                   Logind::listInhibitors, transition.canMethod});
     if (const auto pending = pendingOn(logind)) {
         throw Refusal("another request is in progress: " + pending->description);
     }
-    // Systemd-logind would let the superuser do it all the same.
+    // systemd-logind would ignore inhibitors if root makes the request, so they are checked here.
     if (const auto inhibitors = logind.shutdownInhibitors(); !inhibitors.empty()) {
         throw Refusal(describe(inhibitors));
     }
@@ -144,7 +144,7 @@ void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
     }
 }
 
-/** Has systemd-logind do it. @return when. */
+/** Makes the request of systemd-logind. @return when the machine goes down. */
 WallTime carryOut(Logind& logind, const Transition& transition, std::chrono::milliseconds delay) {
     const WallTime time = std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
     if (delay.count() == 0) {
@@ -155,7 +155,8 @@ WallTime carryOut(Logind& logind, const Transition& transition, std::chrono::mil
         logind.scheduleShutdown({transition.scheduledType, time});
     } catch (const LogindError& error) {
         if (error.kind() == LogindError::Kind::unanswered) {
-            // The call may still be waiting. It was refused here, and must not bring the machine down later.
+            // systemd-logind may still receive the call later. The request counts as refused here, so it must have no
+            // effect then.
             logind.takeBackScheduledShutdown();
         }
         throw;
@@ -182,7 +183,7 @@ std::string adviceFor(LogindError::Kind kind) {
     return ": look into the journal of systemd-logind (journalctl --unit systemd-logind)";
 }
 
-/** The reason, with advice where it is one that somebody has brought about on purpose, and forgotten. */
+/** The reason; for a masked service, with advice: somebody has masked it on purpose and may have forgotten it. */
 std::string reasonOf(const LogindError& error) {
     const bool isMasked = error.kind() == LogindError::Kind::masked || error.kind() == LogindError::Kind::polkitMasked;
     return error.what() + (isMasked ? adviceFor(error.kind()) : std::string());
@@ -216,7 +217,7 @@ public:
     std::size_t size() const override { return 1; }
 
     const std::string& path(std::size_t /*node*/) const override {
-        // Never destroyed: cursors may be used until the very end of the process.
+        // Never destroyed: cursors may be used until the process ends.
         static const std::string& path = *new std::string(nodePath);
         return path;
     }
@@ -261,7 +262,10 @@ public:
     }
 
 private:
-    /** How long others are asked once the machine should go down: they may be gone, and this process is to end. */
+    /**
+     * The timeout for questions after the time of a shutdown has come: systemd-logind may have ended, and this process
+     * is about to.
+     */
     static constexpr std::chrono::milliseconds shortTimeout{500};
 
     void show(const EndOfTheMachine::Node& node) {
@@ -297,7 +301,10 @@ private:
         }
     }
 
-    /** @param action what to ask of systemd-logind; gives the end of the description, or throws the reason. */
+    /**
+     * @param action makes the request of systemd-logind; returns the end of the description, or throws the reason of a
+     * refusal.
+     */
     PowerRequestOutcome attempt(const std::string& what, const std::function<std::string(Logind&)>& action) {
         const Patience patience(_backend._settings.timeout);
         try {
@@ -313,7 +320,7 @@ private:
     }
 
     LogindBackend& _backend;
-    /** Not set where it cannot be told. */
+    /** No value if the state is not known. */
     std::optional<unsigned int> _state;
     std::vector<unsigned int> _states;
 };

@@ -1,6 +1,6 @@
 /**
- * Backend "logind": the machine itself, as one node. What it does now is read from systemd-logind with each selection,
- * and a request is handed to systemd-logind before it counts as accepted: this process keeps nothing of it.
+ * Backend "logind": the machine itself, as one node. Each selection reads the state from systemd-logind. A request
+ * counts as accepted when systemd-logind has taken it: it does not depend on this process any more.
  */
 #ifndef INSTRUMENTATION_LOGINDBACKEND_H
 #define INSTRUMENTATION_LOGINDBACKEND_H
@@ -15,7 +15,7 @@ namespace Norv::Agent {
 
 class LogindBackend final : public Backend {
 public:
-    /** Nothing is connected yet. */
+    /** Does not connect to systemd-logind yet. */
     explicit LogindBackend(LogindSettings settings) : _settings(std::move(settings)) {}
 
     bool isSimulated() const override { return false; }
@@ -27,7 +27,7 @@ private:
     class Selection;
 
     const LogindSettings _settings;
-    /** What keeps the node's state once the machine goes down. */
+    /** Knows the node's state when the machine goes down. */
     EndOfTheMachine _end;
 };
 

@@ -9,12 +9,12 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-/** Of the whole time, what an operation may take and still count as quick. */
+/** An operation that takes at most the whole time divided by this counts as quick. */
 constexpr int quickFraction = 5;
-/** A pause after which a thread is taken to answer another request. */
+/** After a pause this long, the thread is assumed to serve another request. */
 constexpr std::chrono::seconds pause{1};
 
-/** What the thread's slow operations took, one after the other, and when the last one ended. */
+/** The total time of the thread's latest slow operations, and when the last of them ended. */
 struct Account {
     milliseconds spent{0};
     steady_clock::time_point end;
@@ -37,7 +37,7 @@ Patience::~Patience() {
     const auto now = steady_clock::now();
     const auto taken = std::chrono::ceil<milliseconds>(now - _begin);
     if (account.spent >= _deadline.whole()) {
-        return; // The pause begins with the operation that used the time up, not with those that had none left.
+        return; // The pause begins after the operation that used the time up; later ones do not prolong it.
     }
     account.spent = taken * quickFraction > _deadline.whole() ? account.spent + taken : milliseconds{0};
     account.end = now;

@@ -1,5 +1,5 @@
 /**
- * How long systemd-logind is waited for, by all that a host does in answer to one request.
+ * Limits how long a host waits for systemd-logind during one request of a client.
  */
 #ifndef INSTRUMENTATION_PATIENCE_H
 #define INSTRUMENTATION_PATIENCE_H
@@ -11,13 +11,14 @@
 namespace Norv::Agent {
 
 /**
- * One operation's share of the time that the calling thread may wait. A host selects nodes several times to answer one
- * request, and does not say where the next request begins. So the time that slow operations of a thread took, one after
- * the other, is taken from what the next one may take. A quick operation, or a pause, ends the account.
+ * One operation's share of the time that the calling thread may wait for systemd-logind during one request. A host
+ * selects nodes several times in one request, and does not say where the next request begins. So the times of a
+ * thread's consecutive slow operations are added up, and the next operation gets what remains. A quick operation, or a
+ * pause, starts the account anew.
  */
 class Patience {
 public:
-    /** @param whole what all of them may take together. */
+    /** @param whole the time that all operations of a request may take together. */
     explicit Patience(std::chrono::milliseconds whole);
     ~Patience();
     Patience(const Patience&) = delete;

@@ -1,5 +1,5 @@
 /**
- * What a simulated machine can be asked to do.
+ * The transitions between power states that a simulated machine can make.
  */
 #ifndef INSTRUMENTATION_POWERTRANSITION_H
 #define INSTRUMENTATION_POWERTRANSITION_H
@@ -12,11 +12,11 @@
 namespace Norv::Agent {
 
 struct PowerTransition {
-    /** What is written to property 123, and what it reads until the transition is over. */
+    /** The value that is written to property 123, and that it has until the transition is over. */
     unsigned int state;
-    /** What it reads from then on. */
+    /** The value of property 123 afterwards. */
     unsigned int stateAfterwards;
-    /** Its name in texts and in the state file. */
+    /** The transition's name in texts and in the state file. */
     const char* name;
     std::chrono::milliseconds SimulatedSettings::*duration;
 };

@@ -13,11 +13,11 @@ namespace Norv::Agent {
 
 inline constexpr const char* instrumentationCategory = "Corvane.Instrumentation";
 
-/** Levels of the instrumentation's records, beside alwaysWrittenLevel. */
+/** The levels of the instrumentation's records; a third one is alwaysWrittenLevel. */
 inline constexpr int informationLevel = 5000;
 inline constexpr int failureLevel = 6000;
 
-/** Writes a record of kind "log" whose place is the caller's. */
+/** Writes a record of kind "log"; its place in the source is the caller's. */
 inline void report(int level, const std::string& text, OrvLog::RecordKind kind = OrvLog::ORDINARY_RECORD,
                    const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
                    int line = __builtin_LINE()) {

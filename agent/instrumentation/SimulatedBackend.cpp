@@ -16,7 +16,7 @@ namespace Norv::Agent {
 
 class SimulatedBackend::Selection final : public NodeSelection {
 public:
-    /** `requests` is what the state file holds; null where it cannot be read. */
+    /** @param requests the content of the state file; null if it cannot be read. */
     Selection(SimulatedBackend& backend, std::shared_ptr<const PowerRequests> requests)
         : _backend(backend), _requests(std::move(requests)) {}
 
@@ -78,8 +78,8 @@ public:
     }
 
 private:
-    /** Not where the end is further away than a transition takes: the clock was set back, or the file came from
-     * elsewhere. */
+    /** Whether the transition goes on. An end that is further away than the transition takes does not count: the clock
+     * was set back, or the file is from another machine. */
     bool isUnderWay(const PowerRequest& request) const {
         const auto remaining = request.over - _backend._clock();
         return remaining.count() > 0 && remaining <= _backend._settings.*request.transition->duration;
@@ -91,7 +91,9 @@ private:
                inSeconds(request.over - _backend._clock());
     }
 
-    /** @param action what to do to the file's content; gives the end of the description, or throws the reason. */
+    /**
+     * @param action changes the file's content; returns the end of the description, or throws the reason of a refusal.
+     */
     PowerRequestOutcome change(const std::string& what, const std::function<std::string(PowerRequests&)>& action) {
         try {
             std::string end;
@@ -103,7 +105,7 @@ private:
     }
 
     SimulatedBackend& _backend;
-    /** Null where the state file cannot be read. */
+    /** Null if the state file cannot be read. */
     std::shared_ptr<const PowerRequests> _requests;
 };
 
@@ -117,7 +119,7 @@ std::string SimulatedBackend::machine() const {
 }
 
 std::string SimulatedBackend::warning() const {
-    // Each service is paired with each capabilities, and CMPI providers of this interface count with 16 bits.
+    // Every service is associated with every capabilities instance, and the provider counts these pairs with 16 bits.
     constexpr std::uint64_t mostNodes = 255;
     const std::uint64_t count = _settings.nodes.size();
     if (count <= mostNodes) {

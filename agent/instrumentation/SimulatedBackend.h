@@ -1,5 +1,5 @@
 /**
- * Backend "simulated": a machine of any number of nodes that reboots and shuts down on paper only.
+ * Backend "simulated": a machine of any number of nodes; a reboot or shutdown changes only its state file.
  */
 #ifndef INSTRUMENTATION_SIMULATEDBACKEND_H
 #define INSTRUMENTATION_SIMULATEDBACKEND_H
@@ -15,7 +15,7 @@ namespace Norv::Agent {
 
 class SimulatedBackend final : public Backend {
 public:
-    /** Wall-clock time, which every process on the host shares. */
+    /** Returns the wall-clock time, which all processes on the host share. */
     using Clock = std::function<TimePoint()>;
 
     explicit SimulatedBackend(SimulatedSettings settings, Clock clock = wallClock);

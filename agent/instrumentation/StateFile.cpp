@@ -32,12 +32,12 @@ constexpr const char* requestKey = "request";
 constexpr const char* overKey = "over";
 constexpr const char* afterKey = "after";
 
-/** How long others may keep the file locked. */
+/** How long to wait while another process holds the lock. */
 constexpr std::chrono::seconds patience{5};
-/** No file of ours is larger. */
+/** A larger file is not a state file. */
 constexpr off_t largestSize = off_t{16} * 1024 * 1024;
 
-/** @throws std::system_error of errno. */
+/** @throws std::system_error with the number in errno. */
 [[noreturn]] void fail(const std::filesystem::path& path, const std::string& problem) {
     throw std::system_error(errno, std::system_category(), path.string() + ": " + problem);
 }
@@ -82,12 +82,12 @@ void writeAll(const Descriptor& file, const std::filesystem::path& path, std::st
 }
 
 /**
- * Reads a state file's text value by value: the destructor of a document allocates memory, and ends the process where
- * there is none. What the file has beside the requests is ignored.
+ * Reads a state file's text value by value. A parsed document is not used, since its destructor allocates memory and
+ * ends the process if there is none. Values other than the requests are ignored.
  */
 class Reader final : public nlohmann::json_sax<nlohmann::json> {
 public:
-    /** @throws std::invalid_argument where the text is no state file's. */
+    /** @throws std::invalid_argument if the text is not that of a state file. */
     static PowerRequests read(const std::string& text) {
         Reader reader;
         nlohmann::json::sax_parse(text, &reader);
@@ -142,7 +142,7 @@ public:
         return true;
     }
 
-    // An array is a level without a key.
+    // An array is a level with an empty key.
     bool start_array(std::size_t /*elements*/) override {
         refuse("an array");
         _keys.emplace_back();
@@ -162,12 +162,14 @@ public:
 private:
     bool isAt(std::initializer_list<std::string_view> keys) const { return std::ranges::equal(_keys, keys); }
 
-    /** Whether the value that comes now is this one of a node. */
+    /** Whether the current value is the one called `field` of a node. */
     bool isField(std::string_view field) const {
         return _keys.size() == 3 && _keys.front() == nodesKey && _keys.back() == field;
     }
 
-    /** Ignores a value where any may stand; true, to go on. */
+    /**
+     * Handles a value of an unexpected type: throws if it is one of a request, else ignores it. @return true, to go on.
+     */
     bool refuse(const std::string& found) const {
         const bool isNode = _keys.size() == 2 && _keys.front() == nodesKey;
         if (isAt({nodesKey})) {
@@ -196,7 +198,7 @@ private:
         _over.reset();
     }
 
-    /** The keys that lead to the value that comes now. */
+    /** The keys that lead to the current value. */
     std::vector<std::string> _keys;
     bool _hasNodes = false;
     const PowerTransition* _transition = nullptr;
@@ -205,7 +207,7 @@ private:
     PowerRequests _requests;
 };
 
-/** @throws nlohmann::json::exception where a node's name is not UTF-8. */
+/** @throws nlohmann::json::exception if a node's name is not valid UTF-8. */
 std::string format(const PowerRequests& requests) {
     std::string text;
     for (const auto& [node, request] : requests) {
@@ -239,7 +241,7 @@ std::filesystem::path nameForDamaged(const std::filesystem::path& file) {
 
 } // namespace
 
-// A guest does not know when its host changes the working directory, hence the absolute path.
+// The path is made absolute, since the host program may change its working directory at any time.
 StateFile::StateFile(const std::filesystem::path& file) : _file(std::filesystem::absolute(file)) {}
 
 std::shared_ptr<const PowerRequests> StateFile::read() {
@@ -292,7 +294,7 @@ std::optional<FileSignature> StateFile::currentSignature() const {
 }
 
 StateFile::Content StateFile::load() const {
-    // Opening what is no regular file must not wait for its other end.
+    // O_NONBLOCK: opening a named pipe must not wait for a writer.
     const Descriptor file(::open(_file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (!file.isOpen()) {
         if (errno == ENOENT) {
@@ -339,7 +341,7 @@ StateFile::Content StateFile::loadOrSetAside(const LockFile& /*held*/) const {
 void StateFile::store(const PowerRequests& requests, const std::optional<FileSignature>& replaced,
                       const LockFile& /*held*/) const {
     const std::filesystem::path replacement = withSuffix(_file, ".new");
-    // A process that was killed while it wrote has left its own.
+    // A process that was killed while it wrote has left this file behind.
     if (::unlink(replacement.c_str()) != 0 && errno != ENOENT) {
         fail(replacement, "cannot be removed");
     }
@@ -349,8 +351,8 @@ void StateFile::store(const PowerRequests& requests, const std::optional<FileSig
     }
     try {
         writeAll(file, replacement, format(requests));
-        // File systems give the same time to everything within a few milliseconds and use an inode number again at
-        // once; the signature of two contents must differ all the same.
+        // Two contents must have different signatures, but file systems give the same time to all changes within a few
+        // milliseconds and reuse inode numbers at once.
         std::chrono::nanoseconds modified = std::chrono::system_clock::now().time_since_epoch();
         if (replaced && replaced->modified >= modified) {
             modified = replaced->modified + std::chrono::nanoseconds(1);
@@ -368,8 +370,8 @@ void StateFile::store(const PowerRequests& requests, const std::optional<FileSig
         ::unlink(replacement.c_str());
         throw;
     }
-    // The new file is whole and in place. Where this fails, a power failure can bring the former one back: no reason to
-    // call the request refused.
+    // The new file is complete and in place. If this synchronization fails, a power failure can bring the former file
+    // back; that is no reason to report the request as refused.
     const Descriptor folder(::open(_file.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (folder.isOpen()) {
         ::fsync(folder.number());

@@ -3,11 +3,12 @@
  *
  *     { "nodes": { "chassis/blade1": { "request": "reboot", "over": 1795177867123, "after": "shutdown" } } }
  *
- * holds the last power request of each node that ever had one; "over" is in milliseconds since 1970 (UTC), and "after"
- * is the request before, where there was one: what the node goes back to where the last one is cancelled. The file is
- * replaced as a whole, under a lock on "<file>.lock" beside it, so that a reader needs no lock and a process that is
- * killed at any moment leaves a whole file. A damaged file is set aside as "<file>.damaged-<UTC time>-<number>". One
- * that is larger than any of ours is neither read nor replaced.
+ * holds the last power request of each node that ever had one. "over" is the time at which the transition is over, in
+ * milliseconds since 1970 (UTC). "after" is the request before it, if there was one: when the last request is
+ * cancelled, the node has the state after that one. The file is replaced as a whole, under a lock on "<file>.lock"
+ * beside it, so that readers need no lock and a process that is killed at any moment leaves a complete file. A damaged
+ * file is renamed to "<file>.damaged-<UTC time>-<number>". A file that is larger than any state file is neither read
+ * nor replaced.
  */
 #ifndef INSTRUMENTATION_STATEFILE_H
 #define INSTRUMENTATION_STATEFILE_H
@@ -30,47 +31,47 @@ namespace Norv::Agent {
 using TimePoint = std::chrono::sys_time<std::chrono::milliseconds>;
 
 struct PowerRequest {
-    /** Element of powerTransitions. */
+    /** An element of powerTransitions. */
     const PowerTransition* transition;
     /** When the transition is over. */
     TimePoint over;
-    /** The node's request before, which was over; null where there was none. */
+    /** The node's request before this one, which was over; null if there was none. */
     const PowerTransition* after = nullptr;
 };
 
 /** The last request of each node that had one, by the node's path. */
 using PowerRequests = std::map<std::string, PowerRequest>;
 
-/** Any number of threads may use one object at once. */
+/** The state file. Any number of threads may use one object at once. */
 class StateFile {
 public:
-    /** Nothing is read or made yet. The missing folders of `file` are made with the file. */
+    /** Neither reads nor makes the file yet. Missing folders are made together with the file. */
     explicit StateFile(const std::filesystem::path& file);
 
     /**
-     * What the file holds now; nothing where there is no file. A damaged file is reported, set aside and counts as
+     * The present content of the file; empty if there is no file. A damaged file is reported, renamed, and counts as
      * none.
      *
-     * @throws std::system_error where the file cannot be read.
+     * @throws std::system_error if the file cannot be read.
      */
     std::shared_ptr<const PowerRequests> read();
 
     /**
-     * Changes what the file holds, while nobody else can.
+     * Changes the content of the file, under its lock.
      *
-     * @param change what is to be changed. Where it throws, the file stays as it is.
-     * @return what the file holds afterwards.
-     * @throws std::system_error where the file cannot be locked, read or written, or a damaged one cannot be set aside;
-     * the file is then as it was. What `change` throws.
+     * @param change changes the content. If it throws, the file stays as it is, and update throws the same.
+     * @return the new content.
+     * @throws std::system_error if the file cannot be locked, read or written, or a damaged one cannot be renamed; the
+     * file then stays as it was.
      */
     std::shared_ptr<const PowerRequests> update(const std::function<void(PowerRequests&)>& change);
 
 private:
     struct Content {
-        /** Not set where there is no file. */
+        /** No value if there is no file. */
         std::optional<FileSignature> signature;
         std::shared_ptr<const PowerRequests> requests = std::make_shared<PowerRequests>();
-        /** Why the file cannot be used; empty where it can. `requests` is then empty. */
+        /** Why the file is damaged; empty if it is not. `requests` of a damaged file is empty. */
         std::string damage;
     };
 
@@ -83,7 +84,7 @@ private:
     const std::filesystem::path _file;
 
     std::mutex _mutex;
-    /** What was last read; guarded by _mutex. */
+    /** The content that was last read; guarded by _mutex. */
     Content _content;
 };
 

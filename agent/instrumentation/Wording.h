@@ -1,5 +1,5 @@
 /**
- * Texts for people that several backends use.
+ * Parts of texts for people, for all backends.
  */
 #ifndef INSTRUMENTATION_WORDING_H
 #define INSTRUMENTATION_WORDING_H
@@ -9,13 +9,13 @@
 
 namespace Norv::Agent {
 
-/** Seconds in the shortest exact form, whatever the process's locale: "10 s", "2.5 s". */
+/** A duration in seconds, in the shortest exact form whatever the process's locale: "10 s", "2.5 s". */
 std::string inSeconds(std::chrono::milliseconds duration);
 
-/** A time in UTC: "2026-11-20T12:31:07Z". */
+/** A time in UTC, for example "2026-11-20T12:31:07Z". */
 std::string inUtc(std::chrono::sys_seconds time);
 
-/** "9 (reboot) or 12 (shutdown)", from a table of what can be asked for. */
+/** The states of a table of transitions as text: "9 (reboot) or 12 (shutdown)". */
 std::string acceptedStates(const auto& transitions) {
     std::string text;
     for (const auto& transition : transitions) {

@@ -48,7 +48,7 @@ std::string_view localeOfEnvironment() {
     return "C";
 }
 
-// Where this library lies; links to it resolved, since they may lie elsewhere.
+// The folder of this library's file. Symbolic links to the file are resolved, since they may be in another folder.
 fs::path ownFolder() {
     Dl_info information{};
     if (dladdr(languages.data(), &information) == 0) {
@@ -79,7 +79,7 @@ ResourceLibrary readCatalogue(const fs::path& file) {
     }
 }
 
-// Without its catalogue a language has no texts; the reason is logged.
+// Loads a language's texts. If its catalogue is missing or damaged, the language has no texts; the reason is logged.
 ResourceLibrary load(std::string_view language) {
     try {
         return readCatalogue(catalogueFile(language));
@@ -102,7 +102,7 @@ const ResourceLibrary& getResourceLibrary(unsigned int number, unsigned int lang
         std::once_flag loaded;
         ResourceLibrary texts;
     };
-    // Never destroyed: users hold references until the very end of the process.
+    // Never destroyed: users hold references until the process ends.
     static auto& loadedLanguages = *std::make_unique<std::array<Language, languages.size()>>().release();
     static const auto& withoutTexts = *std::make_unique<ResourceLibrary>().release();
 

@@ -74,7 +74,7 @@ ResourceLibrary::ResourceLibrary(std::string_view content) {
     for (std::size_t index = 0; index < catalogue.size(); ++index) {
         _texts.emplace(catalogue.id(index), catalogue.text(index));
     }
-    // The text behind the empty id is the catalogue's description of itself.
+    // The text of the empty id is the catalogue's header, not a text for users.
     _texts.erase(L"");
 }
 

@@ -7,20 +7,20 @@
 
 namespace Norv {
 
-/** Texts by their ids. */
+/** The texts of one resource library in one language, by their ids. */
 class ResourceLibrary {
 public:
-    /** Has no texts. */
+    /** A library without texts. */
     ResourceLibrary() = default;
 
     /**
-     * The texts of a message catalogue: the content of a file as gettext compiles it (.mo), in UTF-8.
+     * @param content of a message catalogue that gettext has compiled (.mo), in UTF-8.
      *
-     * @throws std::runtime_error, saying what is wrong, where the catalogue is damaged.
+     * @throws std::runtime_error if the catalogue is damaged; what() says how.
      */
     explicit ResourceLibrary(std::string_view content);
 
-    /** The text behind `id`, or `id` itself where there is none. */
+    /** The text of `id`, or `id` itself if there is none. */
     const std::wstring& find(const std::wstring& id) const;
 
 private:

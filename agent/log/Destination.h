@@ -10,7 +10,7 @@
 
 namespace OrvLog {
 
-/** Where lines go. Used by several threads at a time. */
+/** A destination of log lines. Used by several threads at a time. */
 class Destination {
 public:
     Destination() = default;
@@ -18,7 +18,7 @@ public:
     Destination(const Destination&) = delete;
     Destination& operator=(const Destination&) = delete;
 
-    /** What messages call it. */
+    /** The destination's name in messages. */
     virtual std::string name() const = 0;
 
     /**
@@ -29,13 +29,15 @@ public:
     virtual int write(const Line& line) = 0;
 };
 
-/** The host's standard error. A line that it cannot take at once is lost. */
+/** The host's standard error. A line that would have to wait is lost. */
 std::unique_ptr<Destination> standardErrorDestination();
 
-/** The file and rotation of `settings`, for any number of processes and threads that write and rotate the same file. */
+/**
+ * The file of `settings`, rotated as they say. Any number of processes and threads may write and rotate the same file.
+ */
 std::unique_ptr<Destination> fileDestination(const Norv::Agent::LogSettings& settings);
 
-/** syslog(3), with the identity and the options that the host has chosen. */
+/** syslog(3), with the identity and the options that the host has set. */
 std::unique_ptr<Destination> syslogDestination();
 
 } // namespace OrvLog

@@ -33,17 +33,17 @@ Descriptor openToAppend(const std::string& path) {
     }
     Descriptor made(open(path.c_str(), flags | O_CREAT | O_EXCL, mode));
     if (made.isOpen()) {
-        // Where it stays root's, root's records are written all the same.
+        // If this fails, the file stays root's, and root's records are written all the same.
         Norv::Agent::giveToOwnerOfFolder(made, path);
     } else if (errno == EEXIST) {
-        // Somebody else has just made it, or the name is a link to a file that is missing.
+        // Another process has just made the file, or the name is a symbolic link to a file that does not exist.
         return Descriptor(open(path.c_str(), flags | O_CREAT, mode));
     }
     return made;
 }
 
-// The file is opened for each line: nothing is held that a host that closes its descriptors could take away or give to
-// somebody else, and a file that others removed or renamed is there again at once.
+// The file is opened for each line: a host that closes all of its descriptors can neither break the log nor let it
+// write into another file, and a file that was removed or renamed is made again at once.
 class FileDestination final : public Destination {
 public:
     explicit FileDestination(const Norv::Agent::LogSettings& settings)
@@ -77,28 +77,29 @@ private:
                status.st_size > 0 && static_cast<std::uint64_t>(status.st_size) + more > _rotateSize;
     }
 
-    // Who has the lock rotates; what others write meanwhile goes into the file that is being renamed, and is not lost.
+    // The process that gets the lock rotates. Lines that others write meanwhile go into the file that is being renamed,
+    // and are not lost.
     void rotate(const Descriptor& file) {
         if (flock(file.number(), LOCK_EX | LOCK_NB) != 0) {
             return;
         }
-        // Another file of this name means that somebody else has just rotated.
+        // If another file has this name now, another process has just rotated.
         struct stat opened {};
         struct stat named {};
         const bool isDue = fstat(file.number(), &opened) == 0 && stat(_path.c_str(), &named) == 0 &&
                            named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
         const int error = isDue ? shiftFiles() : 0;
-        // Closing would not do: a child that the host has just forked holds the same lock.
+        // Closing the descriptor is not enough: a child process that the host has just forked holds the same lock.
         flock(file.number(), LOCK_UN);
         if (isDue && _rotationError.exchange(error) != error && error != 0) {
             append(Line(ownRecord(_path + ": cannot be rotated, and grows: " + strerrordesc_np(error))));
         }
     }
 
-    // Returns 0 or an error number. The first failure is the end of it, or the next step would overwrite a file.
+    // Returns 0 or an error number. Stops at the first failure, since the next step would overwrite a file.
     int shiftFiles() const {
         const auto rotated = [this](unsigned int number) { return _path + '.' + std::to_string(number); };
-        // The first free number, or the last one, whose file goes.
+        // The first free number; if there is none, the last number, whose file is overwritten.
         unsigned int number = 1;
         while (number < _rotateCount && access(rotated(number).c_str(), F_OK) == 0) {
             ++number;
@@ -116,7 +117,7 @@ private:
     const std::uint64_t _rotateSize;
     const unsigned int _rotateCount;
     LineWriter _writer;
-    // Of the last rotation; it is reported when it changes.
+    // The error number of the last rotation; it is reported when it changes.
     std::atomic<int> _rotationError = 0;
 };
 

@@ -8,13 +8,13 @@
 namespace OrvLog {
 
 /**
- * Keeps threads away from a destination that hangs, such as a file on a network that is down: once a thread has been in
- * for a second and nobody has got out since, nobody else is let in until it is. The thread that writes to such a file
- * cannot give up, but no other thread has to wait with it.
+ * Keeps threads away from a destination that hangs, such as a file on a network that is down. When a thread has been
+ * writing for a second and no thread has finished since, no other thread is let in until one finishes. The thread that
+ * writes to such a file cannot give up, but no other thread has to wait with it.
  */
 class Gate {
 public:
-    /** A thread's stay. */
+    /** Lets a thread write while it exists. */
     class Pass {
     public:
         explicit Pass(Gate& gate) : _gate(&gate) {}
@@ -32,17 +32,18 @@ public:
         Gate* _gate;
     };
 
-    /** Nothing where the destination hangs. */
+    /** Lets the calling thread in. @return no value if the destination hangs. */
     std::optional<Pass> enter();
 
 private:
     void leave();
 
     /**
-     * How many threads are in, and in the upper half whose: those that were in do not come along into a child process.
+     * The number of threads inside, with the process id in the upper half: threads that are inside during a fork do not
+     * exist in the child process.
      */
     std::atomic<std::uint64_t> _inside = 0;
-    /** When a thread came in where nobody was, or got out; in milliseconds of a clock of its own. */
+    /** When a thread last entered an empty gate, or left it; in milliseconds of coarseMilliseconds(). */
     std::atomic<std::int64_t> _moved = 0;
 };
 

@@ -10,17 +10,20 @@
 namespace OrvLog {
 
 /**
- * The last operation that a thread has logged below its threshold, with the value that it was given. Where a failure
- * follows that is written, so is this, in front of it: a failure alone does not say what was asked for.
+ * The last record of an operation that a thread logged below the threshold; it has the values that the operation was
+ * called with. When a record of a failure is written later, this record is written before it, since the failure alone
+ * does not say what was requested.
  */
 class LastOperation {
 public:
-    /** That of the calling thread. */
+    /** The calling thread's object. */
     static LastOperation& ofThisThread();
 
-    /** Whether a record that is below the threshold is an operation, and so to be remembered. */
+    /** Whether a record below the threshold is one of an operation, which is remembered. */
     static bool isOne(const Record& record) { return record.kind == Kind::log && record.level >= operationLevel; }
-    /** Whether a written record is a failure that the operation explains. Records of power requests need no other. */
+    /**
+     * Whether a written record is a failure that the operation explains. Records of power requests explain themselves.
+     */
     static bool isNeededFor(const Record& record) {
         return record.kind == Kind::log && record.level >= failureLevel &&
                record.level < Norv::Agent::alwaysWrittenLevel;
@@ -28,10 +31,10 @@ public:
 
     void remember(const Record& record);
 
-    /** Nothing is remembered afterwards, or nothing of this category. */
+    /** Whether a record of this category is remembered. */
     bool hasBeen(std::string_view category) const { return _level != 0 && category == _category.view(); }
 
-    /** What is remembered; the texts are this object's. */
+    /** The record that is remembered; its texts belong to this object. */
     Record record() const;
 
     void forget() { _level = 0; }
@@ -40,7 +43,7 @@ private:
     static constexpr int operationLevel = 4000;
     static constexpr int failureLevel = 6000;
 
-    /** The beginning of a text. */
+    /** As many bytes of a text as fit. */
     template <std::size_t Capacity>
     class Beginning {
     public:
@@ -52,7 +55,7 @@ private:
         std::size_t _size = 0;
     };
 
-    /** 0 where nothing is remembered. */
+    /** The record's level; 0 if no record is remembered. */
     int _level = 0;
     int _line = 0;
     Beginning<64> _category;

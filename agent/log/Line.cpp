@@ -18,7 +18,7 @@ struct TimeText {
     std::string_view view() const { return {characters.data(), characters.size() - 1}; }
 };
 
-// Calculated here: gmtime_r takes a lock of the C library, which must not happen between a host's fork and exec.
+// Does not call gmtime_r, which takes a lock of the C library: another thread may hold it while the host forks.
 TimeText timeText(std::chrono::system_clock::time_point time) {
     const auto day = std::chrono::floor<std::chrono::days>(time);
     const std::chrono::year_month_day date{day};
@@ -66,7 +66,7 @@ Line::Line(const Record& record) : _level(record.level) {
     end();
 }
 
-// All of the piece or nothing of it and of what follows.
+// Appends the whole piece; if it does not fit, neither the piece nor anything after it.
 void Line::append(std::string_view piece) {
     _full = _full || piece.size() > _capacity - cutOff.size() - _size;
     if (!_full) {
@@ -103,7 +103,7 @@ void Line::end() {
         _text[_size++] = '\n';
         return;
     }
-    // The cut may have gone through a UTF-8 character; its pieces go, too.
+    // If the cut goes through a UTF-8 character, the character's other bytes are removed, too.
     while ((static_cast<unsigned char>(_text[_size - 1]) & 0xc0) == 0x80) {
         --_size;
     }

@@ -10,18 +10,18 @@
 namespace OrvLog {
 
 /**
- * A record as one line: time, kind, level, category, function, file:line and text. Control characters are escaped, and
- * what is longer than a pipe takes in one piece is cut off and ends in three dots.
+ * A record as one line: time, kind, level, category, function, file:line and text. Control characters are escaped. A
+ * line that is longer than a pipe takes at once (PIPE_BUF) is cut off and ends in three dots.
  */
 class Line {
 public:
-    /** The line of a record that happens now. */
+    /** Formats a record; its time is the present one. */
     explicit Line(const Record& record);
 
     /** The line with the line feed at its end. */
     std::string_view whole() const { return {_text.data(), _size}; }
 
-    /** The line from the kind on, for destinations that note the time themselves. */
+    /** The line without its time and line feed, for destinations that add the time themselves. */
     std::string_view withoutTime() const { return whole().substr(_timeSize, _size - _timeSize - 1); }
 
     int level() const { return _level; }

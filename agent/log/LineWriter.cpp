@@ -14,7 +14,7 @@ namespace OrvLog {
 
 namespace {
 
-// Keeps the signals that a failing write(2) raises away from the host, for which they could be the end.
+// Keeps the signals that a failing write(2) raises away from the host, which they could terminate.
 class WithoutWriteSignals {
 public:
     WithoutWriteSignals() {
@@ -22,7 +22,7 @@ public:
         sigaddset(&_signals, SIGPIPE);
         sigaddset(&_signals, SIGXFSZ);
         pthread_sigmask(SIG_BLOCK, &_signals, &_before);
-        // A signal that the host does not block cannot be pending.
+        // Only a signal that the host blocks can be pending.
         sigemptyset(&_pendingBefore);
         if (sigismember(&_before, SIGPIPE) != 0 || sigismember(&_before, SIGXFSZ) != 0) {
             sigpending(&_pendingBefore);
@@ -34,7 +34,10 @@ public:
     WithoutWriteSignals(const WithoutWriteSignals&) = delete;
     WithoutWriteSignals& operator=(const WithoutWriteSignals&) = delete;
 
-    /** Takes back the signal that a write of this thread has just raised; not one that the host is waiting for. */
+    /**
+     * Removes the pending signal that this thread's write has just raised, unless it was pending before: then the host
+     * expects it.
+     */
     void takeBack(int signal) const {
         if (sigismember(&_pendingBefore, signal) == 0) {
             sigset_t raised;
@@ -52,7 +55,7 @@ private:
 };
 
 iovec piece(std::string_view text) {
-    // writev(2) reads only, but takes what readv(2) takes, too.
+    // writev(2) does not change the text, but shares its argument type with readv(2).
     return {.iov_base = const_cast<char*>(text.data()), .iov_len = text.size()};
 }
 

@@ -11,15 +11,15 @@ namespace OrvLog {
 class LineWriter {
 public:
     /**
-     * Writes a line. No signal is raised: a reader that is gone and a size limit that is reached are errors like
-     * others.
+     * Writes a line. No signal is raised if the reader is gone (EPIPE) or the limit for file sizes is reached (EFBIG):
+     * these are errors like others.
      *
      * @return 0, or the error number that says why the line is lost.
      */
     int write(int descriptor, const Line& line);
 
 private:
-    /** The last line was written in part only, so that the next one begins on a line of its own. */
+    /** Whether the last line was written only in part; then the next one begins with a line feed. */
     std::atomic<bool> _torn = false;
 };
 

@@ -15,7 +15,7 @@ namespace OrvLog {
 
 namespace {
 
-// Collects streamed text. A text is handed over by swapping two strings, so that both keep their memory.
+// Collects streamed text. Handing a text over swaps two strings, so that both keep their memory.
 class Texts final : public std::streambuf {
 public:
     const std::string& handOver() {
@@ -46,12 +46,12 @@ private:
     std::string _handedOver;
 };
 
-// Objects that wait for their next user. A record needs its buffer for a moment only, so there are as many as threads
-// that log at the same time. There is no lock that a host could hold while it forks.
+// Objects that are kept for their next user. A record needs its buffer only for a moment, so the pool holds about as
+// many objects as threads log at the same time. It has no lock, which another thread could hold while the host forks.
 template <typename T>
 class Pool {
 public:
-    /** Nothing where none waits. */
+    /** Takes an object out of the pool; null if the pool is empty. */
     std::unique_ptr<T> take() {
         for (auto& place : _places) {
             if (place.load(std::memory_order_relaxed) != nullptr) {
@@ -108,7 +108,7 @@ public:
     }
 
 private:
-    // As good as new: nothing stays that the former user set, and the host program's global locale is not taken over.
+    // Resets everything that the former user has set, and any locale taken over from the host program's global one.
     void renew() {
         rdbuf(&_texts);
         exceptions(goodbit);

@@ -5,7 +5,7 @@
 
 namespace OrvLog {
 
-/** Hands a record to the observer of the process, where there is one that wants it: see OrvLog/Observer.h. */
+/** Calls the process's observer with a record, if there is one and the level is high enough: see OrvLog/Observer.h. */
 void showToObserver(const Record& record);
 
 } // namespace OrvLog

@@ -15,7 +15,7 @@ public:
     std::string name() const override { return "standard error"; }
 
     int write(const Line& line) override {
-        // Whether a write waits is a property of the open file, which is not the log's to change.
+        // O_NONBLOCK would change the open file for all processes that share it, so the log asks before it writes.
         pollfd standardError{.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
         if (poll(&standardError, 1, 0) == 0) {
             return EAGAIN;

@@ -11,7 +11,7 @@
 
 namespace OrvLog {
 
-/** Which records are written. Asked for every record, most of which are not. */
+/** Decides which records are written. This is asked for every record, and most are not written. */
 class Thresholds {
 public:
     explicit Thresholds(const Norv::Agent::LogSettings& settings);
@@ -36,9 +36,9 @@ private:
     };
 
     Levels _general;
-    /** No category has a lower threshold: what is below needs no look at its category. */
+    /** The lowest of all thresholds: a record below it is dropped without a look at its category. */
     Levels _lowest;
-    /** Longest prefix first. */
+    /** Categories with thresholds of their own, the longest prefix first. */
     std::vector<Category> _categories;
 };
 

@@ -11,7 +11,7 @@
 
 namespace Norv {
 
-/** Why a record could not be filled. Owns its text. */
+/** The reason why a record could not be filled. The exception owns its text. */
 class ProviderException : public std::exception {
 public:
     explicit ProviderException(const char* message) : _message(message) {}
@@ -28,7 +28,7 @@ namespace PowerStateManagementServiceProvider {
  * One power-managed element: its names and its power state (CIM_PowerManagementService and
  * CIM_PowerManagementCapabilities, DMTF DSP1027). A plain value: copies share nothing.
  *
- * A setter of a text stores its argument and returns whether that is not empty.
+ * A setter of a text stores its argument, and returns whether the argument is not empty.
  */
 class PowerStateManagement {
 public:
@@ -40,15 +40,14 @@ public:
     /**
      * Stores the power state.
      *
-     * @param powerState the state as the instrumentation tree counts it: 1 running, 8 hibernating, 10 off. The record
-     *                   keeps the code of CIM_AssociatedPowerManagementService.PowerState: 2 (On), 7 (Hibernate),
-     *                   12 (Off - Soft Graceful), and 1 (Other) for everything else.
+     * @param powerState the state by its number in the instrumentation tree: 1 running, 8 hibernating, 10 off. The
+     *                   record stores the value of CIM_AssociatedPowerManagementService.PowerState for it: 2 (On), 7
+     *                   (Hibernate (Off - Soft)), 12 (Off - Soft Graceful), or 1 (Other) for every other number.
      * @return true.
      */
     bool setPowerState(unsigned int powerState);
 
-    /** The lists that a record advertises are fixed, whatever the tree offers: both ignore the argument, return true.
-     */
+    /** The lists of a record are fixed, whatever the tree has: both functions ignore their argument and return true. */
     bool setPowerChangeCapabilities(std::vector<unsigned int> codes);
     bool setPowerStatesSupported(std::vector<unsigned int> codes);
 
@@ -57,10 +56,10 @@ public:
     std::string getInstanceID();
     std::string getCapabilitiesElementName();
 
-    /** 0 where no power state was stored. */
+    /** The stored power state; 0 if none was stored. */
     unsigned short getPowerState();
 
-    /** Always 12, which is Not Applicable as a requested power state (DSP1027); it is stored as well. */
+    /** Stores and returns 12, which means "Not Applicable" as a requested power state (DSP1027). */
     unsigned short getRequestedPowerState();
 
     /**
@@ -83,18 +82,18 @@ private:
     unsigned short _requestedPowerState = 0;
 };
 
-/** Records by the text that names them to clients. */
+/** Records by their name or instance ID, under which clients know them. */
 using Records = std::map<std::string, PowerStateManagement>;
 
 /**
  * Reads the power-management nodes of the instrumentation tree.
  *
- * @param[in,out] instances receives a record for each node; what it holds already stays, unless a node has the same
- * key.
- * @param keyProperty "Name" or an empty text keys the records by name, "InstanceID" by instance ID; with any other text
- *                    no record is stored.
- * @return 0 when the whole tree was read; 1 when it has no power-management node, or when reading it failed: then the
- *         reason is written to standard error, and the records of the nodes before are in the map.
+ * @param[in,out] instances receives a record for each node. Records that it already holds stay, unless a node has the
+ * same key.
+ * @param keyProperty "Name" or an empty text: the key of a record is its name; "InstanceID": its instance ID. With any
+ *                    other text, no record is stored.
+ * @return 0 if the whole tree was read; 1 if it has no power-management node or reading it failed. In the latter case,
+ *         the reason is written to standard error, and the map has the records of the nodes before the failure.
  */
 unsigned short getPowerStateManagementInstances(Records& instances, std::string keyProperty);
 

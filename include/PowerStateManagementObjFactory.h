@@ -1,5 +1,5 @@
 /**
- * Object paths and instances of the power-managed elements.
+ * Makes object paths and instances of the power-managed elements.
  */
 #ifndef POWERSTATEMANAGEMENTOBJFACTORY_H
 #define POWERSTATEMANAGEMENTOBJFACTORY_H
@@ -24,31 +24,31 @@ constexpr const char* powerManagementHostedServiceClass = "TALVO_PowerManagement
 /**
  * The power-managed elements at the time of one request, and the CMPI objects that stand for them.
  *
- * A provider builds one for each request and drops it when the request ends: nothing is cached in between.
+ * A provider makes a factory for each request and destroys it at the end of the request: nothing is cached in between.
  *
- * The operations make their objects through `broker`, in the namespace of the path `ref` that the request came with and
- * with the managed system's name as host. The objects belong to the object manager's request. Vectors are appended to,
- * never cleared. The status, which may be null, is handed to the broker's calls and never written here. Nothing throws
- * but for lack of memory, or where the broker or the agent does.
+ * The operations make their objects through `broker`, in the namespace of the request's path `ref`, with the managed
+ * system's name as host. The objects belong to the object manager's request. The operations append to vectors and never
+ * clear them. They pass the status, which may be null, to calls of the broker, and never write it themselves. They
+ * throw only if memory is short, or if the broker or the agent throws.
  *
- * `properties` is the request's property list: names ended by a null, compared with regard to letter case; null asks
- * for all properties. Key properties are always set.
+ * `properties` is the request's property list: an array of names that ends with a null; letter case matters. Null
+ * stands for all properties. Key properties are always set.
  */
 class PowerStateManagementObjFactory {
 public:
-    /** What an operation reports. */
+    /** What an operation returns. */
     enum Result : unsigned short {
         done = 0,
-        /** There is no element, or none under the key. */
+        /** There is no element, or none with the key. */
         nothingFound = 1,
         pathCreationFailed = 2,
     };
 
     /**
-     * Reads the instrumentation tree. A failure is logged, not thrown: then the factory has the elements that were read
-     * until then.
+     * Reads the instrumentation tree. A failure is logged, not thrown: the factory then has the elements that were read
+     * before it.
      *
-     * @param keyProperty the property that the elements are ordered by and looked up with: "Name" or "InstanceID".
+     * @param keyProperty the property by which the elements are ordered and looked up: "Name" or "InstanceID".
      */
     explicit PowerStateManagementObjFactory(std::string keyProperty);
 
@@ -61,22 +61,22 @@ public:
     unsigned short getAllPMCMPIObjPaths(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                         std::vector<CMPIObjectPath*>& objectPaths, CMPIStatus* status);
 
-    /** Appends the path of each capabilities object; as `getAllPMCMPIObjPaths`. */
+    /** Appends the path of each capabilities object; returns the same as `getAllPMCMPIObjPaths`. */
     unsigned short getAllPMCapCMPIObjPaths(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                            std::vector<CMPIObjectPath*>& objectPaths, CMPIStatus* status);
 
     /**
      * Appends the instance of each service.
      *
-     * @param isObjPath true where the instances are wanted for their paths: without a property list they have their
-     *                  keys only, and no filter is set on them.
-     * @return done, or nothingFound. An instance that cannot be made is appended as the broker returned it, perhaps
-     * null.
+     * @param isObjPath true if the caller needs only the paths of the instances: without a property list, the instances
+     *                  then have their keys only, and no property filter.
+     * @return done or nothingFound. For an instance that cannot be made, whatever the broker returned is appended,
+     * possibly null.
      */
     unsigned short getAllPMCMPIInstances(const CMPIBroker* broker, const CMPIObjectPath* ref, char const** properties,
                                          bool isObjPath, std::vector<CMPIInstance*>& instances, CMPIStatus* rc);
 
-    /** As `getAllPMCMPIInstances`, for capabilities objects; returns done where there is none, too. */
+    /** The same as `getAllPMCMPIInstances` for capabilities objects, but returns done if there are none, too. */
     unsigned short getAllPMCapCMPIInstances(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                             char const** properties, bool isObjPath,
                                             std::vector<CMPIInstance*>& instances, CMPIStatus* rc);
@@ -91,29 +91,29 @@ public:
                                            char const** properties, std::vector<CMPIInstance*>& instances,
                                            CMPIStatus* rc);
 
-    /** The instance of TALVO_PowerManagementService for an element; null where its path cannot be made. */
+    /** Makes the instance of TALVO_PowerManagementService for an element; null if its path cannot be made. */
     CMPIInstance* makePMInstance(const CMPIBroker* broker, const CMPIObjectPath* ref, PowerStateManagement pm,
                                  char const** properties, bool isObjPath, CMPIStatus* rc);
 
-    /** The instance of TALVO_PowerManagementCapabilities for an element; null where its path cannot be made. */
+    /** Makes the instance of TALVO_PowerManagementCapabilities for an element; null if its path cannot be made. */
     CMPIInstance* makePMCapInstance(const CMPIBroker* broker, const CMPIObjectPath* ref, PowerStateManagement pm,
                                     char const** properties, bool isObjPath, CMPIStatus* rc);
 
     /**
-     * The class at the far end of an association.
+     * Finds the class at the far end of an association.
      *
      * Class names are compared exactly, never by inheritance.
      *
-     * @param ref the source, of which only the class name counts.
+     * @param ref the source; only its class name matters.
      * @param refLeftClass the association's class; null matches no association.
-     * @param refRightClass the request's result class, which is reported but decides nothing. May be null.
-     * @return one of the class names above, or an empty text where the association does not link the source's class;
-     * not to be freed.
+     * @param refRightClass the request's result class, which is logged and has no other effect. May be null.
+     * @return one of the class names above, or an empty text if the association does not link the source's class. The
+     * caller must not free it.
      */
     const char* get_assoc_targetClass_Name(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                            const char* refLeftClass, const char* refRightClass, CMPIStatus* rc);
 
-    /** The path of that class, without keys; null where there is none or the broker cannot make it. */
+    /** Makes a path of that class, without keys; null if there is no such class or the broker cannot make the path. */
     CMPIObjectPath* get_assoc_targetClass_ObjectPath(const CMPIBroker* broker, const CMPIObjectPath* ref,
                                                      const char* refLeftClass, const char* refRightClass,
                                                      CMPIStatus* rc);

@@ -1,9 +1,8 @@
 /**
- * What the provider library reports about itself: fixed line shapes, and records that go to the agent's log and to its
- * trace.
+ * The provider library's log: fixed formats of lines, and records that go to the agent's log and to its trace.
  *
- * Every record is written twice with the same arguments, first as a log record and then as a trace record. Log files
- * are read by tools: the texts, and the line numbers of the markers, never change.
+ * Every record is written twice with the same arguments, first as a log record and then as a trace record. Tools read
+ * the log files: the texts, and the line numbers of the markers, must never change.
  */
 #ifndef TRACE_H
 #define TRACE_H
@@ -23,48 +22,50 @@ namespace Norv {
 
 /** The kind of a line. The numbers are fixed. */
 enum MessageType : int {
-    /** A function was entered. */
+    /** The function was entered. */
     ENTERING = 0,
-    /** A function is about to return. */
+    /** The function is about to return. */
     EXITING = 1,
-    /** A method was invoked. */
+    /** The method was invoked. */
     METHOD = 2,
     /** Free text. */
     MESSAGE = 3,
 };
 
-/** Levels of records: the higher, the more important. */
+/** Levels of records; a higher level is more important. */
 inline constexpr int progressLevel = 3000;
 inline constexpr int operationLevel = 4000;
 inline constexpr int failureLevel = 6000;
 
-/** A place in the source that reports something. */
+/** The place in the source that a record names. */
 struct Site {
     /** The function's own name, without scope and arguments. */
     const char* function;
-    /** The source file as the build knows it. */
+    /** The path of the source file in the build. */
     const char* file;
     unsigned int line;
 
-    /** The place of the call; as a default argument, the place of the call that leaves it out. */
+    /**
+     * The place of the call of `here`; in a default argument, that is the place of the call that omits the argument.
+     */
     static constexpr Site here(const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
                                unsigned int line = __builtin_LINE()) {
         return Site{function, file, line};
     }
 
-    /** The same function and file at the line of the call: for what a function reports through a helper of its own. */
+    /** The same function and file with the line of this call, for a helper that reports on behalf of that function. */
     constexpr Site atLine(unsigned int currentLine = __builtin_LINE()) const {
         return Site{function, file, currentLine};
     }
 };
 
-/** Size in bytes of each helper's text buffer; longer texts are cut. */
+/** The size of each helper's text buffer in bytes; longer texts are cut off. */
 inline constexpr std::size_t messageBufferSize = 512;
 
-/** What a message is put together from: a text or a number. */
+/** A part of a message: a text or a number. */
 class MessagePart {
 public:
-    /** A null text reads "(null)". */
+    /** A null text becomes "(null)". */
     MessagePart(const char* text) : _text(text != nullptr ? text : "(null)") {}
     MessagePart(int number)
         : _text(_digits.data(), std::to_chars(_digits.data(), _digits.data() + _digits.size(), number).ptr) {}
@@ -79,7 +80,9 @@ private:
     std::string_view _text;
 };
 
-/** Clears the buffer, puts the parts into it one behind the other, cutting what is too long, and returns it. */
+/**
+ * Clears the buffer, writes the parts into it one after another, cuts off what does not fit, and returns the buffer.
+ */
 inline char* formatMessage(char (&buffer)[messageBufferSize], std::initializer_list<MessagePart> parts) {
     std::memset(buffer, 0, sizeof buffer);
     std::size_t size = 0;
@@ -90,12 +93,13 @@ inline char* formatMessage(char (&buffer)[messageBufferSize], std::initializer_l
 }
 
 /**
- * A line about a function or a free text.
+ * Formats a line about a function, or a free text.
  *
- * Each of the four formatting helpers has one buffer per thread, which its next call in that thread overwrites.
+ * Each of the four formatting helpers has one buffer per thread. The helper's next call in the same thread overwrites
+ * it.
  *
- * @param text the function's name, or the free text where the type is MESSAGE.
- * @param type any other value than the four gives the shape of ENTERING.
+ * @param text the function's name, or the free text if the type is MESSAGE.
+ * @param type a MessageType; any other value formats the line as ENTERING does.
  * @return the line in the helper's buffer.
  */
 inline char* trace(const char* text, const char* file, unsigned int line, MessageType type) {
@@ -115,7 +119,7 @@ inline char* trace(const char* text, const char* file, unsigned int line, Messag
     }
 }
 
-/** As `trace`, with the function's parameters behind the line: labels and values in one text. */
+/** Formats the same line, followed by the function's parameters: labels and values in one text. */
 inline char* tracepara(const char* text, const char* file, unsigned int line, const char* parameters,
                        MessageType type) {
     static thread_local char messageBuffer[messageBufferSize];
@@ -138,14 +142,14 @@ inline char* tracepara(const char* text, const char* file, unsigned int line, co
     }
 }
 
-/** A line about a variable that holds a text. */
+/** Formats a line about a variable that holds a text. */
 inline char* trace(const char* variable, const char* file, unsigned int line, const char* value) {
     static thread_local char messageBuffer[messageBufferSize];
     return formatMessage(messageBuffer, {"VARIABLE: '", variable, "' has Value '", value, "' at line ",
                                          static_cast<int>(line), " in ", file});
 }
 
-/** A line about a variable that holds a number. */
+/** Formats a line about a variable that holds a number. */
 inline char* trace(const char* variable, const char* file, unsigned int line, unsigned int value) {
     static thread_local char messageBuffer[messageBufferSize];
     return formatMessage(messageBuffer, {"VARIABLE: '", variable, "' has Value '", static_cast<int>(value),
@@ -155,8 +159,9 @@ inline char* trace(const char* variable, const char* file, unsigned int line, un
 /**
  * Writes one record, to the log and then to the trace.
  *
- * @param category the reporting file's category.
- * @param text gives the record's text; called once for each of the two, since the helpers' buffers are shared.
+ * @param category the category of the file that reports.
+ * @param text returns the record's text. It is called once for the log and once for the trace, since the helpers'
+ * buffers are shared.
  */
 template <typename Text>
 void writeRecord(const std::string& category, int level, const Site& site, Text text) {
@@ -168,7 +173,7 @@ void writeRecord(const std::string& category, int level, const Site& site, Text 
                                          OrvLog::OrvMessageBuffer::str(buffer << text()));
 }
 
-/** The line that sets one operation of a provider off from the next. */
+/** The line that separates one operation of a provider from the next. */
 inline constexpr const char* separatorLine =
     "==============================================================================";
 
@@ -176,7 +181,7 @@ inline constexpr const char* separatorLine =
  * Marks the beginning of a provider's operation.
  *
  * @param logger the category of the provider's file.
- * @param function,file,line the operation, and where it begins.
+ * @param function,file,line the operation, and the place where it begins.
  */
 inline void markProviderEntry(const std::string& logger, const char* function, const char* file, unsigned int line) {
     writeRecord(logger, operationLevel, Site{"markProviderEntry", __FILE__, 336}, [] { return separatorLine; });

@@ -1,5 +1,5 @@
 /**
- * TALVO_AssociatedPowerManagementService: ties each computer system to each service that manages its power, with the
+ * TALVO_AssociatedPowerManagementService: links each computer system to each service that manages its power, with the
  * current and the requested power state (CIM_AssociatedPowerManagementService, DMTF DSP1027).
  */
 #include "AssociationOperations.h"

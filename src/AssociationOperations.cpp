@@ -11,11 +11,11 @@ namespace Norv::PowerStateManagementServiceProvider {
 
 namespace {
 
-/** The keys by which services and capabilities are had from a factory. */
+/** The key properties with which factories of services and of capabilities are made. */
 constexpr const char* srcKey = "Name";
 constexpr const char* targetKey = "InstanceID";
 
-/** The records that power states are taken from: one copy for a whole operation. */
+/** The records that provide the power states: one copy for a whole operation. */
 Records recordsFor(PowerStates powerStates, PowerStateManagementObjFactory& factory) {
     return powerStates == PowerStates::none ? Records() : factory.getPowerStateManagementMap();
 }
@@ -31,7 +31,7 @@ void setPowerStates(const CMPIInstance* association, PowerStateManagement& recor
     setProperty(association, "RequestedPowerState", record.getRequestedPowerState());
 }
 
-/** Whether two names of classes are the same: letter case is ignored, whatever the process's locale. */
+/** Whether two class names are equal. The case of ASCII letters is ignored, whatever the process's locale. */
 bool isSameName(const char* left, const char* right) {
     const auto lower = [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; };
     while (*left != '\0' && lower(*left) == lower(*right)) {
@@ -41,32 +41,32 @@ bool isSameName(const char* left, const char* right) {
     return lower(*left) == lower(*right);
 }
 
-/** Whether a request that may name a result class asks for this end. */
+/** Whether a request with this result class, which may be null, asks for objects of this end. */
 bool isResultClass(const AssociationEnd& end, const char* resultClass) {
     return end.resultClassAlias == nullptr || resultClass == nullptr || isSameName(resultClass, end.className) ||
            isSameName(resultClass, end.resultClassAlias);
 }
 
-/** One request to the provider of an association, from the frame that all its operations have in common. */
+/** One request to the provider of an association: the steps that its operations have in common. */
 class AssociationRequest {
 public:
-    /** `ref` is the path that the request came with: the class of an enumeration, or the source of a traversal. */
+    /** @param ref the request's path: the class of an enumeration, or the source of a traversal. */
     AssociationRequest(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                        const CMPIObjectPath* ref, const Site& site)
         : operation(provider.category, site), factory(srcKey), _provider(provider), _broker(broker), _context(context),
           _ref(ref) {}
 
     Operation operation;
-    /** The services. */
+    /** Makes the objects of services. */
     PowerStateManagementObjFactory factory;
 
     /** The namespace of the request. */
     const char* nameSpace() { return textOf(CMGetNameSpace(_ref, &operation.status)); }
 
     /**
-     * Visits the pairs of object paths, one of each end, until a visit fails.
+     * Visits the pairs of object paths, one path of each end, until a visit fails.
      *
-     * @return whether none did, and no step: a failed step has been reported.
+     * @return whether all visits and all steps in between succeeded. A failed step has been reported.
      */
     template <typename Visit>
     bool forEachPair(const PairTexts& texts, Visit visit) {
@@ -76,27 +76,30 @@ public:
         });
     }
 
-    /** A path of the association without keys; null, which is reported, where the broker cannot make it. */
+    /** Makes a path of the association without keys. If the broker cannot make it, reports that and returns null. */
     CMPIObjectPath* newAssociationPath(const PairTexts& texts) {
         CMPIObjectPath* const path = newClassPath(_broker, nameSpace(), _provider.className, &operation.status);
         isUsable(path, texts.associationPathFailed);
         return path;
     }
 
-    /** Finds the far end of a traversal; false where the association does not link the class of the source. */
+    /** Finds the far end of a traversal. @return false if the association does not link the class of the source. */
     bool resolve(const char* assocClass, const char* resultClass) {
         _target = factory.get_assoc_targetClass_ObjectPath(_broker, _ref, assocClass, resultClass, &operation.status);
         return !isNull(_target);
     }
 
-    /** Finds the far end of a reference. The association is always this provider's own, whatever is asked for. */
+    /**
+     * Finds the far end of a reference. The association is always this provider's own, whichever class the request
+     * names.
+     */
     bool resolveReference() {
         const bool resolved = resolve(_provider.className, nullptr);
         _referencePath = CMNewObjectPath(_broker, nameSpace(), _provider.className, &operation.status);
         return resolved;
     }
 
-    /** The far end, once it is resolved; null where it is none of this association's. */
+    /** The far end after it was resolved; null if its class is at neither end of this association. */
     const AssociationEnd* farEnd() {
         const char* const className = textOf(CMGetClassName(_target, &operation.status));
         if (isText(className, _provider.first.className)) {
@@ -105,7 +108,10 @@ public:
         return isText(className, _provider.second.className) ? &_provider.second : nullptr;
     }
 
-    /** Visits the path of each object at the far end; false, with `notAvailable` reported, where they cannot be had. */
+    /**
+     * Visits the path of each object at the far end. If the objects are not available, reports `notAvailable` and
+     * returns false.
+     */
     template <typename Visit>
     bool forEachFarPath(const AssociationEnd& end, const char* notAvailable, Visit visit) {
         return forEachPath(end, _target, notAvailable, [&](CMPIObjectPath* path) {
@@ -114,7 +120,7 @@ public:
         });
     }
 
-    /** As `forEachFarPath`, for instances; another provider's come with all their properties. */
+    /** The same for instances. Those of another provider have all their properties. */
     template <typename Visit>
     bool forEachFarInstance(const AssociationEnd& end, char const** properties, bool keysOnly, const char* notAvailable,
                             Visit visit) {
@@ -139,19 +145,19 @@ public:
             visitOne);
     }
 
-    /** An association of the far end's class without properties; null where the broker cannot make it. */
+    /** Makes an instance of the association, without properties; null if the broker cannot make it. */
     const CMPIInstance* newReference() {
         const CMPIInstance* const reference = CMNewInstance(_broker, _referencePath, &operation.status);
         return isNull(reference) ? nullptr : reference;
     }
 
-    /** Makes an association refer to the source and to an object at the far end. */
+    /** Sets the references of an association to the source and to an object at the far end. */
     void setReferenceEnds(const CMPIInstance* reference, const AssociationEnd& end, const CMPIObjectPath* far) const {
         const bool farIsFirst = &end == &_provider.first;
         setEnds(_provider, reference, farIsFirst ? far : _ref, farIsFirst ? _ref : far);
     }
 
-    /** Puts a path into the namespace of the request and on the managed system. */
+    /** Sets the namespace of a path to the request's, and its host name to the managed system's. */
     void place(CMPIObjectPath* path) {
         CMSetNameSpace(path, nameSpace());
         CMSetHostname(path, getSystemName().c_str());
@@ -167,9 +173,9 @@ private:
     }
 
     /**
-     * Visits the paths of an end for an enumeration, those of this library's classes in the request's namespace.
+     * Visits the paths of an end for an enumeration. Paths of this library's classes get the request's namespace.
      *
-     * @param outer the path that the walk stands on at the first end; null for the first end itself.
+     * @param outer the current path at the first end, if `end` is the second one; else null.
      */
     template <typename Visit>
     bool forEachPathOf(const AssociationEnd& end, const CMPIObjectPath* outer, const PairTexts& texts, Visit visit) {
@@ -182,7 +188,7 @@ private:
         const bool areServices = end.source == ObjectSource::services;
         const char* const notAvailable = areServices ? texts.servicesNotAvailable : texts.capabilitiesNotAvailable;
         return forEachPath(end, _ref, notAvailable, [&](CMPIObjectPath* path) {
-            // Before a capabilities object's path, it is the service's path that is tested once more.
+            // For a path of capabilities, the service's path is checked once more, and not this path.
             if (!(areServices ? isUsable(path, texts.servicePathNull) : isUsable(outer, texts.capabilitiesPathNull))) {
                 return false;
             }
@@ -191,7 +197,10 @@ private:
         });
     }
 
-    /** Visits the paths of an end, made after `classPath`, until a visit returns false; whether none did. */
+    /**
+     * Visits the paths of an end, which are made after `classPath`, until a visit returns false. @return whether no
+     * visit did.
+     */
     template <typename Visit>
     bool forEachPath(const AssociationEnd& end, const CMPIObjectPath* classPath, const char* notAvailable,
                      Visit visit) {
@@ -211,7 +220,9 @@ private:
             visit);
     }
 
-    /** Visits what an up-call returned. An enumeration or an object that the object manager left out is skipped. */
+    /**
+     * Visits the objects that an up-call returned. A null enumeration counts as empty, and null objects are skipped.
+     */
     template <typename Get, typename Visit>
     bool forEachEnumerated(const CMPIEnumeration* enumeration, const char* notAvailable, Get get, Visit visit) {
         if (operation.status.rc != CMPI_RC_OK) {
@@ -230,7 +241,7 @@ private:
         return true;
     }
 
-    /** Visits what the factory of an end makes. */
+    /** Visits the objects that the factory of an end makes. */
     template <typename Object, typename Make, typename Visit>
     bool forEachMade(const AssociationEnd& end, const char* notAvailable, Make make, Visit visit) {
         std::vector<Object*> objects;
@@ -260,7 +271,7 @@ private:
     const CMPIObjectPath* _referencePath = nullptr;
 };
 
-/** The association class that a request asks for: where it names none, the provider's own. */
+/** The association class that a request asks for; the provider's own if the request names none. */
 const char* requestedClass(const AssociationProvider& provider, const char* assocClass) {
     return assocClass == nullptr ? provider.className : assocClass;
 }
@@ -426,7 +437,7 @@ CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker*
 
 namespace {
 
-/** Sets the properties of a reference; false where it is not to be returned. */
+/** Sets the properties of a reference. @return false if the reference must not be returned. */
 bool fillReference(const AssociationRequest& request, const CMPIInstance* reference, const AssociationEnd& end,
                    const CMPIObjectPath* far, Records& records) {
     if (end.inReferences == PowerStates::everyRecord) {

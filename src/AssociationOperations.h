@@ -17,23 +17,26 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
-/** Where the objects at one end of an association come from. */
+/** The source of the objects at one end of an association. */
 enum class ObjectSource {
-    /** From another provider, through the object manager. */
+    /** Another provider, which is asked through the object manager. */
     objectManager,
     services,
     capabilities,
 };
 
-/** The records whose power states an association carries; the choices differ where there are several records. */
+/** The record whose power states an association has. The choices differ only if there are several records. */
 enum class PowerStates {
     none,
     firstRecord,
-    /** Every record's in turn, so that the last one's stay; without records, there is no association. */
+    /**
+     * The states of each record are set in turn, so those of the last one stay. Without records, there is no
+     * association.
+     */
     everyRecord,
 };
 
-/** A text for each of the association operations. */
+/** One text for each of the association operations. */
 struct AssociationTexts {
     const char* associatorNames;
     const char* associators;
@@ -47,22 +50,22 @@ struct AssociationEnd {
     /** The association's property that refers to this end. */
     const char* role;
     ObjectSource source;
-    /** The text reported where this end is the far one and its objects cannot be had. */
+    /** The texts that are reported if this end is the far one and its objects are not available. */
     AssociationTexts notAvailable;
     /** Whether AssociatorNames sets the namespace and the host name of this end's paths. */
     bool placedByAssociatorNames = false;
-    /** The second class name that a client's result class may have; null where result classes are not looked at. */
+    /** Another class name that clients may use as result class for this end; null if result classes are ignored. */
     const char* resultClassAlias = nullptr;
-    /** What References puts into an association whose far end is this one. */
+    /** The power states that References sets in an association whose far end is this one. */
     PowerStates inReferences = PowerStates::none;
 };
 
-/** The texts reported where the walk over an association's pairs fails. */
+/** The texts that are reported if the walk over an association's pairs fails. */
 struct PairTexts {
     const char* servicesNotAvailable;
     const char* servicePathNull;
     const char* associationPathFailed;
-    /* Null where neither end is a capabilities object. */
+    /* Null if neither end is a capabilities object. */
     const char* capabilitiesNotAvailable = nullptr;
     const char* capabilitiesPathNull = nullptr;
 };
@@ -70,41 +73,47 @@ struct PairTexts {
 /**
  * Appends an association's instances for a request.
  *
- * @param context where the objects of other providers are asked for.
+ * @param context for the up-calls to other providers.
  * @return CMPI_RC_OK or CMPI_RC_ERR_FAILED.
  */
 using AssociationBuilder = unsigned short (*)(const CMPIObjectPath* ref, char const** properties,
                                               const CMPIContext* context, std::vector<CMPIInstance*>& instances);
 
-/** What distinguishes the provider of one association from those of the others. */
+/** What is particular to the provider of one association. */
 struct AssociationProvider {
     const std::string& category;
     const char* className;
-    /** A function of the provider's own file, since its records name it; calls `buildAssociations`. */
+    /**
+     * Calls `buildAssociations`. It is a function of the provider's own file, since log records name the function and
+     * file.
+     */
     AssociationBuilder build;
-    /** Pairs are walked with the first end outside and the second inside; properties are set in the same order. */
+    /**
+     * The two ends. The outer loop over pairs walks the first end, the inner loop the second; their properties are set
+     * in this order.
+     */
     AssociationEnd first;
     AssociationEnd second;
-    /** The names that an instance's property filter is told to spare, ended by a null. */
+    /** The key names that are given to an instance's property filter; the array ends with a null. */
     const char** filterKeys;
     PairTexts instances;
     PairTexts names;
-    /** The texts reported where the association does not link the class of the source. */
+    /** The texts that are reported if the association does not link the class of the source. */
     AssociationTexts targetNull;
-    /** What an enumerated instance carries. */
+    /** The power states that an enumerated instance has. */
     PowerStates inInstances = PowerStates::none;
-    /** What EnumInstanceNames does, besides reporting, where the association's path cannot be made; may be null. */
+    /** Called by EnumInstanceNames, after its report, if the association's path cannot be made; may be null. */
     void (*onNamesPathFailed)(const CMPIBroker* broker, CMPIStatus* status) = nullptr;
-    /** Whether EnumInstanceNames closes its result before it marks its exit, or after. */
+    /** Whether EnumInstanceNames closes its result before it marks its exit; else it does so afterwards. */
     bool namesCloseBeforeExit = false;
     /**
-     * Whether References has the instances at the far end, of which only the paths count, always built with keys
-     * alone; otherwise they are where the client names properties.
+     * References needs only the paths of the instances at the far end. True: these instances always have their keys
+     * only; false: only if the client names properties.
      */
     bool referencesOfKeysOnly = false;
 };
 
-/* What several of the associations report alike. */
+/* Texts that several of the associations report. */
 inline constexpr const char* servicePathNull = "CMPIObjectPath is NULL for Power Management Service";
 inline constexpr const char* computerSystemsNotAvailable = "CBEnumInstanceNames Failed for the target Class";
 inline constexpr AssociationTexts computerSystemEndNotAvailable = {
@@ -129,11 +138,11 @@ inline constexpr AssociationTexts targetNullTexts = {
 };
 
 /*
- * The operations of an association. As those of an element class, each reports under the name and place of its caller,
- * and fails with its result open and no exit marked; the last four never close their result.
+ * The operations of an association. Each logs under the name and place of its caller. An operation that fails leaves
+ * its result open and marks no exit. The last four never close their result.
  */
 
-/** Appends an instance for each pair; CMPI_RC_OK or CMPI_RC_ERR_FAILED. */
+/** Appends an instance for each pair. @return CMPI_RC_OK or CMPI_RC_ERR_FAILED. */
 unsigned short buildAssociations(const AssociationProvider& provider, const CMPIBroker* broker,
                                  const CMPIContext* context, const CMPIObjectPath* ref, char const** properties,
                                  std::vector<CMPIInstance*>& instances, const Site& site = Site::here());
@@ -142,15 +151,15 @@ CMPIStatus enumAssociationNames(const AssociationProvider& provider, const CMPIB
                                 const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* ref,
                                 const Site& site = Site::here());
 
-/** A failure of the builder closes an empty result and does not reach the status. */
+/** If the builder fails, the result is closed without instances, and the status does not tell of the failure. */
 CMPIStatus enumAssociations(const AssociationProvider& provider, const CMPIContext* context, const CMPIResult* result,
                             const CMPIObjectPath* ref, char const** properties, const Site& site = Site::here());
 
-/** Returns the first instance with an equal path; an association that does not exist is no error. */
+/** Returns the first instance with an equal path. If there is none, that is not an error. */
 CMPIStatus getAssociation(const AssociationProvider& provider, const CMPIContext* context, const CMPIResult* result,
                           const CMPIObjectPath* ref, char const** properties, const Site& site = Site::here());
 
-/** An association class that is null asks for this provider's own; an empty one is a name that no class has. */
+/** A null association class asks for this provider's own. An empty one is a name that no class has. */
 CMPIStatus associatorNames(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                            const CMPIResult* result, const CMPIObjectPath* op, const char* assocClass,
                            const char* resultClass, const Site& site = Site::here());
@@ -162,8 +171,8 @@ CMPIStatus referenceNames(const AssociationProvider& provider, const CMPIBroker*
                           const CMPIResult* result, const CMPIObjectPath* op, const Site& site = Site::here());
 
 /**
- * @param properties the request's property list. The references have all their properties, whatever it lists; it
- * decides whether the instances that they refer to are built with keys alone.
+ * @param properties the request's property list. References have all their properties, whatever it lists. It only
+ * decides whether the instances at the far end are made with their keys only.
  */
 CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* broker, const CMPIContext* context,
                       const CMPIResult* result, const CMPIObjectPath* op, char const** properties,
@@ -172,8 +181,8 @@ CMPIStatus references(const AssociationProvider& provider, const CMPIBroker* bro
 } // namespace Norv::PowerStateManagementServiceProvider
 
 /**
- * Defines the operations of an association's class in the class's own file, of which records name the operation and the
- * file. Uses the file's `provider` and `broker`.
+ * Defines the operations of an association's class. It is used in the class's own file, since log records name the
+ * operation and its file. Uses the file's variables `provider` and `broker`.
  */
 #define ORV_ASSOCIATION_OPERATIONS(Class)                                                                              \
     ORV_FIXED_INSTANCE_OPERATIONS(Class)                                                                               \

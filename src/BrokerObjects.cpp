@@ -17,12 +17,12 @@ CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, co
 
 namespace {
 
-/** For CMPI_chars, the text begins where the value would. */
+/** For the type CMPI_chars, the pointer to the value is a pointer to the text. */
 const CMPIValue* textValue(const char* text) {
     return reinterpret_cast<const CMPIValue*>(text);
 }
 
-/** The broker copies what a reference refers to. */
+/** A value that refers to `path`. The broker copies the path when it takes the value. */
 CMPIValue referenceValue(const CMPIObjectPath* path) {
     CMPIValue value = {};
     value.ref = const_cast<CMPIObjectPath*>(path);
@@ -75,7 +75,6 @@ void returnAll(const CMPIResult* result, const std::vector<CMPIInstance*>& insta
     });
 }
 
-/** Returns the first of the instances whose path equals the requested one under `flag`, if there is one. */
 void returnFirstMatch(const CMPIResult* result, const std::vector<CMPIInstance*>& instances,
                       const CMPIObjectPath* objectPath, bool flag, CMPIStatus* status) {
     forEach(instances, [&](const CMPIInstance* instance) {

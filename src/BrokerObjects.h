@@ -1,9 +1,9 @@
 /**
- * What several operations do with the broker's objects.
+ * Functions for the broker's objects that several operations use.
  *
- * The headers of other object managers take the same objects as these, but not const: a path or instance that is
- * changed is handed over as what the broker made. A value is handed over as a whole CMPIValue, since some brokers copy
- * all of it, and a text as such.
+ * The CMPI headers of other object managers take the same objects, but without const: so an object that is changed is
+ * passed as the non-const pointer that the broker returned. A value is always passed as a whole CMPIValue, since some
+ * brokers copy all of it; only a text is passed as a pointer to its characters.
  */
 #ifndef BROKEROBJECTS_H
 #define BROKEROBJECTS_H
@@ -17,28 +17,28 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
-/** Whether there is no object or one that holds nothing; CMIsNullObject of some headers looks at the pointer only. */
+/** Whether the pointer is null or its object holds nothing. CMIsNullObject of some headers checks only the pointer. */
 template <typename Object>
 bool isNull(const Object* object) {
     return object == nullptr || object->hdl == nullptr;
 }
 
-/** The text of a string that the broker gave; null where it gave none. */
+/** The text of a string that the broker returned; null if it returned none. */
 inline const char* textOf(const CMPIString* string) {
     return isNull(string) ? nullptr : CMGetCharPtr(string);
 }
 
-/** Whether a text, which may be null, is this one to the letter. */
+/** Whether a text, which may be null, is equal to another one, letter case included. */
 inline bool isText(const char* text, const char* expected) {
     return text != nullptr && std::strcmp(text, expected) == 0;
 }
 
-/** The string in a value; null where the value is of another type. */
+/** The string in a value; null if the value is of another type. */
 inline CMPIString* stringOf(const CMPIData& data) {
     return data.type == CMPI_string ? data.value.string : nullptr;
 }
 
-/** Whether a value of this type is a pointer to a CMPI object. All of them begin with a handle and a function table. */
+/** Whether a value of this type is a pointer to a CMPI object, which begins with a handle and a function table. */
 inline bool isObjectType(CMPIType type) {
     switch (type) {
     case CMPI_instance:
@@ -55,9 +55,10 @@ inline bool isObjectType(CMPIType type) {
 }
 
 /**
- * A path of a class, without keys, in a namespace and on the managed system; null where the broker cannot make it.
+ * Makes a path of a class, without keys, with a namespace and the managed system's host name; null if the broker cannot
+ * make it.
  *
- * @param nameSpace may be null where the request has none.
+ * @param nameSpace may be null if the request has none.
  */
 CMPIObjectPath* newClassPath(const CMPIBroker* broker, const char* nameSpace, const char* className,
                              CMPIStatus* status);
@@ -69,10 +70,10 @@ void setProperty(const CMPIInstance* instance, const char* name, const char* tex
 void setProperty(const CMPIInstance* instance, const char* name, CMPIUint16 number);
 void setProperty(const CMPIInstance* instance, const char* name, const CMPIObjectPath* reference);
 
-/** Sets an array of CMPI_uint16. */
+/** Sets a property to an array of CMPI_uint16. */
 void setProperty(const CMPIInstance* instance, const char* name, CMPIArray* array);
 
-/** Visits the objects in order until a visit returns false; whether none did. Objects are counted in 16 bits. */
+/** Visits the objects in order until a visit returns false. @return whether no visit did. The index has 16 bits. */
 template <typename Object, typename Visit>
 bool forEach(const std::vector<Object*>& objects, Visit visit) {
     const auto count = static_cast<unsigned short>(objects.size());
@@ -87,7 +88,10 @@ bool forEach(const std::vector<Object*>& objects, Visit visit) {
 void returnAll(const CMPIResult* result, const std::vector<CMPIObjectPath*>& paths);
 void returnAll(const CMPIResult* result, const std::vector<CMPIInstance*>& instances);
 
-/** Returns the first of the instances whose path equals the requested one under `flag`, if there is one. */
+/**
+ * Returns to `result` the first instance whose path equals the requested one (isObjPathsEqual with `flag`), if there is
+ * one.
+ */
 void returnFirstMatch(const CMPIResult* result, const std::vector<CMPIInstance*>& instances,
                       const CMPIObjectPath* objectPath, bool flag, CMPIStatus* status);
 

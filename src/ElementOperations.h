@@ -1,5 +1,5 @@
 /**
- * The operations of the two element classes, whose instances stand for the power-managed elements.
+ * The operations of the two element classes, whose instances represent the power-managed elements.
  */
 #ifndef ELEMENTOPERATIONS_H
 #define ELEMENTOPERATIONS_H
@@ -17,7 +17,7 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
-/** What distinguishes the provider of one element class from that of the other. */
+/** What is particular to the provider of one element class. */
 struct ElementProvider {
     using AllObjectPaths = unsigned short (PowerStateManagementObjFactory::*)(const CMPIBroker*, const CMPIObjectPath*,
                                                                               std::vector<CMPIObjectPath*>&,
@@ -30,7 +30,7 @@ struct ElementProvider {
                                                                            std::vector<CMPIInstance*>&, CMPIStatus*);
 
     const std::string& category;
-    /** The key property that names an element. */
+    /** The name of the key property. */
     const char* key;
     AllObjectPaths allObjectPaths;
     AllInstances allInstances;
@@ -40,9 +40,9 @@ struct ElementProvider {
 };
 
 /*
- * The operations of an element class. Each builds its own factory, returns the status that the last call of the broker
- * or the factory left, and reports under the name and place of its caller. Where the factory fails, the result stays
- * open and no exit is marked.
+ * The operations of an element class. Each makes its own factory, returns the status that the last call of the broker
+ * or the factory left, and logs under the name and place of its caller. If the factory fails, the operation leaves its
+ * result open and marks no exit.
  */
 
 CMPIStatus enumInstanceNames(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
@@ -51,15 +51,15 @@ CMPIStatus enumInstanceNames(const ElementProvider& provider, const CMPIBroker* 
 CMPIStatus enumInstances(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
                          const CMPIObjectPath* objectPath, char const** properties, const Site& site = Site::here());
 
-/** Looks the element up by its key; where the path lacks that key, the first instance with an equal path is it. */
+/** Returns the element with the path's key; if the path lacks that key, the first instance with an equal path. */
 CMPIStatus getInstance(const ElementProvider& provider, const CMPIBroker* broker, const CMPIResult* result,
                        const CMPIObjectPath* objectPath, char const** properties, const Site& site = Site::here());
 
 } // namespace Norv::PowerStateManagementServiceProvider
 
 /**
- * Defines the operations of an element class in the class's own file, of which records name the operation and the file.
- * Uses the file's `provider` and `broker`.
+ * Defines the operations of an element class. It is used in the class's own file, since log records name the operation
+ * and its file. Uses the file's variables `provider` and `broker`.
  */
 #define ORV_ELEMENT_OPERATIONS(Class)                                                                                  \
     ORV_FIXED_INSTANCE_OPERATIONS(Class)                                                                               \

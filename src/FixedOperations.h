@@ -1,5 +1,5 @@
 /**
- * The operations of which only the code that they return is particular.
+ * The operations that do nothing but return a fixed status code.
  */
 #ifndef FIXEDOPERATIONS_H
 #define FIXEDOPERATIONS_H
@@ -7,13 +7,16 @@
 #include "cmpidt.h"
 #include "cmpift.h"
 
-/** Defines a provider's operation that takes these arguments, uses none of them and returns this code. */
+/** Defines an operation of a provider that ignores its arguments and returns the status `code`. */
 #define ORV_FIXED_OPERATION(name, code, ...)                                                                           \
     static CMPIStatus name(__VA_ARGS__) {                                                                              \
         return CMPIStatus{code, nullptr};                                                                              \
     }
 
-/** The operations of an instance provider that are the same for every class: instances are never made or changed. */
+/**
+ * The operations of an instance provider that every class refuses, since clients cannot make or change instances, and
+ * its cleanup.
+ */
 #define ORV_FIXED_INSTANCE_OPERATIONS(Class)                                                                           \
     ORV_FIXED_OPERATION(Class##_Cleanup, CMPI_RC_OK, CMPIInstanceMI*, const CMPIContext*, CMPIBoolean)                 \
     ORV_FIXED_OPERATION(Class##_CreateInstance, CMPI_RC_ERR_NOT_SUPPORTED, CMPIInstanceMI*, const CMPIContext*,        \
@@ -25,7 +28,7 @@
     ORV_FIXED_OPERATION(Class##_ExecQuery, CMPI_RC_ERR_NOT_SUPPORTED, CMPIInstanceMI*, const CMPIContext*,             \
                         const CMPIResult*, const CMPIObjectPath*, const char*, const char*)
 
-/** The operation of an association provider that is the same for every class. */
+/** The cleanup of an association provider. */
 #define ORV_FIXED_ASSOCIATION_OPERATIONS(Class)                                                                        \
     ORV_FIXED_OPERATION(Class##_AssociationCleanup, CMPI_RC_OK, CMPIAssociationMI*, const CMPIContext*, CMPIBoolean)
 

@@ -1,5 +1,5 @@
 /**
- * One run of a provider's operation, and what it writes to the log.
+ * One run of a provider's operation, and the log records that it writes.
  */
 #ifndef OPERATION_H
 #define OPERATION_H
@@ -15,17 +15,17 @@
 
 namespace Norv::PowerStateManagementServiceProvider {
 
-/** Writes a free text under the caller's category. */
+/** Writes a free text to the log. */
 void logMessage(const std::string& category, int level, const char* text, const Site& site = Site::here());
 
-/** Writes a variable's value at the level of operations. */
+/** Writes a variable's value to the log, at the level of operations. */
 void logVariable(const std::string& category, const char* variable, const char* value, const Site& site = Site::here());
 void logVariable(const std::string& category, const char* variable, unsigned int value,
                  const Site& site = Site::here());
 
 /**
- * The entry and exit records of a call with parameters. The parts are labels and values in turn: pointers are written
- * as addresses, and a null text ends the list.
+ * Writes an entry or exit record of a call with parameters. The parts are alternately labels and values: pointers are
+ * written as addresses, and a null text ends the list.
  */
 template <typename... Parts>
 class CallTrace {
@@ -50,8 +50,8 @@ private:
 };
 
 /**
- * One run of a provider's operation: marked as entered when it is made. What it reports carries the place where the
- * provider's file entered it, since the work may be done in code that providers share.
+ * One run of a provider's operation; the constructor marks its entry in the log. Its records name the place in the
+ * provider's own file where the operation began, since shared code does the work.
  */
 class Operation {
 public:
@@ -59,7 +59,9 @@ public:
         markProviderEntry(_category, _site.function, _site.file, _site.line);
     }
 
-    /** What the operation returns: handed to every call of the broker and the factory, which write it. */
+    /**
+     * The status that the operation returns. It is passed to every call of the broker and the factory, which write it.
+     */
     CMPIStatus status{CMPI_RC_OK, nullptr};
 
     const Site& site() const { return _site; }
@@ -68,13 +70,13 @@ public:
 
     void markExit() const { markProviderExit(_category, _site.function, _site.file, _site.line); }
 
-    /** Ends the operation as failed: the result stays open and no exit is marked. */
+    /** Ends a failed operation: the result stays open and no exit is marked. */
     CMPIStatus fail(const char* failure) const {
         report(failure);
         return status;
     }
 
-    /** Ends the operation with its result closed. */
+    /** Ends an operation: closes its result and marks its exit. */
     CMPIStatus complete(const CMPIResult* result) const {
         CMReturnDone(result);
         markExit();

@@ -1,6 +1,6 @@
 /**
- * TALVO_PowerManagementElementCapabilities: ties each service to each capabilities object (CIM_ElementCapabilities,
- * DMTF DSP1027). Neither end is a computer system, so nothing is asked of the object manager.
+ * TALVO_PowerManagementElementCapabilities: links each service to each capabilities object (CIM_ElementCapabilities,
+ * DMTF DSP1027). Neither end is a computer system, so this provider makes no up-calls.
  */
 #include "AssociationOperations.h"
 
@@ -17,7 +17,9 @@ static constexpr const char* capabilitiesPathNull = "CMPIObjectPath is NULL for 
 static constexpr const char* associationPathFailed =
     "Create CMPIObjectPath failed for                     PowerManagementElementCapabilities.";
 
-/** The one failure of an association that reaches the client as an error; its text ends without the period. */
+/**
+ * This is the only failure of an association that reaches the client as an error. Its text has no period at the end.
+ */
 static void onNamesPathFailed(const CMPIBroker* mb, CMPIStatus* status) {
     CMSetStatusWithChars(mb, status, CMPI_RC_ERR_FAILED,
                          "Create CMPIObjectPath failed for                     PowerManagementElementCapabilities");

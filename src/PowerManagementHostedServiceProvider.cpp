@@ -1,5 +1,5 @@
 /**
- * TALVO_PowerManagementHostedService: ties each computer system to each service that it hosts (CIM_HostedService, DMTF
+ * TALVO_PowerManagementHostedService: links each computer system to each service that it hosts (CIM_HostedService, DMTF
  * DSP1027).
  */
 #include "AssociationOperations.h"
@@ -9,7 +9,7 @@ namespace Norv::PowerStateManagementServiceProvider {
 static const CMPIBroker* broker = nullptr;
 static const std::string loggerPowerMgmtHostedService = "Corvane.PowerMgmtHostedSvcProvider";
 
-/** No properties of this class, so that a client's property list can leave out either end. */
+/** These are not the names of this class's properties, so a client's property list can leave out either end. */
 static const char* filterKeys[] = {"GroupComponent", "PartComponent", nullptr};
 
 static unsigned short PowerManagementHostedServiceCMPIInstances(const CMPIObjectPath* ref, const char** properties,

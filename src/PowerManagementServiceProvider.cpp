@@ -27,7 +27,7 @@ static const ElementProvider provider = {
 
 ORV_ELEMENT_OPERATIONS(PowerManagementService)
 
-/** A power state that a client can ask for, and the write to the instrumentation tree that brings it about. */
+/** A power state that a client can request, and the write to the instrumentation tree that causes it. */
 struct PowerStateChange {
     CMPIUint16 powerState;
     unsigned int written;
@@ -49,8 +49,8 @@ static const PowerStateChange* findPowerStateChange(CMPIUint16 powerState) {
 }
 
 /**
- * Whether a time is given, which is read again before its handle counts. One of another type than datetime is given all
- * the same: a client that wants the change at some time must not get it at once.
+ * Whether the argument is given with a time. The argument is read twice: the second value's handle counts. A value of
+ * another type than datetime also counts as given: a client that wants the change at some time must not get it at once.
  */
 static bool isTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status) {
     if (CMGetArg(in, name, status).value.dateTime == nullptr) {
@@ -60,7 +60,7 @@ static bool isTimeGiven(const CMPIArgs* in, const char* name, CMPIStatus* status
     return isObjectType(time.type) ? !isNull(time.value.dateTime) : time.value.dateTime != nullptr;
 }
 
-/** Writes the change to the machine's power-management node. A failure is in the log only. */
+/** Writes the change to the machine's power-management node. A failure is only logged. */
 static void changePowerState(Instrumentation& instrumentation, const PowerStateChange& change, const Site& operation) {
     instrumentation.selectNode(NodeLexicon::POWER_MANAGEMENT_NODE);
     if (!instrumentation) {
@@ -74,14 +74,14 @@ static void changePowerState(Instrumentation& instrumentation, const PowerStateC
     }
 }
 
-/** What became of a request: a refused one leaves the result open and without a value. */
+/** The outcome of a request. A refused request leaves the result open and without a value. */
 enum class Outcome { answered, refused };
 
 /**
- * RequestPowerStateChange, up to its result.
+ * RequestPowerStateChange without its result.
  *
- * @param in the method's arguments; the object path "ManagedElement" is released once the change was tried.
- * @param operation the operation that reports.
+ * @param in the method's arguments; the object path "ManagedElement" is released after the change was tried.
+ * @param operation the place that log records name.
  */
 static Outcome requestPowerStateChange(const CMPIArgs* in, CMPIStatus* status, const Site& operation) {
     const auto refuse = [](const char* reason, const Site& site) {
@@ -124,7 +124,7 @@ static CMPIStatus PowerManagementService_InvokeMethod(CMPIMethodMI*, const CMPIC
         return operation.status;
     }
 
-    // Whatever was found on the way, the method reports that it completed.
+    // The method reports success whether or not the machine accepted the change.
     CMPIValue value = {};
     value.uint32 = 0;
     operation.markExit();

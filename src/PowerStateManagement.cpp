@@ -115,7 +115,7 @@ unsigned short getPowerStateManagementInstances(Records& instances, std::string 
             return 1;
         }
 
-        // A read gets the value of the node before: the tree leaves it alone where a node lacks the property.
+        // Each read is passed the previous node's value, which the tree leaves unchanged if a node lacks the property.
         std::vector<unsigned int> powerStates;
         unsigned int powerState = 0;
         for (; cursor; ++cursor) {
@@ -136,7 +136,7 @@ unsigned short getPowerStateManagementInstances(Records& instances, std::string 
                 require(record.setPowerState(powerState), "Failed while setting PowerState.");
             }
 
-            // A tree often lists its nodes in order: then each record belongs behind the last one.
+            // Trees often list their nodes in order: then each record belongs at the end of the map.
             if (keyProperty == "Name" || keyProperty.empty()) {
                 instances.insert_or_assign(instances.end(), std::move(name), std::move(record));
             } else if (keyProperty == "InstanceID") {

@@ -20,14 +20,14 @@ void logFailure(const char* text, const Site& site = Site::here()) {
     logMessage(loggerPowerMgmtObjFactory, failureLevel, text, site);
 }
 
-/** What is particular to the paths of TALVO_PowerManagementService. */
+/** What is particular to object paths of TALVO_PowerManagementService. */
 struct Service {
     static constexpr const char* className = powerManagementServiceClass;
     static inline const char* keys[] = {"CreationClassName", "Name", "SystemCreationClassName", "SystemName", nullptr};
     static constexpr const char* pathCreationFailed =
         "Create CMPIObjectPath                                  failed for Power Management Service.";
 
-    /** Gives each key and its value to `set`, in order. */
+    /** Calls `set` with each key and its value, in order. */
     template <typename Set>
     static void setKeys(PowerStateManagement& record, Set set) {
         set(keys[0], powerManagementServiceClass);
@@ -37,7 +37,7 @@ struct Service {
     }
 };
 
-/** What is particular to the paths of TALVO_PowerManagementCapabilities. */
+/** What is particular to object paths of TALVO_PowerManagementCapabilities. */
 struct Capabilities {
     static constexpr const char* className = powerManagementCapabilitiesClass;
     static inline const char* keys[] = {"InstanceID", nullptr};
@@ -51,7 +51,7 @@ struct Capabilities {
     }
 };
 
-/** The namespace of the path that a request came with; null where it has none. */
+/** The namespace of the request's path; null if it has none. */
 const char* nameSpaceOf(const CMPIObjectPath* ref, CMPIStatus* status) {
     return textOf(CMGetNameSpace(ref, status));
 }
@@ -78,14 +78,14 @@ Factory::Result appendObjectPaths(const Records& records, const CMPIBroker* brok
     return Factory::done;
 }
 
-/** The properties that a request asks for, by their exact names. */
+/** The properties that a request asks for; letter case matters. */
 class RequestedProperties {
 public:
     RequestedProperties(char const** properties, bool isObjPath) : _all(properties == nullptr && !isObjPath) {
         if (properties == nullptr) {
             return;
         }
-        // The index has 16 bits: only the first 65,536 names count.
+        // The index has 16 bits, so only the first 65,536 names are used.
         unsigned short i = 0;
         while (properties[i] != nullptr) {
             _names.emplace(properties[i], properties[i]);
@@ -102,7 +102,10 @@ private:
     std::map<std::string, std::string> _names;
 };
 
-/** An instance with its filter and its keys; what the broker gave where it gave none, null where the path failed. */
+/**
+ * Makes an instance with its property filter and its keys. If the broker makes none, returns what the broker returned;
+ * null if the path cannot be made.
+ */
 template <typename Class>
 CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath* ref, PowerStateManagement& record,
                           char const** properties, bool isObjPath, CMPIStatus* rc) {
@@ -121,14 +124,14 @@ CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath* ref, P
     return instance;
 }
 
-/** The text behind a resource id in the language of the environment, in UTF-8. */
+/** The text of a resource id in the language of the environment, in UTF-8. */
 std::string localizedText(const std::wstring& id) {
     constexpr unsigned int powerManagementTexts = 2;
     const ResourceString text(Locale::getResourceLibrary(powerManagementTexts, Locale::getLanguageId()), id);
     return make_string(text);
 }
 
-/** Sets an array of codes as a property; where the array cannot be made, the property is left out. */
+/** Sets a property to an array of codes. If the array cannot be made, the property is left out. */
 void setCodes(const CMPIBroker* broker, const CMPIInstance* instance, const char* property,
               const std::vector<unsigned short>& codes, const char* failed, CMPIStatus* rc, const Site& site) {
     const auto count = static_cast<unsigned short>(codes.size());
@@ -145,7 +148,7 @@ void setCodes(const CMPIBroker* broker, const CMPIInstance* instance, const char
     setProperty(instance, property, array);
 }
 
-/** The record under a key; where there is none, that is logged and the result is null. */
+/** The record with a key. If there is none, logs that and returns null. */
 const PowerStateManagement* findRecord(const Records& records, const std::string& key,
                                        const Site& site = Site::here()) {
     const auto found = records.find(key);
@@ -156,7 +159,7 @@ const PowerStateManagement* findRecord(const Records& records, const std::string
     return &found->second;
 }
 
-/** From the class of a source and the class of an association to the class at the association's far end. */
+/** A row of the table that maps the class of a source and an association class to the class at the far end. */
 struct AssociationTarget {
     const char* sourceClass;
     const char* associationClass;

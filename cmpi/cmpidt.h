@@ -13,7 +13,7 @@
 extern "C" {
 #endif
 
-/* Versions of the interface, as they stand in the first member of every function table. */
+/* Versions of the interface, for the first member of each function table. */
 #define CMPIVersion100 100
 #define CMPIVersion200 200
 #define CMPIVersion210 210
@@ -36,16 +36,16 @@ typedef long long CMPISint64;
 typedef float CMPIReal32;
 typedef double CMPIReal64;
 
-/** Number of elements, or index of one. */
+/** A number of elements, or the index of an element. */
 typedef unsigned int CMPICount;
 /** One of the type codes below. */
 typedef unsigned short CMPIType;
-/** Any combination of the value states below. */
+/** A combination of the value states below. */
 typedef unsigned short CMPIValueState;
 typedef int CMPIVersion;
-/** Handle of an open message catalogue. */
+/** The handle of an open message catalogue. */
 typedef void* CMPIMsgFileHandle;
-/** State of the object manager's garbage collection, opaque to providers. */
+/** The state of the object manager's garbage collection; opaque to providers. */
 typedef void CMPIGcStat;
 
 /* Handles. The tags are part of mangled C++ names. */
@@ -268,7 +268,7 @@ typedef enum _CMPIErrorSeverity {
     ErrorSevFatal = 5
 } CMPIErrorSeverity;
 
-/** CIM_Error.ProbableCause: the two general values; every other value of that property is as valid here. */
+/** CIM_Error.ProbableCause: its two general values. The property's other values are valid here, too. */
 typedef enum _CMPIErrorProbableCause { ErrorProbCauseUnknown = 0, ErrorProbCauseOther = 1 } CMPIErrorProbableCause;
 
 /** CIM_Error.ErrorSourceFormat. */
@@ -311,11 +311,11 @@ typedef enum _CMPIErrorSrcFormat {
 /** A memory area that a provider passes through the object manager (CMPI_ptr). */
 struct _CMPIValuePtr {
     void* ptr;
-    /** Bytes at `ptr`. */
+    /** The number of bytes at `ptr`. */
     CMPICount length;
 };
 
-/** A value; which member holds it is told by the type code beside it. */
+/** A value. A type code, which stands beside it, says which member is in use. */
 union _CMPIValue {
     CMPIBoolean boolean;
     CMPIChar16 char16;
@@ -347,20 +347,20 @@ union _CMPIValue {
     CMPIReal64 Double;
 };
 
-/** A value with its type and state. The value is meaningful only where the state has no CMPI_nullValue. */
+/** A value with its type and state. If the state contains CMPI_nullValue, the value is meaningless. */
 struct _CMPIData {
     CMPIType type;
     CMPIValueState state;
     CMPIValue value;
 };
 
-/** What an operation reports. `msg` may be null. */
+/** The status that an operation reports. `msg` may be null. */
 struct _CMPIStatus {
     CMPIrc rc;
     CMPIString* msg;
 };
 
-/** Gives the value of a property to the evaluation of a select expression. */
+/** Returns the value of a property for the evaluation of a select expression. */
 typedef CMPIData CMPIAccessor(const char* propertyName, void* parm);
 
 #ifdef __cplusplus

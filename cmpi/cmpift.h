@@ -3,14 +3,15 @@
  *
  * Slots are found by position; their order must never change. An object manager of a later version may append slots.
  *
- * Unless a slot says otherwise: a trailing CMPIStatus pointer may be null, then no status is wanted. What a function
- * returns belongs to the object manager and lives until the current request ends or the object is released; what
- * `clone` returns belongs to the caller, who releases it. Text handed in is copied.
+ * Unless a slot says otherwise: a trailing CMPIStatus pointer may be null if the caller wants no status. An object that
+ * a function returns belongs to the object manager, and lives until the current request ends or the object is released;
+ * an object that `clone` returns belongs to the caller, who must release it. Texts that are passed as arguments are
+ * copied.
  *
- * An attached thread is one in which the object manager called a provider, until that call returns, and one that a
- * provider started itself, between its attachThread and its detachThread. Functions of the object manager may be called
- * from several threads at once unless a table says otherwise; what a provider keeps in memory of its own it guards
- * itself.
+ * Each table says from which threads its functions may be called. A thread is attached in two cases: while the object
+ * manager calls a provider in it, and, if a provider started it, between its calls of attachThread and detachThread.
+ * Several threads may call functions of the object manager at once unless a table says otherwise. An object belongs to
+ * the thread that made it or got it as an argument. A provider itself has to guard the memory that its threads share.
  */
 #ifndef CMPIFT_H
 #define CMPIFT_H
@@ -22,7 +23,7 @@
 extern "C" {
 #endif
 
-/** The object manager, as a provider sees it. */
+/** The object manager's interface for providers. */
 struct _CMPIBroker {
     /** Private to the object manager. */
     const void* hdl;
@@ -33,7 +34,7 @@ struct _CMPIBroker {
 };
 
 /*
- * Encapsulated objects. `hdl` is private to the object manager; where it is null, the object holds nothing.
+ * Encapsulated objects. `hdl` is private to the object manager. If it is null, the object holds nothing.
  */
 
 struct _CMPIContext {
@@ -107,7 +108,7 @@ struct _CMPIError {
 };
 
 /*
- * What a provider's factory function returns, one kind each. `hdl` is private to the provider.
+ * What the factory functions of a provider return, one structure for each kind. `hdl` is private to the provider.
  */
 
 struct _CMPIInstanceMI {
@@ -138,7 +139,7 @@ struct _CMPIIndicationMI {
 /**
  * Factories for encapsulated data types, and the services of the object manager that work on them.
  *
- * Threads: those that are attached. A new object belongs to the thread that made it.
+ * Threads: any attached thread. A new object belongs to the thread that made it.
  */
 struct _CMPIBrokerEncFT {
     CMPIVersion ftVersion;
@@ -169,9 +170,9 @@ struct _CMPIBrokerEncFT {
 /**
  * Up-calls into the object manager: operations on other classes, indications, and thread attachment.
  *
- * Threads: those that are attached. prepareAttachThread is called in the attached thread that starts another one, and
- * attachThread, before anything else, and detachThread, last, in the thread that was started. An up-call may come back
- * to the calling provider in the same thread before it returns.
+ * Threads: any attached thread. To start a thread of its own, a provider calls prepareAttachThread in the attached
+ * thread that starts it; the new thread calls attachThread before anything else, and detachThread last. An up-call may
+ * call the same provider again, in the same thread, before it returns.
  */
 struct _CMPIBrokerFT {
     unsigned int brokerCapabilities;
@@ -212,7 +213,7 @@ struct _CMPIBrokerFT {
 /**
  * Encapsulation of the operating system: file names, threads, mutexes and conditions.
  *
- * Threads: any. A thread that newThread started has to be attached before it uses the other tables.
+ * Threads: any thread. A thread that newThread started must be attached before it uses the other tables.
  */
 struct _CMPIBrokerExtFT {
     CMPIVersion ftVersion;
@@ -241,7 +242,7 @@ struct _CMPIBrokerExtFT {
 /**
  * Memory services of the object manager (CMPI_MB_Supports_MemEnhancements).
  *
- * Threads: those that are attached. mark and release concern the objects of the calling thread; memory is freed in the
+ * Threads: any attached thread. mark and release concern the objects of the calling thread. Memory must be freed in the
  * thread that allocated it.
  */
 struct _CMPIBrokerMemFT {
@@ -265,7 +266,8 @@ struct _CMPIBrokerMemFT {
 /**
  * The context of one invocation: named entries such as CMPIPrincipal.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIContextFT {
     CMPIVersion ftVersion;
@@ -278,10 +280,10 @@ struct _CMPIContextFT {
 };
 
 /**
- * Where a provider delivers what an operation returns.
+ * The result of an operation, to which a provider returns objects and values.
  *
- * Threads: the one in which the operation was called, and those that the provider attached for it, one at a time, until
- * the operation returns.
+ * Threads: until the operation returns, the thread in which it was called, and threads that the provider attached for
+ * it; one thread at a time.
  */
 struct _CMPIResultFT {
     CMPIVersion ftVersion;
@@ -297,7 +299,8 @@ struct _CMPIResultFT {
 /**
  * Object path: host, namespace, class name and key bindings.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIObjectPathFT {
     CMPIVersion ftVersion;
@@ -325,7 +328,8 @@ struct _CMPIObjectPathFT {
 /**
  * Instance: an object path and property values.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIInstanceFT {
     CMPIVersion ftVersion;
@@ -345,7 +349,8 @@ struct _CMPIInstanceFT {
 /**
  * Arguments of an extrinsic method, by name and in order.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIArgsFT {
     CMPIVersion ftVersion;
@@ -360,7 +365,7 @@ struct _CMPIArgsFT {
 /**
  * String: immutable, owned by the object.
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPIStringFT {
     CMPIVersion ftVersion;
@@ -372,7 +377,8 @@ struct _CMPIStringFT {
 /**
  * Array of fixed size and element type.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIArrayFT {
     CMPIVersion ftVersion;
@@ -385,9 +391,10 @@ struct _CMPIArrayFT {
 };
 
 /**
- * Enumeration: what an up-call returned, one element at a time.
+ * Enumeration: the elements that an up-call returned, one at a time.
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIEnumerationFT {
     CMPIVersion ftVersion;
@@ -401,7 +408,7 @@ struct _CMPIEnumerationFT {
 /**
  * Date and time or interval (DSP0004, datetime type).
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPIDateTimeFT {
     CMPIVersion ftVersion;
@@ -415,7 +422,7 @@ struct _CMPIDateTimeFT {
 /**
  * Select expression of an indication filter.
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPISelectExpFT {
     CMPIVersion ftVersion;
@@ -431,7 +438,7 @@ struct _CMPISelectExpFT {
 /**
  * Normalized condition of a select expression.
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPISelectCondFT {
     CMPIVersion ftVersion;
@@ -444,7 +451,7 @@ struct _CMPISelectCondFT {
 /**
  * Conjunction or disjunction inside a select condition.
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPISubCondFT {
     CMPIVersion ftVersion;
@@ -458,7 +465,7 @@ struct _CMPISubCondFT {
 /**
  * Predicate inside a sub-condition.
  *
- * Threads: the one that the object belongs to; a clone, which nobody changes, may be read from several.
+ * Threads: only the thread that the object belongs to. Several threads may read a clone at once.
  */
 struct _CMPIPredicateFT {
     CMPIVersion ftVersion;
@@ -471,7 +478,8 @@ struct _CMPIPredicateFT {
 /**
  * CIM error object (CMPI_MB_Supports_Extended_Error).
  *
- * Threads: the one that the object belongs to; a clone may be handed to another, one at a time.
+ * Threads: only the thread that the object belongs to. A clone may be handed over to another thread; one thread at a
+ * time may use it.
  */
 struct _CMPIErrorFT {
     CMPIVersion ftVersion;
@@ -506,8 +514,8 @@ struct _CMPIErrorFT {
 /**
  * Instance provider.
  *
- * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
- * function of the table runs.
+ * Threads: the object manager may call these functions from any of its threads, several at once; each thread is
+ * attached during the call. It calls cleanup last, when no other function of the table is running.
  */
 struct _CMPIInstanceMIFT {
     CMPIVersion ftVersion;
@@ -531,8 +539,8 @@ struct _CMPIInstanceMIFT {
 /**
  * Association provider.
  *
- * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
- * function of the table runs.
+ * Threads: the object manager may call these functions from any of its threads, several at once; each thread is
+ * attached during the call. It calls cleanup last, when no other function of the table is running.
  */
 struct _CMPIAssociationMIFT {
     CMPIVersion ftVersion;
@@ -552,8 +560,8 @@ struct _CMPIAssociationMIFT {
 /**
  * Method provider.
  *
- * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
- * function of the table runs.
+ * Threads: the object manager may call these functions from any of its threads, several at once; each thread is
+ * attached during the call. It calls cleanup last, when no other function of the table is running.
  */
 struct _CMPIMethodMIFT {
     CMPIVersion ftVersion;
@@ -567,8 +575,8 @@ struct _CMPIMethodMIFT {
 /**
  * Property provider.
  *
- * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
- * function of the table runs.
+ * Threads: the object manager may call these functions from any of its threads, several at once; each thread is
+ * attached during the call. It calls cleanup last, when no other function of the table is running.
  */
 struct _CMPIPropertyMIFT {
     CMPIVersion ftVersion;
@@ -586,8 +594,8 @@ struct _CMPIPropertyMIFT {
 /**
  * Indication provider.
  *
- * Threads: any of the object manager's, several at once, each attached for the call. cleanup comes last, when no other
- * function of the table runs.
+ * Threads: the object manager may call these functions from any of its threads, several at once; each thread is
+ * attached during the call. It calls cleanup last, when no other function of the table is running.
  */
 struct _CMPIIndicationMIFT {
     CMPIVersion ftVersion;

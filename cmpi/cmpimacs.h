@@ -2,8 +2,8 @@
  * The convenience layer of the Common Manageability Programming Interface, version 2.0 (The Open Group, C061): one call
  * for each slot of the function tables, and the stub macros that define a provider's tables and factory functions.
  *
- * Each call goes straight to its slot, with the arguments in the order shown; `rc` is the trailing status pointer and
- * may be null. Objects and tables are not checked for null.
+ * Each macro calls its slot directly, with the arguments in the order shown; `rc` is the trailing status pointer and
+ * may be null. The macros do not check objects and tables for null.
  */
 #ifndef CMPIMACS_H
 #define CMPIMACS_H
@@ -32,7 +32,7 @@
         return cmpiStatus_;                                                                                            \
     }
 
-/** Sets the code and a null message, where `st` is not null. */
+/** If `st` is not null, sets its code, and a null message. */
 #define CMSetStatus(st, code)                                                                                          \
     do {                                                                                                               \
         if ((st) != NULL) {                                                                                            \
@@ -41,7 +41,7 @@
         }                                                                                                              \
     } while (0)
 
-/** Sets the code and the message, where `st` is not null. */
+/** If `st` is not null, sets its code and message. */
 #define CMSetStatusWithString(st, code, string)                                                                        \
     do {                                                                                                               \
         if ((st) != NULL) {                                                                                            \
@@ -50,7 +50,10 @@
         }                                                                                                              \
     } while (0)
 
-/** Sets the code, and as message a new string of `chars` where the broker `mb` is not null, else a null message. */
+/**
+ * If `st` is not null, sets its code, and as its message a new string with the text `chars`; without a broker `mb`, a
+ * null message.
+ */
 #define CMSetStatusWithChars(mb, st, code, chars)                                                                      \
     do {                                                                                                               \
         if ((st) != NULL) {                                                                                            \
@@ -233,10 +236,11 @@
     ((pr)->ft->evaluateUsingAccessor((pr), (accessor), (parm), (rc)))
 
 /*
- * Stubs. Each defines the static function table of one kind of provider and its exported factory function
+ * Stubs. Each defines the static function table of one kind of provider, and its exported factory function
  * `<provider>_Create_<Kind>MI`. `pfx` is the prefix of the operations' names, `pn` the provider's name, `broker` the
- * variable that keeps the broker, `hook` a statement run by every call of the factory (CMNoHook for none). The object
- * manager may call a factory again, from any thread; it calls it before the functions of the table that it returns.
+ * variable that keeps the broker, and `hook` a statement that each call of the factory runs (CMNoHook for none). The
+ * object manager calls a factory before the functions of the table that it returns; it may call the factory again, from
+ * any thread.
  */
 
 #define CMNoHook

@@ -1,6 +1,6 @@
 /**
- * What the headers of the Common Manageability Programming Interface need to know of the platform: Linux on x86 and
- * x86-64, where the C calling convention is the default.
+ * What the headers of the Common Manageability Programming Interface need to know about the platform, which is Linux on
+ * x86 and x86-64: the C calling convention is the default.
  */
 #ifndef CMPIPL_H
 #define CMPIPL_H

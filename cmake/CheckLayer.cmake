@@ -1,4 +1,4 @@
-# Fails where a file of the layer in FOLDER includes a file of a layer that is not in the list USES:
+# Fails if a file of the layer in FOLDER includes a file of a layer that is not in the list USES:
 #
 #   cmake -DFOLDER=objectmanager/text "-DUSES=model;classes" -P cmake/CheckLayer.cmake
 cmake_minimum_required(VERSION 3.25)

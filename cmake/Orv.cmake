@@ -1,7 +1,7 @@
-# What every target of the project is built with, and the few ways in which targets are made.
+# The options that every target of the project is built with, and functions that add targets.
 
 add_library(orv_options INTERFACE)
-# Files and inodes are as large on 32-bit machines.
+# 32-bit builds support files and inode numbers as large as 64-bit builds do.
 target_compile_definitions(orv_options INTERFACE _FILE_OFFSET_BITS=64)
 target_compile_options(orv_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wundef -Wformat=2 -Wimplicit-fallthrough
@@ -20,15 +20,15 @@ if(ORV_SANITIZE)
   target_link_options(orv_options INTERFACE -fsanitize=${ORV_SANITIZE})
 endif()
 
-# orv_small(TARGET sources...): sources of the target in this folder whose code runs once in a process, or for a command:
-# the less of it there is in memory afterwards, the better.
+# orv_small(TARGET sources...): optimises sources of the target for size. For code that runs only once in a process, or
+# for a command, so that it takes less memory afterwards.
 function(orv_small target)
   set_source_files_properties(${ARGN} TARGET_DIRECTORY ${target}
     PROPERTIES COMPILE_OPTIONS "$<$<NOT:$<CONFIG:Debug>>:-Os>")
 endfunction()
 
-# orv_shared_library(TARGET sources...): a library lib<TARGET>.so.1 that exports what the version script <TARGET>.map of
-# its folder names, and nothing else.
+# orv_shared_library(TARGET sources...): adds a library lib<TARGET>.so.1 that exports only the symbols that the version
+# script <TARGET>.map of its folder names.
 function(orv_shared_library target)
   add_library(${target} SHARED ${ARGN})
   set(map "${CMAKE_CURRENT_SOURCE_DIR}/${target}.map")
@@ -41,8 +41,8 @@ function(orv_shared_library target)
   install(TARGETS ${target} LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}" NAMELINK_SKIP)
 endfunction()
 
-# orv_provider_library(TARGET sources...): a shared library that is also found where object managers look for providers,
-# under the name that they make of its registration.
+# orv_provider_library(TARGET sources...): adds a shared library, and a link to it in the folder where object managers
+# look for providers, under the name that they derive from its registration.
 function(orv_provider_library target)
   orv_shared_library(${target} ${ARGN})
   set(link "${CMAKE_CURRENT_BINARY_DIR}/lib${target}.so")
@@ -50,7 +50,7 @@ function(orv_provider_library target)
   install(FILES "${link}" DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmpi")
 endfunction()
 
-# orv_install_manual(FILE): installs a manual page of docs/man, compressed as systems have theirs.
+# orv_install_manual(FILE): installs a manual page of docs/man, compressed with gzip.
 function(orv_install_manual file)
   string(REGEX REPLACE ".*\\." "" section "${file}")
   set(source "${PROJECT_SOURCE_DIR}/docs/man/${file}")
@@ -62,23 +62,23 @@ function(orv_install_manual file)
   install(FILES "${compressed}" DESTINATION "${CMAKE_INSTALL_MANDIR}/man${section}")
 endfunction()
 
-# What test programs are compiled with besides: they are compiled often and run briefly, so the compiler's time counts and
-# theirs does not. References that are null or misaligned, and objects of another class, are looked for in what is
-# tested; in the tests' own code, that would take the compiler nearly as long as everything else.
+# Further options for test programs. They are compiled often and run briefly, so the compiler's time counts and theirs
+# does not. The sanitizers' checks for null and misaligned references, and for objects of another class, apply to the
+# tested code only: in the tests' own code, they would nearly double the time of compilation.
 string(FIND "${ORV_SANITIZE}" undefined position)
 add_library(orv_test_options INTERFACE)
 target_compile_options(orv_test_options INTERFACE -O0 -g1 -U_FORTIFY_SOURCE
   $<$<NOT:$<EQUAL:${position},-1>>:-fno-sanitize=null,alignment,vptr>)
 
-# orv_add_test(NAME [THREADS] SOURCES... LIBRARIES... [EXCEPT PATTERN]): a GoogleTest program that ctest runs; with EXCEPT,
-# without the tests whose names match, which are run by a test of their own. With THREADS it is one of those that
-# ThreadSanitizer watches: the target threaded_tests builds them, the label threads selects them.
+# orv_add_test(NAME [THREADS] SOURCES... LIBRARIES... [EXCEPT PATTERN]): adds a GoogleTest program that ctest runs.
+# EXCEPT leaves out the tests whose names match PATTERN; another test has to run them. With THREADS, the program is one
+# of those that run under ThreadSanitizer: the target threaded_tests builds them, the label threads selects them.
 function(orv_add_test name)
   cmake_parse_arguments(PARSE_ARGV 1 arg "THREADS" "EXCEPT" "SOURCES;LIBRARIES")
   add_executable(${name} ${arg_SOURCES})
   target_link_libraries(${name} PRIVATE
     orv_options orv_test_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)
-  # They are headers of C++, and CMake wants them for every language of the program.
+  # The precompiled headers are C++, and CMake would use them for every language of the program.
   if(TARGET orv_test_headers AND NOT "${arg_SOURCES}" MATCHES "\\.c(;|$)")
     target_precompile_headers(${name} REUSE_FROM orv_test_headers)
   endif()
@@ -94,8 +94,8 @@ function(orv_add_test name)
   endif()
 endfunction()
 
-# orv_test_schema(TARGET FOLDER): what a program needs that loads the tests' own provider: in FOLDER, the shipped schema
-# and registrations beside those of the tests.
+# orv_test_schema(TARGET FOLDER): fills FOLDER with the shipped schema and registrations and those of the tests' own
+# provider, for a program that loads this provider.
 function(orv_test_schema target folder)
   add_custom_target(${target}_schema
     COMMAND "${CMAKE_COMMAND}" -E copy_directory

@@ -11,15 +11,20 @@ constexpr CMPIUint16 enabledStateEnabled = 2;
 constexpr CMPIUint16 requestedStateNotApplicable = 12;
 constexpr CMPIUint16 dedicatedNotDedicated = 0;
 
-/** CIM_ComputerSystem calls the name of an Internet host "IP"; a name that was configured may be any text. */
+/**
+ * The name's format in CIM_ComputerSystem: "IP" for the name of an Internet host. A configured name may be any text.
+ */
 const char* nameFormatOf(const std::string& name) {
     constexpr const char* hostNameCharacters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-.";
     return name.find_first_not_of(hostNameCharacters) == std::string::npos ? "IP" : "Other";
 }
 
-/* A value is handed over as a whole CMPIValue, since some brokers copy all of it, and a text as such. */
+/*
+ * A value is passed as a whole CMPIValue, since some brokers copy all of it; only a text is passed as a pointer to its
+ * characters.
+ */
 
-/** For CMPI_chars, the text begins where the value would. */
+/** For the type CMPI_chars, the pointer to the value is a pointer to the text. */
 const CMPIValue* textValue(const char* text) {
     return reinterpret_cast<const CMPIValue*>(text);
 }
@@ -44,9 +49,10 @@ void setNumber(const CMPIInstance* instance, const char* property, CMPIUint16 nu
 }
 
 /**
- * Sets an array of elements of a type.
+ * Sets a property to an array.
  *
- * @param valueOf gives the element at an index, of exactly that type: object managers do not convert elements.
+ * @param valueOf returns the element at an index. It must have exactly the array's type: object managers do not convert
+ * elements.
  */
 template <typename ValueOf>
 void setArray(const CMPIBroker* broker, const CMPIInstance* instance, const char* property, std::size_t size,
@@ -64,7 +70,7 @@ void setArray(const CMPIBroker* broker, const CMPIInstance* instance, const char
     setProperty(instance, property, &value, static_cast<CMPIType>(type | CMPI_ARRAY));
 }
 
-/** Sets one text of each fact. */
+/** Sets a property to an array with one text of each fact. */
 void setTexts(const CMPIBroker* broker, const CMPIInstance* instance, const char* property,
               const std::vector<IdentifyingFact>& facts, std::string IdentifyingFact::*text) {
     setArray(broker, instance, property, facts.size(), CMPI_string, [&](CMPICount i) {

@@ -1,5 +1,5 @@
 /**
- * TALVO_ComputerSystem as CMPI objects (CIM_ComputerSystem, DMTF DSP1052).
+ * Makes CMPI objects of TALVO_ComputerSystem (CIM_ComputerSystem, DMTF DSP1052).
  */
 #ifndef COMPUTERSYSTEM_COMPUTERSYSTEM_H
 #define COMPUTERSYSTEM_COMPUTERSYSTEM_H
@@ -19,17 +19,18 @@ inline constexpr const char* creationClassNameKey = "CreationClassName";
 inline constexpr const char* nameKey = "Name";
 
 /*
- * Objects belong to the broker and live as long as its request does. `reference` is a path of the request, whose
- * namespace the new object gets; `name` is the system's name, which is also the object's host. Both functions throw
- * OperationError where the broker fails.
+ * The objects belong to the broker and live until its request ends. `reference` is the request's path; the new object
+ * gets its namespace. `name` is the system's name, which is also the object's host name. Both functions throw
+ * OperationError if the broker fails.
  */
 
 CMPIObjectPath* newSystemPath(const CMPIBroker* broker, const CMPIObjectPath* reference, const std::string& name);
 
 /**
- * @param facts what identifies the system beside its name; without any, the instance has neither OtherIdentifyingInfo
+ * @param facts identify the system beside its name. If there are none, the instance has neither OtherIdentifyingInfo
  *              nor IdentifyingDescriptions.
- * @param properties names of the properties that are wanted beside the keys, ended by a null; null for all.
+ * @param properties the names of the wanted properties beside the keys, as an array that ends with a null; null for all
+ * properties.
  */
 CMPIInstance* newSystemInstance(const CMPIBroker* broker, const CMPIObjectPath* reference, const std::string& name,
                                 const std::vector<IdentifyingFact>& facts, const char** properties);

@@ -11,13 +11,16 @@ namespace Norv::ComputerSystemProvider {
 
 namespace {
 
-/** A file or variable and what its value is to people. */
+/** A file or variable, and a description of its value for people. */
 struct Source {
     const char* name;
     const char* description;
 };
 
-/** The kernel opens these to everybody; the serial numbers and the UUID beside them it keeps for root. */
+/**
+ * The kernel lets every user read these files. In the same folder, it lets only root read the serial numbers and the
+ * UUID.
+ */
 constexpr Source firmwareFiles[] = {
     {"sys_vendor", "System vendor"},
     {"product_name", "Product name"},
@@ -48,14 +51,14 @@ std::string trimmed(const std::string& text) {
     return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of(blanks) - first + 1);
 }
 
-/** Surrogates are no characters, though the standard library decodes them. */
+/** Surrogates are not characters, although the standard library decodes them. */
 bool isPrintable(char32_t character) {
     const bool isControl = character < 0x20 || character == 0x7f;
     const bool isSurrogate = character >= 0xd800 && character <= 0xdfff;
     return !isControl && !isSurrogate;
 }
 
-/** Whether a text is UTF-8 without control characters: firmware holds any bytes, a CIM string must not. */
+/** Whether a text is UTF-8 without control characters. Firmware may contain any bytes, a CIM string may not. */
 bool isOneLine(const std::string& text) {
     using Utf8 = std::codecvt<char32_t, char8_t, std::mbstate_t>;
     const std::u8string bytes(text.begin(), text.end());
@@ -76,7 +79,7 @@ void append(std::vector<IdentifyingFact>& facts, const char* description, const 
     }
 }
 
-/** The file's lines without the blanks around them; nothing where it cannot be read. */
+/** The file's lines, without blanks at their ends; no value if the file cannot be read. */
 std::optional<std::vector<std::string>> linesOf(const std::string& file) {
     std::ifstream stream(file);
     std::vector<std::string> lines;
@@ -86,7 +89,7 @@ std::optional<std::vector<std::string>> linesOf(const std::string& file) {
     return stream.is_open() && !stream.bad() ? std::optional(std::move(lines)) : std::nullopt;
 }
 
-/** A value without the shell's quotes and backslashes. */
+/** A value of an os-release file, without the shell's quotes and backslashes. */
 std::string unquoted(std::string_view text) {
     const auto isQuotedWith = [text](char quote) {
         return text.size() > 1 && text.front() == quote && text.back() == quote;
@@ -105,7 +108,7 @@ std::string unquoted(std::string_view text) {
     return value;
 }
 
-/** The assignments of an os-release file, the last one of each variable. */
+/** The variables of an os-release file. The last assignment of each counts. */
 std::map<std::string, std::string> variablesOf(const std::vector<std::string>& lines) {
     std::map<std::string, std::string> variables;
     for (const std::string& line : lines) {

@@ -1,5 +1,5 @@
 /**
- * What the machine tells everybody about itself.
+ * Facts about the machine that every user may read.
  */
 #ifndef COMPUTERSYSTEM_IDENTIFYINGFACTS_H
 #define COMPUTERSYSTEM_IDENTIFYINGFACTS_H
@@ -9,7 +9,7 @@
 
 namespace Norv::ComputerSystemProvider {
 
-/** One fact: what it is and what the machine says, both in UTF-8 and in one line. */
+/** One fact: its description and its value, each one line of UTF-8. */
 struct IdentifyingFact {
     std::string description;
     std::string value;
@@ -17,20 +17,20 @@ struct IdentifyingFact {
     bool operator==(const IdentifyingFact&) const = default;
 };
 
-/** Where facts are read from. */
+/** The files from which facts are read. */
 struct FactSources {
-    /** The folder of the firmware's texts, one to a file. */
+    /** The folder with the firmware's texts, each in a file of its own. */
     std::string firmware = "/sys/class/dmi/id";
-    /** The operating system's description (os-release(5)); the first of them that can be read counts. */
+    /** Files that describe the operating system (os-release(5)). The first one that can be read counts. */
     std::vector<std::string> operatingSystem = {"/etc/os-release", "/usr/lib/os-release"};
 };
 
 /**
- * The facts that identify the machine: hardware and firmware, then operating system. Only what every user may read is
- * looked at, whoever asks: no serial numbers, no UUID, no machine-id(5).
+ * The facts that identify the machine: first the hardware and firmware, then the operating system. Whoever asks, only
+ * facts that every user may read are used: no serial numbers, no UUID, no machine-id(5).
  *
- * @return the facts in a fixed order. What the machine does not tell, or tells in anything but one line of UTF-8, is
- *         not among them.
+ * @return the facts in a fixed order. Facts that the machine does not have, or whose text is not one line of UTF-8, are
+ *         left out.
  */
 std::vector<IdentifyingFact> identifyingFacts(const FactSources& sources = {});
 

@@ -1,5 +1,5 @@
 /**
- * Services that every part of the management agent shares: liborvcommon.so.1.
+ * Functions that all parts of the management agent share: liborvcommon.so.1.
  */
 #ifndef NORV_COMMON_H
 #define NORV_COMMON_H
@@ -11,20 +11,20 @@
 namespace Norv {
 
 /**
- * The managed system's name: the configured one, else the fully qualified host name.
+ * The managed system's name: the configured name, else the fully qualified host name.
  *
- * @return the name, the same one for the life of the process; never empty.
+ * @return the name, which is never empty and stays the same until the process ends.
  */
 std::string getSystemName();
 
 /**
- * Whether two object paths name the same instance (DSP0004, "naming"): equal class names and namespaces without regard
- * to letter case, and the same keys, their names without regard to letter case and their values exactly. Reference keys
- * are compared as object paths.
+ * Whether two object paths name the same instance (DSP0004, "naming"): their class names, namespaces, and keys are
+ * equal. Letter case does not matter in names, but does in values of keys. Reference keys are compared as object paths.
  *
- * @param left,right the paths, not changed and not kept. A null path, or one that holds nothing, equals no path.
- * @param flag true leaves host names and namespaces out of the comparison of reference keys, since object managers
- *             fill them differently.
+ * @param left,right the paths, which are neither changed nor kept. A null path, or one that holds nothing, is equal to
+ * no path.
+ * @param flag if true, host names and namespaces do not matter in reference keys, since object managers set them
+ *             differently.
  */
 bool isObjPathsEqual(const CMPIObjectPath* left, const CMPIObjectPath* right, bool flag);
 

@@ -12,22 +12,22 @@
 namespace Norv {
 
 /**
- * A cursor over the nodes of one type. A cursor belongs to one thread at a time; different cursors may be used by
- * different threads at once.
+ * A cursor over the nodes of one type. Only one thread at a time may use a cursor; several threads may use different
+ * cursors at once.
  *
- * The object is one word and its members are neither const nor inline: the library that implements them can be
- * exchanged without rebuilding its users.
+ * The object is one word, and its members are neither const nor inline, so that the library can be replaced without
+ * rebuilding its users.
  */
 class Instrumentation {
 public:
-    /** A cursor on the tree that stands on no node yet. May throw what derives from std::exception. */
+    /** Makes a cursor that does not stand on a node yet. May throw exceptions that derive from std::exception. */
     Instrumentation();
     ~Instrumentation();
     Instrumentation(const Instrumentation&) = delete;
     Instrumentation& operator=(const Instrumentation&) = delete;
 
     /**
-     * Selects every node of a type and places the cursor on the first.
+     * Selects all nodes of a type, and moves the cursor to the first one.
      *
      * @return whether there is such a node.
      */
@@ -36,19 +36,22 @@ public:
     /** Whether the cursor stands on a selected node. */
     operator bool();
 
-    /** Moves to the next selected node; past the last one, the cursor stands on none. */
+    /** Moves the cursor to the next selected node; after the last one, it stands on no node. */
     Instrumentation& operator++();
 
-    /** The current node's path in the library's own form; empty where the cursor stands on no node. */
+    /** The current node's path in the library's own form; empty if the cursor stands on no node. */
     std::string getPathToNode();
 
-    /** A path of `getPathToNode` as text for people: the node's identity, stable from one request to the next. */
+    /**
+     * Converts a path of `getPathToNode` to a text for people. The text is the node's identity, and stays the same from
+     * one request to the next.
+     */
     std::string convertPathToString(const std::string& path);
 
     /**
      * Reads a list property of the current node.
      *
-     * @param[out] values the list; untouched where the result is false.
+     * @param[out] values the list; unchanged if the result is false.
      * @return whether the node has the property.
      */
     bool getProperty(NodeLexicon::Properties property, std::vector<unsigned int>& values);
@@ -56,7 +59,7 @@ public:
     /**
      * Reads a number property of the current node.
      *
-     * @param[out] value the number; untouched where the result is false.
+     * @param[out] value the number; unchanged if the result is false.
      * @return whether the node has the property.
      */
     bool getProperty(NodeLexicon::Properties property, unsigned int& value);
@@ -65,7 +68,7 @@ public:
      * Writes a number property of the current node.
      *
      * @param value the number to write; not changed.
-     * @return whether the write was accepted. The reason of a refusal is in the log.
+     * @return whether the write was accepted. The log has the reason of a refusal.
      */
     bool setProperty(NodeLexicon::Properties property, unsigned int& value);
 

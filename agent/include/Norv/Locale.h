@@ -8,25 +8,27 @@
 
 namespace Norv {
 
-/** The texts of one resource library in one language. Lives as long as the process; opaque to users. */
+/**
+ * The texts of one resource library in one language. The object lives until the process ends; it is opaque to users.
+ */
 class ResourceLibrary;
 
 namespace Locale {
 
 /**
- * The language in force: the first of LC_ALL, LC_MESSAGES and LANG that is set and not empty decides. The process's
- * own locale is neither read nor changed.
+ * The current language. The first of the environment variables LC_ALL, LC_MESSAGES and LANG that is set and not empty
+ * decides; the process's own locale is neither read nor changed.
  *
- * @return a number for `getResourceLibrary`; a language without texts counts as English.
+ * @return a number for `getResourceLibrary`. For a language without texts, it is the number of English.
  */
 unsigned int getLanguageId();
 
 /**
  * The texts of a resource library.
  *
- * @param number the resource library; 2 holds the texts of power management.
+ * @param number the number of the resource library; 2 is that of power management.
  * @param language a result of `getLanguageId`.
- * @return the texts, valid as long as the process runs. An unknown number or language gives a library without texts.
+ * @return the library, valid until the process ends. For an unknown number or language, it has no texts.
  */
 const ResourceLibrary& getResourceLibrary(unsigned int number, unsigned int language);
 
@@ -35,7 +37,7 @@ const ResourceLibrary& getResourceLibrary(unsigned int number, unsigned int lang
 /** One text of a resource library. */
 class ResourceString {
 public:
-    /** Looks up the text behind `id`; where the library has none, the text is the id itself. */
+    /** Looks up the text of `id`. If the library has none, the text is the id itself. */
     ResourceString(const ResourceLibrary& library, const std::wstring& id);
 
     /** The text; valid as long as this object. */
@@ -45,7 +47,7 @@ private:
     std::wstring _text;
 };
 
-/** The text in UTF-8; what is no Unicode character becomes U+FFFD. */
+/** Converts a text to UTF-8. A wide character that is not a Unicode character becomes U+FFFD. */
 std::string make_string(const std::wstring& text);
 
 } // namespace Norv

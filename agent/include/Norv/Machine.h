@@ -1,57 +1,57 @@
 /**
- * What a program that serves others needs to know of, and tell, the instrumentation: optional functions of
- * liborvinstrumentation.so.1.
+ * Optional functions of liborvinstrumentation.so.1 for programs that serve clients: they tell which machine is managed,
+ * and for whom requests are made.
  *
- * The library of another agent need not have them. A program therefore does not link them: it asks dlsym(3) for the
- * names that stand here, of a library that it loaded and that uses the instrumentation, and does without where there
- * are none.
+ * Another agent's library need not have these functions. A program therefore does not link them: it passes the names
+ * below to dlsym(3), with the handle of a library that it has loaded and that uses the instrumentation, and does
+ * without the functions that are missing.
  */
 #ifndef NORV_MACHINE_H
 #define NORV_MACHINE_H
 
 namespace Norv {
 
-/** Whose power the process manages. The numbers are fixed. */
+/** The kind of machine whose power the process manages. The numbers are fixed. */
 enum Machine : int {
-    /** Nobody's: the configuration cannot be used. */
+    /** No machine: the configuration cannot be used. */
     NO_MACHINE = 0,
-    /** That of a simulated machine. Whatever is asked of it happens in a file. */
+    /** A simulated machine: requests change only a file. */
     SIMULATED_MACHINE = 1,
-    /** That of a real machine. */
+    /** A real machine. */
     REAL_MACHINE = 2,
 };
 
 /**
- * Tells whose power the process manages; asks nothing of the machine. May be called from any thread.
+ * Tells which kind of machine the process manages, without contacting it. May be called from any thread.
  *
- * @return a Machine, the same one for the life of the process.
+ * @return a Machine, which stays the same until the process ends.
  */
 using Machine1 = int();
 
 /**
- * Says on whose behalf the calling thread acts from now on: the record of a power request in the log names him.
+ * Sets the user on whose behalf the calling thread acts from now on. The log records of power requests name this user.
  *
- * @param whom a text for people, such as "alice from 192.0.2.7"; null for nobody but the process itself. It stays the
- *             caller's, and is valid until the thread gives another one.
+ * @param whom a text for people, such as "alice from 192.0.2.7"; null if the process acts for itself. The text belongs
+ *             to the caller, and must stay valid until the thread's next call.
  */
 using OnBehalfOf1 = void(const char* whom);
 
 /**
- * Tells to which node power requests go: the provider writes to the first one, whichever service a client names.
+ * Tells which node gets the power requests: the provider writes to the first node, whichever service a client names.
  *
- * @return the node's path below the root; empty where there is none. It is the same one for the life of the process.
+ * @return the node's path below the root, which stays the same until the process ends; empty if there is no node.
  */
 using PowerNode1 = const char*();
 
 /**
- * Takes back the power request that is under way, by whomever it was made. The log gets a record of it as of a power
- * request. May be called from any thread, and waits for the machine as a request does.
+ * Cancels the power request that is under way, whoever made it. The outcome is logged like that of a power request. May
+ * be called from any thread; waits for the machine as long as a power request does.
  *
- * @return 1 where the request was taken back, 0 where there is none or it is too late.
+ * @return 1 if the request was cancelled; 0 if there is no request, or if it is too late.
  */
 using CancelRequest1 = int();
 
-/** The names of the functions. */
+/** The functions' names for dlsym(3). */
 inline constexpr const char* machine1Name = "orvInstrumentationMachine1";
 inline constexpr const char* powerNode1Name = "orvInstrumentationPowerNode1";
 inline constexpr const char* cancelRequest1Name = "orvInstrumentationCancelRequest1";

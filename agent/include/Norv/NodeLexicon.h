@@ -6,12 +6,12 @@
 
 namespace Norv::NodeLexicon {
 
-/** What a node of the tree stands for. The numbers are fixed. */
+/** The types of nodes. The numbers are fixed. */
 enum NodeType : int {
     POWER_MANAGEMENT_NODE = 40,
 };
 
-/** What a node can be asked for. The numbers are fixed. */
+/** The properties of nodes. The numbers are fixed. */
 enum Properties : int {
     /** The current power state, a number; writing it changes the power state. */
     POWER_STATE = 123,

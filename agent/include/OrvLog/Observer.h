@@ -1,8 +1,9 @@
 /**
- * How a program hears what the libraries in it log: an optional function of liborvlog.so.1.
+ * An optional function of liborvlog.so.1 with which a program receives the log records of the libraries in its process.
  *
- * The log library of another agent need not have it. A program therefore does not link it: it asks dlsym(3) for the
- * name that stands here, of a library that it loaded and that uses the log, and does without where there is none.
+ * Another agent's log library need not have this function. A program therefore does not link it: it passes the name
+ * below to dlsym(3), with the handle of a library that it has loaded and that uses the log, and does without if the
+ * function is missing.
  */
 #ifndef ORVLOG_OBSERVER_H
 #define ORVLOG_OBSERVER_H
@@ -12,21 +13,24 @@
 namespace OrvLog {
 
 /**
- * What a record tells that a program may act on. The numbers are fixed. Whoever logs such a record hands its kind to
- * OrvLogger::logLevelMessage as the first of the numbers that have no name there.
+ * The kinds of records, by which a program can recognise those that it acts on. The numbers are fixed. A library that
+ * logs such a record passes its kind to OrvLogger::logLevelMessage, as the first of the two unnamed numbers.
  */
 enum RecordKind : int {
-    /** For people only. */
+    /** A record that is for people only. */
     ORDINARY_RECORD = 0,
-    /** Which machine the instrumentation manages. Once in a process. */
+    /** The record that tells which machine the instrumentation manages. It is logged once in a process. */
     MACHINE_RECORD = 1,
-    /** A power request that the machine accepted: what was asked, when it will be over, and who asked. */
+    /** A power request that the machine accepted: which request, when it will be done, and who made it. */
     POWER_REQUEST_ACCEPTED_RECORD = 2,
     /** A power request that was refused, and why. */
     POWER_REQUEST_REFUSED_RECORD = 3,
 };
 
-/** A record of kind "log". The texts are the log's, valid while the observer runs; they end where their sizes say. */
+/**
+ * A record of kind "log". The texts belong to the log and are valid while the observer runs. They have sizes instead of
+ * a null at the end.
+ */
 struct ObservedRecord1 {
     /** A RecordKind. */
     int kind;
@@ -38,26 +42,26 @@ struct ObservedRecord1 {
 };
 
 struct Observer1 {
-    /** Records below this level are not handed over. */
+    /** The observer does not receive records below this level. */
     int lowestLevel;
     /**
-     * Called with each record, whatever the log's thresholds, in the thread that logs, before the record is written.
-     * Several threads call it at a time. It neither throws nor logs.
+     * Called with each record, whatever the log's thresholds, before the record is written. It runs in the thread that
+     * logs, and in several threads at once. It must neither throw nor log.
      */
     void (*record)(void* context, const ObservedRecord1* record);
-    /** For `record`; the observer's own. */
+    /** The first argument of `record`; belongs to the observer. */
     void* context;
 };
 
 /**
- * Makes an observer the process's only one, in place of the one before; null is none.
+ * Sets the process's only observer, in place of the former one; null removes it.
  *
- * @param observer stays the caller's. It is valid until another one has taken its place and no thread that was logging
- *                 at that moment logs any more.
+ * @param observer belongs to the caller. It must stay valid until another one has replaced it and each thread that was
+ *                 logging at that moment has finished doing so.
  */
 using Observe1 = void(const Observer1* observer);
 
-/** The name of the function. */
+/** The function's name for dlsym(3). */
 inline constexpr const char* observe1Name = "orvLogObserve1";
 
 } // namespace OrvLog

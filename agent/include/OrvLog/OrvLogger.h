@@ -9,23 +9,22 @@
 namespace OrvLog {
 
 /**
- * Writes records to the configured destination. Both members may be called from any thread at any time; neither throws,
- * and neither waits for a destination that is full or missing.
+ * Writes records to the configured destination. Both members may be called from any thread at any time. Neither throws,
+ * nor waits for a destination that is full or missing.
  *
- * A record is written where its level is at or above the threshold of its category and kind.
+ * A record is written if its level is at or above the threshold of its category and kind.
  */
 class OrvLogger {
 public:
     /**
      * Writes a record of kind "log".
      *
-     * @param function,file,line the place that reports; null texts are written as empty.
+     * @param function,file,line the place in the source that reports; null texts become empty.
      * @param category a dotted name; thresholds are set for prefixes of it.
-     * @param level the higher, the more important: 3000 progress, 4000 operations, 6000 failures.
+     * @param level a higher level is more important: 3000 progress, 4000 operations, 6000 failures.
      * @param message the text, one line.
      *
-     * Of the three arguments without a name, the first number is a RecordKind of OrvLog/Observer.h; the others are not
-     * used.
+     * Of the three unnamed arguments, the first number is a RecordKind of OrvLog/Observer.h; the others are not used.
      */
     static void logLevelMessage(const char* function, const char* file, int line, const std::string& category,
                                 int level, char*, int, int, const std::string& message);

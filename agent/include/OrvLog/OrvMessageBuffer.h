@@ -1,5 +1,5 @@
 /**
- * The text of one log record, built by streaming: liborvlog.so.1.
+ * Builds the text of a log record by streaming: liborvlog.so.1.
  */
 #ifndef ORVLOG_ORVMESSAGEBUFFER_H
 #define ORVLOG_ORVMESSAGEBUFFER_H
@@ -10,9 +10,9 @@
 namespace OrvLog {
 
 /**
- * A text stream whose text is handed over record by record. A buffer belongs to one thread at a time.
+ * A text stream whose text is handed over record by record. Only one thread at a time may use a buffer.
  *
- * The object is one word: the library that implements it can be exchanged without rebuilding its users.
+ * The object is one word, so that the library can be replaced without rebuilding its users.
  */
 class OrvMessageBuffer {
 public:
@@ -21,21 +21,21 @@ public:
     OrvMessageBuffer(const OrvMessageBuffer&) = delete;
     OrvMessageBuffer& operator=(const OrvMessageBuffer&) = delete;
 
-    /** Appends a text. A null pointer makes the stream bad until the next hand-over. */
+    /** Appends a text. A null pointer makes the stream bad until the next call of `str`. */
     OrvMessageBuffer& operator<<(const char* text);
 
-    /** The buffer as a standard stream, for numbers, pointers and std::string values. Lives as long as the buffer. */
+    /** The buffer as a standard stream, for numbers, pointers and std::string values; valid as long as the buffer. */
     operator std::ostream&();
 
     /**
-     * Hands over what has been streamed since the last hand-over and leaves the buffer empty, and good again, for the
-     * next text.
+     * Hands over the text that has been streamed since the last call, and leaves the buffer empty, and its stream good,
+     * for the next text.
      *
-     * @return the text, valid until the next hand-over of the same buffer or its end.
+     * @return the text, valid until the next call with the same buffer, or until the buffer is destroyed.
      */
     static const std::string& str(OrvMessageBuffer& buffer);
 
-    /** The same for a stream that `operator std::ostream&` gave. */
+    /** The same for a stream that `operator std::ostream&` returned. */
     static const std::string& str(std::ostream& stream);
 
 private:

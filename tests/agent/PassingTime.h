@@ -5,7 +5,7 @@
 
 namespace AgentTest {
 
-/** Lets time pass for everything in this process that goes by the coarse clock, at once. */
+/** Advances the coarse clock for all code in this process. */
 void passTime(std::chrono::seconds time);
 
 } // namespace AgentTest

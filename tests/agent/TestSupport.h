@@ -1,5 +1,5 @@
 /**
- * What the tests of several of the agent's libraries need.
+ * Helpers for the tests of the agent's libraries.
  */
 #ifndef TESTS_AGENT_TESTSUPPORT_H
 #define TESTS_AGENT_TESTSUPPORT_H
@@ -20,7 +20,7 @@
 
 namespace AgentTest {
 
-/** A folder of its own, removed with the object. */
+/** A temporary folder, which is removed when the object is destroyed. */
 class TemporaryFolder {
 public:
     TemporaryFolder() {
@@ -69,7 +69,7 @@ inline std::string contentOf(const std::filesystem::path& file) {
     return {std::istreambuf_iterator<char>(stream), {}};
 }
 
-/** Lines that a shell command writes to its standard output. @throws std::runtime_error where it fails. */
+/** The lines that a shell command writes to its standard output. @throws std::runtime_error if it fails. */
 inline std::vector<std::string> linesOf(const std::string& command) {
     std::FILE* pipe = popen(command.c_str(), "re");
     if (pipe == nullptr) {

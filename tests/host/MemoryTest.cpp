@@ -1,11 +1,10 @@
 /**
- * What becomes of an operation, and of its host, where memory is short: each allocation that the operation makes fails
- * in turn, once alone and once with all that follow.
+ * Tests operations while memory is short: each allocation of an operation fails in turn, once alone and once with all
+ * later ones. The operation must end as expected, and the host must go on.
  *
- * The host's own allocations never fail, nor do those that happen once in a process or a thread: each operation has run
- * before. Among these are the loader's, which allocates a library's thread-local variables when a thread uses them
- * first and ends the process where it cannot, and those of the library that parses the configuration, which does the
- * same.
+ * The host's own allocations never fail. Nor do those that happen once in a process or a thread, since each operation
+ * has run before: the loader allocates a library's thread-local variables when a thread uses them first, and ends the
+ * process if it cannot; the library that parses the configuration does the same.
  */
 #include "broker.h"
 
@@ -42,7 +41,7 @@ extern const char etext;
 
 namespace {
 
-/** What is to happen to the allocations of this thread. */
+/** Which allocations of this thread fail. */
 struct Shortage {
     bool counting = false;
     unsigned int allocations = 0;
@@ -53,7 +52,7 @@ struct Shortage {
 
 constinit thread_local Shortage shortage;
 
-/** Whether an allocation that is asked for at an address is to fail. */
+/** Whether an allocation for the caller at this address must fail. */
 bool fails(const void* caller) {
     const auto address = reinterpret_cast<std::uintptr_t>(caller);
     const bool isHost = address >= reinterpret_cast<std::uintptr_t>(&__executable_start) &&
@@ -150,18 +149,18 @@ private:
     void* _provider = load(ORV_PROVIDER_LIBRARY);
 };
 
-/** One request: everything that the operation needs is made before, and the call is all that may lack memory. */
+/** One request. Everything that the operation needs is made before, so that only the call itself may lack memory. */
 using Call = std::function<CMPIStatus()>;
 using Request = std::function<Call(CMPIResult* result)>;
 
 struct Operation {
     std::string name;
     Request request;
-    /** Whether it closes its result where it did what was asked. */
+    /** Whether the operation closes its result when it succeeds. */
     bool closes = true;
 };
 
-/** How a request ended. */
+/** The outcome of a request. */
 struct Outcome {
     bool threw = false;
     CMPIrc code = CMPI_RC_OK;
@@ -189,7 +188,9 @@ Outcome run(const Operation& operation, unsigned int failing, bool allThatFollow
     return outcome;
 }
 
-/** What has been written to standard error since it was asked last. Standard error is a file from the first time on. */
+/**
+ * The text that was written to standard error since the last call. From the first call on, standard error is a file.
+ */
 class StandardError {
 public:
     explicit StandardError(const std::string& file) : _file(open(file.c_str(), O_RDWR | O_CREAT | O_APPEND, 0600)) {
@@ -210,12 +211,12 @@ private:
     off_t _read = 0;
 };
 
-/** The allocation that fails now, where the parent of the process sees it. */
+/** The number of the allocation that fails now, in memory that the parent process shares. */
 struct Progress {
     unsigned int failing;
     bool allThatFollow;
     unsigned int allocations;
-    /** What was wrong, where anything was. */
+    /** What was wrong; empty if nothing was. */
     char complaint[4096];
 };
 
@@ -224,7 +225,7 @@ void complain(Progress& progress, const std::string& text) {
     _exit(EXIT_FAILURE);
 }
 
-/** Lets each allocation of an operation fail; ends the process at the first that has another outcome than it should. */
+/** Makes each allocation of an operation fail; ends the process at the first unexpected outcome. */
 void failEachAllocation(const Operation& operation, Progress& progress, const std::string& errors) {
     const Outcome usual = (run(operation, 0, false), run(operation, 0, false));
     if (usual.threw || usual.code != CMPI_RC_OK || usual.text.empty() || usual.closed != operation.closes) {
@@ -241,8 +242,8 @@ void failEachAllocation(const Operation& operation, Progress& progress, const st
             progress.allocations = progress.failing;
             const std::string reported = standardError.text();
             const bool failed = outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed;
-            // What nobody needs for the answer, such as a record of the log, may be lacking; and where the provider has
-            // to leave out what it could not read, it has to say so.
+            // Something that the answer does not need, such as a log record, may be missing. If the provider leaves out
+            // an object that it could not read, it must report that.
             if (!failed && outcome.text != usual.text && reported.find("bad_alloc") == std::string::npos &&
                 reported.find(" log 6000 ") == std::string::npos) {
                 complain(progress, "the operation succeeded and returned\n" + outcome.text + "instead of\n" +

@@ -1,6 +1,6 @@
 /*
- * A broker in plain C, as far as the providers use one. What a provider makes and returns belongs to the request that
- * runs in its thread; slots that no provider has a use for are null.
+ * A broker in plain C, with the functions that the providers call; other slots are null. The objects that a provider
+ * makes belong to the request that runs in its thread.
  */
 #ifndef HOST_BROKER_H
 #define HOST_BROKER_H
@@ -14,25 +14,25 @@
 extern "C" {
 #endif
 
-/* The tables as CMPI 2.0 has them, or those of a later object manager: a higher version, with slots behind the known
-   ones that end the program when they are called. */
+/* The function tables of CMPI 2.0, or those of a later object manager: they have a higher version, and more slots at
+   the end, which end the program when they are called. */
 enum TableLength { knownTables, longerTables };
 
-/* Answers an up-call for the instance names or the instances of a class by returning them into the result; a failure is
-   the caller's. */
+/* Answers an up-call for the instance names or the instances of a class: returns them to the result. If it fails, the
+   up-call fails. */
 typedef CMPIStatus UpCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* classPath,
                           CMPIResult* result);
 
-/* A broker of its own; it lives as long as the process. An up-call may be null: then no class has an instance. */
+/* Makes a broker, which lives as long as the process. An up-call may be null: then no class has instances. */
 const CMPIBroker* newBroker(enum TableLength length, UpCall* names, UpCall* instances);
 
-/* Between these two lies one request of the calling thread: the second frees all that was made since the first. */
+/* Begin and end a request of the calling thread. endRequest frees all objects that were made since beginRequest. */
 void beginRequest(void);
 void endRequest(void);
 
 CMPIContext* newContext(const CMPIBroker* broker);
 
-/* What a provider returns into a result is kept there as text, one line for each path, instance or value. */
+/* Makes a result. It keeps what a provider returns as text, one line for each path, instance or value. */
 CMPIResult* newResult(const CMPIBroker* broker);
 const char* returnedText(const CMPIResult* result);
 int isClosed(const CMPIResult* result);

@@ -1,11 +1,11 @@
 /*
- * An object manager's dealings with the provider library, in plain C: loads it by its file name, calls its factories
+ * Does in plain C what an object manager does with the provider library: loads it by its file name, calls its factories
  * and operations through the function tables, and unloads it.
  *
  *   provider_host LIBRARY NAMESAKES CASE
  *
- * NAMESAKES is a library that has functions of the same names as the provider library. Each case is one test; it ends
- * with exit status 1 at the first thing that is not as it should be, and says on standard error what that is.
+ * NAMESAKES is a library that has functions with the same names as the provider library. Each case is one test. At the
+ * first failure, the program prints it to standard error and ends with exit status 1.
  */
 #include "broker.h"
 
@@ -33,7 +33,7 @@ static _Noreturn void fail(const char* file, int line, const char* what, const c
 #define EXPECT_TEXT(actual, expected)                                                                                  \
     (strcmp((actual), (expected)) == 0 ? (void)0 : fail(__FILE__, __LINE__, "unexpected " #actual, (actual)))
 
-/* The loaded library, and what its nine factories gave. */
+/* The loaded library, and the providers that its nine factories returned. */
 
 enum { classes = 5, associations = 3 };
 
@@ -114,7 +114,7 @@ static void unload(struct Providers* providers) {
 
 /* Requests */
 
-/* What the simulated machine of this test yields. */
+/* The instances of this test's simulated machine. */
 #define SERVICE                                                                                                        \
     "//host.example/root/cimv2:TALVO_PowerManagementService( CreationClassName=\"TALVO_PowerManagementService\""       \
     " Name=\"PowerStateManagement_system\" SystemCreationClassName=\"TALVO_ComputerSystem\""                           \
@@ -130,7 +130,7 @@ static CMPIObjectPath* classPath(const CMPIBroker* broker, const char* className
     return CMNewObjectPath(broker, "root/cimv2", name, NULL);
 }
 
-/* Answers the up-call for the one computer system there is. */
+/* Answers the up-call with the only computer system. */
 static CMPIStatus oneComputerSystem(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                                     CMPIResult* result) {
     (void)context;
@@ -157,7 +157,7 @@ static void expectService(const struct Providers* providers, const CMPIBroker* b
     endRequest();
 }
 
-/* Every operation that reads, and the method; what they return, as one text for free(). */
+/* Calls every operation that reads, and the method. @return their results as one text, to be freed with free(). */
 static char* everything(const struct Providers* providers, const CMPIBroker* broker) {
     char* text = NULL;
     size_t size = 0;
@@ -290,7 +290,7 @@ static void loadedAThousandTimes(void) {
         cleanUp(&providers, 0);
         unload(&providers);
     }
-    /* Whatever a load leaves behind is at least a block; a few in all are what the allocator keeps at hand. */
+    /* If each load leaked, it would leak at least one block. A few blocks in all may stay with the allocator. */
     const size_t grown = mallinfo2().uordblks - allocated;
     EXPECT((ptrdiff_t)grown < (ptrdiff_t)((loads - warmUp) * sizeof(void*)));
     EXPECT(mappings() == mapped);
@@ -402,7 +402,7 @@ static const struct {
     {"served-by-a-later-object-manager", servedByALaterObjectManager},
 };
 
-/* A machine for this process alone, with its configuration and its state in a folder of its own. */
+/* A simulated machine for this process only: its configuration and state are in a temporary folder. */
 static char folder[] = "/tmp/provider_host.XXXXXX";
 static char configurationFile[sizeof folder + 16];
 

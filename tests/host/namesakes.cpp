@@ -1,6 +1,6 @@
 /**
- * A library with functions and objects of the same names as the provider library has: its factories, and what it keeps
- * to itself. None is ever to be called on the provider library's behalf.
+ * A library with the same names of functions and objects as the provider library: those of its factories and of its
+ * hidden symbols. The provider library must never call these.
  */
 #include "PowerStateManagement.h"
 #include "cmpift.h"

@@ -1,4 +1,4 @@
-/** How an operation of the object manager failed, for tests. */
+/** Helpers for tests of operations that fail with a CimError. */
 #ifndef TESTS_OBJECTMANAGER_CIMERRORS_H
 #define TESTS_OBJECTMANAGER_CIMERRORS_H
 
@@ -11,7 +11,7 @@
 
 namespace ObjectManager {
 
-/** The code and text of the CimError that `call` throws; a failure of the test where it throws none. */
+/** The code and text of the CimError that `call` throws; if it throws none, the test fails. */
 template <typename Call>
 CimError errorOf(Call call) {
     try {

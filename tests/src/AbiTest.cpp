@@ -1,5 +1,5 @@
 /**
- * The built library's file: what it exports, what it is called, and what it needs.
+ * The built library's file: its exports, its names, and the libraries that it needs.
  */
 #include "ProviderLibrary.h"
 #include "Transcript.h"

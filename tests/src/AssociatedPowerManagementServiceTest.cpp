@@ -1,5 +1,5 @@
 /**
- * What is particular to TALVO_AssociatedPowerManagementService: the power states, and whose they are.
+ * What is particular to TALVO_AssociatedPowerManagementService: the power states, and the nodes from which they come.
  */
 #include "Associations.h"
 

@@ -1,5 +1,5 @@
 /**
- * EnumInstanceNames, EnumInstances and GetInstance of the three associations. What differs between them is data.
+ * EnumInstanceNames, EnumInstances and GetInstance of the three associations, whose differences are data.
  */
 #include "Associations.h"
 

@@ -1,6 +1,6 @@
 /**
- * Associators, AssociatorNames, References and ReferenceNames of the three associations, from either end. What differs
- * between them is data.
+ * Associators, AssociatorNames, References and ReferenceNames of the three associations, from either end. The
+ * associations' differences are data.
  */
 #include "Associations.h"
 

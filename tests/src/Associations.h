@@ -1,5 +1,6 @@
 /**
- * The three associations as their providers' users see them: what is linked, in which order, and what is reported.
+ * The three associations as their providers' users see them: which objects are linked in which order, and what is
+ * logged.
  */
 #ifndef SRC_ASSOCIATIONS_H
 #define SRC_ASSOCIATIONS_H
@@ -27,9 +28,9 @@ struct OperationTexts {
 struct End {
     std::string property;
     std::string className;
-    /** Where its objects come from; null for computer systems, which come through the object manager. */
+    /** The class of its objects; null for computer systems, which come through the object manager. */
     const ElementClass* element;
-    /** What is reported where its objects are asked for and cannot be got. */
+    /** The texts that are logged if its objects are not available. */
     OperationTexts failures;
     /** Whether AssociatorNames puts its paths into the source's namespace and on the managed system. */
     bool namesPlaced = false;
@@ -37,7 +38,7 @@ struct End {
     Lines resultClasses = {};
 };
 
-/** What is reported where the pairs cannot be had. */
+/** The texts that are logged if the pairs are not available. */
 struct PairTexts {
     std::string noServices;
     std::string nullService;

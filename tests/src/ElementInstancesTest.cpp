@@ -1,5 +1,6 @@
 /**
- * The instance operations of the two element classes, through the built library. What both share is one suite for both.
+ * The instance operations of the two element classes, through the built library. One suite tests what both classes
+ * share.
  */
 #include "Expected.h"
 #include "ProviderLibrary.h"

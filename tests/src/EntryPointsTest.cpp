@@ -280,8 +280,8 @@ TEST_F(EntryPoints, BothProvidersOfAFileShareItsBroker) {
 }
 
 /**
- * What fails first is always something else: a record without an instance ID, and the factory makes the instances of
- * capabilities without ever failing. The library has these texts for the day when that changes.
+ * The library has texts for two failures that cannot happen: another failure always comes first (a record without an
+ * instance ID), or the factory never reports one (instances of capabilities).
  */
 TEST_F(EntryPoints, TheLibraryHasTextsForFailuresThatCannotHappen) {
     std::ifstream file(ProviderLibrary::file, std::ios::binary);

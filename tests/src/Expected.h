@@ -1,5 +1,5 @@
 /**
- * The vocabulary of expected transcripts: what a step of the provider library looks like from outside.
+ * Expected transcripts: the lines that each step of the provider library leaves.
  */
 #ifndef SRC_EXPECTED_H
 #define SRC_EXPECTED_H
@@ -46,7 +46,7 @@ struct Source {
     std::string message(int level, const std::string& function, const std::string& text) const;
     std::string variable(const std::string& function, const std::string& name, const std::string& value) const;
 
-    /** What stands at the beginning and at the end of a provider's operation. */
+    /** The lines at the beginning and at the end of a provider's operation. */
     Lines entry(const std::string& operation) const;
     Lines exit(const std::string& operation) const;
 

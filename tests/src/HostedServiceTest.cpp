@@ -1,6 +1,6 @@
 /**
- * What is particular to TALVO_PowerManagementHostedService: the result class of associators, and what a property list
- * takes away.
+ * What is particular to TALVO_PowerManagementHostedService: the result class of associators, and the properties that a
+ * property list leaves out.
  */
 #include "Associations.h"
 

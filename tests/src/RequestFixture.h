@@ -19,7 +19,7 @@ class RequestFixture : public testing::Test {
 protected:
     RequestFixture() { transcript.clear(); }
 
-    /** Whatever a test did, nothing of the agent's libraries may be left over. */
+    /** Expects that no object of the agent's libraries is left over, whatever the test did. */
     ~RequestFixture() override {
         EXPECT_EQ(agent.messageBuffers, 0);
         EXPECT_EQ(agent.instrumentations, 0);

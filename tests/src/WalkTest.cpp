@@ -1,6 +1,6 @@
 /**
- * The graph of computer systems, services and capabilities as a client walks it: along all three associations, by names
- * and by instances, there and back. Whichever operation is asked, the same objects are linked.
+ * Walks the graph of computer systems, services and capabilities as a client does: along all three associations, by
+ * names and by instances, in both directions. All operations must link the same objects.
  */
 #include "Associations.h"
 

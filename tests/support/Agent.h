@@ -1,5 +1,5 @@
 /**
- * What the stand-ins for the agent's libraries answer. They record what they are asked into the transcript.
+ * The answers of the stand-ins for the agent's libraries. The stand-ins record all calls in the transcript.
  */
 #ifndef SUPPORT_AGENT_H
 #define SUPPORT_AGENT_H
@@ -23,11 +23,11 @@ struct Node {
     std::optional<std::vector<unsigned int>> powerStates;
 };
 
-/** The script of one test. Faults are found by the name of the member or function, e.g. "selectNode". */
+/** The agent of one test: its answers and faults. Faults have the name of a member or function, e.g. "selectNode". */
 struct Agent {
     static Agent& instance();
 
-    /** Back to a machine without nodes. */
+    /** Resets everything to a machine without nodes. */
     void reset();
 
     std::vector<Node> nodes;
@@ -37,11 +37,11 @@ struct Agent {
     unsigned int language = 7;
     /** Texts by resource id; an id that is not here is its own text. */
     std::map<std::wstring, std::wstring> texts;
-    /** What `isObjPathsEqual` returns; false where there is none. */
+    /** Decides what `isObjPathsEqual` returns; without it, false. */
     std::function<bool(const CMPIObjectPath*, const CMPIObjectPath*, bool)> pathsEqual;
     Faults faults;
 
-    /** Objects of each class that live now. */
+    /** The number of objects of each class that exist now. */
     std::atomic<int> messageBuffers = 0;
     std::atomic<int> instrumentations = 0;
 };

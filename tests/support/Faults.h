@@ -1,5 +1,5 @@
 /**
- * What goes wrong on purpose: which call, which time, and how.
+ * Faults that a test injects: which call goes wrong, at which occurrence, and how.
  */
 #ifndef SUPPORT_FAULTS_H
 #define SUPPORT_FAULTS_H
@@ -14,18 +14,18 @@
 
 namespace OrvTest {
 
-/** How a call departs from the usual. */
+/** How a call goes wrong. */
 struct Fault {
     enum class Object { usual, null, withoutHandle };
 
-    /** What the call returns, where it returns an object. */
+    /** What the call returns, if it returns an object. */
     Object object = Object::usual;
     /** The code and message that the call reports instead of CMPI_RC_OK. */
     std::optional<CMPIrc> status = {};
     CMPIString* message = nullptr;
-    /** Leaves the caller's status as it is. */
+    /** Whether the call leaves the caller's status as it is. */
     bool leavesStatus = false;
-    /** Done first; may throw, then the call does nothing else. */
+    /** Called first. If it throws, the call does nothing else. */
     std::function<void()> action = {};
 };
 
@@ -56,10 +56,10 @@ public:
     /** Makes the `occurrence`th call of that name from now on (1 is the next one) go wrong. */
     void at(const std::string& call, unsigned int occurrence, Fault fault);
 
-    /** Makes every call of that name go wrong, where `at` does not say otherwise. */
+    /** Makes every call of that name go wrong, unless `at` says otherwise. */
     void always(const std::string& call, Fault fault);
 
-    /** To be asked once by each call: what is to go wrong now. Passes on what the fault's action throws. */
+    /** Each call asks once for its fault. @return the fault. Throws what the fault's action throws. */
     Fault next(const std::string& call);
 
     void clear();

@@ -1,5 +1,5 @@
 /**
- * The built provider library, found and used as an object manager does it: by file name and exported factories.
+ * Loads and uses the built provider library as an object manager does: by its file name and exported factories.
  */
 #ifndef SUPPORT_PROVIDERLIBRARY_H
 #define SUPPORT_PROVIDERLIBRARY_H

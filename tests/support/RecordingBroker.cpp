@@ -17,7 +17,7 @@ bool sameName(const std::string& left, const std::string& right) {
     return strcasecmp(left.c_str(), right.c_str()) == 0;
 }
 
-/** The broker's side of an object: who made it and what it is called. */
+/** What the broker knows about an object: which broker made it, and its name. */
 struct Named {
     RecordingBroker* broker;
     std::string name;
@@ -113,7 +113,7 @@ Result& self(const CMPIResult* object) {
     return static_cast<Result&>(const_cast<CMPIResult&>(*object));
 }
 
-/** Brokers are handed round as const by CMPI; every one here is a RecordingBroker. */
+/** CMPI passes brokers as const pointers; here, each one is a RecordingBroker. */
 RecordingBroker& self(const CMPIBroker* broker) {
     return static_cast<RecordingBroker&>(const_cast<CMPIBroker&>(*broker));
 }
@@ -162,7 +162,7 @@ std::string shownType(CMPIType type) {
     return found == typeNames.end() ? "type " + std::to_string(type) : found->second;
 }
 
-/** The value as it comes, without taking texts over. All of it is copied, as some object managers do. */
+/** The data for a value; texts are not copied. The whole value is copied, as some object managers do. */
 CMPIData plainData(const CMPIValue* value, CMPIType type) {
     CMPIData data = nullValue(type);
     if (value != nullptr && type != CMPI_null) {
@@ -215,10 +215,10 @@ std::string shown(const CMPIData& data) {
 
 /* Calls */
 
-/** What a reading does for the transcript, a call does as well; only the transcript keeps them apart. */
+/** Whether a call is recorded as a call or as a reading; only the transcript treats them differently. */
 enum class Weight { call, reading };
 
-/** One call on the broker or an object of it: its line in the transcript and what is to go wrong in it. */
+/** One call of the broker or of one of its objects: its line in the transcript, and its fault. */
 class Call {
 public:
     Call(RecordingBroker& broker, const std::string& object, const char* slot, const std::string& arguments,
@@ -365,7 +365,7 @@ struct RecordingBroker::Objects {
     Instance* newInstance(const std::string& objectName, const CMPIObjectPath* path);
     Enumeration* newEnumeration(std::vector<CMPIData> elements);
 
-    /** Data as the broker keeps it: texts are taken over. */
+    /** The data that the broker keeps: texts are copied. */
     CMPIData stored(const std::string& owner, const char* entry, CMPIData data);
 };
 
@@ -380,7 +380,7 @@ CMPIStatus releaseObject(Object* object) {
     return call.done();
 }
 
-/** Ends a call that makes an object or hands one over, as its fault wants it. */
+/** Ends a call that makes or returns an object, as its fault says. */
 template <typename Object, typename Make>
 Object* deliver(Call& call, CMPIStatus* status, Make make) {
     Object* object = call.fault().object == Fault::Object::null ? nullptr : make();

@@ -1,13 +1,14 @@
 /**
- * A CMPI broker for tests: it does what an object manager does, writes every call with its arguments into the
- * transcript, and goes wrong where it is told to.
+ * A CMPI broker for tests: it does what an object manager does, records every call with its arguments in the
+ * transcript, and fails where a test tells it to.
  *
- * Objects made by a provider are named by kind and number ("path#1", "instance#2"), those made by a test by the test;
- * what belongs to another object by its owner ("path.Name", "instance#1.path"). A call that could have reported its
- * status but was given a null status pointer ends with "no status". Readings in the sense of the transcript are the
- * characters of a string, the namespace of a path, and whether an enumeration goes on.
+ * The name of an object that a provider makes has its kind and number ("path#1", "instance#2"); a test names the
+ * objects that it makes; the name of an object that belongs to another one begins with its owner ("path.Name",
+ * "instance#1.path"). The line of a call with a null status pointer ends with "no status". Readings, as the transcript
+ * defines them, are reading the characters of a string, the namespace of a path, and whether an enumeration has more
+ * elements.
  *
- * Slots that no provider here has a use for report CMPI_RC_ERR_NOT_SUPPORTED and are recorded like all others.
+ * Slots that no provider here uses report CMPI_RC_ERR_NOT_SUPPORTED, and are recorded like all others.
  */
 #ifndef SUPPORT_RECORDINGBROKER_H
 #define SUPPORT_RECORDINGBROKER_H
@@ -28,22 +29,22 @@ public:
     /** `name` stands before the calls on this broker in the transcript. */
     explicit RecordingBroker(const std::string& name = "broker");
 
-    /** Ends the life of every object that it made. */
+    /** Destroys every object that it made. */
     ~RecordingBroker();
     RecordingBroker(const RecordingBroker&) = delete;
     RecordingBroker& operator=(const RecordingBroker&) = delete;
 
-    /** What goes wrong, by the name of the slot in the function table, e.g. "newObjectPath". */
+    /** The faults, by the name of the slot in the function table, e.g. "newObjectPath". */
     Faults faults;
 
-    /** What the up-calls yield, by class name. Other classes yield nothing. */
+    /** The results of up-calls, by class name. Those for other classes are empty. */
     std::map<std::string, std::vector<CMPIObjectPath*>> instanceNames;
     std::map<std::string, std::vector<CMPIInstance*>> instances;
 
     /** The key properties of classes, as a schema has them; setting one on an instance also sets it in its path. */
     std::map<std::string, std::vector<std::string>> keyProperties;
 
-    /** What a provider has handed over. */
+    /** What a provider has returned to a result. */
     struct Returned {
         std::vector<const CMPIInstance*> instances;
         std::vector<const CMPIObjectPath*> paths;
@@ -65,8 +66,7 @@ public:
                          const std::vector<std::pair<std::string, std::string>>& keys = {});
     CMPIInstance* instance(const std::string& name, const CMPIObjectPath* path);
 
-    /** The newest path of that name in the transcript, whoever made it. Throws std::out_of_range where there is none.
-     */
+    /** The newest path of that name in the transcript, whoever made it. Throws std::out_of_range if there is none. */
     CMPIObjectPath* pathCalled(const std::string& name);
 
     CMPIString* string(const std::string& name, const std::string& text);

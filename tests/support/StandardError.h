@@ -1,5 +1,5 @@
 /**
- * What the process writes to standard error while this object lives.
+ * Captures what the process writes to standard error while this object exists.
  */
 #ifndef SUPPORT_STANDARDERROR_H
 #define SUPPORT_STANDARDERROR_H

@@ -1,5 +1,6 @@
 /**
- * What the other tests rely on: that the transcript hides nothing that matters, and that the broker behaves like one.
+ * Tests what the other tests rely on: the transcript hides nothing that matters, and the broker behaves like that of an
+ * object manager.
  */
 #include "RecordingBroker.h"
 #include "Transcript.h"

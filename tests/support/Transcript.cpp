@@ -28,7 +28,7 @@ bool isPair(const LogRecord& first, LogRecord second) {
     return first == second && first.usualArguments;
 }
 
-/** Where the first line number in a text begins and ends; npos where there is none. */
+/** The begin and end of the first line number in a text; npos if there is none. */
 std::pair<std::size_t, std::size_t> findLineNumber(const std::string& text) {
     for (const std::string& before : {std::string("Line: "), std::string(" at line ")}) {
         const std::size_t found = text.find(before);

@@ -1,5 +1,6 @@
 /**
- * The one list of everything that a test's provider did: broker calls, log records, calls on the agent's libraries.
+ * The list of everything that a provider did in a test: calls of the broker, log records, calls of the agent's
+ * libraries.
  */
 #ifndef SUPPORT_TRANSCRIPT_H
 #define SUPPORT_TRANSCRIPT_H
@@ -16,7 +17,7 @@ namespace OrvTest {
 
 using Lines = std::vector<std::string>;
 
-/** One record as the log library got it. */
+/** One record as the log library received it. */
 struct LogRecord {
     enum class Kind { log, trace };
 
@@ -27,7 +28,7 @@ struct LogRecord {
     std::string file;
     int line;
     std::string text;
-    /** Whether the three arguments without a name were null, 0 and 0. */
+    /** Whether the three unnamed arguments were null, 0 and 0. */
     bool usualArguments;
 
     bool operator==(const LogRecord&) const = default;
@@ -36,8 +37,8 @@ struct LogRecord {
 /**
  * The transcript of one process; may be written from several threads at once.
  *
- * There are calls, which a test compares, and readings: looking at texts and states, which a provider may do as often
- * as it likes (a string's characters, a path's namespace, the system name, a message buffer).
+ * It has calls, which a test compares, and readings of texts and states, which a provider may make as often as it likes
+ * (a string's characters, a path's namespace, the system name, a message buffer).
  */
 class Transcript {
 public:
@@ -58,19 +59,19 @@ public:
      */
     Lines calls() const;
 
-    /** Calls and readings in order, nothing folded and nothing replaced. */
+    /** Calls and readings in order, without any line folded or replaced. */
     Lines everything() const;
 
     /** Forgets lines and numbers, not the names of objects, and ends a pause. */
     void clear();
 
-    /** Keeps no line and no name until the next `clear`, for tests that do a great deal and look at results only. */
+    /** Keeps no line and no name until the next `clear`, for tests with very many calls that check only results. */
     void pause();
 
-    /** A name for the next object of a kind: "path#1", "path#2", ... */
+    /** The name for the next object of a kind: "path#1", "path#2", ... */
     std::string nextName(const std::string& kind);
 
-    /** Names what stands at an address, until `forget`. */
+    /** Gives the object at an address a name, until `forget`. */
     void name(const void* address, const std::string& name);
     void forget(const void* address);
 

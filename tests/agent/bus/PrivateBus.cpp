@@ -57,7 +57,7 @@ void forgetSystemBus() {
 }
 
 Child::Child(const std::vector<std::string>& arguments, int inherited, const std::string& errors) {
-    // A test program that is killed takes it along; it would hold the program's output open otherwise.
+    // The child is killed together with the test program: else it would keep the program's output open.
     std::vector<char*> pointers;
     for (const char* argument : {"/usr/bin/setpriv", "--pdeathsig", "KILL", "--"}) {
         pointers.push_back(const_cast<char*>(argument));
@@ -69,7 +69,7 @@ Child::Child(const std::vector<std::string>& arguments, int inherited, const std
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
     if (inherited >= 0) {
-        // To the same number: it stays open in the child.
+        // Duplicated to the same number, the descriptor stays open in the child.
         posix_spawn_file_actions_adddup2(&actions, inherited, inherited);
     }
     if (!errors.empty()) {
@@ -97,7 +97,7 @@ PrivateBus::PrivateBus(const std::string& policy) {
                      "--print-address=" + std::to_string(ends[1])},
                     ends[1], _folder / "errors");
     close(ends[1]);
-    // It writes its address when it listens there.
+    // The bus writes its address when it listens.
     std::array<char, 1000> text{};
     const ssize_t size = read(ends[0], text.data(), text.size());
     close(ends[0]);
@@ -129,7 +129,7 @@ std::vector<std::string> PrivateBus::requests() const {
     std::vector<std::string> requests;
     std::istringstream lines(contentOf(_folder / "calls"));
     for (std::string line; std::getline(lines, line);) {
-        // Behind the time.
+        // The call stands behind the time.
         const std::string call = line.substr(line.find(' ') + 1);
         for (const char* method : {"Reboot", "PowerOff", "ScheduleShutdown", "CancelScheduledShutdown"}) {
             if (call == method || call.starts_with(method + std::string(" "))) {

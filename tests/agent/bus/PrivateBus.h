@@ -1,5 +1,5 @@
 /**
- * A message bus of the test's own in place of the machine's, with a systemd-logind that is only played.
+ * A message bus for tests in place of the machine's, with a mock of systemd-logind.
  */
 #ifndef TESTS_AGENT_PRIVATEBUS_H
 #define TESTS_AGENT_PRIVATEBUS_H
@@ -15,22 +15,22 @@
 namespace AgentTest {
 
 /**
- * Throws std::runtime_error unless everything that this process and its children do on "the system bus" goes to a bus
- * in `folder`. Called before anything is done that could bring a machine down.
+ * Throws std::runtime_error unless "the system bus" of this process and its children is a bus in `folder`. Tests call
+ * this before anything that could shut down a machine.
  */
 void requireBusIn(const TemporaryFolder& folder);
 
-/** Makes an address that leads nowhere the system bus's for this process: what forgets to set another one fails. */
+/** Sets an unusable address of the system bus for this process: a test that forgets to set another one fails. */
 void forgetSystemBus();
 
-/** A child process, ended with the object. */
+/** A child process, which is ended when the object is destroyed. */
 class Child {
 public:
     Child() = default;
     /**
-     * @param arguments the program's file first.
-     * @param inherited a descriptor that the child has, too.
-     * @param errors the file of its standard error; where it is empty, that of this process.
+     * @param arguments the program's file, followed by its arguments.
+     * @param inherited a descriptor that stays open in the child.
+     * @param errors the file for the child's standard error; if it is empty, that of this process is used.
      */
     explicit Child(const std::vector<std::string>& arguments, int inherited = -1, const std::string& errors = "");
     Child(Child&& other) noexcept : _process(std::exchange(other._process, -1)) {}
@@ -56,13 +56,16 @@ public:
     PrivateBus(const PrivateBus&) = delete;
     PrivateBus& operator=(const PrivateBus&) = delete;
 
-    /** Starts a systemd-logind. @param parameters of logind_mock.py, as JSON. */
+    /** Starts the mock of systemd-logind. @param parameters of logind_mock.py, as JSON. */
     void startLogind(const std::string& parameters = "{}");
 
-    /** Ends it again. */
+    /** Ends the mock of systemd-logind. */
     void endLogind() { _logind.end(); }
 
-    /** The methods that were called, in order, with their arguments: "Reboot False". Without what only reads. */
+    /**
+     * The methods that were called, in order, with their arguments, for example "Reboot False"; without methods that
+     * only read.
+     */
     std::vector<std::string> requests() const;
 
     const std::string& address() const { return _address; }

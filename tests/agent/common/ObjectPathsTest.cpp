@@ -37,7 +37,7 @@ private:
 
     static constexpr CMPIStringFT table = {CMPIVersion200, nullptr, nullptr, getCharPtr};
 
-    /** Not set where the object gives a null pointer. */
+    /** No value if the object returns a null pointer. */
     std::optional<std::string> _text;
     CMPIString _handle = {this, &table};
 };
@@ -62,10 +62,10 @@ private:
     CMPIDateTime _handle = {this, &table};
 };
 
-/** A call of the object path's that fails. */
+/** The call of the object path that fails. */
 enum class Failure { none, className, nameSpace, hostName, keyCount, key };
 
-/** An object path of an object manager: what the comparison reads of it, and nothing else. */
+/** An object path of an object manager, with only those functions that the comparison calls. */
 class FakePath {
 public:
     explicit FakePath(const char* className = "TALVO_PowerManagementService", const char* nameSpace = "root/cimv2",
@@ -97,14 +97,14 @@ private:
         CMPIData data;
     };
 
-    /** A null pointer where `value` is one: an object manager that has no such text gives no object. */
+    /** A null pointer if `value` is one: an object manager without such a text returns no object. */
     CMPIString* text(const char* value) {
         return value == nullptr ? nullptr : _strings.emplace_back(std::string(value)).handle();
     }
 
     static const FakePath& self(const CMPIObjectPath* path) { return *static_cast<const FakePath*>(path->hdl); }
 
-    /** Sets the status; whether the call does not fail. */
+    /** Sets the status. @return whether the call succeeds. */
     bool succeeds(Failure call, CMPIStatus* status) const {
         *status = {_failure == call ? CMPI_RC_ERR_FAILED : CMPI_RC_OK, nullptr};
         return _failure != call;
@@ -205,7 +205,7 @@ TEST(ObjectPaths, DifferByClassOrNamespace) {
     expectEqual(FakePath("A", "root/cimv2"), FakePath("A", "root/cimv3"), false);
     expectEqual(FakePath("A", nullptr), FakePath("A", "root/cimv2"), false);
     expectEqual(FakePath("A", nullptr), FakePath("A", nullptr), true);
-    // Case is folded for ASCII letters only: these two differ by the bit that tells cases apart.
+    // Case is folded for ASCII letters only: these two characters differ in the bit that tells cases apart.
     expectEqual(FakePath("A@"), FakePath("A`"), false);
 }
 

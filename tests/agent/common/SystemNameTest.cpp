@@ -19,11 +19,11 @@
 
 namespace {
 
-/** What the host knows about its name. */
+/** What gethostname and the name service tell about the host's name. */
 struct Host {
-    /** Null where it cannot be had. */
+    /** Null if gethostname fails. */
     const char* name;
-    /** What hosts file and name service call it in full; null where they do not know it. */
+    /** The fully qualified name in the hosts file or name service; null if they do not know the host. */
     const char* canonicalName = nullptr;
 };
 
@@ -32,7 +32,7 @@ std::atomic<int> lookups = 0;
 
 } // namespace
 
-// These stand in for the C library's in this program.
+// These replace the C library's functions in this program.
 extern "C" {
 
 int gethostname(char* name, size_t size) noexcept {
@@ -65,8 +65,8 @@ namespace {
 using AgentTest::TemporaryFolder;
 
 /**
- * The system's name as a process of its own has it, from four threads at once and once more after the host was renamed;
- * "different names" where they did not all get the same.
+ * The system's name in a new process, which asks for it from four threads at once, and once more after the host was
+ * renamed. "different names" if the answers differ.
  */
 std::string systemName(const Host& ofHost, const std::string& configuration) {
     const TemporaryFolder folder;

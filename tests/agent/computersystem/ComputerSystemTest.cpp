@@ -18,7 +18,7 @@ class SystemInstance : public testing::Test {
 protected:
     SystemInstance() { Transcript::instance().clear(); }
 
-    /** The text of a property, "not found" where there is none. */
+    /** The text of a property; "not found" if there is none. */
     std::string textOf(const CMPIInstance* instance, const char* property) {
         const CMPIData data = CMGetProperty(instance, property, nullptr);
         return (data.state & CMPI_notFound) != 0 ? "not found" : CMGetCharPtr(data.value.string);
@@ -53,7 +53,7 @@ TEST_F(SystemInstance, LacksBothArraysWithoutFacts) {
     }
 }
 
-/** A system's name and what kind of name the instance says it is. */
+/** A system's name, and the name format that the instance must have for it. */
 struct NamedFormat {
     std::string name;
     std::string format;

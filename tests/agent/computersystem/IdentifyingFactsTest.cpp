@@ -78,7 +78,7 @@ TEST_F(Facts, LeaveOutWhatCannotBeRead) {
     EXPECT_THAT(facts(), ElementsAre(IdentifyingFact{"Product name", "Box"}));
 }
 
-/** A text of the firmware and the fact that it gives, empty for none. */
+/** A text of the firmware, and the value of the fact that is made from it; empty if none is. */
 struct FirmwareText {
     const char* name;
     std::string content;
@@ -112,7 +112,7 @@ INSTANTIATE_TEST_SUITE_P(
                     FirmwareText{"Surrogate", "Box\xed\xa0\x80\n", ""}),
     [](const auto& test) { return test.param.name; });
 
-/** A line of os-release and the value that it gives, empty for none. */
+/** A line of os-release, and the value that is read from it; empty if none is. */
 struct Assignment {
     const char* name;
     std::string content;

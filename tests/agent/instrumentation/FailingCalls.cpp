@@ -10,11 +10,11 @@
 
 namespace {
 
-/** A literal; null where none fails. Writes may come until the very end of a thread. */
+/** A literal; null if no call fails. It has no destructor, since a thread may write until it has ended. */
 constinit thread_local const char* failing = nullptr;
 constinit thread_local int failure = 0;
 
-/** Whether a call fails now, and only now. */
+/** Whether this call fails; the next one then does not. */
 bool fails(const char* call) {
     if (failing == nullptr || std::strcmp(failing, call) != 0) {
         return false;
@@ -45,7 +45,7 @@ bool hasFailed() {
 
 } // namespace AgentTest
 
-// The code under test takes these from the program.
+// These replace the C library's functions for the code under test.
 extern "C" {
 
 ssize_t write(int descriptor, const void* data, size_t size) {

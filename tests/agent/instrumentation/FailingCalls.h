@@ -1,5 +1,5 @@
 /**
- * Stands in front of the system calls by which a state file is stored, so that they can fail.
+ * Replaces the system calls that store a state file, so that tests can make them fail.
  */
 #ifndef TESTS_INSTRUMENTATION_FAILINGCALLS_H
 #define TESTS_INSTRUMENTATION_FAILINGCALLS_H
@@ -7,14 +7,14 @@
 namespace AgentTest {
 
 /**
- * Has this thread's next call of write, fsync, futimens or rename fail.
+ * Makes this thread's next call of write, fsync, futimens or rename fail.
  *
- * @param call its name, a literal.
- * @param error the error number; 0 is a write(2) that writes nothing.
+ * @param call the function's name, a literal.
+ * @param error the error number; 0 makes write(2) succeed without writing anything.
  */
 void failNext(const char* call, int error);
 
-/** Whether it has failed since. */
+/** Whether the call has failed since `failNext`. */
 bool hasFailed();
 
 } // namespace AgentTest

@@ -58,11 +58,11 @@ TEST(InstrumentationLibrary, HasTheOptionalFunctionsUnderTheNamesThatTheHeaderGi
     EXPECT_EQ(dlsym(RTLD_DEFAULT, cancelRequest1Name), reinterpret_cast<void*>(&orvInstrumentationCancelRequest1));
 }
 
-/** Who asks for what this process does. */
+/** The requester in log records of requests that this process makes. */
 const std::string askedByThis =
     " [asked by instrumentation_test, process " + std::to_string(getpid()) + ", uid " + std::to_string(geteuid()) + ']';
 
-/** This process's machine: its configuration is read once, so all tests of a cursor share it. */
+/** Tests of a cursor in this process. The configuration is read once, so they share one machine. */
 class Cursor : public testing::Test {
 protected:
     static void SetUpTestSuite() {
@@ -86,7 +86,7 @@ protected:
         takeLog();
     }
 
-    /** Nothing has been asked of the machine yet. */
+    /** Each test begins without former requests. */
     void SetUp() override { std::filesystem::remove(folder() / "state.json"); }
 
     Instrumentation cursor;
@@ -98,7 +98,7 @@ private:
     }
 };
 
-/** Every member gives nothing, and leaves what it was handed alone. */
+/** Expects that every member returns nothing, and leaves its arguments unchanged. */
 void expectStandsOnNoNode(Instrumentation& cursor) {
     EXPECT_FALSE(bool(cursor));
     EXPECT_EQ(cursor.getPathToNode(), "");
@@ -266,7 +266,7 @@ TEST_F(Cursor, MayBeUsedBesideOthersInOtherThreads) {
     EXPECT_EQ(visited, 4 * 50 * 3);
 }
 
-/** Processes that use the library: the configuration holds for the life of each. */
+/** Tests with separate processes that use the library, since the configuration is read once in a process. */
 class Processes : public testing::Test {
 protected:
     void configure(const std::string& text) const { writeFile(folder / "agent.toml", text); }
@@ -276,7 +276,7 @@ protected:
                   '\n' + nodes);
     }
 
-    /** What a process writes that runs the commands of probe.cpp. */
+    /** The output of a process that runs commands of probe.cpp. */
     std::vector<std::string> run(const std::string& commands) const {
         std::vector<std::string> lines = AgentTest::linesOf("ORV_AGENT_CONFIG='" + (folder / "agent.toml").string() +
                                                             "' " + ORV_INSTRUMENTATION_PROBE + ' ' + commands);

@@ -35,7 +35,7 @@ using testing::MatchesRegex;
 using testing::Optional;
 using testing::StartsWith;
 
-// Whatever a test forgets: nothing here reaches the machine's own bus.
+// Even if a test forgets to set a bus, nothing here reaches the machine's own bus.
 const bool systemBusIsForgotten = (AgentTest::forgetSystemBus(), true);
 
 TEST(BusOfTheTests, IsNeverTheMachinesOwn) {
@@ -53,7 +53,7 @@ TEST(BusOfTheTests, IsNeverTheMachinesOwn) {
     EXPECT_THROW(requireBusIn(folder), std::runtime_error);
 }
 
-/** A machine whose systemd-logind is played. */
+/** A machine with a mock of systemd-logind. */
 class Machine : public testing::Test {
 protected:
     /** @param policy of the bus. */
@@ -281,7 +281,7 @@ TEST_F(Machine, TellsWhatIsMissingToWhoeverExaminesIt) {
                             "or end it"));
 }
 
-/** Processes that use the library: what they say, and the log lines behind it. */
+/** Tests with separate processes that use the library: their output, and the log lines behind it. */
 class Processes : public Machine {
 protected:
     using Machine::Machine;
@@ -292,7 +292,7 @@ protected:
                                                    lockFile.string() + "\"\n" + more);
     }
 
-    /** What a process writes that runs the commands of probe.cpp. */
+    /** The output of a process that runs commands of probe.cpp. */
     std::vector<std::string> run(const std::string& commands) const {
         requireBusIn(bus.folder());
         std::vector<std::string> lines =
@@ -302,9 +302,9 @@ protected:
         return lines;
     }
 
-    /** What it says of a request that is refused, where it may be that the power state cannot be read either. */
+    /** The output for a refused request. @param unreadable whether the power state cannot be read either. */
     testing::Matcher<std::vector<std::string>> refusal(const std::string& reason, bool unreadable) const {
-        // What nobody answered the first time is not waited for again.
+        // The second operation does not wait once more for an answer that did not come.
         const std::string again =
             unreadable ? "(" + reason + "|there was no answer within .* s, a moment ago)" : reason;
         const auto refused = MatchesRegex("log 10000 Corvane\\.Instrumentation Power request refused: reboot of this "
@@ -347,14 +347,14 @@ TEST_F(Processes, TellThatTheMachineIsRealWithoutAskingTheBus) {
 
 struct Failure {
     const char* name;
-    /** Of systemd-logind; null where there is none. "BUS" is the number of the bus's process. */
+    /** The mock's parameters; null for no systemd-logind. "BUS" is the number of the bus's process. */
     const char* parameters;
-    /** What the log says, as a regular expression. */
+    /** The reason in the log, as a regular expression. */
     const char* reason;
     const char* settings = "delay = 3600\n";
-    /** Of the bus. */
+    /** The policy of the bus. */
     const char* policy = "";
-    /** The power state cannot be read either, for the same reason. */
+    /** Whether the power state cannot be read either, for the same reason. */
     bool unreadable = false;
 };
 
@@ -514,10 +514,10 @@ TEST_F(Machine, HasNothingToCancelWhereNothingIsScheduled) {
     EXPECT_THAT(bus.requests(), IsEmpty());
 }
 
-/** What is left to ask at the machine's end. */
+/** What still answers while the machine goes down. */
 struct Ending {
     const char* name;
-    /** Of the systemd-logind that is there then; null where there is none. */
+    /** The parameters of the mock that runs then; null if none runs. */
     const char* parameters;
 };
 

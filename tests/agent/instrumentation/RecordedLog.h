@@ -1,5 +1,5 @@
 /**
- * Stands in for the agent's log in the programs that link it: keeps the records instead of writing them.
+ * Replaces the agent's log library in the programs that link it: keeps the records instead of writing them.
  */
 #ifndef TESTS_INSTRUMENTATION_RECORDEDLOG_H
 #define TESTS_INSTRUMENTATION_RECORDEDLOG_H
@@ -15,7 +15,7 @@ std::vector<std::string> takeLog();
 /** The kinds of the records of kind "log" since the last call, as OrvLog/Observer.h numbers them. */
 std::vector<int> takeRecordKinds();
 
-/** Takes the numbers out of who asked for a power request: "[asked by PROGRAM, process N, uid N]". */
+/** Replaces the numbers in the requester of power requests: "[asked by PROGRAM, process N, uid N]". */
 void maskRequester(std::vector<std::string>& lines);
 
 } // namespace AgentTest

@@ -35,7 +35,7 @@ using testing::Optional;
 using testing::SizeIs;
 using testing::StartsWith;
 
-/** A simulated machine of three nodes whose time is the test's. */
+/** A simulated machine of three nodes, with a clock that the test sets. */
 class Simulated : public testing::Test {
 protected:
     enum Node : std::size_t { system, blade1, blade2 };
@@ -199,7 +199,7 @@ TEST_F(Simulated, ShowsTheRequestsOfOthersFromTheNextSelectionOn) {
 }
 
 TEST_F(Simulated, GivesEachFileALaterTimeThanTheOneBefore) {
-    // Size and inode number can be those of a file before: by the time, a reader sees that there is another content.
+    // Size and inode number may be those of a former file: the time tells a reader that the content is another one.
     select()->requestPowerState(system, 9);
     std::filesystem::last_write_time(stateFile, std::filesystem::file_time_type::clock::now() + 1h);
     for (int i = 0; i < 10; ++i) {
@@ -345,9 +345,9 @@ TEST_F(Simulated, LeavesADamagedFileAloneThatCannotBeSetAside) {
 
 struct Obstacle {
     const char* name;
-    /** Puts the obstacle in the way of a state file. */
+    /** Makes the obstacle at the path of a state file. */
     std::function<void(const std::filesystem::path&)> put;
-    /** What the refusal says after the state file's name. */
+    /** The refusal's message behind the state file's name. */
     const char* problem;
 };
 
@@ -383,7 +383,7 @@ TEST_F(Simulated, CannotTellItsStatesWhereTheFileCannotBeRead) {
     EXPECT_EQ(select()->size(), 3);
 }
 
-/** A call that fails while the state is stored, and what the refusal then says after the state file's name. */
+/** A call that fails while the state is stored, and the refusal's message behind the state file's name. */
 struct FailingCall {
     const char* call;
     int error;
@@ -476,7 +476,7 @@ TEST_F(Simulated, RefusesRequestsWhereTheFolderIsAFile) {
     EXPECT_FALSE(select()->requestPowerState(system, 9).accepted);
 }
 
-/** Runs `work` in a process of its own that ends with status 0, or 1 where it throws. */
+/** Runs `work` in a child process, whose exit status is 0, or 1 if `work` throws. */
 template <typename Work>
 pid_t inProcess(Work work) {
     const pid_t child = fork();

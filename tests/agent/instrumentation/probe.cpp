@@ -1,13 +1,13 @@
 /**
- * A process that uses the instrumentation library, for the tests of what holds for a process or among several. Runs the
- * commands of its arguments one after the other, each with a cursor of its own:
+ * A program that uses the instrumentation library, for tests of what happens once in a process, or between processes.
+ * It runs the commands in its arguments one after another, each with a new cursor:
  *
  *     list               each node: its text, property 123, property 125
  *     write NODE VALUE   writes property 123 of a node
  *     machine            which machine it is
  *     stay               keeps a cursor in use, in a thread and in an object that is destroyed last
  *
- * and prints what they give, then the log records that were written meanwhile.
+ * and prints their results, then the log records that were written meanwhile.
  */
 #include "RecordedLog.h"
 
@@ -56,7 +56,7 @@ void write(const std::string& path, unsigned int value) {
     std::cout << (node.setProperty(NodeLexicon::POWER_STATE, value) ? "accepted" : "refused") << '\n';
 }
 
-/** Made before anything of the library is, and so destroyed after it. */
+/** Constructed before any object of the library, and so destroyed after them. */
 class LastUser {
 public:
     ~LastUser() {

@@ -28,7 +28,7 @@ public:
         AgentTest::writeFile(folder / "agent.toml", "");
     }
 
-    /** Where the installation has its German catalogue. */
+    /** The path of the installation's German catalogue. */
     fs::path catalogue() const { return folder / "share/locale/de/LC_MESSAGES/orv-agent.mo"; }
 
     void addCatalogue(const std::string& content) const {
@@ -36,7 +36,7 @@ public:
         AgentTest::writeFile(catalogue(), content);
     }
 
-    /** What a German program prints that finds its libraries in a folder: the caption, and before it what is logged. */
+    /** The output of a German program that loads its libraries from a folder: log records, then the caption. */
     std::vector<std::string> output(const fs::path& libraries) const {
         return AgentTest::linesOf("LC_ALL=de_DE.UTF-8 ORV_AGENT_CONFIG='" + (folder / "agent.toml").string() +
                                   "' LD_LIBRARY_PATH='" + libraries.string() + "' " ORV_LOCALE_PROBE " 2>&1");

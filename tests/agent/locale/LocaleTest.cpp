@@ -30,7 +30,7 @@ std::string textOf(const ResourceLibrary& library, const std::wstring& id) {
     return make_string(ResourceString(library, id));
 }
 
-/** The variables that decide the language; what is not set is not there. */
+/** The environment variables that decide the language. One without a value is not set. */
 struct Environment {
     std::optional<std::string> all = std::nullopt;
     std::optional<std::string> messages = std::nullopt;

@@ -16,7 +16,7 @@ namespace {
 using Norv::ResourceLibrary;
 using testing::HasSubstr;
 
-/** A catalogue with one message, number by number as the format has it. */
+/** The numbers of a catalogue with one message, in the order of the format. */
 struct CatalogueData {
     std::uint32_t magic = 0x950412de;
     std::uint32_t revision = 0;
@@ -83,7 +83,7 @@ TEST(ResourceLibraryTest, SaysWhatIsWrongWithADamagedCatalogue) {
     EXPECT_THAT(errorOf(CatalogueData{.count = 0xffffffff}.bytes()), HasSubstr("ends after 53 bytes"));
 }
 
-// Whatever happens to a catalogue, reading it either works or is refused; the sanitizers see the rest.
+// However a catalogue is damaged, it is either read or refused. The sanitizers check for invalid reads.
 TEST(ResourceLibraryTest, NoDamageIsTakenForMemory) {
     for (const char* language : {"en", "de", "ja"}) {
         const std::string whole =

@@ -1,5 +1,4 @@
-// Prints the caption in the language of the environment, as a program does that finds the library where it is
-// installed.
+// Prints the caption in the language of the environment. The program loads the library from where it is installed.
 #include "Norv/Locale.h"
 
 #include <iostream>

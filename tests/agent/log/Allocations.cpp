@@ -15,7 +15,7 @@ int LogTest::allocations() {
     return count;
 }
 
-// The library takes its operator new from the program.
+// This replaces operator new for the library, too.
 void* operator new(std::size_t size) {
     ++count;
     if (void* memory = std::malloc(size)) {

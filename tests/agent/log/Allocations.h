@@ -3,7 +3,7 @@
 
 namespace LogTest {
 
-/** How often operator new was called so far, by the test and by the library. */
+/** The number of calls of operator new so far, by the test and by the library. */
 int allocations();
 
 } // namespace LogTest

@@ -310,7 +310,7 @@ TEST(FileTest, OthersMayRenameTheFileWhileManyWrite) {
             second.join();
         }));
     }
-    // As logrotate(8) does.
+    // This is what logrotate(8) does.
     std::atomic<bool> over = false;
     std::thread rotator([&] {
         for (int number = 0; !over; ++number) {
@@ -334,15 +334,15 @@ TEST(FileTest, AFileSystemThatHangsHoldsOneThreadAndNotTheOthers) {
         LogTest::hangFiles(true);
         std::thread held([] { writeLog(6000, "held"); });
         LogTest::waitUntil([] { return LogTest::hangingWrites() == 1; });
-        // Longer than others wait for a write that is on its way.
+        // Longer than other threads wait for one that is writing.
         AgentTest::passTime(std::chrono::seconds(2));
 
-        // A child has none of the threads that hang.
+        // The child process has none of the threads that hang.
         process.run([] {
             LogTest::hangFiles(false);
             writeLog(6000, "child");
         });
-        // Would never end, were it to write.
+        // If this call wrote, it would never return.
         writeLog(6000, "first");
         writeLog(6000, "second");
 

@@ -23,7 +23,7 @@ int LogTest::hangingWrites() {
     return writes;
 }
 
-// The library takes its writev from the program.
+// This replaces the C library's writev for the library, too.
 extern "C" ssize_t writev(int descriptor, const iovec* pieces, int count) {
     struct stat status {};
     if (hanging && fstat(descriptor, &status) == 0 && S_ISREG(status.st_mode)) {

@@ -3,11 +3,10 @@
 
 namespace LogTest {
 
-/** From now on, what writes to a regular file hangs until it is told to go on, as on a file system that is out of
- * reach. */
+/** From now on, writes to regular files hang, as on a file system that is out of reach; with false, they go on. */
 void hangFiles(bool hang);
 
-/** Writes that hang now. */
+/** The number of writes that hang now. */
 int hangingWrites();
 
 } // namespace LogTest

@@ -27,7 +27,7 @@ void writeTrace(int level, const std::string& text, const std::string& category)
 }
 
 void LogProcess::configure(const std::string& text) const {
-    // In one piece, for children that are watching.
+    // Replaces the file at once, since children may be watching it.
     const auto replacement = folder / "agent.toml.new";
     AgentTest::writeFile(replacement, text);
     std::filesystem::rename(replacement, configurationFile());

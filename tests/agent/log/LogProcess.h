@@ -16,22 +16,25 @@ namespace LogTest {
 void writeLog(int level, const std::string& text, const std::string& category = "Corvane.Test");
 void writeTrace(int level, const std::string& text, const std::string& category = "Corvane.Test");
 
-/** Child processes of the test, with a folder and a configuration file that is theirs. */
+/** Child processes of the test, with a folder and a configuration file of their own. */
 class LogProcess {
 public:
-    /** What the children find in the configuration file; nothing unless this is called. */
+    /** Writes the children's configuration file, which is empty unless this is called. */
     void configure(const std::string& text) const;
 
     /** A configuration that logs to `file()` with the given lines in table [log]. */
     void configureFile(const std::string& more = "") const;
 
-    /** The children's log file. */
+    /** The path of the children's log file. */
     std::filesystem::path file() const { return folder / "agent.log"; }
 
-    /** Starts a child. A failed expectation in `body` fails the test that waits for the child. @return its id. */
+    /**
+     * Starts a child process. A failed expectation in `body` fails the test that waits for the child. @return the
+     * child's process id.
+     */
     pid_t start(const std::function<void()>& body) const;
 
-    /** Waits for a child to end and expects that it did so by itself. */
+    /** Waits for the end of a child, and expects that no signal ended it. */
     static void wait(pid_t child);
 
     void run(const std::function<void()>& body) const { wait(start(body)); }
@@ -46,12 +49,12 @@ private:
     std::filesystem::path standardErrorFile() const { return folder / "stderr"; }
 };
 
-/** Waits until something is so; fails the test where that takes longer than a minute. */
+/** Waits until a condition holds; fails the test if that takes longer than a minute. */
 void waitUntil(const std::function<bool()>& isSo);
 
 std::vector<std::string> linesOfFile(const std::filesystem::path& file);
 
-/** The lines' texts: what stands behind the sixth blank. */
+/** The texts of log lines, which begin behind the sixth blank. */
 std::vector<std::string> textsOf(const std::vector<std::string>& lines);
 
 } // namespace LogTest

@@ -102,7 +102,7 @@ TEST(MessageBufferTest, TheGlobalLocaleOfTheProgramDoesNotChangeNumbers) {
         std::string do_grouping() const override { return "\3"; }
     };
     const std::locale before = std::locale::global(std::locale(std::locale::classic(), new Grouping));
-    // More than are kept, so that some are made now.
+    // More than the pool keeps, so that some are made new.
     std::vector<std::unique_ptr<OrvMessageBuffer>> buffers(40);
     for (auto& buffer : buffers) {
         buffer = std::make_unique<OrvMessageBuffer>();

@@ -33,7 +33,7 @@ struct Seen {
     std::string text;
 };
 
-/** The records that were handed over in a thread. */
+/** The records that the observer received in this thread. */
 std::vector<Seen>& seenHere() {
     thread_local std::vector<Seen> records;
     return records;

@@ -30,8 +30,8 @@ void note(int priority, const char* format, va_list arguments) {
 
 } // namespace
 
-// The program's own syslog stands before the C library's; which of the two names is called depends on how the library
-// was hardened.
+// The program's own functions replace the C library's syslog. Which of the two names is called depends on how the
+// library was hardened.
 extern "C" {
 [[gnu::format(printf, 2, 3)]] void syslog(int priority, const char* format, ...) {
     va_list arguments;

@@ -1,6 +1,6 @@
 /*
- * For LD_PRELOAD: what the process sends to the socket of the system's journal goes to the one that the environment
- * variable TEST_JOURNAL_SOCKET names.
+ * For LD_PRELOAD: redirects what the process sends to the socket of the system's journal to the socket that the
+ * environment variable TEST_JOURNAL_SOCKET names.
  */
 #include <dlfcn.h>
 #include <sys/socket.h>

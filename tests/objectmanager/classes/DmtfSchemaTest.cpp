@@ -50,7 +50,10 @@ private:
     std::filesystem::path _folder = testing::TempDir() + "schema-with-dmtfs";
 };
 
-/** What two declarations differ in, a line each. Texts for people, and where else to look, may differ. */
+/**
+ * The differences between two declarations, one a line. Texts for people, and references to other documents, may
+ * differ.
+ */
 class Comparison {
 public:
     std::vector<std::string> differences(const Class& ours, const Class& theirs) {

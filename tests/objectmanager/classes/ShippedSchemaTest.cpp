@@ -43,7 +43,7 @@ TEST_F(ShippedSchemaTest, registersTheServiceForInstancesAndMethods) {
                                                Field(&Registration::methods, ElementsAre("RequestPowerStateChange")))));
 }
 
-/** sfcb ends where a registration has what it does not know. */
+/** sfcb terminates if a registration has a key that it does not know. */
 TEST_F(ShippedSchemaTest, registersWithSfcbInItsOwnForm) {
     const std::filesystem::path folder = ORV_SCHEMA_FOLDER;
     for (const char* name : {"orv-power-management.reg", "orv-computer-system.reg"}) {
@@ -158,7 +158,7 @@ TEST_F(ShippedSchemaTest, givesTheCapabilitiesTheirKeyAndTheirCodes) {
     EXPECT_THAT(meaningOf("PowerChangeCapabilities", 8), Optional(std::string("Graceful Shutdown Supported")));
 }
 
-/** So that the served classes can be loaded beside the whole common model, whatever else that declares. */
+/** This lets the served classes be loaded beside the whole common model, whatever else that declares. */
 TEST_F(ShippedSchemaTest, hasTheServedClassesOverrideNothingButToNarrowReferences) {
     for (const Class* served : _catalogue.all()) {
         if (!served->name.starts_with("TALVO_")) {

@@ -18,7 +18,7 @@ class LogTapTest : public testing::Test {
 protected:
     ~LogTapTest() override { dlclose(library); }
 
-    /** Logs in the calling thread. */
+    /** Writes a log record in the calling thread. */
     void log(const std::string& text, int level = 6000, int kind = OrvLog::ORDINARY_RECORD) const {
         using Log = void(int kind, int level, const char* text);
         reinterpret_cast<Log*>(dlsym(library, "TestProvider_log"))(kind, level, text.c_str());
@@ -26,7 +26,7 @@ protected:
 
     static auto hasText(const std::string& text) { return Field(&LogRecord::text, text); }
 
-    /** Uses an agent that can be listened to. */
+    /** A library that uses an agent whose log can be listened to. */
     void* const library = dlopen((testProviders / "liborvtestprovider.so").c_str(), RTLD_NOW | RTLD_LOCAL);
 };
 

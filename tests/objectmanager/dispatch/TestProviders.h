@@ -10,7 +10,7 @@
 
 namespace ObjectManager {
 
-/** Where the libraries are. */
+/** The folder of the libraries. */
 inline const std::filesystem::path testProviders = TEST_PROVIDERS;
 
 /** A class that liborvtestprovider.so serves with instances and methods. */

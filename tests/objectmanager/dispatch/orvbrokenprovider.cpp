@@ -1,4 +1,4 @@
-/* Providers that cannot be used, each for the reason that its name tells. */
+/* Providers that cannot be used. The name of each tells why. */
 #include "cmpimacs.h"
 
 #include <stdexcept>

@@ -1,6 +1,6 @@
 /*
- * A provider that behaves as the class says for which it is asked: Test_Disk well, most others in the one wrong way
- * that their name tells.
+ * A provider whose behaviour depends on the requested class: for Test_Disk it is correct, for most other classes it is
+ * wrong in the way that the class name tells.
  */
 #include "OrvLog/Observer.h"
 #include "cmpimacs.h"
@@ -23,7 +23,7 @@ CMPIStatus failed(CMPIrc code, const char* message) {
     return {code, CMNewString(broker, message, nullptr)};
 }
 
-/** What an operation was given. */
+/** The arguments of an operation. */
 struct Call {
     const CMPIContext* context;
     const CMPIResult* result;
@@ -60,7 +60,7 @@ void orvLogObserve1(const OrvLog::Observer1* given) {
     observer = given;
 }
 
-/** Logs a record; for the tests as well. */
+/** Logs a record; tests call it, too. */
 extern "C" void TestProvider_log(int kind, int level, const char* text) {
     constexpr std::string_view category = "Test.Disk";
     const OrvLog::ObservedRecord1 record{kind, level, category.data(), category.size(), text, std::strlen(text)};
@@ -190,7 +190,7 @@ const std::map<std::string, Behaviour> behaviours = {
      }},
 };
 
-/** What the path's class asks for; false where it is a disk. */
+/** Does what the path's class asks for. @return false if the class is Test_Disk. */
 bool behave(const Call& call, CMPIStatus& status) {
     const auto found = behaviours.find(CMGetCharPtr(CMGetClassName(call.path, nullptr)));
     if (found != behaviours.end()) {
@@ -293,7 +293,7 @@ CMPIStatus Test_MethodCleanup(CMPIMethodMI*, const CMPIContext*, CMPIBoolean) {
     throw std::runtime_error("no cleaning today");
 }
 
-/** Gives its arguments back, and how many there are. */
+/** Returns the method's arguments, and their number. */
 CMPIStatus Test_InvokeMethod(CMPIMethodMI*, const CMPIContext* context, const CMPIResult* result,
                              const CMPIObjectPath* path, const char* method, const CMPIArgs* in, CMPIArgs* out) {
     const Call call{context, result, path, nullptr};
@@ -314,7 +314,7 @@ CMPIStatus Test_InvokeMethod(CMPIMethodMI*, const CMPIContext* context, const CM
 
 /* Associations: none of the operations looks at the filter or closes its result, as providers may. */
 
-/** What an association operation was given, and which it is. */
+/** An association operation, and its arguments. */
 struct Walk {
     Call call;
     bool references;
@@ -333,7 +333,7 @@ void give(const Walk& walk, const CMPIInstance* instance) {
     }
 }
 
-/** A host's disk, or the association of the two. */
+/** Returns a disk of the host, or the association between both. */
 void giveDisk(const Walk& walk, const char* name) {
     if (!walk.references) {
         give(walk, disk(walk.call, name));

@@ -1,4 +1,4 @@
-/* The associations of what is shipped, from every end and as a drawing. */
+/* The associations of the shipped classes, from every end and as a drawing. */
 #include "Provided.h"
 
 #include <gmock/gmock.h>
@@ -19,11 +19,11 @@ std::string contentOf(const std::filesystem::path& file) {
     return {std::istreambuf_iterator<char>(stream), {}};
 }
 
-/** The file data/<name> has the answer. */
+/** The name of the file in data that has the expected answer. */
 struct Query {
     const char* name;
     const char* command;
-    /** SYSTEM, SERVICE or CAPABILITIES stands for the path of the machine's. */
+    /** SYSTEM, SERVICE or CAPABILITIES stands for the path of that object of the machine. */
     const char* source;
     std::vector<std::string> options;
 };
@@ -93,7 +93,7 @@ TEST_F(ProvidedTest, restrictsAssociationsByClassesTheirAncestorsAndRoles) {
     }
 }
 
-/** What is shipped, but for the registration of the computer system. */
+/** The shipped schema without the registration of the computer system. */
 class NoComputerSystemTest : public ProvidedTest {
 protected:
     NoComputerSystemTest() {

@@ -1,6 +1,6 @@
 /*
- * For LD_PRELOAD: nothing can be written to the files of the folder that the environment variable TEST_FULL_FOLDER
- * names, since the disk is full.
+ * For LD_PRELOAD: writes to files in the folder that the environment variable TEST_FULL_FOLDER names fail as on a full
+ * disk.
  */
 #include <dlfcn.h>
 #include <unistd.h>

@@ -20,10 +20,10 @@ using testing::MatchesRegex;
 using testing::Not;
 using testing::StartsWith;
 
-// Whatever a test forgets: nothing here reaches the machine's own bus.
+// Even if a test forgets to set a bus, nothing here reaches the machine's own bus.
 const bool systemBusIsForgotten = (AgentTest::forgetSystemBus(), true);
 
-/** The program on a machine whose systemd-logind is played. */
+/** The program on a machine with a mock of systemd-logind. */
 class LogindTest : public ProvidedTest {
 protected:
     LogindTest() { configureLogind("delay = 3600\n"); }
@@ -37,7 +37,7 @@ protected:
             << settings;
     }
 
-    /** On the played machine only. */
+    /** Runs orvcim with the mock only. */
     Outcome run(const std::vector<std::string>& arguments) const {
         AgentTest::requireBusIn(_bus.folder());
         return orvcim(arguments);

@@ -1,5 +1,5 @@
 /**
- * Runs a program and keeps what it did.
+ * Runs programs, and keeps their output and exit status.
  */
 #ifndef TESTS_ORVCIM_PROCESS_H
 #define TESTS_ORVCIM_PROCESS_H
@@ -15,20 +15,21 @@
 namespace OrvcimTest {
 
 struct Outcome {
-    /** The exit status; -1 where a signal ended the program. */
+    /** The exit status; -1 if a signal ended the program. */
     int status = -1;
     std::string out;
     std::string err;
 };
 
-/** A program that runs until it ends, by itself or because it is told to. Killed with the object. */
+/** A running program. It is killed when the object is destroyed. */
 class RunningProcess {
 public:
     /**
-     * @param arguments the program's file first.
-     * @param environment variables that are set for it, beside those of this process.
-     * @param typed what a person types at its terminal; where it is not given, standard input is no terminal and empty.
-     * @throws std::system_error where it cannot be started.
+     * @param arguments the program's file, followed by its arguments.
+     * @param environment variables that are set for the program, in addition to those of this process.
+     * @param typed the text that a person types on the program's terminal; without a value, standard input is empty and
+     * not a terminal.
+     * @throws std::system_error if the program cannot be started.
      */
     RunningProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
                    const std::optional<std::string>& typed = std::nullopt);
@@ -37,19 +38,19 @@ public:
     ~RunningProcess();
 
     /**
-     * Waits until it has written a text to its standard output, for a minute at most. @return what it has written so
-     * far; empty where it ended before.
+     * Waits up to a minute until the program has written a text to its standard output. @return its output so far;
+     * empty if it ended before.
      * @throws std::runtime_error after that minute.
      */
     std::string outputWith(const std::string& text) const;
-    /** As `outputWith`, for the first line, without its end. */
+    /** Waits in the same way for the first line, and returns it without its line end. */
     std::string firstLine() const;
-    /** As `outputWith`, of standard error. */
+    /** Waits in the same way for a text on standard error. */
     std::string errWith(const std::string& text) const;
-    /** What it has written to its standard error so far. */
+    /** The text that the program has written to its standard error so far. */
     std::string err() const;
     void send(int signal) const;
-    /** Waits for its end. */
+    /** Waits for the program's end. */
     Outcome wait();
 
 private:
@@ -62,7 +63,7 @@ private:
     pid_t _process = -1;
 };
 
-/** Runs a program to its end, as `RunningProcess` starts it. */
+/** Runs a program to its end; the parameters are those of `RunningProcess`. */
 Outcome runProcess(const std::vector<std::string>& arguments, const std::map<std::string, std::string>& environment,
                    const std::optional<std::string>& typed = std::nullopt);
 

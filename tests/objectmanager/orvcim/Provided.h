@@ -1,5 +1,5 @@
 /**
- * Runs orvcim with what is shipped, found where it lies beside the program: schema, provider libraries and agent, and a
+ * Runs orvcim with the shipped schema, provider libraries and agent, which it finds beside the program, and with a
  * simulated machine.
  */
 #ifndef TESTS_ORVCIM_PROVIDED_H

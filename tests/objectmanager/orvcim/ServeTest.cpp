@@ -1,4 +1,4 @@
-/* The server as a program: whom it serves where, and how it begins and ends. */
+/* The server as a program: addresses, clients and rights, its start and its end. */
 #include "Orvcim.h"
 #include "Serving.h"
 
@@ -30,7 +30,7 @@ protected:
         return start(options)->wait();
     }
 
-    /** For the name localhost. @return the file that has it and its key. */
+    /** Makes a certificate for the name localhost. @return the file that has the certificate and its key. */
     std::string makeCertificate() const {
         const std::string file = (_folder / "server.pem").string();
         const Outcome made =
@@ -60,7 +60,7 @@ TEST_F(ServeTest, saysWhereItListensAndEndsOnASignal) {
     }
 }
 
-/** A service manager's end of the protocol of sd_notify(3). */
+/** The socket of a service manager, which receives messages of sd_notify(3). */
 class NotifySocket {
 public:
     /** @param name a file, or a name outside of the file system behind an at sign. */
@@ -243,7 +243,7 @@ TEST_F(ServeTest, takesLimitsFromTheCommandLine) {
     };
     EXPECT_EQ(statusOf("--data " + std::string(101, 'x')), "413");
     EXPECT_EQ(statusOf("--data x --header 'X: " + std::string(1000, 'x') + "'"), "431");
-    // A body that is announced and does not come.
+    // The request announces a body and does not send it.
     EXPECT_EQ(statusOf("--data x --header 'Content-Length: 50'"), "408");
 }
 

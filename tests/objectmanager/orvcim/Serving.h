@@ -1,5 +1,5 @@
 /**
- * Runs "orvcim serve" with what is shipped, on a free port and a simulated machine.
+ * Runs "orvcim serve" with the shipped files, on a free port, with a simulated machine.
  */
 #ifndef TESTS_ORVCIM_SERVING_H
 #define TESTS_ORVCIM_SERVING_H

@@ -181,7 +181,7 @@ struct Thing {
         return add(result, in, out);
     }
 
-    /** Adds the numbers, and tells of the other arguments what was seen. */
+    /** Adds the numbers, and returns what it received as the other arguments. */
     static CMPIStatus add(const CMPIResult* result, const CMPIArgs* in, CMPIArgs* out) {
         CMPIUint64 sum = CMGetArg(in, "Left", nullptr).value.uint16;
         std::string seen;
@@ -266,7 +266,7 @@ struct ComputerSystem {
     }
 };
 
-/** Only the first system is associated with a service: with all of them. */
+/** Only the first system is associated with services: with all of them. */
 struct PowerAssociation {
     static Instances instances(const CMPIObjectPath* request, const char** properties) {
         CMPIObjectPath* service = CMGetObjectPath(PowerService::instances(request, nullptr).front(), nullptr);

@@ -1,4 +1,4 @@
-/* A stock client sees what the command line sees: every operation that it has, on every class. */
+/* A stock client gets the same answers as the command line, for each of its operations and every class. */
 #include "Serving.h"
 
 #include <gmock/gmock.h>
@@ -18,8 +18,8 @@ using testing::EndsWith;
 using testing::HasSubstr;
 
 /**
- * What a path or value says, whoever wrote it: the client orders keys in its own way, leaves out quotes where they
- * stand in quotes, and says through which host it came.
+ * The meaning of a path or value, whichever program wrote it: the client orders keys differently, leaves out quotes
+ * within quotes, and adds the host.
  */
 std::string essence(std::string text) {
     text = std::regex_replace(text, std::regex("(//machine[.]example|localhost:[0-9]+)/"), "");
@@ -49,11 +49,11 @@ std::string textOf(const Json& value) {
     return text;
 }
 
-/** Objects with their properties, each as lines in an order of their own. */
+/** Objects with their properties, each as lines that are sorted. */
 using Objects = std::vector<std::string>;
 
-/** From what the client prints with -nl. Properties without a value, which the command line leaves out, are left out.
- */
+/** The objects in the client's output with -nl. Properties without a value are left out, since the command line leaves
+ * them out. */
 Objects clientsObjects(const std::string& out) {
     std::vector<std::vector<std::string>> objects;
     std::istringstream stream(out);
@@ -80,7 +80,7 @@ Objects clientsObjects(const std::string& out) {
     return result;
 }
 
-/** From every object anywhere in the command line's JSON. */
+/** Collects every object anywhere in the command line's JSON. */
 void collect(const Json& json, std::vector<Json>& found) {
     if (json.is_object() && json.contains("path")) {
         found.push_back(json);
@@ -119,7 +119,7 @@ protected:
         return Json::parse(answerOf(arguments));
     }
 
-    /** Has the machine's reboot, however long it takes, end now. */
+    /** Ends the simulated machine's reboot now. */
     void rebootIsOver() const {
         const std::filesystem::path file = _folder / "state.json";
         std::stringstream state;
@@ -136,7 +136,7 @@ protected:
         return outcome.out;
     }
 
-    /** An instance as each of them names it. */
+    /** An instance's path as the client and as the command line write it. */
     struct Path {
         std::string commandLines;
         std::string clients;
@@ -222,7 +222,7 @@ TEST_P(WbemcliClassTest, knowsTheSameClass) {
 
 TEST_P(WbemcliClassTest, isToldThatNothingElseCanBeChanged) {
     const Path path = pathsOf(GetParam()).at(0);
-    // The client asks for the instance first, and takes no other property.
+    // The client gets the instance first, and sends no other property.
     std::vector<Json> found;
     collect(inProcess({"get", path.commandLines}), found);
     const auto property = found.at(0)["properties"].begin();
@@ -273,7 +273,7 @@ TEST_F(WbemcliTest, isToldWhatDoesNotExist) {
     }
 }
 
-/** With nothing but the client: from the host to its power, and a reboot that can be watched. */
+/** Uses only the client: goes from the host to its power state, and watches a reboot. */
 TEST_F(WbemcliTest, reboots) {
     configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"system\"\n");
     serve();
@@ -302,7 +302,7 @@ TEST_F(WbemcliTest, isToldWhyARequestIsRefused) {
     EXPECT_NE(outcome.status, 0);
 }
 
-/** What the guide shows as typed and printed: the lines of its blocks of that kind. */
+/** The commands and the output that the guide shows: the lines of its code blocks. */
 std::vector<std::string> guide() {
     std::ifstream file(ORVCIM_CLIENTS_GUIDE);
     std::vector<std::string> lines;

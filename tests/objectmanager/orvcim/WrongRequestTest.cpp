@@ -1,4 +1,7 @@
-/* Every wrong way to ask for a reboot: the machine does not move, the client knows why, and the log says who. */
+/*
+ * Every wrong request for a reboot: the machine's state does not change, the client gets the reason, and the log names
+ * the client.
+ */
 #include "Serving.h"
 
 #include <gmock/gmock.h>
@@ -25,7 +28,7 @@ class WrongRequestTest : public ServingTest {
 protected:
     using Environment = std::map<std::string, std::string>;
 
-    /** Where the program has AddressSanitizer, which else refuses to run behind a library that is loaded before it. */
+    /** For programs with AddressSanitizer, which otherwise refuses to run if another library is loaded before it. */
     inline static const Environment::value_type sanitizersGoSecond{"ASAN_OPTIONS", "verify_asan_link_order=0"};
 
     /** Serves root, who may do everything, and nobody, who may read. */
@@ -46,7 +49,10 @@ protected:
         return wbemcli({"cm", url(_service, user), "RequestPowerStateChange.PowerState=5,ManagedElement=" + element});
     }
 
-    /** The machine is as it was, the client was told `reason`, and the log names him beside it. */
+    /**
+     * Expects that the machine's state has not changed, that the client got `reason`, and that the log has it with the
+     * client's name.
+     */
     void expectRefused(const Outcome& outcome, const std::string& reason, const std::string& user = "root",
                        const std::string& verdict = "refused") const {
         EXPECT_NE(outcome.status, 0);
@@ -94,7 +100,7 @@ TEST_F(WrongRequestTest, findsNoAgent) {
 }
 
 TEST_F(WrongRequestTest, findsAFullDisk) {
-    // Nothing can be logged by the agent either.
+    // The agent cannot write its log either.
     serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, sanitizersGoSecond, {"TEST_FULL_FOLDER", _folder.string()}});
     expectRefused(reboot(_system), "No space left on device");
 }
@@ -134,12 +140,12 @@ TEST_F(WrongRequestTest, isRecordedWhateverItAsksFor) {
 TEST_F(WrongRequestTest, isNotRecordedWhereItOnlyReads) {
     serveUsers();
     wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", bob)});
-    // Lines are written in the order of what they tell.
+    // Log lines stand in the order of the requests.
     wbemcli({"di", url(_system, bob)});
     EXPECT_THAT(_server->errWith("change anything\n"), Not(HasSubstr("EnumerateInstanceNames")));
 }
 
-/** A socket that takes what is sent to the journal. */
+/** A socket that receives what is sent to the journal. */
 class Journal {
 public:
     explicit Journal(const std::filesystem::path& file) {
@@ -154,7 +160,7 @@ public:
     Journal& operator=(const Journal&) = delete;
     ~Journal() { close(_socket); }
 
-    /** The next entry, when it has come. */
+    /** Waits for the next entry. */
     std::string entry() const {
         std::array<char, 65536> bytes{};
         const ssize_t size = recv(_socket, bytes.data(), bytes.size(), 0);

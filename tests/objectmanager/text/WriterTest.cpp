@@ -32,7 +32,7 @@ Thing REF Next;
                                          [ In(false), Out, ValueMap{"7"}, Values{"Seven"} ] uint8 Got);
 };)mof";
 
-/** Everything that a value can be. */
+/** An instance with a property of every type. */
 Instance thing() {
     const ObjectPath next{"host", "root/cimv2", "Thing", {{"Name", stringValue("a \"b\"")}}};
     const Instance embedded{{"", "", "Part", {}},
@@ -71,7 +71,7 @@ struct FormatName {
     const char* name;
 };
 
-/** What each format makes of the same answer is in the file data/<answer>.<format>. */
+/** The file data/<answer>.<format> has the expected text of an answer in a format. */
 class WriterTest : public testing::TestWithParam<FormatName> {
 protected:
     void expectFile(const std::string& answer) const {

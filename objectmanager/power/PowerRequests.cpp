@@ -11,7 +11,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** A value that must be there. */
+/** The value of an argument that must be given. */
 const Value& requiredArgument(const MethodCall& call, std::string_view name) {
     const NamedValue* const argument = find(call.arguments, name);
     if (argument == nullptr || argument->value.isNull()) {
@@ -32,8 +32,7 @@ const ObjectPath& elementOf(const MethodCall& call) {
     return **path;
 }
 
-/** Requests go to one node, whichever service they name: throws where the service is known to be that of another one.
- */
+/** Requests go to one node, whichever service they name. Throws if the service is known to be that of another node. */
 void requireActing(const ObjectPath& service, const std::string& node) {
     constexpr std::string_view prefix = "PowerStateManagement_";
     const NamedValue* const key = find(service.keys, "Name");
@@ -53,7 +52,7 @@ std::string textOf(const std::vector<ObjectPath>& paths) {
                          : fmt::format("{}", fmt::join(texts, " or "));
 }
 
-/** The agent's records tell for whom the request was, as long as this lives. */
+/** As long as this object exists, the agent's log records name the user who made the request. */
 class OnBehalfOf {
 public:
     OnBehalfOf(const LogTap& log, const Invocation& invocation)
@@ -78,13 +77,16 @@ CimError refusal(const std::string& message) {
     return error;
 }
 
-/** The first record of a kind; null where there is none. */
+/** The first record of a kind; null if there is none. */
 const LogRecord* find(const std::vector<LogRecord>& records, OrvLog::RecordKind kind) {
     const auto found = std::ranges::find(records, static_cast<int>(kind), &LogRecord::kind);
     return found == records.end() ? nullptr : &*found;
 }
 
-/** What the provider answers. A failure that comes after the machine has accepted the request says that it did. */
+/**
+ * Calls the provider. If the call fails after the machine has accepted the request, the failure's message says that it
+ * did.
+ */
 MethodResult answerOf(const std::function<MethodResult()>& provider, const LogTap& log, std::uint64_t before) {
     try {
         return provider();

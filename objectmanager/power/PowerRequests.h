@@ -1,4 +1,4 @@
-/** What is particular to requests for another power state (CIM_PowerManagementService, DMTF DSP1027). */
+/** Rules for requests for another power state (CIM_PowerManagementService, DMTF DSP1027). */
 #ifndef POWER_POWERREQUESTS_H
 #define POWER_POWERREQUESTS_H
 
@@ -8,9 +8,9 @@
 
 namespace ObjectManager {
 
-/** The class whose method RequestPowerStateChange this is about, with its descendants. */
+/** The class of the method RequestPowerStateChange. The rules also hold for its descendants. */
 inline constexpr const char* powerManagementServiceClass = "CIM_PowerManagementService";
-/** The associations of such services with the systems whose power they manage, with its descendants. */
+/** The association between such a service and the systems whose power it manages. Its descendants count, too. */
 inline constexpr const char* associatedPowerManagementServiceClass = "CIM_AssociatedPowerManagementService";
 inline constexpr const char* requestPowerStateChangeMethod = "RequestPowerStateChange";
 
@@ -22,33 +22,34 @@ inline constexpr const char* requestPowerStateChangeMethod = "RequestPowerStateC
 std::vector<ObjectPath> systemsOf(const ObjectPath& service, const Invocation& invocation, Operations& operations);
 
 /**
- * Takes back the power request that is under way.
+ * Has the agent cancel the power request that is under way.
  *
- * @return the agent's own word on it.
- * @throws CimError with CMPI_RC_ERR_FAILED and the agent's reason where it did not, and CMPI_RC_ERR_NOT_SUPPORTED where
- *         it cannot be asked to.
+ * @return the agent's text about the cancellation.
+ * @throws CimError with CMPI_RC_ERR_FAILED and the agent's reason if it did not cancel a request, with
+ *         CMPI_RC_ERR_NOT_SUPPORTED if the agent does not offer cancellation.
  */
 std::string cancelPowerRequest(const LogTap& log);
 
 /**
- * Calls of RequestPowerStateChange. A provider may act on its one machine whatever element is named, and return 0
- * whatever the machine says. So a request is made only for an element that is associated with the service, and it
- * succeeds only where the agent says, for this very call, that it was accepted. With an agent that cannot be observed
- * the outcome is not known beyond the return value, which is what the remark says then.
+ * The rule for calls of RequestPowerStateChange. A provider may act on its one machine whatever element a request
+ * names, and may return 0 whether or not the machine accepts the request. So the rule calls the provider only if the
+ * element is associated with the service, and the call succeeds only if the agent reports, for this call, that it
+ * accepted the request. If the agent does not report outcomes, nothing but the return value is known: the remark then
+ * says so.
  */
 class PowerRequestRule final : public MethodRule {
 public:
-    /** Both outlive the rule. */
+    /** @param classes,log must outlive the rule. */
     PowerRequestRule(const ClassInformation& classes, const LogTap& log) : _classes(classes), _log(log) {}
 
     bool isAbout(std::string_view className, std::string_view method) const override;
 
     /**
-     * The remark is the agent's own word where the request was accepted.
+     * The remark of an accepted request is the agent's text.
      *
-     * @throws CimError with CMPI_RC_ERR_INVALID_PARAMETER where an argument is missing, the element is not one of
-     *         `systemsOf`, or another service than this one is known to take the requests; CMPI_RC_ERR_FAILED with the
-     * agent's reason where it refused, or was not heard to accept.
+     * @throws CimError with CMPI_RC_ERR_INVALID_PARAMETER if an argument is missing, if the element is not one of
+     *         `systemsOf`, or if it is known that another service's node gets the requests; with CMPI_RC_ERR_FAILED and
+     *         the agent's reason if the agent refused the request or did not report that it accepted it.
      */
     MethodOutcome call(const MethodCall& call, Operations& operations,
                        const std::function<MethodResult()>& provider) const override;

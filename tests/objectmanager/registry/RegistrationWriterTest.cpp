@@ -25,7 +25,7 @@ Registration disk() {
     return registration;
 }
 
-/** Served by the same provider as the disks. */
+/** A registration with the same provider as the disks. */
 Registration diskInBay() {
     Registration registration = disk();
     registration.className = "Test_DiskInBay";

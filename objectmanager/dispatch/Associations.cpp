@@ -8,7 +8,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** A class with fewer references links nothing. */
+/** An association class with fewer references links nothing. */
 constexpr std::size_t fewestReferences = 2;
 
 const ObjectPath& pathOf(const ObjectPath& path) {
@@ -55,7 +55,7 @@ AssociationWalk::AssociationWalk(const Registry& registry, const ClassInformatio
     requireDeclared(filter.resultClass, "result class");
     if (!filter.associationClass.empty() && classes->references(filter.associationClass).size() < fewestReferences) {
         throw CimError(CMPI_RC_ERR_INVALID_PARAMETER,
-                       "the class \"" + filter.associationClass + "\" is no association");
+                       "the class \"" + filter.associationClass + "\" is not an association");
     }
     for (const Registration* registration : registrations) {
         if (!filter.associationClass.empty() && !classes->isA(registration->className, filter.associationClass)) {
@@ -78,8 +78,8 @@ void AssociationWalk::requireDeclared(const std::string& className, const char* 
     }
 }
 
-/** Where the associations lead from the source in the roles that are asked for; nowhere where they do not refer to it.
- */
+/** The references by which the associations lead away from the source, within the filter's roles; none if no reference
+ * of the class can refer to the source. */
 std::vector<ReferenceEnd> AssociationWalk::farEndsOf(const Registration& registration) const {
     const std::span<const ReferenceEnd> ends = _classes->references(registration.className);
     if (ends.size() < fewestReferences) {

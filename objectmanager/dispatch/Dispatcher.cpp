@@ -30,12 +30,12 @@ CimError wrongAnswer(const Registration& registration, const std::string& what) 
     return {CMPI_RC_ERR_FAILED, registration.provider + " returned " + what};
 }
 
-/** A name as a provider gets it: where there is none, null. */
+/** A name as a provider takes it: null instead of an empty one. */
 const char* orNull(const std::string& name) {
     return name.empty() ? nullptr : name.c_str();
 }
 
-/** Adds what was found through an association class, if anything was. */
+/** Adds the objects that one association class leads to, unless there are none. */
 template <typename Object>
 void append(std::vector<Associated<Object>>& found, const AssociationStep& step, std::vector<Object> objects) {
     if (!objects.empty()) {
@@ -43,13 +43,13 @@ void append(std::vector<Associated<Object>>& found, const AssociationStep& step,
     }
 }
 
-/** Why a provider failed that does not say it. */
+/** The message for a provider that failed without a message of its own. */
 std::string reasonOf(const Registration& registration, CMPIrc code, const std::string& operation) {
     return registration.provider +
            (code == CMPI_RC_ERR_NOT_SUPPORTED ? " does not support " + operation : " gave no reason");
 }
 
-/** How a provider ended: throws where it was anything but well. */
+/** Throws unless the provider returned the status OK. */
 void requireSuccess(const Registration& registration, const std::string& operation, const CMPIStatus& status,
                     const Request& request, const Result& result) {
     std::string message = textOf(status.msg);
@@ -93,7 +93,7 @@ std::vector<Instance> instancesOf(const Result& result) {
 
 } // namespace
 
-/** What an operation gives. */
+/** What an operation answers with. */
 enum class Dispatcher::Answer { paths, instances, value, nothing };
 
 Dispatcher::Dispatcher(Registry registry, const Settings& settings)
@@ -105,9 +105,9 @@ Dispatcher::Dispatcher(Registry registry, const Settings& settings)
       }) {}
 
 /**
- * Does one operation, which messages call `operation`: `call` calls the provider with context, result and path, `take`
- * takes what it returned. `unanswered`, where it is one, is thrown where the provider neither returned anything nor
- * closed its result.
+ * Does one operation, which messages call `operation`: `call` calls the provider with context, result and path, and
+ * `take` takes the objects that the provider returned. If the provider neither returned anything nor closed its result,
+ * `unanswered` is thrown, if there is one.
  */
 template <typename Call, typename Take>
 auto Dispatcher::serve(const char* operation, const Invocation& invocation, const ObjectPath& path,
@@ -119,7 +119,7 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
         Result result(request);
         ObjectPath target = path;
         if (equalNames(target.className, registration.className)) {
-            target.className = registration.className; // as the provider spells it
+            target.className = registration.className; // spelled as the provider's registration has it
         }
         const CMPIContext* context = request.context({
             {CMPIInitNameSpace, stringValue(path.nameSpace)},
@@ -138,7 +138,7 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
         if ((answer != Answer::paths && result.pathCount() != 0) ||
             (answer != Answer::instances && result.instanceCount() != 0) ||
             (answer != Answer::value && !result.data().empty())) {
-            throw wrongAnswer(registration, "what this operation does not give");
+            throw wrongAnswer(registration, "a result of the wrong kind for this operation");
         }
         return take(result);
     } catch (CimError& error) {
@@ -254,7 +254,7 @@ bool Dispatcher::hasInstanceProvider(const ObjectPath& path) const {
     });
 }
 
-/** Whether the provider of the path's class names that instance among its own. */
+/** Whether the provider of the path's class lists that instance in its EnumInstanceNames. */
 bool Dispatcher::isNamed(const Invocation& invocation, const ObjectPath& path) {
     bool found = false;
     enumerateInstanceNames(invocation, {{}, path.nameSpace, path.className, {}},
@@ -262,14 +262,17 @@ bool Dispatcher::isNamed(const Invocation& invocation, const ObjectPath& path) {
     return found;
 }
 
-/** Of a class that has no provider of instances it is not known what there is, so whatever is named is. */
+/**
+ * Throws if the path names no instance. A class without an instance provider is not checked: its instances cannot be
+ * listed.
+ */
 void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath& path) {
     if (hasInstanceProvider(path) && !isNamed(invocation, path)) {
         throw noInstance();
     }
 }
 
-/** Of a value that is a reference, or has references as its elements. */
+/** Checks an argument that is a reference, or an array of references: each must name an instance that is there. */
 void Dispatcher::requireReference(const Invocation& invocation, const std::string& argument, const Value& value) {
     if (const auto* elements = std::get_if<Value::Array>(&value.content)) {
         for (const Value& element : *elements) {
@@ -300,9 +303,9 @@ void Dispatcher::requireReference(const Invocation& invocation, const std::strin
 namespace {
 
 /**
- * A reference as it is meant. The client wbemcli takes the first name of a namespace for a host's: from
- * root/cimv2:CLASS it makes the host root and the namespace cimv2. Where there is no such namespace, but one of both
- * names, it is that one.
+ * The reference that the client means. The client wbemcli takes the first part of a namespace for a host name: it turns
+ * root/cimv2:CLASS into the host root and the namespace cimv2. If the namespace cimv2 is not registered but root/cimv2
+ * is, the reference is one in root/cimv2.
  */
 Value meantReference(const Value& given, const Registry& registry) {
     const auto* const reference = std::get_if<std::shared_ptr<const ObjectPath>>(&given.content);
@@ -367,7 +370,7 @@ MethodResult Dispatcher::invokeMethod(const Invocation& invocation, const Object
 
 namespace {
 
-/** The failure of one association's provider, named by its class. */
+/** The error of one association's provider, with the association class in its message. */
 CimError failureOf(const Registration& registration, const CimError& error) {
     CimError failure(error.code, registration.className + ": " + error.what());
     failure.reasons = error.reasons;
@@ -377,8 +380,8 @@ CimError failureOf(const Registration& registration, const CimError& error) {
 } // namespace
 
 /**
- * Asks the provider of one association class. It leaves its result open, so that an open result is as complete as a
- * closed one. A failure names the class.
+ * Asks the provider of one association class. Association providers leave their results open, so an open result counts
+ * as complete here. The message of a failure names the class.
  */
 template <typename Call, typename Take>
 auto Dispatcher::follow(const char* operation, const Invocation& invocation, const AssociationWalk& walk,
@@ -401,7 +404,7 @@ auto Dispatcher::follow(const char* operation, const Invocation& invocation, con
     }
 }
 
-/** A provider of associations may make up references to a source that is not there. */
+/** Begins the walk at a source that exists: association providers may make up references to one that does not. */
 AssociationWalk Dispatcher::walkFrom(const Invocation& invocation, const ObjectPath& source,
                                      const AssociationFilter& filter) {
     AssociationWalk walk(_registry, _broker.classes(), source, filter);

@@ -147,7 +147,7 @@ const std::string& OperationTexts::of(const std::string& operation) const {
     if (operation == "References") {
         return references;
     }
-    throw std::invalid_argument(operation + " is no association operation");
+    throw std::invalid_argument(operation + " is not an association operation");
 }
 
 const std::vector<const Association*> associations = {&associatedService, &elementCapabilities, &hostedService};

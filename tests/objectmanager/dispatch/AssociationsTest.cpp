@@ -58,7 +58,7 @@ protected:
         return paths;
     }
 
-    /** As many words as objects: the association class and the object's name. */
+    /** One text for each object: the association class and the object's name. */
     static std::vector<std::string> wordsOf(const std::vector<Associated<ObjectPath>>& found) {
         std::vector<std::string> words;
         for (const Associated<ObjectPath>& each : found) {
@@ -69,7 +69,7 @@ protected:
         return words;
     }
 
-    /** The dispatcher of what is registered for these association classes. */
+    /** A dispatcher with the registrations of these association classes. */
     Dispatcher& serving(const std::vector<std::string>& associations) {
         std::vector<Registration> registrations = {testRegistration("Test_Disk")};
         for (const std::string& className : associations) {
@@ -103,7 +103,7 @@ TEST_F(AssociationsTest, LeadToEveryObjectOncePerAssociationInTheOrderOfRegistra
 }
 
 TEST_F(AssociationsTest, AreFollowedOnlyWhereTheyCanReferToTheSource) {
-    // A provider that is asked for Test_Between would throw.
+    // If the provider of Test_Between were called, it would throw.
     EXPECT_THAT(names(serving({"Test_Between", "Test_BootsFrom"})), ElementsAre("Test_BootsFrom a"));
     EXPECT_THAT(dispatcher->associatorNames(invocation, path("Test_Tape", "t"), {}), IsEmpty());
 }
@@ -153,7 +153,7 @@ TEST_F(AssociationsTest, AreAskedForTheirOwnClassAndToldTheFilter) {
     };
     EXPECT_EQ("Test_ShowsFilter none none none", shown({}));
     EXPECT_EQ("Test_ShowsFilter Test_Disk Host Disk", shown({"CIM_Has", "Test_Disk", "Host", "Disk"}));
-    // The class that every object at the far end has is no restriction.
+    // A class that every object at the far end has does not restrict the result.
     EXPECT_EQ("Test_ShowsFilter none none none", shown({"", "CIM_Device", "", ""}));
 }
 
@@ -237,7 +237,7 @@ TEST_F(AssociationsTest, RefuseWhatIsNotDeclaredOrServed) {
     for (const char* noAssociation : {"Test_Tape", "Test_Mirrored"}) {
         EXPECT_THAT(failure(host, {noAssociation, "", "", ""}),
                     isError(CMPI_RC_ERR_INVALID_PARAMETER,
-                            "the class \"" + std::string(noAssociation) + "\" is no association"));
+                            "the class \"" + std::string(noAssociation) + "\" is not an association"));
     }
     ObjectPath elsewhere = host;
     elsewhere.nameSpace = "root/elsewhere";

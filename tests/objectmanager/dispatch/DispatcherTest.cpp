@@ -60,7 +60,7 @@ protected:
     }
 
     /** The error of an operation on a class whose provider misbehaves; afterwards a disk is still served. */
-    template <class Call>
+    template <typename Call>
     CimError failureOf(Call call) {
         CimError error = errorOf(call);
         EXPECT_EQ(2U, dispatcher.enumerateInstances(invocation, path("Test_Disk"), std::nullopt).size());
@@ -227,7 +227,8 @@ INSTANTIATE_TEST_SUITE_P(
         Misbehaviour{"Test_ReleasesTwice", CMPI_RC_ERR_FAILED, "TestProvider released a CMPIInstance twice"},
         Misbehaviour{"Test_ReturnsAfterClose", CMPI_RC_ERR_FAILED,
                      "TestProvider returned an instance after it had closed its result"},
-        Misbehaviour{"Test_ReturnsPath", CMPI_RC_ERR_FAILED, "TestProvider returned what this operation does not give"},
+        Misbehaviour{"Test_ReturnsPath", CMPI_RC_ERR_FAILED,
+                     "TestProvider returned a result of the wrong kind for this operation"},
         Misbehaviour{"Test_AsksForItself", CMPI_RC_ERR_FAILED,
                      "requests of providers nest deeper than 16 levels: does a provider ask for itself?"}));
 

@@ -19,7 +19,7 @@ namespace {
 using Norv::Agent::Configuration;
 using Norv::Agent::LogSettings;
 
-/** What keeps the log from being written; empty where nothing does. */
+/** Why the log file cannot be written; empty if it can, or if the log does not go to a file. */
 std::string problemOf(const LogSettings& log) {
     if (log.destination != LogSettings::Destination::file) {
         return "";
@@ -66,8 +66,8 @@ AgentExamination examineAgent() {
     try {
         const Configuration configuration = Norv::Agent::loadConfiguration();
         const auto backend = Norv::Agent::makeBackend(configuration);
-        found.facts.emplace_back("configuration",
-                                 configuration.source.empty() ? "no file: defaults" : configuration.source.string());
+        found.facts.emplace_back("configuration", configuration.source.empty() ? "no file: built-in defaults"
+                                                                               : configuration.source.string());
         found.facts.emplace_back("log", describe(configuration.log));
         found.facts.emplace_back("machine", backend->machine());
         if (const std::string problem = problemOf(configuration.log); !problem.empty()) {
@@ -80,7 +80,7 @@ AgentExamination examineAgent() {
         found.problems.insert(found.problems.end(), report.problems.begin(), report.problems.end());
     } catch (const Norv::Agent::ConfigurationError& error) {
         found.problems.push_back(
-            fmt::format("{}: as long as this is so, no power-management node is offered", error.what()));
+            fmt::format("{}: until this is corrected, the agent offers no power-management node", error.what()));
     }
     return found;
 }
@@ -89,8 +89,8 @@ AgentExamination examineAgent() {
 
 namespace OrvLog {
 
-// What the agent's own code would log while it is examined: the failures are among its findings. Providers in this
-// process log with the agent's library as ever.
+// Replaces the log library for the agent's code that is linked into orvcim, which runs while the agent is examined.
+// Providers in this process log through the agent's own library.
 void OrvLogger::logLevelMessage(const char*, const char*, int, const std::string&, int, char*, int, int,
                                 const std::string& message) {
     fmt::print(stderr, "orvcim: {}\n", message);

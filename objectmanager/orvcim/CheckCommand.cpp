@@ -15,7 +15,7 @@ using Json = nlohmann::ordered_json;
 struct Finding {
     const Registration& registration;
     ProviderReport provider;
-    /** Of the class's declaration; empty where nothing is wrong. */
+    /** What is wrong with the class's declaration; empty if nothing is. */
     std::string schemaProblem;
 
     bool good() const { return provider.usable() && schemaProblem.empty(); }
@@ -128,9 +128,9 @@ void checkProviders(Session& session) {
         writeTable(session, findings, agent);
     }
     if (!unusable.empty() || findings.empty()) {
-        throw Failure(findings.empty()
-                          ? fmt::format("found no registration in {}, expected some", session.schemaFolder().string())
-                          : fmt::format("not usable: {}", fmt::join(unusable, ", ")));
+        throw Failure(findings.empty() ? fmt::format("found no registration in {}, expected at least one",
+                                                     session.schemaFolder().string())
+                                       : fmt::format("not usable: {}", fmt::join(unusable, ", ")));
     }
 }
 

@@ -25,7 +25,7 @@ using Command = void (*)(Session&);
 
 const std::map<std::string, Format> formats = {{"table", Format::table}, {"json", Format::json}, {"mof", Format::mof}};
 
-/** Declares the command line, and takes from it what was asked for. */
+/** Declares the commands and options, and parses the command line into them. */
 class CommandLine {
 public:
     CommandLine() : _app("The object manager of power management, on the command line.", "orvcim") {
@@ -36,14 +36,14 @@ public:
         associationCommands();
         powerCommands();
         addServeOptions(add(_app, "serve", "Answer WBEM clients on the network", serve), _options.serve);
-        add(_app, "check", "Say which providers load and what the agent can do, and what is wrong or missing",
+        add(_app, "check", "Report which providers load, what the agent can do, and what is wrong or missing",
             checkProviders);
     }
 
     CLI::App& app() { return _app; }
     const Options& options() const { return _options; }
 
-    /** @throws UsageError where the command line has none. */
+    /** The command to run. @throws UsageError if the command line names none. */
     Command command() const {
         if (_command == nullptr) {
             throw UsageError(fmt::format("found no command, expected one of {}", fmt::join(_names, ", ")));
@@ -51,13 +51,13 @@ public:
         return _command;
     }
 
-    /** Whether all that the command does depends on the agent. */
+    /** Whether the command can do nothing without the agent. */
     bool asksTheAgent() const { return _name != "classes" && _name != "check" && _name != "serve"; }
 
-    /** What cannot be told without the agent, as the beginning of a sentence that goes on with the reason. */
+    /** The beginning of the message for an agent that cannot be used; the reason follows it. */
     std::string whatIsMissing() const { return _name == "power status" ? "the power state is unknown: " : ""; }
 
-    /** What is wrong with a command line whose words are no command; empty where they are one. */
+    /** What is wrong with a command line that names an unknown command; empty if the command is known. */
     std::string wrongCommand() const {
         const std::vector<std::string> words = _app.remaining(true);
         const std::vector<CLI::App*> given = _app.get_subcommands();
@@ -73,7 +73,7 @@ public:
                            fmt::join(expected, ", "));
     }
 
-    /** What the command is about, as errors name it. */
+    /** The class, path or method that the command is about, as error messages name it. */
     std::string subject() const {
         return !_options.method.empty() ? _options.method : !_options.target.empty() ? _options.target : _name;
     }
@@ -89,15 +89,15 @@ private:
             ->check(CLI::IsMember(&formats).description(""))
             ->type_name("FORMAT");
         _app.add_option("--provider-path", _options.providerFolders,
-                        "Search provider libraries here first (repeatable)")
+                        "Search this folder for provider libraries first (repeatable)")
             ->type_name("DIR")
             ->allow_extra_args(false);
-        _app.add_option("--schema", _options.schemaFolder, "Folder of class declarations and registrations")
+        _app.add_option("--schema", _options.schemaFolder, "Folder with the class declarations and registrations")
             ->type_name("DIR");
     }
 
     void objectCommands() {
-        add(_app, "classes", "List the classes that are served", listClasses);
+        add(_app, "classes", "List the classes that providers serve", listClasses);
         addTarget(add(_app, "names", "List the paths of a class's instances", enumerateNames), "CLASS");
         CLI::App& instances = add(_app, "instances", "Show a class's instances", enumerateInstances);
         addTarget(instances, "CLASS");
@@ -108,16 +108,17 @@ private:
         CLI::App& invoke = add(_app, "invoke", "Call a method", invokeMethod);
         addTarget(invoke, "PATH");
         invoke.add_option("METHOD", _options.method, "Name of the method")->required()->type_name("");
-        invoke.add_option("NAME=VALUE", _options.arguments, "Arguments; for an array, one for each element")
+        invoke.add_option("NAME=VALUE", _options.arguments, "Arguments; for an array, one NAME=VALUE for each element")
             ->type_name("");
     }
 
     void associationCommands() {
         CLI::App& associators =
-            add(_app, "associators", "Show what an instance is associated with, by association", listAssociators);
+            add(_app, "associators", "Show the instances that are associated with an instance", listAssociators);
         addAssociators(associators);
         addProperties(associators);
-        addAssociators(add(_app, "associator-names", "List the paths of what an instance is associated with",
+        addAssociators(add(_app, "associator-names",
+                           "List the paths of the instances that are associated with an instance",
                            listAssociatorNames));
         CLI::App& references =
             add(_app, "references", "Show the associations that refer to an instance", listReferences);
@@ -133,10 +134,10 @@ private:
         power.fallthrough();
         power.footer(footer);
         add(power, "status", "Show the power states", powerStatus)
-            .add_flag("--watch", _options.watch, "Show every change, until the program is ended");
+            .add_flag("--watch", _options.watch, "Show every change until the program is interrupted");
         addPowerRequest(add(power, "reboot", "Reboot the machine", powerReboot));
         addPowerRequest(add(power, "shutdown", "Shut the machine down", powerShutdown));
-        add(power, "cancel", "Take back the reboot or shutdown that is under way", powerCancel);
+        add(power, "cancel", "Cancel the reboot or shutdown that is under way", powerCancel);
     }
 
     CLI::App& add(CLI::App& parent, const std::string& name, const std::string& description, Command toDo) {
@@ -163,22 +164,22 @@ private:
         addTarget(subcommand, "PATH");
         addAssociation(subcommand, "--assoc-class");
         addRestriction(subcommand, "--result-class", _options.filter.resultClass,
-                       "Follow to objects of this class or its descendants", "CLASS");
+                       "Only associated objects of this class or its descendants", "CLASS");
         addRestriction(subcommand, "--result-role", _options.filter.resultRole,
-                       "Follow where this reference refers to the other object", "NAME");
+                       "Only objects that this reference of the association refers to", "NAME");
     }
 
     void addReferences(CLI::App& subcommand) {
         addTarget(subcommand, "PATH");
-        // The result is the associations.
+        // Here the result consists of the associations, so both options mean the same.
         addAssociation(subcommand, "--assoc-class,--result-class");
     }
 
     void addAssociation(CLI::App& subcommand, const std::string& option) {
         addRestriction(subcommand, option, _options.filter.associationClass,
-                       "Follow associations of this class or its descendants", "CLASS");
-        addRestriction(subcommand, "--role", _options.filter.role, "Follow where this reference refers to the instance",
-                       "NAME");
+                       "Only associations of this class or its descendants", "CLASS");
+        addRestriction(subcommand, "--role", _options.filter.role,
+                       "Only associations whose reference of this name refers to the instance", "NAME");
     }
 
     static void addRestriction(CLI::App& subcommand, const std::string& option, std::string& value,
@@ -196,14 +197,14 @@ private:
     }
 
     void addPowerRequest(CLI::App& subcommand) {
-        subcommand.add_option("--service", _options.service, "Path of the service, where there are several")
+        subcommand.add_option("--service", _options.service, "Path of the service, if there are several")
             ->type_name("PATH");
         subcommand
             .add_flag("--wait{300}", _waitSeconds,
-                      "Wait until it is done, or as many seconds are over (--wait=SECONDS; 300 where none are given)")
+                      "Wait until the request is done, for at most SECONDS (--wait=SECONDS; --wait alone: 300)")
             ->check(CLI::Range(0.0, longestWait))
             ->each([this](const std::string& seconds) { _options.waitSeconds = std::stod(seconds); });
-        subcommand.add_flag("--yes", _options.yes, "Do not ask, whatever the machine is");
+        subcommand.add_flag("--yes", _options.yes, "Do not ask for confirmation, even if the machine is not simulated");
     }
 
     static constexpr double longestWait = 86400;
@@ -211,9 +212,9 @@ private:
     CLI::App _app;
     Options _options;
     std::string _waitSeconds;
-    /** Of all commands. */
+    /** The names of all commands. */
     std::vector<std::string> _names;
-    /** Of the one that was asked for. */
+    /** The name of the command to run. */
     std::string _name;
     Command _command = nullptr;
 };
@@ -228,7 +229,7 @@ std::string refusalText(const CimError& error) {
 }
 
 std::string failureText(const std::string& subject, const CimError& error) {
-    // That there is no such instance is all there is to say.
+    // For CMPI_RC_ERR_NOT_FOUND the message says everything; what providers logged would only repeat it.
     const std::string reasons =
         error.code == CMPI_RC_ERR_NOT_FOUND ? "" : reasonsText(error.reasons, "; the provider logged: ");
     return fmt::format("{}: {}: {}{}", subject, statusText(error.code), error.what(), reasons);
@@ -246,17 +247,17 @@ int run(int argc, const char* const* argv) {
         if (const std::string wrong = commandLine.wrongCommand(); !wrong.empty()) {
             return report(badUsage, wrong);
         }
-        return report(badUsage, fmt::format("{} (orvcim --help tells what can be done)", error.what()));
+        return report(badUsage, fmt::format("{} ('orvcim --help' lists the commands)", error.what()));
     }
     try {
         const Command command = commandLine.command();
-        // Providers would say the same in many words each.
+        // Without a configuration every provider fails; this one message replaces all of theirs.
         if (const std::string problem = commandLine.asksTheAgent() ? problemOfConfiguration() : ""; !problem.empty()) {
             return report(failed, commandLine.whatIsMissing() + problem + " ('orvcim check' says more)");
         }
         Session session(commandLine.options(), std::cout);
         command(session);
-        // Providers report some failures to nobody but the log, with an answer that is merely empty.
+        // Some failures are reported in the agent's log only: the provider's answer is just empty.
         if (const std::string logged = reasonsText(session.log().failuresSince(0), "the provider logged: ");
             !logged.empty()) {
             report(0, logged);

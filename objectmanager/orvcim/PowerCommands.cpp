@@ -20,12 +20,12 @@ namespace {
 constexpr const char* capabilitiesClass = "TALVO_PowerManagementCapabilities";
 constexpr const char* associationClass = "TALVO_AssociatedPowerManagementService";
 
-/** In between: the machine is on its way from one of the other states to another. */
+/** "Other": the machine reboots or shuts down. */
 constexpr std::uint64_t otherPowerState = 1;
 
 struct PowerRequest {
     std::uint64_t powerState;
-    /** What the person is asked about. */
+    /** Completes the question that asks for confirmation. */
     const char* verb;
 };
 
@@ -47,14 +47,14 @@ bool isServed(Session& session, const char* className) {
     }
 }
 
-/** The property for people; empty where the instance has none. */
+/** The property's value for people; empty if the instance does not have it. */
 std::string textOf(const Session& session, const Instance& instance, const char* name) {
     const NamedValue* property = find(instance.properties, name);
     const Class* known = session.catalogue().find(instance.path.className);
     return property == nullptr ? "" : plainText(property->value, known == nullptr ? nullptr : known->property(name));
 }
 
-/** The key called Name of the object that a property refers to; the whole reference where it has none. */
+/** The key Name of the object that a property refers to; the whole reference if the object has no such key. */
 std::string nameBehind(const Session& session, const Instance& instance, const char* reference) {
     const NamedValue* property = find(instance.properties, reference);
     const auto* path =
@@ -63,14 +63,14 @@ std::string nameBehind(const Session& session, const Instance& instance, const c
     return name == nullptr ? textOf(session, instance, reference) : plainText(name->value, nullptr);
 }
 
-/** A state of the association; nothing where it is not known. */
+/** The power state in an instance of the association; no value if it is not known. */
 std::optional<std::uint64_t> stateOf(const Instance& association) {
     const NamedValue* const state = find(association.properties, "PowerState");
     const auto* const number = state == nullptr ? nullptr : std::get_if<std::uint64_t>(&state->value.content);
     return number == nullptr || *number == 0 ? std::nullopt : std::optional(*number);
 }
 
-/** The power state for people, to whom "Other" alone says nothing. */
+/** The power state for people; "Other" is explained. */
 std::string stateText(const Session& session, const Instance& association) {
     const std::optional<std::uint64_t> state = stateOf(association);
     return !state ? "unknown"
@@ -89,7 +89,7 @@ Rows rowsOf(const Session& session, const std::vector<Instance>& states) {
     return rows;
 }
 
-/** Throws where nothing is known of a machine's state. */
+/** Throws if there is no state, or if one of them is not known. */
 void requireKnown(Session& session, const std::vector<Instance>& states) {
     if (states.empty() ||
         !std::ranges::all_of(states, [](const Instance& each) { return stateOf(each).has_value(); })) {
@@ -99,10 +99,10 @@ void requireKnown(Session& session, const std::vector<Instance>& states) {
     }
 }
 
-/** How often the state is looked at that is waited for. */
+/** The time between two looks at the power state. */
 constexpr std::chrono::milliseconds lookAgain{200};
 
-/** Shows the states whenever they change, until the program is ended. */
+/** Shows the states each time that they change, until the program is interrupted. */
 [[noreturn]] void watch(Session& session) {
     Rows shown;
     for (;;) {
@@ -137,13 +137,14 @@ ObjectPath serviceOf(Session& session) {
     return services.front();
 }
 
-/** Asks before a machine is acted upon that may be more than a simulation. */
+/** Asks the user for confirmation unless the machine is known to be a simulated one. */
 void confirm(Session& session, const PowerRequest& request, const std::string& systemName) {
     if (session.options().yes || session.isSimulated()) {
         return;
     }
     if (isatty(STDIN_FILENO) == 0) {
-        throw Failure(fmt::format("{} is not known to be a simulated machine: expected --yes, or a terminal to ask on",
+        throw Failure(fmt::format("{} is not known to be a simulated machine: expected --yes, or a terminal "
+                                  "on which to ask for confirmation",
                                   systemName));
     }
     std::cerr << fmt::format("Really {} {}? [y/N] ", request.verb, systemName) << std::flush;
@@ -164,13 +165,13 @@ ObjectPath systemOf(Session& session, const ObjectPath& service) {
     return systems.front();
 }
 
-/** The name for people. */
+/** The system's name for people. */
 std::string nameOf(const ObjectPath& system) {
     const NamedValue* const name = find(system.keys, "Name");
     return name == nullptr ? formatLocalPath(system) : plainText(name->value, nullptr);
 }
 
-/** Waits until the service's system is on its way no longer, and says in which state it is. */
+/** Waits until the service's system has completed the request, and shows its power state. */
 void waitForEnd(Session& session, const ObjectPath& service) {
     using Clock = std::chrono::steady_clock;
     const std::chrono::duration<double> longest(*session.options().waitSeconds);
@@ -188,8 +189,8 @@ void waitForEnd(Session& session, const ObjectPath& service) {
             return;
         }
         if (Clock::now() - start >= longest) {
-            throw Failure(fmt::format(
-                "the request is not done after {} s: 'orvcim power status' shows what comes of it", longest.count()));
+            throw Failure(fmt::format("the request is not done after {} s: 'orvcim power status' shows how it goes on",
+                                      longest.count()));
         }
     }
 }
@@ -237,18 +238,18 @@ void powerStatus(Session& session) {
         requireKnown(session, states);
         return;
     }
-    std::cerr << fmt::format("orvcim: the power state itself is not served: {} is not registered in {}\n",
+    std::cerr << fmt::format("orvcim: no provider serves the power state: {} is not registered in {}\n",
                              associationClass, session.options().nameSpace);
     std::vector<Instance> instances = instancesOf(session, powerServiceClass);
     Rows rows;
-    rows.push_back({"SERVICE OR CAPABILITIES", "POWER STATES THAT CAN BE ASKED FOR"});
+    rows.push_back({"SERVICE OR CAPABILITIES", "POWER STATES THAT CAN BE REQUESTED"});
     std::vector<Instance> capabilities = instancesOf(session, capabilitiesClass);
     std::move(capabilities.begin(), capabilities.end(), std::back_inserter(instances));
     for (const Instance& instance : instances) {
         rows.push_back({textOf(session, instance, "ElementName"), textOf(session, instance, "PowerStatesSupported")});
     }
     session.writer().summary(rows, instances);
-    throw Failure("the power state is unknown: nobody serves it");
+    throw Failure("the power state is unknown: no provider serves it");
 }
 
 void powerReboot(Session& session) {

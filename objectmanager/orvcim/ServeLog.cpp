@@ -16,7 +16,7 @@ namespace {
 
 constexpr std::chrono::seconds lastTime{1};
 
-/** How often it is looked whether the program ends while nobody reads standard error. */
+/** How often the thread checks whether the program ends while nobody reads standard error, in milliseconds. */
 constexpr int lookInterval = 100;
 
 } // namespace
@@ -38,7 +38,7 @@ ServeLog::~ServeLog() {
     if (ended) {
         _thread.join();
     } else {
-        // It waits for the system's log.
+        // The thread hangs in a call of the system's log.
         _thread.detach();
     }
 }
@@ -70,7 +70,7 @@ void ServeLog::Queue::run() {
         std::string line = std::move(lines.front());
         lines.pop_front();
         if (lines.empty() && leftOut > 0) {
-            lines.push_back(fmt::format("{} more lines are left out: whoever reads the log is too slow",
+            lines.push_back(fmt::format("{} more lines are left out: the reader of the log is too slow",
                                         std::exchange(leftOut, 0)));
         }
         writing = true;
@@ -89,7 +89,7 @@ void ServeLog::Queue::put(const std::string& line) {
         ::syslog(LOG_WARNING, "%s", line.c_str());
         return;
     }
-    // A pipe that is ready takes this much at once, since lines are short.
+    // A pipe that is ready takes a whole line at once, since lines are short.
     const std::string text = "orvcim: " + line + '\n';
     std::string_view rest = text;
     while (!rest.empty() && !isEnding()) {
@@ -99,7 +99,7 @@ void ServeLog::Queue::put(const std::string& line) {
         }
         const ssize_t written = ::write(STDERR_FILENO, rest.data(), rest.size());
         if (written < 0 && errno != EINTR && errno != EAGAIN) {
-            return; // nobody reads it any more
+            return; // nobody reads standard error any more
         }
         rest.remove_prefix(written > 0 ? static_cast<std::size_t>(written) : 0);
     }

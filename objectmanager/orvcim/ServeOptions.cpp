@@ -28,12 +28,11 @@ void addCount(CLI::App& subcommand, const std::string& option, Count& value, con
         ->capture_default_str();
 }
 
-/** Empty where it is one. */
+/** What is wrong with a time; empty if it is valid. */
 std::string problemOfTime(const std::string& text) {
     constexpr double least = 0.1;
     constexpr double most = 86'400;
     double seconds = 0;
-    // What is no number at all is in no range either.
     return CLI::detail::lexical_cast(text, seconds) && seconds >= least && seconds <= most
                ? std::string()
                : fmt::format("found {}, expected seconds from {} to {}", text, least, most);
@@ -53,7 +52,7 @@ void addTime(CLI::App& subcommand, const std::string& option, std::chrono::milli
         ->default_str(fmt::format("{}", std::chrono::duration<double>(value).count()));
 }
 
-/** Empty where it is an address. */
+/** What is wrong with an address; empty if it is valid. */
 std::string problemOfAddress(const std::string& text) {
     try {
         const Server::Address address(text);
@@ -72,49 +71,50 @@ void addServeOptions(CLI::App& command, ServeOptions& options) {
         ->check(CLI::Validator(problemOfAddress, ""))
         ->type_name("ADDRESS")
         ->capture_default_str();
-    command.add_option("--port", options.port, "Port to listen on, 0 for any (default: 5988, with TLS 5989)")
+    command.add_option("--port", options.port, "Port to listen on; 0 for any free port (default: 5988, with TLS 5989)")
         ->type_name("PORT");
-    command.add_option("--tls-cert", options.certificate, "Serve with TLS: file of the certificate, in PEM")
+    command.add_option("--tls-cert", options.certificate, "Serve with TLS: file with the certificate, in PEM")
         ->type_name("FILE");
-    command.add_option("--tls-key", options.key, "File of the certificate's key, in PEM")->type_name("FILE");
+    command.add_option("--tls-key", options.key, "File with the certificate's private key, in PEM")->type_name("FILE");
     CLI::Option* const authenticate =
-        command.add_flag("--authenticate", options.authenticate, "Clients have to log in, as PAM decides");
-    addText(command, "--pam-service", options.pam.service, "PAM's service", "NAME")->needs(authenticate);
-    command.add_option("--pam-folder", options.pam.folder, "Folder of PAM's services, not the system's")
+        command.add_flag("--authenticate", options.authenticate, "Clients must log in; PAM checks their passwords");
+    addText(command, "--pam-service", options.pam.service, "PAM service that checks log-ins", "NAME")
+        ->needs(authenticate);
+    command.add_option("--pam-folder", options.pam.folder, "Folder of PAM service files, instead of the system's")
         ->type_name("DIR")
         ->needs(authenticate);
     addText(command, "--read-group", options.pam.readGroup,
             "Group whose members may read (default: everyone who can log in)", "GROUP")
         ->needs(authenticate);
     addText(command, "--power-group", options.pam.powerGroup,
-            "Group whose members may read and change the power state, as root may if root may log in", "GROUP")
+            "Group whose members may read and change the power state; with --allow-root, root may too", "GROUP")
         ->needs(authenticate);
-    command.add_flag("--allow-root", options.pam.allowRoot, "Root may log in")->needs(authenticate);
+    command.add_flag("--allow-root", options.pam.allowRoot, "Let root log in")->needs(authenticate);
     command
         .add_flag("--allow-without-shell", options.pam.allowWithoutShell,
-                  "Users may log in who have no log-in shell (see shells(5))")
+                  "Let users without a log-in shell log in (see shells(5))")
         ->needs(authenticate);
     command
-        .add_option("--host", server.hosts,
-                    "Name by which clients may call this server, beside the machine's; may be given several times")
+        .add_option("--host", server.hosts, "Another host name by which clients may address this server (repeatable)")
         ->type_name("NAME");
-    command.add_flag("--syslog", options.syslog, "Log to the system's log, not to standard error");
+    command.add_flag("--syslog", options.syslog, "Log to the system's log instead of standard error");
     command.add_flag("--access-log", server.accessLog, "Log each request in one line");
     constexpr int mostThreads = 1000;
-    addCount(command, "--threads", server.threads, "Requests answered at a time", mostThreads);
-    addCount(command, "--max-body", limits.bodyBytes, "Bytes of a request's body");
-    addCount(command, "--max-bodies", limits.allBodiesBytes, "Bytes of all bodies together");
-    addCount(command, "--max-headers", limits.headerBytes, "Bytes of a request's headers");
-    addCount(command, "--max-connections", limits.connections, "Connections at a time");
-    addCount(command, "--max-connections-per-address", limits.connectionsPerAddress, "Connections of one network");
-    addTime(command, "--request-time", limits.requestTime, "Seconds in which a request has to arrive");
+    addCount(command, "--threads", server.threads, "Requests that are answered at the same time", mostThreads);
+    addCount(command, "--max-body", limits.bodyBytes, "Largest body of a request, in bytes");
+    addCount(command, "--max-bodies", limits.allBodiesBytes, "Largest size of all requests' bodies together, in bytes");
+    addCount(command, "--max-headers", limits.headerBytes, "Largest size of a request's headers, in bytes");
+    addCount(command, "--max-connections", limits.connections, "Connections that may be open at the same time");
+    addCount(command, "--max-connections-per-address", limits.connectionsPerAddress,
+             "Connections that may be open from one network at the same time");
+    addTime(command, "--request-time", limits.requestTime, "Seconds within which a request must arrive");
     addTime(command, "--idle-time", limits.idleTime, "Seconds after which an idle connection is closed");
     addCount(command, "--max-enumerations", options.enumerations.count,
-             "Enumerations open at a time, of one user half of them");
+             "Enumerations that may be open at the same time; one user may have half of them");
     addCount(command, "--max-enumeration-bytes", options.enumerations.bytes,
-             "Bytes of what open enumerations hold, of one user half of them");
+             "Memory that open enumerations may hold, in bytes; one user may have half of it");
     addTime(command, "--enumeration-time", options.enumerations.time,
-            "Seconds after which an enumeration that nobody pulls from is closed");
+            "Seconds after which an enumeration is closed if the client pulls nothing from it");
 }
 
 } // namespace ObjectManager::Orvcim

@@ -79,7 +79,7 @@ TEST_F(LogindTest, rebootsAndShutsDown) {
 TEST_F(LogindTest, asksBeforeItActs) {
     _bus.startLogind();
     EXPECT_EQ(run({"power", "reboot"}).err, "orvcim: machine.example is not known to be a simulated machine: expected "
-                                            "--yes, or a terminal to ask on\n");
+                                            "--yes, or a terminal on which to ask for confirmation\n");
     EXPECT_THAT(_bus.requests(), IsEmpty());
 }
 

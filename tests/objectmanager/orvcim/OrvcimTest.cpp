@@ -132,7 +132,7 @@ std::string withoutCommand(const std::string& word) {
 INSTANTIATE_TEST_SUITE_P(
     ofTheCommandLine, MistakeTest,
     testing::Values(Mistake{{}, 2, noCommand}, Mistake{{"power"}, 2, noCommand},
-                    Mistake{{"names"}, 2, "CLASS is required (orvcim --help tells what can be done)"},
+                    Mistake{{"names"}, 2, "CLASS is required ('orvcim --help' lists the commands)"},
                     Mistake{{"nonsense"}, 2, withoutCommand("nonsense")},
                     Mistake{{"power", "off"},
                             2,
@@ -140,10 +140,10 @@ INSTANTIATE_TEST_SUITE_P(
                             "power cancel"},
                     Mistake{{"names", "Test_Thing", "more"},
                             2,
-                            "The following argument was not expected: more (orvcim --help tells what can be done)"},
+                            "The following argument was not expected: more ('orvcim --help' lists the commands)"},
                     Mistake{{"classes", "--format", "xml"},
                             2,
-                            "--format: xml not in {json,mof,table} (orvcim --help tells what can be done)"},
+                            "--format: xml not in {json,mof,table} ('orvcim --help' lists the commands)"},
                     Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
                     Mistake{{"graph", "--format", "json"}, 2, "found --format, expected none: graph writes DOT"}));
 
@@ -201,7 +201,7 @@ INSTANTIATE_TEST_SUITE_P(
                             1,
                             "Test_Thing: CIM_ERR_INVALID_PARAMETER (4): found no Name, expected every key of "
                             "Test_Thing"},
-                    Mistake{{"reference-names"}, 2, "PATH is required (orvcim --help tells what can be done)"}));
+                    Mistake{{"reference-names"}, 2, "PATH is required ('orvcim --help' lists the commands)"}));
 
 INSTANTIATE_TEST_SUITE_P(
     ofMethods, MistakeTest,

@@ -45,7 +45,7 @@ TEST(Power, leavesAMachineThatMayBeRealAloneWhereItCannotAsk) {
     for (const char* machine : {"real", "silent"}) {
         const Outcome outcome = orvcim({"power", "shutdown"}, {{"ORVCIM_TEST_MACHINE", machine}});
         EXPECT_EQ(outcome.err, "orvcim: testhost is not known to be a simulated machine: expected --yes, or a terminal "
-                               "to ask on\n");
+                               "on which to ask for confirmation\n");
         EXPECT_EQ(outcome.out, "");
         EXPECT_EQ(outcome.status, 1);
     }
@@ -181,7 +181,7 @@ TEST(Power, waitsUntilTheMachineIsThere) {
 TEST(Power, waitsNoLongerThanItIsTold) {
     const Outcome outcome = orvcim({"power", "shutdown", "--wait=0.01"}, {{"ORVCIM_TEST_STATE", "1"}});
     EXPECT_EQ(outcome.err,
-              "orvcim: the request is not done after 0.01 s: 'orvcim power status' shows what comes of it\n");
+              "orvcim: the request is not done after 0.01 s: 'orvcim power status' shows how it goes on\n");
     EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 8 "));
     EXPECT_EQ(outcome.status, 1);
 }
@@ -221,10 +221,10 @@ TEST(PowerStatus, failsWhereTheStateIsNotKnown) {
 
 TEST(PowerStatus, showsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
     const Outcome outcome = orvcim({"power", "status", "--namespace", "root/unassociated"}, simulated);
-    EXPECT_EQ(outcome.err, "orvcim: the power state itself is not served: TALVO_AssociatedPowerManagementService is "
+    EXPECT_EQ(outcome.err, "orvcim: no provider serves the power state: TALVO_AssociatedPowerManagementService is "
                            "not registered in root/unassociated\n"
-                           "orvcim: the power state is unknown: nobody serves it\n");
-    EXPECT_EQ(outcome.out, "SERVICE OR CAPABILITIES  POWER STATES THAT CAN BE ASKED FOR\n"
+                           "orvcim: the power state is unknown: no provider serves it\n");
+    EXPECT_EQ(outcome.out, "SERVICE OR CAPABILITIES  POWER STATES THAT CAN BE REQUESTED\n"
                            "service1\n"
                            "capabilities1            5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n");
     EXPECT_EQ(outcome.status, 1);

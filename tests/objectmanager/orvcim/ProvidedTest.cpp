@@ -40,8 +40,8 @@ TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
     EXPECT_EQ(wrong.err, "orvcim: not usable: the embedded agent\n");
     EXPECT_EQ(wrong.status, 1);
     EXPECT_THAT(wrong.out, HasSubstr("agent.toml:8: instrumentation.simulated.reboot-time: \\\"soon\\\": expected a "
-                                     "number of seconds from 0 to 86400: as long as this is so, no power-management "
-                                     "node is offered\""));
+                                     "number of seconds from 0 to 86400: until this is corrected, the agent offers "
+                                     "no power-management node\""));
 
     configure("");
     std::filesystem::create_directory(_folder / "state.json");

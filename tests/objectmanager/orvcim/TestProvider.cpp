@@ -80,7 +80,7 @@ CMPIStatus returnNumber(const CMPIResult* result, CMPIUint32 number) {
 }
 
 /** The tables and factories of a provider `P`, which has `instances`, and `invoke` where it serves methods. */
-template <class P>
+template <typename P>
 struct Provider {
     static CMPIStatus enumerateNames(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,
                                      const CMPIObjectPath* path) {

@@ -15,7 +15,7 @@ using namespace ObjectManager;
 
 namespace {
 
-/** Lets in whoever has the password "right". */
+/** Lets every user with the password "right" log in. */
 class Doorkeeper : public Server::Authenticator {
 public:
     Server::LogIn logIn(const std::string& user, const std::string& password, const std::string&) override {

@@ -3,9 +3,9 @@
  *
  *   registration-forms TABLE LOCATION NAME VERSION FOLDER
  *
- * FOLDER/NAME.reg for the embedded object manager, FOLDER/sfcb/NAME.reg for sfcb, which reads the same form but refuses
- * what it does not know, and FOLDER/pg/NAME.mof for those that take instances of PG_ProviderModule, PG_Provider and
- * PG_ProviderCapabilities.
+ * It writes FOLDER/NAME.reg for the embedded object manager, FOLDER/sfcb/NAME.reg for sfcb, which reads the same format
+ * but refuses unknown keys, and FOLDER/pg/NAME.mof for object managers that take instances of PG_ProviderModule,
+ * PG_Provider and PG_ProviderCapabilities.
  */
 #include "classes/Files.h"
 #include "registry/RegistrationReader.h"

@@ -1,4 +1,4 @@
-"""python-dbusmock's logind, with what it lacks of scheduled shutdowns, and with calls that fail.
+"""python-dbusmock's mock of systemd-logind, extended by scheduled shutdowns and by calls that fail.
 
 Parameters, beside those of the template that it extends:
 
@@ -44,7 +44,7 @@ class Unreadable(dict):
 
 
 def code_of(method, work, calls):
-    """The code of a method that works, or does what a test wants of it instead."""
+    """The code of a method: that of a working one, or what a test asks for instead."""
     call = calls.get(method, {})
     if "error" in call:
         name, message = call["error"]

@@ -1,14 +1,21 @@
 /**
- * The floor: providers that make the broker calls of the power management provider in a bare loop, without looking at
- * a machine, logging or translating anything; and computer systems for the associations to refer to. How many objects
- * there are is told by ORV_BENCH_NODES and ORV_BENCH_SYSTEMS.
+ * The floor: providers that do what the power management provider cannot do without. They make the same calls of the
+ * broker and of the agent (the walk through the tree, properties, the system's name, texts), and hand the log's filter
+ * as many records of the same levels, of a text that stands ready; and computer systems for the associations to refer
+ * to, of which ORV_BENCH_SYSTEMS says how many there are.
  */
+#include "Norv/Common.h"
+#include "Norv/Instrumentation.h"
+#include "Norv/Locale.h"
+#include "OrvLog/OrvLogger.h"
+
 #include "cmpidt.h"
 #include "cmpift.h"
 #include "cmpimacs.h"
 
 #include <cstdlib>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -17,45 +24,86 @@ const CMPIBroker* broker = nullptr;
 const char* serviceKeys[] = {"CreationClassName", "Name", "SystemCreationClassName", "SystemName", nullptr};
 const char* capabilitiesKeys[] = {"InstanceID", nullptr};
 
-int count(const char* variable) {
-    const char* const value = std::getenv(variable);
-    return value == nullptr ? 1 : std::atoi(value);
+constexpr int progressLevel = 3000;
+constexpr int operationLevel = 4000;
+constexpr int failureLevel = 6000;
+
+/** Hands so many records to the log, and each to the trace as well. */
+void logRecords(int number, int level) {
+    static const std::string category = "Corvane.Floor";
+    static const std::string text(100, 'x');
+    for (int i = 0; i < number; ++i) {
+        OrvLog::OrvLogger::logLevelMessage(__func__, __FILE__, __LINE__, category, level, nullptr, 0, 0, text);
+        OrvLog::OrvLogger::traceLevelMessage(__func__, __FILE__, __LINE__, category, level, nullptr, 0, 0, text);
+    }
+}
+
+void enter() {
+    logRecords(2, operationLevel);
+}
+
+CMPIStatus leave(const CMPIResult* result) {
+    CMReturnDone(result);
+    logRecords(2, operationLevel);
+    return {CMPI_RC_OK, nullptr};
+}
+
+/** The nodes of the tree, all of whose properties are read. */
+std::vector<std::string> readNodes() {
+    std::vector<std::string> nodes;
+    Norv::Instrumentation cursor;
+    cursor.selectNode(Norv::NodeLexicon::POWER_MANAGEMENT_NODE);
+    std::vector<unsigned int> powerStates;
+    unsigned int powerState = 0;
+    for (; cursor; ++cursor) {
+        nodes.push_back(cursor.convertPathToString(cursor.getPathToNode()));
+        cursor.getProperty(Norv::NodeLexicon::POWER_STATE_LIST, powerStates);
+        cursor.getProperty(Norv::NodeLexicon::POWER_STATE, powerState);
+    }
+    return nodes;
 }
 
 CMPIObjectPath* newPath(const CMPIObjectPath* ref, const char* className) {
     const char* const nameSpace = CMGetCharPtr(CMGetNameSpace(ref, nullptr));
     CMPIObjectPath* const path = CMNewObjectPath(broker, nameSpace, className, nullptr);
     CMSetNameSpace(path, nameSpace);
-    CMSetHostname(path, "bench.example");
+    CMSetHostname(path, Norv::getSystemName().c_str());
     return path;
 }
 
-CMPIObjectPath* newServicePath(const CMPIObjectPath* ref, const std::string& name) {
+std::string localizedText(const std::wstring& id) {
+    constexpr unsigned int powerManagementTexts = 2;
+    return Norv::make_string(Norv::ResourceString(
+        Norv::Locale::getResourceLibrary(powerManagementTexts, Norv::Locale::getLanguageId()), id));
+}
+
+CMPIObjectPath* newServicePath(const CMPIObjectPath* ref, const std::string& node) {
     CMPIObjectPath* const path = newPath(ref, "FLOOR_Service");
     CMAddKey(path, serviceKeys[0], "TALVO_PowerManagementService", CMPI_chars);
-    CMAddKey(path, serviceKeys[1], name.c_str(), CMPI_chars);
+    CMAddKey(path, serviceKeys[1], ("PowerStateManagement_" + node).c_str(), CMPI_chars);
     CMAddKey(path, serviceKeys[2], "TALVO_ComputerSystem", CMPI_chars);
-    CMAddKey(path, serviceKeys[3], "bench.example", CMPI_chars);
+    CMAddKey(path, serviceKeys[3], Norv::getSystemName().c_str(), CMPI_chars);
     return path;
 }
 
-CMPIInstance* newService(const CMPIObjectPath* ref, const std::string& name, const char** properties) {
+CMPIInstance* newService(const CMPIObjectPath* ref, const std::string& node, const char** properties) {
+    logRecords(2, progressLevel);
+    const std::string name = "PowerStateManagement_" + node;
     CMPIInstance* const instance = CMNewInstance(broker, newPath(ref, "FLOOR_Service"), nullptr);
     CMSetPropertyFilter(instance, properties, serviceKeys);
     CMSetProperty(instance, serviceKeys[0], "TALVO_PowerManagementService", CMPI_chars);
     CMSetProperty(instance, serviceKeys[1], name.c_str(), CMPI_chars);
     CMSetProperty(instance, serviceKeys[2], "TALVO_ComputerSystem", CMPI_chars);
-    CMSetProperty(instance, serviceKeys[3], "bench.example", CMPI_chars);
-    CMSetProperty(instance, "Caption", "Power Management Service", CMPI_chars);
-    CMSetProperty(instance, "Description",
-                  "Reports the power state of the computer system, reboots it and shuts it down.", CMPI_chars);
+    CMSetProperty(instance, serviceKeys[3], Norv::getSystemName().c_str(), CMPI_chars);
+    CMSetProperty(instance, "Caption", localizedText(L"MSGID_POWER_MANAGEMENT_CAPTION").c_str(), CMPI_chars);
+    CMSetProperty(instance, "Description", localizedText(L"MSGID_POWER_MANAGEMENT_DESCRIPTION").c_str(), CMPI_chars);
     CMSetProperty(instance, "ElementName", name.c_str(), CMPI_chars);
     return instance;
 }
 
-CMPIObjectPath* newCapabilitiesPath(const CMPIObjectPath* ref, const std::string& id) {
+CMPIObjectPath* newCapabilitiesPath(const CMPIObjectPath* ref, const std::string& node) {
     CMPIObjectPath* const path = newPath(ref, "FLOOR_Capabilities");
-    CMAddKey(path, capabilitiesKeys[0], id.c_str(), CMPI_chars);
+    CMAddKey(path, capabilitiesKeys[0], node.c_str(), CMPI_chars);
     return path;
 }
 
@@ -67,23 +115,25 @@ void setCodes(const CMPIInstance* instance, const char* property, const CMPIUint
     CMSetProperty(instance, property, &array, CMPI_uint16A);
 }
 
-CMPIInstance* newCapabilities(const CMPIObjectPath* ref, const std::string& id, const char** properties) {
+CMPIInstance* newCapabilities(const CMPIObjectPath* ref, const std::string& node, const char** properties) {
+    logRecords(2, progressLevel);
     CMPIInstance* const instance = CMNewInstance(broker, newPath(ref, "FLOOR_Capabilities"), nullptr);
     CMSetPropertyFilter(instance, properties, capabilitiesKeys);
-    CMSetProperty(instance, capabilitiesKeys[0], id.c_str(), CMPI_chars);
+    CMSetProperty(instance, capabilitiesKeys[0], node.c_str(), CMPI_chars);
     setCodes(instance, "PowerChangeCapabilities", {3, 4, 8});
-    CMSetProperty(instance, "ElementName", id.c_str(), CMPI_chars);
+    CMSetProperty(instance, "ElementName", ("PowerStateManagementCapabilities_" + node).c_str(), CMPI_chars);
     setCodes(instance, "PowerStatesSupported", {2, 5, 8});
     return instance;
 }
 
-std::string nodeName(int i) {
-    return "PowerStateManagement_node" + std::to_string(i);
-}
-
-CMPIStatus done(const CMPIResult* result) {
-    CMReturnDone(result);
-    return {CMPI_RC_OK, nullptr};
+/** Nodes that are no part of the tree. */
+std::vector<std::string> computerSystems() {
+    const char* const number = std::getenv("ORV_BENCH_SYSTEMS");
+    std::vector<std::string> systems;
+    for (int i = 0; i < (number == nullptr ? 1 : std::atoi(number)); ++i) {
+        systems.push_back("system" + std::to_string(i));
+    }
+    return systems;
 }
 
 template <typename MI>
@@ -118,58 +168,77 @@ CMPIStatus notSupported() {
         return notSupported();                                                                                         \
     }
 
-/** The enumerations and the lookup of a class whose objects `newObjectPath` and `newInstance` make. */
-#define FLOOR_CLASS(Class, newObjectPath, newInstance, variable)                                                       \
+/** The operations of a class of which there is an object for each of `nodes`. */
+#define FLOOR_CLASS(Class, key, newObjectPath, newInstance, nodes)                                                     \
     FLOOR_REFUSED(Class)                                                                                               \
     static CMPIStatus Class##_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,         \
                                                 const CMPIObjectPath* ref) {                                           \
-        const int objects = count(variable);                                                                           \
-        for (int i = 0; i < objects; ++i) {                                                                            \
-            CMReturnObjectPath(result, newObjectPath(ref, nodeName(i)));                                               \
+        enter();                                                                                                       \
+        logRecords(2, progressLevel);                                                                                  \
+        for (const std::string& node : nodes()) {                                                                      \
+            CMReturnObjectPath(result, newObjectPath(ref, node));                                                      \
         }                                                                                                              \
-        return done(result);                                                                                           \
+        return leave(result);                                                                                          \
     }                                                                                                                  \
     static CMPIStatus Class##_EnumInstances(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,             \
                                             const CMPIObjectPath* ref, const char** properties) {                      \
-        const int objects = count(variable);                                                                           \
-        for (int i = 0; i < objects; ++i) {                                                                            \
-            CMReturnInstance(result, newInstance(ref, nodeName(i), properties));                                       \
+        enter();                                                                                                       \
+        logRecords(1, progressLevel);                                                                                  \
+        for (const std::string& node : nodes()) {                                                                      \
+            CMReturnInstance(result, newInstance(ref, node, properties));                                              \
         }                                                                                                              \
-        return done(result);                                                                                           \
+        return leave(result);                                                                                          \
     }                                                                                                                  \
     static CMPIStatus Class##_GetInstance(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,               \
                                           const CMPIObjectPath* ref, const char** properties) {                        \
+        enter();                                                                                                       \
         CMGetKeyCount(ref, nullptr);                                                                                   \
-        CMGetKeyAt(ref, 0, nullptr, nullptr);                                                                          \
-        CMReturnInstance(result, newInstance(ref, nodeName(0), properties));                                           \
-        return done(result);                                                                                           \
+        CMGetCharPtr(CMGetKey(ref, key, nullptr).value.string);                                                        \
+        logRecords(2, progressLevel);                                                                                  \
+        logRecords(1, operationLevel);                                                                                 \
+        CMReturnInstance(result, newInstance(ref, nodes().front(), properties));                                       \
+        return leave(result);                                                                                          \
     }                                                                                                                  \
     CMInstanceMIStub(Class##_, Floor##Class##Provider, broker, CMNoHook)
 
 namespace Service {
-FLOOR_CLASS(Service, newServicePath, newService, "ORV_BENCH_NODES")
+FLOOR_CLASS(Service, "Name", newServicePath, newService, readNodes)
 
 static CMPIStatus Service_MethodCleanup(CMPIMethodMI* mi, const CMPIContext* context, CMPIBoolean terminating) {
     return cleanup(mi, context, terminating);
 }
 
+/** RequestPowerStateChange: 5 writes to the tree, and every other state is refused. */
 static CMPIStatus Service_InvokeMethod(CMPIMethodMI*, const CMPIContext*, const CMPIResult* result,
                                        const CMPIObjectPath* ref, const char*, const CMPIArgs* in, CMPIArgs*) {
-    CMGetClassName(ref, nullptr);
+    enter();
+    CMGetCharPtr(CMGetClassName(ref, nullptr));
+    readNodes();
     CMGetArg(in, "TimeoutPeriod", nullptr);
     CMGetArg(in, "Time", nullptr);
-    CMGetArg(in, "PowerState", nullptr);
-    CMRelease(CMGetArg(in, "ManagedElement", nullptr).value.ref);
+    const CMPIUint16 powerState = CMGetArg(in, "PowerState", nullptr).value.uint16;
+    logRecords(1, operationLevel);
+    if (powerState != 5) {
+        logRecords(1, failureLevel);
+        return {CMPI_RC_OK, nullptr};
+    }
+    CMPIObjectPath* const element = CMGetArg(in, "ManagedElement", nullptr).value.ref;
+    Norv::Instrumentation cursor;
+    cursor.selectNode(Norv::NodeLexicon::POWER_MANAGEMENT_NODE);
+    logRecords(1, progressLevel);
+    unsigned int reboot = 9;
+    cursor.setProperty(Norv::NodeLexicon::POWER_STATE, reboot);
+    CMRelease(element);
     const CMPIUint32 value = 0;
     CMReturnData(result, &value, CMPI_uint32);
-    return done(result);
+    return leave(result);
 }
 
 CMMethodMIStub(Service_, FloorServiceProvider, broker, CMNoHook)
 } // namespace Service
 
 namespace Capabilities {
-FLOOR_CLASS(Capabilities, newCapabilitiesPath, newCapabilities, "ORV_BENCH_NODES")
+FLOOR_CLASS(Capabilities, "InstanceID", newCapabilitiesPath, newCapabilities, readNodes)
 } // namespace Capabilities
 
 namespace ComputerSystem {
@@ -185,5 +254,5 @@ static CMPIInstance* newSystem(const CMPIObjectPath* ref, const std::string& nam
     return CMNewInstance(broker, newSystemPath(ref, name), nullptr);
 }
 
-FLOOR_CLASS(ComputerSystem, newSystemPath, newSystem, "ORV_BENCH_SYSTEMS")
+FLOOR_CLASS(ComputerSystem, "Name", newSystemPath, newSystem, computerSystems)
 } // namespace ComputerSystem

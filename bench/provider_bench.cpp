@@ -1,14 +1,20 @@
 /**
- * The provider library's operations through the embedded object manager, beside the floor: the same broker calls made
- * by a bare loop. Prints, after the measurements, a table of the cost of one object (an instance, a path, a pair of an
- * association, a method call) and its ratio to the floor.
+ * The provider library's operations through the embedded object manager, beside the floor: what is fixed of them, the
+ * same calls of the broker and the agent and as many log records, in a bare loop. Prints, after the measurements, the
+ * cost of one object (an instance, a path, a pair of an association, a method call) and that of the floor, a figure a
+ * line: table, row, column and value, with tabs between them.
  *
  * The agent reads its configuration once in a process, so each number of nodes and each setting of the log runs in a
  * process of its own.
+ *
+ * Where valgrind runs it with the tool callgrind, it leaves dumps of the instructions of each operation instead;
+ * bench/count-instructions makes figures of them.
  */
+#include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
 
 #include <benchmark/benchmark.h>
+#include <valgrind/callgrind.h>
 
 #include <sys/wait.h>
 #include <unistd.h>
@@ -19,7 +25,9 @@
 #include <fstream>
 #include <functional>
 #include <map>
+#include <regex>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace {
@@ -61,7 +69,6 @@ void writeConfiguration(const Setup& setup, const std::filesystem::path& folder)
     }
     file.close();
     setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
-    setenv("ORV_BENCH_NODES", std::to_string(setup.nodes).c_str(), 1);
     setenv("ORV_BENCH_SYSTEMS", std::to_string(setup.systems).c_str(), 1);
 }
 
@@ -78,17 +85,26 @@ Registration registration(const char* className, const char* provider, const cha
     return made;
 }
 
-Registry registry() {
-    constexpr const char* library = "orvpowerstatemanagementprovider";
-    Registration associated =
-        registration("TALVO_AssociatedPowerManagementService", "AssociatedPowerManagementServiceProvider", library);
-    associated.method = false;
+constexpr const char* library = "orvpowerstatemanagementprovider";
+
+Registration associationRegistration(const char* className, const char* provider) {
+    Registration made = registration(className, provider, library);
+    made.association = true;
+    made.method = false;
+    return made;
+}
+
+/** @param systems computer systems: one as machines have it, more are made up. */
+Registry registry(unsigned int systems) {
     return Registry({
         registration("TALVO_PowerManagementService", "PowerManagementServiceProvider", library),
         registration("TALVO_PowerManagementCapabilities", "PowerManagementCapabilitiesProvider", library),
-        associated,
-        registration("TALVO_PowerManagementElementCapabilities", "PowerManagementElementCapabilitiesProvider", library),
-        registration("TALVO_ComputerSystem", "FloorComputerSystemProvider", "orvfloorprovider"),
+        associationRegistration("TALVO_AssociatedPowerManagementService", "AssociatedPowerManagementServiceProvider"),
+        associationRegistration("TALVO_PowerManagementHostedService", "PowerManagementHostedServiceProvider"),
+        associationRegistration("TALVO_PowerManagementElementCapabilities",
+                                "PowerManagementElementCapabilitiesProvider"),
+        systems == 1 ? registration("TALVO_ComputerSystem", "ComputerSystemProvider", "orvcomputersystemprovider")
+                     : registration("TALVO_ComputerSystem", "FloorComputerSystemProvider", "orvfloorprovider"),
         registration("FLOOR_Service", "FloorServiceProvider", "orvfloorprovider"),
         registration("FLOOR_Capabilities", "FloorCapabilitiesProvider", "orvfloorprovider"),
     });
@@ -141,8 +157,47 @@ Operation requestPowerStateChange(std::uint64_t powerState) {
     };
 }
 
+/** Which objects are associated with the first node's service through the associations of a class. */
+using Traversal = std::size_t (*)(Dispatcher&, const ObjectPath& source, const AssociationFilter& filter);
+
+template <typename Object>
+std::size_t countOf(const std::vector<Associated<Object>>& found) {
+    std::size_t count = 0;
+    for (const Associated<Object>& associated : found) {
+        count += associated.objects.size();
+    }
+    return count;
+}
+
+std::size_t associators(Dispatcher& dispatcher, const ObjectPath& source, const AssociationFilter& filter) {
+    return countOf(dispatcher.associators({}, source, filter, {}));
+}
+
+std::size_t associatorNames(Dispatcher& dispatcher, const ObjectPath& source, const AssociationFilter& filter) {
+    return countOf(dispatcher.associatorNames({}, source, filter));
+}
+
+std::size_t references(Dispatcher& dispatcher, const ObjectPath& source, const AssociationFilter& filter) {
+    return dispatcher.references({}, source, filter, {}).size();
+}
+
+std::size_t referenceNames(Dispatcher& dispatcher, const ObjectPath& source, const AssociationFilter& filter) {
+    return dispatcher.referenceNames({}, source, filter).size();
+}
+
+Operation traversal(Traversal traverse) {
+    return [traverse](Dispatcher& dispatcher, const std::string& className) {
+        const ObjectPath source =
+            pathOf("TALVO_PowerManagementService", {{"CreationClassName", stringValue("TALVO_PowerManagementService")},
+                                                    {"Name", stringValue("PowerStateManagement_" + nodePath(0))},
+                                                    {"SystemCreationClassName", stringValue("TALVO_ComputerSystem")},
+                                                    {"SystemName", stringValue("bench.example")}});
+        return traverse(dispatcher, source, {className, {}, {}, {}});
+    };
+}
+
 struct Measured {
-    const char* operation;
+    std::string operation;
     /** The class that is measured, and the one that stands for the floor; null where there is none. */
     const char* className;
     const char* floorClass;
@@ -169,9 +224,25 @@ std::vector<Measured> associationOperations(const Setup& setup) {
         constexpr const char* className = "TALVO_PowerManagementElementCapabilities";
         return {{"capabilities association EnumInstanceNames", className, nullptr, enumInstanceNames}};
     }
-    constexpr const char* className = "TALVO_AssociatedPowerManagementService";
-    return {{"system association EnumInstanceNames", className, nullptr, enumInstanceNames},
-            {"system association EnumInstances", className, nullptr, enumInstances}};
+    std::vector<Measured> all;
+    const auto add = [&](const std::string& name, const char* className) {
+        all.push_back({name + " EnumInstanceNames", className, nullptr, enumInstanceNames});
+        all.push_back({name + " EnumInstances", className, nullptr, enumInstances});
+        all.push_back({name + " Associators", className, nullptr, traversal(associators)});
+        all.push_back({name + " AssociatorNames", className, nullptr, traversal(associatorNames)});
+        all.push_back({name + " References", className, nullptr, traversal(references)});
+        all.push_back({name + " ReferenceNames", className, nullptr, traversal(referenceNames)});
+    };
+    add("system association", "TALVO_AssociatedPowerManagementService");
+    add("host association", "TALVO_PowerManagementHostedService");
+    // As clients mostly ask it.
+    all.push_back({"service Associators", "", nullptr, traversal(associators)});
+    all.push_back({"service References", "", nullptr, traversal(references)});
+    // Every service with every capabilities object: many pairs.
+    if (setup.nodes <= 100) {
+        add("capabilities association", "TALVO_PowerManagementElementCapabilities");
+    }
+    return all;
 }
 
 /** Sends each measurement to the parent process as a line "name<TAB>nanoseconds of one object", and shows it. */
@@ -206,22 +277,71 @@ void measure(benchmark::State& state, Dispatcher& dispatcher, const std::string&
     state.SetItemsProcessed(static_cast<std::int64_t>(objects));
 }
 
+/** The benchmarks that the option --benchmark_filter selects. */
+std::regex filterOf(const std::vector<std::string_view>& arguments) {
+    constexpr std::string_view filter = "--benchmark_filter=";
+    for (const std::string_view argument : arguments) {
+        if (argument.starts_with(filter)) {
+            return std::regex(std::string(argument.substr(filter.size())));
+        }
+    }
+    return std::regex("");
+}
+
+/** What a setup adds to an operation's name. */
+std::string suffixOf(const Setup& setup) {
+    const std::string nodes = std::to_string(setup.nodes);
+    const std::string size =
+        setup.associations ? nodes + "x" + (setup.nodes == 300 ? nodes : std::to_string(setup.systems)) : nodes;
+    return std::string(setup.logEverything ? "/log everything/" : "/log default/") + size;
+}
+
+/** Whether instructions are counted of this setup: fewer than are timed, since they do not vary. */
+bool isCounted(const Setup& setup) {
+    return setup.systems == 1 &&
+           (setup.nodes == 1 || setup.nodes == 100 || (setup.nodes == 10'000 && !setup.logEverything));
+}
+
+/** Leaves callgrind's dump of each operation: the instructions of so many runs as its name says. */
+void countInstructions(Dispatcher& dispatcher, const std::vector<Measured>& operations, const Setup& setup,
+                       const std::regex& filter) {
+    const unsigned int runs = setup.nodes == 1 ? 20 : setup.nodes == 100 ? 4 : 1;
+    for (const Measured& measured : operations) {
+        const std::string name = "provider/" + measured.operation + suffixOf(setup);
+        if (!std::regex_search(name, filter)) {
+            continue;
+        }
+        // What is made once is made before.
+        measured.run(dispatcher, measured.className);
+        CALLGRIND_ZERO_STATS;
+        for (unsigned int i = 0; i < runs; ++i) {
+            measured.run(dispatcher, measured.className);
+        }
+        const std::string dump = std::to_string(runs) + '*' + name;
+        CALLGRIND_DUMP_STATS_AT(dump.c_str());
+    }
+}
+
 int runSetup(const Setup& setup, int argc, char** argv, const std::filesystem::path& folder, std::FILE* results) {
     writeConfiguration(setup, folder);
     // Every power request is logged on standard error, which is of no interest here.
     if (std::freopen("/dev/null", "w", stderr) == nullptr) {
         return 1;
     }
-    Dispatcher dispatcher(registry(), {{ORV_LIBRARY_FOLDER}, nullptr, nullptr});
+    // Associations are found in the declarations of classes; the floor's classes have none.
+    const Catalogue catalogue = readCatalogue(ORV_SCHEMA_FOLDER);
+    Dispatcher dispatcher(registry(setup.systems),
+                          {{ORV_LIBRARY_FOLDER}, setup.associations ? &catalogue : nullptr, nullptr});
     // The first request reads the configuration of all the nodes.
     enumInstanceNames(dispatcher, "TALVO_PowerManagementService");
-    const std::string size = setup.associations ? std::to_string(setup.nodes) + "x" +
-                                                      std::to_string(setup.nodes == 300 ? 300 : setup.systems)
-                                                : std::to_string(setup.nodes);
-    const std::string suffix = std::string(setup.logEverything ? "/log everything/" : "/log default/") + size;
-    for (const Measured& measured : setup.associations ? associationOperations(setup) : elementOperations()) {
+    const std::vector<Measured> operations = setup.associations ? associationOperations(setup) : elementOperations();
+    if (RUNNING_ON_VALGRIND) {
+        countInstructions(dispatcher, operations, setup, filterOf({argv + 1, argv + argc}));
+        return 0;
+    }
+    for (const Measured& measured : operations) {
         const auto add = [&](const char* what, const char* className) {
-            benchmark::RegisterBenchmark((std::string(measured.operation) + what + suffix).c_str(), measure,
+            benchmark::RegisterBenchmark((measured.operation + what + suffixOf(setup)).c_str(), measure,
                                          std::ref(dispatcher), std::string(className), measured.run);
         };
         add("", measured.className);
@@ -274,19 +394,16 @@ std::string floorOf(std::string name) {
     return name.substr(0, slash) + " floor/log default" + name.substr(size);
 }
 
-void printTable(const Results& results) {
-    std::map<std::string, double> byName(results.begin(), results.end());
-    std::printf("\n%-72s %12s %12s %8s\n", "operation / log / nodes", "ns/object", "floor", "ratio");
+/** A figure a line: table, row, column and value, with tabs between them. */
+void print(const Results& results) {
+    const std::map<std::string, double> byName(results.begin(), results.end());
     for (const auto& [name, nanoseconds] : results) {
         if (name.find(" floor/") != std::string::npos) {
             continue;
         }
-        const auto floor = byName.find(floorOf(name));
-        if (floor == byName.end()) {
-            std::printf("%-72s %12.0f\n", name.c_str(), nanoseconds);
-        } else {
-            std::printf("%-72s %12.0f %12.0f %8.2f\n", name.c_str(), nanoseconds, floor->second,
-                        nanoseconds / floor->second);
+        std::printf("provider\t%s\tns\t%.4g\n", name.c_str(), nanoseconds);
+        if (const auto floor = byName.find(floorOf(name)); floor != byName.end()) {
+            std::printf("provider\t%s\tfloor ns\t%.4g\n", name.c_str(), floor->second);
         }
     }
 }
@@ -297,8 +414,10 @@ int main(int argc, char** argv) {
     Results results;
     bool ran = true;
     for (const Setup& setup : setups) {
-        ran = runInProcess(setup, argc, argv, results) && ran;
+        if (!RUNNING_ON_VALGRIND || isCounted(setup)) {
+            ran = runInProcess(setup, argc, argv, results) && ran;
+        }
     }
-    printTable(results);
+    print(results);
     return ran ? 0 : 1;
 }

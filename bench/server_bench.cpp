@@ -1,173 +1,65 @@
 /**
- * The object manager as its clients on the network find it: requests per second and latency, over loopback and with
- * connections kept alive, and the memory of the server. Runs "orvcim serve" on simulated machines of several sizes;
- * the load comes from one thread of this program, which does not sleep while it waits for a quick answer.
+ * The object manager as its clients on the network find it: requests per second
+ * and latency, over loopback and with connections kept alive, the memory of the
+ * server, and how long programs take to start. Runs "orvcim serve" on simulated
+ * machines of several sizes; the load comes from one thread of this program,
+ * which does not sleep while it waits for a quick answer. Beside it stands the
+ * limit: the same HTTP server, which hands out the same bytes from memory.
  *
- * Takes of the options that the other benchmarks have --benchmark_min_time=SECONDS, for each measurement, and
- * --benchmark_filter=REGEX, of names as the table shows them.
+ * Prints a figure a line: table, row, column and value, with tabs between them.
+ *
+ * Takes of the options that the other benchmarks have
+ * --benchmark_min_time=SECONDS, for each measurement, and
+ * --benchmark_filter=REGEX, of names as the table shows them. With
+ * --instructions=FOLDER, it lets callgrind count the server's instructions
+ * instead, and leaves its dumps in that folder; bench/count-instructions makes
+ * figures of them.
  */
-#include <fcntl.h>
-#include <netinet/in.h>
-#include <netinet/tcp.h>
-#include <spawn.h>
+#include "Client.h"
+#include "Requests.h"
+#include "ServerProcess.h"
+#include "System.h"
+
+#include "server/HttpServer.h"
+
+#include <pthread.h>
 #include <sys/epoll.h>
-#include <sys/socket.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <memory>
 #include <regex>
 #include <stdexcept>
 #include <string>
 #include <string_view>
-#include <system_error>
 #include <thread>
 #include <vector>
 
 namespace {
 
-using Clock = std::chrono::steady_clock;
-using Milliseconds = std::chrono::duration<double, std::milli>;
+using namespace Bench;
 
-void require(bool done, const char* what) {
-    if (!done) {
-        throw std::system_error(errno, std::generic_category(), what);
-    }
+void print(const char* table, const std::string& row, const char* column, double value) {
+    std::printf("%s\t%s\t%s\t%.4g\n", table, row.c_str(), column, value);
+    std::fflush(stdout);
 }
 
-/** A server of its own, on a machine with so many nodes. */
-class ServerProcess {
-public:
-    explicit ServerProcess(unsigned int nodes) {
-        std::string name = (std::filesystem::temp_directory_path() / "orv-bench-XXXXXX").string();
-        require(mkdtemp(name.data()) != nullptr, "mkdtemp");
-        _folder = name;
-        std::ofstream file(_folder / "agent.toml");
-        file << "[system]\nname = \"bench.example\"\n[instrumentation.simulated]\nstate-file = \""
-             << (_folder / "machine.json").string() << "\"\n";
-        for (unsigned int i = 0; i < nodes; ++i) {
-            file << "[[instrumentation.simulated.node]]\npath = \"node" << i << "\"\n";
-        }
-        file.close();
-        setenv("ORV_AGENT_CONFIG", (_folder / "agent.toml").c_str(), 1);
-        start();
-    }
-    ServerProcess(const ServerProcess&) = delete;
-    ServerProcess& operator=(const ServerProcess&) = delete;
-    ~ServerProcess() {
-        kill(_process, SIGTERM);
-        waitpid(_process, nullptr, 0);
-        std::filesystem::remove_all(_folder);
-    }
-
-    std::uint16_t port() const { return _port; }
-
-    /** Seconds of processor time so far. */
-    double processorTime() const {
-        clockid_t clock{};
-        timespec time{};
-        require(clock_getcpuclockid(_process, &clock) == 0 && clock_gettime(clock, &time) == 0, "processor time");
-        constexpr double nanosecondsPerSecond = 1e9;
-        return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_nsec) / nanosecondsPerSecond;
-    }
-
-    /** A line of the kernel's on the process, in megabytes. */
-    double memory(std::string_view line) const {
-        std::ifstream status("/proc/" + std::to_string(_process) + "/status");
-        constexpr double kilobytesPerMegabyte = 1024;
-        for (std::string text; std::getline(status, text);) {
-            if (text.starts_with(line)) {
-                return std::stod(text.substr(line.size() + 1)) / kilobytesPerMegabyte;
-            }
-        }
-        throw std::runtime_error("no " + std::string(line) + " of the server");
-    }
-
-private:
-    void start() {
-        int ends[2];
-        require(pipe2(ends, O_CLOEXEC) == 0, "pipe");
-        posix_spawn_file_actions_t actions;
-        posix_spawn_file_actions_init(&actions);
-        posix_spawn_file_actions_adddup2(&actions, ends[1], STDOUT_FILENO);
-        posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
-        std::string program = ORV_PROGRAM;
-        std::string command = "serve";
-        std::string port = "--port=0";
-        std::array<char*, 4> arguments = {program.data(), command.data(), port.data(), nullptr};
-        const int error = posix_spawn(&_process, program.c_str(), &actions, nullptr, arguments.data(), environ);
-        posix_spawn_file_actions_destroy(&actions);
-        close(ends[1]);
-        if (error != 0) {
-            throw std::system_error(error, std::generic_category(), program);
-        }
-        std::FILE* const output = fdopen(ends[0], "r");
-        unsigned int number = 0;
-        const bool listening = std::fscanf(output, "Listening on http://127.0.0.1:%u", &number) == 1;
-        std::fclose(output);
-        if (!listening) {
-            throw std::runtime_error(program + " serve did not start");
-        }
-        _port = static_cast<std::uint16_t>(number);
-    }
-
-    std::filesystem::path _folder;
-    pid_t _process = -1;
-    std::uint16_t _port = 0;
+/** What is asked, of whom, and how large the body of every reply is. */
+struct Load {
+    const ServerProcess& server;
+    std::string request;
+    std::size_t size;
+    Transport transport = Transport::plain;
 };
 
-/* Requests. */
-
-std::string call(const std::string& method, const std::string& parameters) {
-    const std::string body =
-        "<?xml version=\"1.0\" encoding=\"utf-8\"?>"
-        "<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\"><MESSAGE ID=\"1\" PROTOCOLVERSION=\"1.0\"><SIMPLEREQ>"
-        "<IMETHODCALL NAME=\"" +
-        method + "\"><LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"cimv2\"/></LOCALNAMESPACEPATH>" +
-        parameters + "</IMETHODCALL></SIMPLEREQ></MESSAGE></CIM>";
-    return "POST /cimom HTTP/1.1\r\nHost: localhost\r\nContent-Type: application/xml; charset=\"utf-8\"\r\n"
-           "CIMOperation: MethodCall\r\nCIMMethod: " +
-           method + "\r\nCIMObject: root/cimv2\r\nContent-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
-}
-
-std::string key(const std::string& name, const std::string& value) {
-    return "<KEYBINDING NAME=\"" + name + "\"><KEYVALUE VALUETYPE=\"string\">" + value + "</KEYVALUE></KEYBINDING>";
-}
-
-std::string servicePath() {
-    return "<INSTANCENAME CLASSNAME=\"TALVO_PowerManagementService\">" +
-           key("CreationClassName", "TALVO_PowerManagementService") + key("Name", "PowerStateManagement_node0") +
-           key("SystemCreationClassName", "TALVO_ComputerSystem") + key("SystemName", "bench.example") +
-           "</INSTANCENAME>";
-}
-
-std::string getInstance() {
-    return call("GetInstance", "<IPARAMVALUE NAME=\"InstanceName\">" + servicePath() + "</IPARAMVALUE>");
-}
-
-std::string enumerateInstances() {
-    return call("EnumerateInstances",
-                "<IPARAMVALUE NAME=\"ClassName\"><CLASSNAME NAME=\"TALVO_PowerManagementService\"/>"
-                "</IPARAMVALUE>");
-}
-
-std::string associators() {
-    return call("Associators", "<IPARAMVALUE NAME=\"ObjectName\">" + servicePath() + "</IPARAMVALUE>");
-}
-
-/* Load. */
-
 struct Measurement {
-    std::string name;
     double requestsPerSecond = 0;
     /** What a request costs the server in processor time. */
     double microseconds = 0;
@@ -176,100 +68,10 @@ struct Measurement {
     std::vector<double> firstBytes;
 };
 
-/** A connection that sends the same request again and again. */
-class Client {
-public:
-    explicit Client(std::uint16_t port) : _socket(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        require(_socket >= 0, "socket");
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_port = htons(port);
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        require(connect(_socket, reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0, "connect");
-        constexpr int yes = 1;
-        setsockopt(_socket, IPPROTO_TCP, TCP_NODELAY, &yes, sizeof yes);
-    }
-    Client(const Client&) = delete;
-    Client& operator=(const Client&) = delete;
-    ~Client() { close(_socket); }
-
-    int socketNumber() const { return _socket; }
-
-    void ask(const std::string& request) {
-        _received.clear();
-        _size = 0;
-        _begin = Clock::now();
-        require(send(_socket, request.data(), request.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(request.size()),
-                "send");
-    }
-
-    /** Takes what came. @return whether the reply is whole. */
-    bool take() {
-        static std::array<char, 256 * 1024> buffer;
-        const ssize_t size = recv(_socket, buffer.data(), buffer.size(), MSG_DONTWAIT);
-        if (size < 0 && errno == EAGAIN) {
-            return false;
-        }
-        require(size > 0, "recv");
-        if (_received.empty()) {
-            _firstByte = Clock::now();
-        }
-        _received.append(buffer.data(), static_cast<std::size_t>(size));
-        if (_size == 0) {
-            findSize();
-        }
-        _end = Clock::now();
-        return _size != 0 && _received.size() >= _size;
-    }
-
-    const std::string& reply() const { return _received; }
-    /** Without the headers, of which one tells how long the server took. */
-    std::size_t bodySize() const { return _bodySize; }
-    double latency() const { return Milliseconds(_end - _begin).count(); }
-    double firstByte() const { return Milliseconds(_firstByte - _begin).count(); }
-
-private:
-    void findSize() {
-        constexpr std::string_view end = "\r\n\r\n";
-        constexpr std::string_view length = "Content-Length: ";
-        const std::size_t headers = _received.find(end);
-        if (headers != std::string::npos) {
-            _bodySize = std::stoul(_received.substr(_received.find(length) + length.size()));
-            _size = headers + end.size() + _bodySize;
-        }
-    }
-
-    int _socket;
-    std::string _received;
-    /** Of the reply; 0 while it is not known. */
-    std::size_t _size = 0;
-    std::size_t _bodySize = 0;
-    Clock::time_point _begin;
-    Clock::time_point _firstByte;
-    Clock::time_point _end;
-};
-
-/** How many bytes the body of every reply must have, as one has that was looked at. */
-std::size_t expectedSize(std::uint16_t port, const std::string& request, std::size_t objects) {
-    Client client(port);
-    client.ask(request);
-    while (!client.take()) {
-        std::this_thread::yield();
-    }
-    std::size_t found = 0;
-    constexpr std::string_view instance = "<INSTANCE ";
-    for (std::size_t at = 0; (at = client.reply().find(instance, at)) != std::string::npos; ++at) {
-        ++found;
-    }
-    if (found != objects) {
-        throw std::runtime_error("expected " + std::to_string(objects) + " instances: " + client.reply());
-    }
-    return client.bodySize();
-}
-
 /**
- * Waits without sleeping as long as a quick answer may take: how long the core of a virtual machine takes to wake up
- * for this program is not the server's. The server goes first on it, though. After that this program sleeps.
+ * Waits without sleeping as long as a quick answer may take: how long the core
+ * of a virtual machine takes to wake up for this program is not the server's.
+ * The server goes first on it, though. After that this program sleeps.
  */
 int waitForEvents(int poll, std::array<epoll_event, 64>& events) {
     constexpr std::chrono::microseconds quickAnswer{500};
@@ -285,25 +87,23 @@ int waitForEvents(int poll, std::array<epoll_event, 64>& events) {
     return epoll_wait(poll, events.data(), size, asLongAsItTakes);
 }
 
-Measurement measure(std::string name, const ServerProcess& server, const std::string& request, std::size_t objects,
-                    unsigned int connections, double seconds) {
-    const std::size_t size = expectedSize(server.port(), request, objects);
+Measurement measure(const Load& load, unsigned int connections, double seconds) {
     const int poll = epoll_create1(EPOLL_CLOEXEC);
     require(poll >= 0, "epoll_create1");
     std::vector<std::unique_ptr<Client>> clients;
     for (unsigned int i = 0; i < connections; ++i) {
-        clients.push_back(std::make_unique<Client>(server.port()));
+        clients.push_back(std::make_unique<Client>(load.server.port(), load.transport));
         epoll_event event{};
         event.events = EPOLLIN;
         event.data.ptr = clients.back().get();
         require(epoll_ctl(poll, EPOLL_CTL_ADD, clients.back()->socketNumber(), &event) == 0, "epoll_ctl");
     }
-    Measurement result{std::move(name), 0, 0, {}, {}};
-    const double processorTime = server.processorTime();
+    Measurement result;
+    const double processorTime = load.server.processorTime();
     const auto begin = Clock::now();
     const auto end = begin + std::chrono::duration_cast<Clock::duration>(std::chrono::duration<double>(seconds));
     for (const auto& client : clients) {
-        client->ask(request);
+        client->ask(load.request);
     }
     std::array<epoll_event, 64> events{};
     for (std::size_t asked = connections; asked > 0;) {
@@ -313,13 +113,13 @@ Measurement measure(std::string name, const ServerProcess& server, const std::st
             if (!client.take()) {
                 continue;
             }
-            if (client.bodySize() != size || !client.reply().starts_with("HTTP/1.1 200 ")) {
+            if (client.bodySize() != load.size || !client.reply().starts_with("HTTP/1.1 200 ")) {
                 throw std::runtime_error("wrong reply: " + client.reply());
             }
             result.latencies.push_back(client.latency());
             result.firstBytes.push_back(client.firstByte());
             if (Clock::now() < end) {
-                client.ask(request);
+                client.ask(load.request);
             } else {
                 --asked;
             }
@@ -328,8 +128,8 @@ Measurement measure(std::string name, const ServerProcess& server, const std::st
     result.requestsPerSecond =
         static_cast<double>(result.latencies.size()) / std::chrono::duration<double>(Clock::now() - begin).count();
     constexpr double microsecondsPerSecond = 1e6;
-    result.microseconds =
-        (server.processorTime() - processorTime) * microsecondsPerSecond / static_cast<double>(result.latencies.size());
+    result.microseconds = (load.server.processorTime() - processorTime) * microsecondsPerSecond /
+                          static_cast<double>(result.latencies.size());
     close(poll);
     std::sort(result.latencies.begin(), result.latencies.end());
     std::sort(result.firstBytes.begin(), result.firstBytes.end());
@@ -340,75 +140,237 @@ double percentile(const std::vector<double>& sorted, double part) {
     return sorted[static_cast<std::size_t>(part * static_cast<double>(sorted.size() - 1))];
 }
 
-void print(const Measurement& result) {
-    std::printf("| %s | %.0f | %.3f | %.3f | %.3f | %.3f | %.3f | %.0f |\n", result.name.c_str(),
-                result.requestsPerSecond, percentile(result.latencies, 0.5), percentile(result.latencies, 0.9),
-                percentile(result.latencies, 0.99), result.latencies.back(), percentile(result.firstBytes, 0.5),
-                result.microseconds);
-    std::fflush(stdout);
+double median(const std::vector<double>& sorted) {
+    return percentile(sorted, 0.5);
 }
 
 struct Options {
     double seconds = 2;
     std::string filter;
+    std::filesystem::path instructions;
+    std::filesystem::path constant;
 };
 
 Options optionsOf(const std::vector<std::string_view>& arguments) {
     constexpr std::string_view time = "--benchmark_min_time=";
     constexpr std::string_view filter = "--benchmark_filter=";
+    constexpr std::string_view instructions = "--instructions=";
+    constexpr std::string_view constant = "--constant=";
     Options options;
     for (const std::string_view argument : arguments) {
         if (argument.starts_with(time)) {
             options.seconds = std::stod(std::string(argument.substr(time.size())));
         } else if (argument.starts_with(filter)) {
             options.filter = argument.substr(filter.size());
+        } else if (argument.starts_with(instructions)) {
+            options.instructions = argument.substr(instructions.size());
+        } else if (argument.starts_with(constant)) {
+            options.constant = argument.substr(constant.size());
         } else {
             throw std::runtime_error("found " + std::string(argument) + ", expected " + std::string(time) +
-                                     "SECONDS or " + std::string(filter) + "REGEX");
+                                     "SECONDS, " + std::string(filter) + "REGEX or " + std::string(instructions) +
+                                     "FOLDER");
         }
     }
     return options;
 }
 
-void run(double seconds, const std::regex& filter) {
-    struct Operation {
-        const char* name;
-        std::string request;
-        /** Of each node, and besides. */
-        std::size_t objectsPerNode;
-        std::size_t objects;
-        unsigned int mostNodes;
-    };
-    const Operation operations[] = {
-        {"GetInstance", getInstance(), 0, 1, 10'000},
-        {"EnumerateInstances", enumerateInstances(), 1, 0, 10'000},
-        {"Associators", associators(), 1, 2, 100},
-    };
-    std::printf(
-        "| operation/connections/nodes | requests/s | median ms | 90 %% | 99 %% | longest | first byte | server "
-        "\u00b5s |\n|---|---|---|---|---|---|---|---|\n");
-    std::string memory;
-    for (const unsigned int nodes : {1U, 100U, 10'000U}) {
-        const ServerProcess server(nodes);
-        expectedSize(server.port(), getInstance(), 1);
-        const double atRest = server.memory("VmRSS:");
-        for (const Operation& operation : operations) {
-            for (const unsigned int connections : {1U, 8U, 64U}) {
-                const std::string name =
-                    std::string(operation.name) + '/' + std::to_string(connections) + '/' + std::to_string(nodes);
-                if (nodes <= operation.mostNodes && std::regex_search(name, filter)) {
-                    print(measure(name, server, operation.request, operation.objectsPerNode * nodes + operation.objects,
-                                  connections, seconds));
-                }
+/** Of a pair of a request and a number of nodes, whether it is measured: pairs
+ * of associations are many. */
+bool isMeasured(const Request& request, unsigned int nodes) {
+    constexpr unsigned int mostNodesOfAssociations = 100;
+    return nodes <= mostNodesOfAssociations || request.objectsPerNode == 0 || request.objects == 0;
+}
+
+const std::vector<std::string> serve = {ORV_PROGRAM, "serve", "--port=0"};
+
+std::vector<std::string> operator+(std::vector<std::string> command, const std::vector<std::string>& more) {
+    command.insert(command.end(), more.begin(), more.end());
+    return command;
+}
+
+/** Looks at a reply, which all others are to be like. */
+std::string checkedBody(const ServerProcess& server, const Request& request, const std::string& text,
+                        unsigned int nodes, Transport transport = Transport::plain) {
+    Client client(server.port(), transport);
+    request.check(client.answerTo(text), nodes);
+    return client.body();
+}
+
+std::string rowOf(const std::string& name, unsigned int connections, unsigned int nodes) {
+    return name + '/' + std::to_string(connections) + '/' + std::to_string(nodes);
+}
+
+/** Each kind of request beside its limit. */
+void measureRequests(const ServerProcess& server, unsigned int nodes, double seconds, const std::regex& filter) {
+    const Folder folder;
+    const std::string reply = folder / "reply";
+    for (const Request& request : requests()) {
+        if (!isMeasured(request, nodes)) {
+            continue;
+        }
+        const std::string body = checkedBody(server, request, request.text(), nodes);
+        std::ofstream(reply) << body;
+        const ServerProcess constant({"/proc/" + std::to_string(getpid()) + "/exe", "--constant=" + reply});
+        for (const unsigned int connections : {1U, 8U, 64U}) {
+            const std::string row = rowOf(request.name, connections, nodes);
+            if (!std::regex_search(row, filter)) {
+                continue;
+            }
+            const Measurement limit = measure({constant, request.text(), body.size()}, connections, seconds);
+            const Measurement found = measure({server, request.text(), body.size()}, connections, seconds);
+            print("server", row, "requests/s", found.requestsPerSecond);
+            print("server", row, "limit requests/s", limit.requestsPerSecond);
+            print("server", row, "median ms", median(found.latencies));
+            print("server", row, "limit median ms", median(limit.latencies));
+            print("server", row, "90 % ms", percentile(found.latencies, 0.9));
+            print("server", row, "99 % ms", percentile(found.latencies, 0.99));
+            print("server", row, "longest ms", found.latencies.back());
+            print("server", row, "first byte ms", median(found.firstBytes));
+            print("server", row, "server \u00b5s", found.microseconds);
+            print("server", row, "limit server \u00b5s", limit.microseconds);
+        }
+    }
+}
+
+/** What log-ins and TLS cost, of one node: three servers in turn. */
+void measureProtection(double seconds, const std::regex& filter) {
+    const Machine machine(1);
+    const Folder folder;
+    const std::string key = folder / "key.pem";
+    const std::string certificate = folder / "certificate.pem";
+    runCommand({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:prime256v1", "-nodes",
+                "-days", "1", "-subj", "/CN=localhost", "-keyout", key, "-out", certificate});
+    const std::string users = folder / "users";
+    const std::string module = std::string(ORV_PAM_MATRIX) + " passdb=" + users;
+    std::ofstream(users) << "root:bench:orvcim\n";
+    std::ofstream(folder / "orvcim") << "auth required " << module << "\naccount required " << module << '\n';
+
+    const ServerProcess plain(serve);
+    const ServerProcess authenticating(serve + std::vector<std::string>{"--authenticate",
+                                                                        "--pam-folder=" + (folder / "."),
+                                                                        "--allow-root", "--allow-without-shell"});
+    const ServerProcess encrypting(serve + std::vector<std::string>{"--tls-cert=" + certificate, "--tls-key=" + key});
+    // root:bench
+    const std::string logIn = "Authorization: Basic cm9vdDpiZW5jaA==\r\n";
+    for (const Request& request : requests()) {
+        const std::string text = request.text();
+        const std::string textWithLogIn = request.text(logIn);
+        const Load loads[] = {
+            {plain, text, checkedBody(plain, request, text, 1).size()},
+            {authenticating, textWithLogIn, checkedBody(authenticating, request, textWithLogIn, 1).size()},
+            {encrypting, text, checkedBody(encrypting, request, text, 1, Transport::tls).size(), Transport::tls},
+        };
+        constexpr const char* columns[] = {"plain requests/s", "with log-ins requests/s", "with TLS requests/s"};
+        for (const unsigned int connections : {1U, 8U}) {
+            const std::string row = rowOf(request.name, connections, 1);
+            for (std::size_t i = 0; std::regex_search(row, filter) && i < std::size(loads); ++i) {
+                print("protection", row, columns[i], measure(loads[i], connections, seconds).requestsPerSecond);
             }
         }
-        std::this_thread::sleep_for(std::chrono::seconds{1});
-        std::array<char, 100> line{};
-        std::snprintf(line.data(), line.size(), "| %u | %.1f | %.1f | %.1f |\n", nodes, atRest, server.memory("VmHWM:"),
-                      server.memory("VmRSS:"));
-        memory += line.data();
     }
-    std::printf("\n| nodes | MB at rest | MB at the peak | MB afterwards |\n|---|---|---|---|\n%s", memory.c_str());
+}
+
+/** Milliseconds that something takes, at the median. */
+template <typename Run>
+double timeOf(Run run) {
+    constexpr unsigned int runs = 21;
+    std::vector<double> times;
+    for (unsigned int i = 0; i < runs; ++i) {
+        const auto begin = Clock::now();
+        run();
+        times.push_back(std::chrono::duration<double, std::milli>(Clock::now() - begin).count());
+    }
+    std::sort(times.begin(), times.end());
+    return median(times);
+}
+
+void measureStart(const std::regex& filter) {
+    const Machine machine(1);
+    if (std::regex_search("orvcim power status/1", filter)) {
+        print("start", "orvcim power status", "ms", timeOf([] { runCommand({ORV_PROGRAM, "power", "status"}); }));
+    }
+    if (std::regex_search("orvcim serve/1", filter)) {
+        // Its end is not counted.
+        std::vector<std::unique_ptr<ServerProcess>> servers;
+        print("start", "orvcim serve, until it listens", "ms",
+              timeOf([&] { servers.push_back(std::make_unique<ServerProcess>(serve)); }));
+    }
+}
+
+void measureAll(double seconds, const std::regex& filter) {
+    measureStart(filter);
+    for (const unsigned int nodes : {1U, 100U, 10'000U}) {
+        const Machine machine(nodes);
+        const ServerProcess server(serve);
+        checkedBody(server, requests().front(), requests().front().text(), nodes);
+        const std::string row = std::to_string(nodes);
+        print("memory", row, "MB at rest", server.memory("status", "VmRSS:"));
+        print("memory", row, "of that private", server.memory("smaps_rollup", "Private_Dirty:"));
+        measureRequests(server, nodes, seconds, filter);
+        std::this_thread::sleep_for(std::chrono::seconds{1});
+        print("memory", row, "MB at the peak", server.memory("status", "VmHWM:"));
+        print("memory", row, "MB afterwards", server.memory("status", "VmRSS:"));
+    }
+    measureProtection(seconds, filter);
+}
+
+/** Hands out a file's content, whatever it is asked, until it is ended. */
+void serveConstant(const std::filesystem::path& file) {
+    std::ifstream stream(file);
+    const std::string body{std::istreambuf_iterator<char>(stream), {}};
+    sigset_t end;
+    sigemptyset(&end);
+    sigaddset(&end, SIGTERM);
+    pthread_sigmask(SIG_BLOCK, &end, nullptr);
+    const ObjectManager::Server::HttpServer server(
+        {},
+        [&](const auto& /*request*/, const auto& /*caller*/) {
+            return ObjectManager::Server::HttpReply{200,
+                                                    {{"Content-Type", "application/xml; charset=\"utf-8\""},
+                                                     {"CIMOperation", "MethodResponse"},
+                                                     {"WBEMServerResponseTime", "0"}},
+                                                    body};
+        },
+        nullptr, [](const std::string& /*line*/) {});
+    std::printf("Listening on http://127.0.0.1:%u\n", server.port());
+    std::fflush(stdout);
+    int signal = 0;
+    sigwait(&end, &signal);
+}
+
+/** Leaves a dump of callgrind's for each kind of request: instructions of so
+ * many requests as its name says. */
+void countInstructions(const std::filesystem::path& folder, const std::regex& filter) {
+    constexpr unsigned int warmUp = 5;
+    constexpr unsigned int counted = 20;
+    for (const unsigned int nodes : {1U, 100U}) {
+        const std::string machine = std::to_string(nodes);
+        const Machine simulated(nodes);
+        const ServerProcess server(
+            std::vector<std::string>{"valgrind", "--tool=callgrind",
+                                     "--callgrind-out-file=" + (folder / ("server." + machine)).string()} +
+            serve);
+        const auto tell = [process = "--pid=" + std::to_string(server.process())](std::vector<std::string> command) {
+            command.insert(command.begin(), {"vgdb", process});
+            runCommand(command);
+        };
+        Client client(server.port());
+        for (const Request& request : requests()) {
+            const std::string name = "server/" + request.name + '/' + machine;
+            if (!std::regex_search(name, filter)) {
+                continue;
+            }
+            for (unsigned int i = 0; i < warmUp; ++i) {
+                request.check(client.answerTo(request.text()), nodes);
+            }
+            tell({"zero"});
+            for (unsigned int i = 0; i < counted; ++i) {
+                client.answerTo(request.text());
+            }
+            tell({"dump", std::to_string(counted) + '*' + name});
+        }
+    }
 }
 
 } // namespace
@@ -416,7 +378,14 @@ void run(double seconds, const std::regex& filter) {
 int main(int argc, char** argv) {
     try {
         const Options options = optionsOf({argv + 1, argv + argc});
-        run(options.seconds, std::regex(options.filter));
+        const std::regex filter(options.filter);
+        if (!options.constant.empty()) {
+            serveConstant(options.constant);
+        } else if (!options.instructions.empty()) {
+            countInstructions(options.instructions, filter);
+        } else {
+            measureAll(options.seconds, filter);
+        }
     } catch (const std::exception& error) {
         std::fprintf(stderr, "server_bench: %s\n", error.what());
         return 1;

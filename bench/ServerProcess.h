@@ -1,0 +1,67 @@
+/** Machines, and programs that serve them. */
+#ifndef BENCH_SERVERPROCESS_H
+#define BENCH_SERVERPROCESS_H
+
+#include <sys/types.h>
+
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Bench {
+
+/** A folder that goes with this object. */
+class Folder {
+public:
+    Folder();
+    Folder(const Folder&) = delete;
+    Folder& operator=(const Folder&) = delete;
+    ~Folder();
+
+    std::string operator/(const char* name) const { return (_path / name).string(); }
+
+private:
+    std::filesystem::path _path;
+};
+
+/** A simulated machine with so many nodes: whatever starts from now on manages it. */
+class Machine {
+public:
+    explicit Machine(unsigned int nodes);
+
+private:
+    Folder _folder;
+};
+
+/** A program that serves HTTP or HTTPS on a free port, and writes to its standard output where. Ends with this object.
+ */
+class ServerProcess {
+public:
+    /** Waits until it listens. */
+    explicit ServerProcess(const std::vector<std::string>& command);
+    ServerProcess(const ServerProcess&) = delete;
+    ServerProcess& operator=(const ServerProcess&) = delete;
+    ~ServerProcess();
+
+    std::uint16_t port() const { return _port; }
+    pid_t process() const { return _process; }
+
+    /** Seconds of processor time so far. */
+    double processorTime() const;
+
+    /** The sum of the lines that begin so in a file of the kernel's on the process, in megabytes. */
+    double memory(const char* file, std::string_view lines) const;
+
+private:
+    pid_t _process = -1;
+    std::uint16_t _port = 0;
+};
+
+/** Runs a command to its end. @throws std::runtime_error where it cannot be run or fails. */
+void runCommand(const std::vector<std::string>& command);
+
+} // namespace Bench
+
+#endif

@@ -19,8 +19,11 @@ public:
     }
     Descriptor(Descriptor&& other) noexcept : _number(std::exchange(other._number, -1)) {}
     Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(Descriptor&& other) noexcept {
+        std::swap(_number, other._number);
+        return *this;
+    }
     Descriptor& operator=(const Descriptor&) = delete;
-    Descriptor& operator=(Descriptor&&) = delete;
 
     bool isOpen() const { return _number >= 0; }
     int number() const { return _number; }

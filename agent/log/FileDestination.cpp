@@ -2,6 +2,7 @@
 #include "LineWriter.h"
 
 #include "base/Descriptor.h"
+#include "base/FolderOfFile.h"
 #include "base/Folders.h"
 
 #include <fcntl.h>
@@ -20,24 +21,28 @@
 namespace OrvLog {
 
 using Norv::Agent::Descriptor;
+using Norv::Agent::FolderOfFile;
 
 namespace {
 
 constexpr int flags = O_WRONLY | O_APPEND | O_CLOEXEC | O_NOCTTY | O_NONBLOCK;
 constexpr mode_t mode = 0640;
 
-Descriptor openToAppend(const std::string& path) {
-    Descriptor existing(open(path.c_str(), flags));
+Descriptor openToAppend(const FolderOfFile& folder, const std::string& path) {
+    if (!folder.isOpen()) {
+        return Descriptor(-1);
+    }
+    Descriptor existing = folder.openFile(flags);
     if (existing.isOpen() || errno != ENOENT) {
         return existing;
     }
-    Descriptor made(open(path.c_str(), flags | O_CREAT | O_EXCL, mode));
+    Descriptor made = folder.openFile(flags | O_CREAT | O_EXCL, mode);
     if (made.isOpen()) {
         // If this fails, the file stays root's, and root's records are written all the same.
         Norv::Agent::giveToOwnerOfFolder(made, path);
     } else if (errno == EEXIST) {
         // Another process has just made the file, or the name is a symbolic link to a file that does not exist.
-        return Descriptor(open(path.c_str(), flags | O_CREAT, mode));
+        return folder.openFile(flags | O_CREAT, mode);
     }
     return made;
 }
@@ -53,21 +58,22 @@ public:
 
     int write(const Line& line) override {
         {
-            const Descriptor file = openToAppend(_path);
+            const FolderOfFile folder(_path);
+            const Descriptor file = openToAppend(folder, _path);
             if (!file.isOpen()) {
                 return errno;
             }
             if (!isFull(file, line.whole().size())) {
                 return _writer.write(file.number(), line);
             }
-            rotate(file);
+            rotate(folder, file);
         }
         return append(line);
     }
 
 private:
     int append(const Line& line) {
-        const Descriptor file = openToAppend(_path);
+        const Descriptor file = openToAppend(FolderOfFile(_path), _path);
         return !file.isOpen() ? errno : _writer.write(file.number(), line);
     }
 
@@ -79,16 +85,17 @@ private:
 
     // The process that gets the lock rotates. Lines that others write meanwhile go into the file that is being renamed,
     // and are not lost.
-    void rotate(const Descriptor& file) {
+    void rotate(const FolderOfFile& folder, const Descriptor& file) {
         if (flock(file.number(), LOCK_EX | LOCK_NB) != 0) {
             return;
         }
         // If another file has this name now, another process has just rotated.
         struct stat opened {};
         struct stat named {};
-        const bool isDue = fstat(file.number(), &opened) == 0 && stat(_path.c_str(), &named) == 0 &&
+        const bool isDue = fstat(file.number(), &opened) == 0 &&
+                           fstatat(folder.number(), folder.name().c_str(), &named, 0) == 0 &&
                            named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
-        const int error = isDue ? shiftFiles() : 0;
+        const int error = isDue ? shiftFiles(folder) : 0;
         // Closing the descriptor is not enough: a child process that the host has just forked holds the same lock.
         flock(file.number(), LOCK_UN);
         if (isDue && _rotationError.exchange(error) != error && error != 0) {
@@ -97,19 +104,21 @@ private:
     }
 
     // Returns 0 or an error number. Stops at the first failure, since the next step would overwrite a file.
-    int shiftFiles() const {
-        const auto rotated = [this](unsigned int number) { return _path + '.' + std::to_string(number); };
+    int shiftFiles(const FolderOfFile& folder) const {
+        const int in = folder.number();
+        const auto rotated = [&folder](unsigned int number) { return folder.name() + '.' + std::to_string(number); };
         // The first free number; if there is none, the last number, whose file is overwritten.
         unsigned int number = 1;
-        while (number < _rotateCount && access(rotated(number).c_str(), F_OK) == 0) {
+        while (number < _rotateCount && faccessat(in, rotated(number).c_str(), F_OK, AT_SYMLINK_NOFOLLOW) == 0) {
             ++number;
         }
         for (; number > 1; --number) {
-            if (rename(rotated(number - 1).c_str(), rotated(number).c_str()) != 0) {
+            if (renameat(in, rotated(number - 1).c_str(), in, rotated(number).c_str()) != 0) {
                 return errno;
             }
         }
-        const int result = _rotateCount > 0 ? rename(_path.c_str(), rotated(1).c_str()) : unlink(_path.c_str());
+        const int result = _rotateCount > 0 ? renameat(in, folder.name().c_str(), in, rotated(1).c_str())
+                                            : unlinkat(in, folder.name().c_str(), 0);
         return result == 0 ? 0 : errno;
     }
 

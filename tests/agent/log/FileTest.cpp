@@ -90,6 +90,31 @@ TEST(FileTest, ALinkToAFileThatIsMissingLeadsToANewOne) {
     EXPECT_THAT(textsOf(linesOfFile(target)), ElementsAre("over there"));
 }
 
+TEST(FileTest, RootIsNotLedElsewhereByTheOwnerOfTheFolder) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root has something to lose";
+    }
+    constexpr uid_t owner = 64998;
+    const LogProcess process;
+    process.configureFile();
+    const AgentTest::TemporaryFolder elsewhere;
+    AgentTest::writeFile(elsewhere / "precious", "precious\n");
+    ASSERT_EQ(chown(process.file().parent_path().c_str(), owner, owner), 0);
+    process.run([&] {
+        for (const char* target : {"precious", "missing"}) {
+            fs::create_symlink(elsewhere / target, process.file());
+            writeLog(6000, "attacked");
+            fs::remove(process.file());
+        }
+        writeLog(6000, "in its place");
+    });
+    EXPECT_THAT(linesOfFile(elsewhere / "precious"), ElementsAre("precious"));
+    EXPECT_FALSE(fs::exists(elsewhere / "missing"));
+    EXPECT_THAT(textsOf(linesOfFile(process.file())),
+                ElementsAre("2 records lost: " + process.file().string() + ": Too many levels of symbolic links",
+                            "in its place"));
+}
+
 TEST(FileTest, ThreadsWriteWholeLinesIntoOneFile) {
     constexpr int threadCount = 8;
     constexpr int records = 500;

@@ -28,8 +28,13 @@ using Kind = LogindError::Kind;
 /** The bus's errors for a service that is not there. */
 constexpr std::array<std::string_view, 3> noServiceErrors = {
     SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER, "org.freedesktop.systemd1.NoSuchUnit"};
-/** systemd's errors for a service that must not be started. */
-constexpr std::array<std::string_view, 1> maskedErrors = {"org.freedesktop.systemd1.UnitMasked"};
+/** systemd's error for a service that must not be started. */
+constexpr std::string_view maskedError = "org.freedesktop.systemd1.UnitMasked";
+/**
+ * systemd's error instead of that, if systemd-logind was masked while it ran: D-Bus starts it by an alias, which
+ * systemd cannot load any more.
+ */
+constexpr std::string_view maskedAliasError = SD_BUS_ERROR_FILE_EXISTS;
 /** The bus's errors for a service that ended before it answered. */
 constexpr std::array<std::string_view, 2> unansweredErrors = {SD_BUS_ERROR_NO_REPLY, SD_BUS_ERROR_DISCONNECTED};
 
@@ -283,7 +288,7 @@ void Logind::failToAnswer(const char* method, int result, const std::string& err
     if (isOneOf(noServiceErrors, error)) {
         throw LogindError(Kind::noService, "systemd-logind is not on the system bus: " + text);
     }
-    if (isOneOf(maskedErrors, error)) {
+    if (error == maskedError || (!_answers && error == maskedAliasError)) {
         throw _answers ? LogindError(Kind::polkitMasked, std::string(method) +
                                                              ": polkit is masked, which "
                                                              "systemd-logind has to ask: " +

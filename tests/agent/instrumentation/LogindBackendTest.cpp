@@ -425,6 +425,11 @@ INSTANTIATE_TEST_SUITE_P(
                 R"(systemd-logind is masked: org\.freedesktop\.systemd1\.UnitMasked: Unit is masked\.: let it be )"
                 R"(started again \(systemctl unmask systemd-logind\.service\))",
                 "delay = 3600\n", "", true},
+        Failure{"WhereSystemdLogindWasMaskedWhileItRan",
+                R"({"PropertiesError": ["org.freedesktop.DBus.Error.FileExists", "Unit failed to load properly"]})",
+                R"(systemd-logind is masked: org\.freedesktop\.DBus\.Error\.FileExists: Unit failed to load properly: )"
+                R"(let it be started again \(systemctl unmask systemd-logind\.service\))",
+                "delay = 3600\n", "", true},
         Failure{"WherePolkitIsMasked",
                 R"({"Calls": {"ScheduleShutdown": {"error": ["org.freedesktop.systemd1.UnitMasked", "Unit"]}}})",
                 R"(ScheduleShutdown: polkit is masked, which systemd-logind has to ask: org\.freedesktop\.systemd1\.)"

@@ -38,13 +38,13 @@ protected:
     Catalogue _catalogue{readMof(family, "family.mof")};
 };
 
-TEST_F(CatalogueTest, findsAClassInAnyLetterCase) {
+TEST_F(CatalogueTest, FindsAClassInAnyLetterCase) {
     ASSERT_NE(_catalogue.find("PARENT"), nullptr);
     EXPECT_EQ(_catalogue.find("parent")->name, "Parent");
     EXPECT_EQ(_catalogue.find("Nobody"), nullptr);
 }
 
-TEST_F(CatalogueTest, givesAClassWhatItInheritsWithTheAncestorsElementsFirst) {
+TEST_F(CatalogueTest, GivesAClassWhatItInheritsWithTheAncestorsElementsFirst) {
     const Class& child = *_catalogue.find("Child");
     EXPECT_THAT(child.properties, ElementsAre(Field(&Property::name, "Caption"), Field(&Property::name, "Id"),
                                               Field(&Property::name, "Name"), Field(&Property::name, "Own")));
@@ -52,7 +52,7 @@ TEST_F(CatalogueTest, givesAClassWhatItInheritsWithTheAncestorsElementsFirst) {
     EXPECT_EQ(child.superClass, "Parent");
 }
 
-TEST_F(CatalogueTest, tellsWhichClassDeclaredAnElementFirstAndWhichLast) {
+TEST_F(CatalogueTest, TellsWhichClassDeclaredAnElementFirstAndWhichLast) {
     const Class& child = *_catalogue.find("Child");
     const auto isDeclared = [](const char* origin, const char* last) {
         return testing::AllOf(Field(&Element::origin, origin), Field(&Element::declaredBy, last));
@@ -65,27 +65,27 @@ TEST_F(CatalogueTest, tellsWhichClassDeclaredAnElementFirstAndWhichLast) {
     EXPECT_FALSE(child.property("Caption")->isDeclaredBy(child));
 }
 
-TEST_F(CatalogueTest, listsAllClassesByName) {
+TEST_F(CatalogueTest, ListsAllClassesByName) {
     EXPECT_THAT(_catalogue.all(), ElementsAre(testing::Pointee(Field(&Class::name, "Base")),
                                               testing::Pointee(Field(&Class::name, "Child")),
                                               testing::Pointee(Field(&Class::name, "Parent")),
                                               testing::Pointee(Field(&Class::name, "Stranger"))));
 }
 
-TEST_F(CatalogueTest, keepsInheritedQualifiersThatADeclarationDoesNotChange) {
+TEST_F(CatalogueTest, KeepsInheritedQualifiersThatADeclarationDoesNotChange) {
     const Property& name = *_catalogue.find("Child")->property("Name");
     EXPECT_TRUE(name.isKey());
     EXPECT_EQ(find(name.qualifiers, "Description")->value, stringValue("more"));
     EXPECT_EQ(find(_catalogue.find("Parent")->property("Name")->qualifiers, "Description")->value, stringValue("less"));
 }
 
-TEST_F(CatalogueTest, knowsTheKeysOfAClass) {
+TEST_F(CatalogueTest, KnowsTheKeysOfAClass) {
     EXPECT_THAT(_catalogue.keyNames("child"), ElementsAre("Id", "Name"));
     EXPECT_THAT(_catalogue.keyNames("Stranger"), IsEmpty());
     EXPECT_THAT(_catalogue.keyNames("Nobody"), IsEmpty());
 }
 
-TEST_F(CatalogueTest, knowsWhatAClassDescendsFrom) {
+TEST_F(CatalogueTest, KnowsWhatAClassDescendsFrom) {
     EXPECT_TRUE(_catalogue.isA("Child", "Child"));
     EXPECT_TRUE(_catalogue.isA("child", "BASE"));
     EXPECT_FALSE(_catalogue.isA("Base", "Child"));
@@ -101,7 +101,7 @@ struct Misfit {
 
 class MisfitTest : public testing::TestWithParam<Misfit> {};
 
-TEST_P(MisfitTest, isReportedByFileAndLine) {
+TEST_P(MisfitTest, IsReportedByFileAndLine) {
     try {
         const Catalogue catalogue(readMof(GetParam().mof, "x.mof"));
         FAIL() << GetParam().mof << " was taken";
@@ -130,7 +130,7 @@ INSTANTIATE_TEST_SUITE_P(
         Misfit{"Qualifier Q : string;\nQualifier q : string[];",
                "x.mof:2: found another declaration of the qualifier type q, expected it as in x.mof:1"}));
 
-TEST(ReadCatalogue, reportsAFolderThatIsNotThere) {
+TEST(ReadCatalogue, ReportsAFolderThatIsNotThere) {
     try {
         readCatalogue("/nowhere/at/all");
         FAIL() << "read";
@@ -148,7 +148,7 @@ std::vector<std::string> namesOf(const Qualifiers& qualifiers) {
     return names;
 }
 
-TEST(QualifiersOfACatalogue, goToSubclassesUnlessTheyAreRestricted) {
+TEST(QualifiersOfACatalogue, GoToSubclassesUnlessTheyAreRestricted) {
     const Catalogue catalogue(readMof(R"(
         [Association, Abstract, Version("1"), UMLPackagePath("A::B")]
         class Parent {
@@ -172,7 +172,7 @@ TEST(QualifiersOfACatalogue, goToSubclassesUnlessTheyAreRestricted) {
     EXPECT_THAT(namesOf(catalogue.find("GrandChild")->property("One")->qualifiers), ElementsAre("Key", "Max", "Min"));
 }
 
-TEST(QualifiersOfACatalogue, haveValuesOfTheirTypes) {
+TEST(QualifiersOfACatalogue, HaveValuesOfTheirTypes) {
     const Catalogue catalogue(readMof(R"(
         Qualifier Shade : uint8[], Flavor(Restricted);
         class A { [MaxLen(64), MinValue(-1), Shade{1, 2}, Unknown(3)] string P; };)",
@@ -188,7 +188,7 @@ TEST(QualifiersOfACatalogue, haveValuesOfTheirTypes) {
     EXPECT_EQ(catalogue.qualifierTypes().find("Unknown"), nullptr);
 }
 
-TEST(QualifiersOfACatalogue, mayBeDeclaredTwiceInTheSameWay) {
+TEST(QualifiersOfACatalogue, MayBeDeclaredTwiceInTheSameWay) {
     const Catalogue catalogue(readMof("Qualifier Key : boolean, Flavor(DisableOverride);\n"
                                       "Qualifier KEY : boolean, Flavor(DisableOverride);\n"
                                       "class A {};",
@@ -203,7 +203,7 @@ struct Code {
 
 class ValueMapTest : public testing::TestWithParam<Code> {};
 
-TEST_P(ValueMapTest, tellsWhatACodeMeans) {
+TEST_P(ValueMapTest, TellsWhatACodeMeans) {
     const auto declared = readMof(R"(
         class A {
             [ValueMap{"1", "2", "3..5", "..", "0x8000..", "..-5"},
@@ -221,7 +221,7 @@ INSTANTIATE_TEST_SUITE_P(
                     Code{signedValue(CMPI_sint64, -5), "none"}, Code{signedValue(CMPI_sint64, -4), "any"},
                     Code{nullValue(CMPI_sint64), std::nullopt}, Code{stringValue("other"), std::nullopt}));
 
-TEST(ValueMap, mayBeOfTexts) {
+TEST(ValueMap, MayBeOfTexts) {
     const auto declared =
         readMof(R"(class A { [ValueMap{"a", "b"}, Values{"first", "second"}] string T; string U; };)", "x.mof");
     const auto& classes = declared.classes;

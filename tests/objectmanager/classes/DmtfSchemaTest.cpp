@@ -153,7 +153,7 @@ protected:
     std::unique_ptr<const Catalogue> _dmtf;
 };
 
-TEST_F(DmtfSchemaTest, hasEveryElementThatIsShippedAsItIsShipped) {
+TEST_F(DmtfSchemaTest, HasEveryElementThatIsShippedAsItIsShipped) {
     for (const Class* ours : _ours.all()) {
         const Class* theirs = _dmtf->find(ours->name);
         ASSERT_NE(theirs, nullptr) << ours->name;
@@ -161,7 +161,7 @@ TEST_F(DmtfSchemaTest, hasEveryElementThatIsShippedAsItIsShipped) {
     }
 }
 
-TEST_F(DmtfSchemaTest, declaresTheStandardQualifiersAsTheyAreKnownWithoutIt) {
+TEST_F(DmtfSchemaTest, DeclaresTheStandardQualifiersAsTheyAreKnownWithoutIt) {
     for (const Class* declared : _dmtf->all()) {
         for (const NamedValue& qualifier : declared->qualifiers) {
             const QualifierType* theirs = _dmtf->qualifierTypes().find(qualifier.name);

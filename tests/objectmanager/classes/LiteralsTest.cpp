@@ -19,7 +19,7 @@ struct TextOfType {
 
 class LiteralTest : public testing::TestWithParam<TextOfType> {};
 
-TEST_P(LiteralTest, meansItsValue) {
+TEST_P(LiteralTest, MeansItsValue) {
     EXPECT_EQ(valueOfText(GetParam().text, GetParam().value.type), GetParam().value);
 }
 
@@ -53,7 +53,7 @@ struct NoValue {
 
 class NoLiteralTest : public testing::TestWithParam<NoValue> {};
 
-TEST_P(NoLiteralTest, saysWhatWasExpected) {
+TEST_P(NoLiteralTest, SaysWhatWasExpected) {
     try {
         valueOfText(GetParam().text, GetParam().type);
         FAIL() << GetParam().text << " was taken";
@@ -83,7 +83,7 @@ INSTANTIATE_TEST_SUITE_P(
         NoValue{"20261120123107.123456+6", CMPI_dateTime, "a datetime"},
         NoValue{"00000001000000.000000:060", CMPI_dateTime, "a datetime"}));
 
-TEST(Literals, withoutADeclaredTypeMeanWhatTheyLookLike) {
+TEST(Literals, WithoutADeclaredTypeMeanWhatTheyLookLike) {
     EXPECT_EQ(valueOfUntypedText("TRUE"), booleanValue(true));
     EXPECT_EQ(valueOfUntypedText("-5"), signedValue(CMPI_sint64, -5));
     EXPECT_EQ(valueOfUntypedText("9223372036854775808"), unsignedValue(CMPI_uint64, 9223372036854775808U));
@@ -102,7 +102,7 @@ struct QuotedText {
 
 class QuotedTextTest : public testing::TestWithParam<QuotedText> {};
 
-TEST_P(QuotedTextTest, isWrittenWithItsEscapesAndReadBack) {
+TEST_P(QuotedTextTest, IsWrittenWithItsEscapesAndReadBack) {
     EXPECT_EQ(inQuotes(GetParam().text), GetParam().literal);
     std::size_t position = 3;
     EXPECT_EQ(readQuoted("..." + GetParam().literal + "...", position), GetParam().text);
@@ -117,7 +117,7 @@ INSTANTIATE_TEST_SUITE_P(texts, QuotedTextTest,
                                          QuotedText{"\x01\x7f", R"("\x0001\x007f")"},
                                          QuotedText{"\u96fb\u6e90", "\"\u96fb\u6e90\""}));
 
-TEST(QuotedLiteral, mayHaveAnyCharacterByItsNumber) {
+TEST(QuotedLiteral, MayHaveAnyCharacterByItsNumber) {
     std::size_t position = 0;
     EXPECT_EQ(readQuoted(R"("\x41\xE4\x96fb.")", position), "A\u00e4\u96fb.");
 }
@@ -130,7 +130,7 @@ struct BadQuotedText {
 
 class BadQuotedTextTest : public testing::TestWithParam<BadQuotedText> {};
 
-TEST_P(BadQuotedTextTest, saysWhereAndWhatWasFound) {
+TEST_P(BadQuotedTextTest, SaysWhereAndWhatWasFound) {
     std::size_t position = 0;
     try {
         readQuoted(GetParam().literal, position);
@@ -148,7 +148,7 @@ INSTANTIATE_TEST_SUITE_P(texts, BadQuotedTextTest,
                                          BadQuotedText{R"("ab\qc")", 3, R"(found the escape '\q')"},
                                          BadQuotedText{R"("ab\xq")", 3, R"(found the escape '\x')"}));
 
-TEST(TypeNames, areReadInAnyCaseAndWrittenAsDeclared) {
+TEST(TypeNames, AreReadInAnyCaseAndWrittenAsDeclared) {
     EXPECT_EQ(typeByName("UInt16"), CMPI_uint16);
     EXPECT_EQ(typeByName("datetime"), CMPI_dateTime);
     EXPECT_EQ(typeByName("integer"), std::nullopt);

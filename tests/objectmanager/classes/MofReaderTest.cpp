@@ -19,12 +19,12 @@ std::vector<Class> classesOf(std::string_view text, std::string_view file) {
     return readMof(text, file).classes;
 }
 
-TEST(MofReader, readsNothingFromAnEmptyText) {
+TEST(MofReader, ReadsNothingFromAnEmptyText) {
     EXPECT_THAT(classesOf("", "x.mof"), SizeIs(0));
     EXPECT_THAT(classesOf("// a comment\n/* and\nanother */ #pragma locale(\"en_US\")\n", "x.mof"), SizeIs(0));
 }
 
-TEST(MofReader, readsAClassWithItsSuperclassAndPlace) {
+TEST(MofReader, ReadsAClassWithItsSuperclassAndPlace) {
     const auto classes = classesOf("#pragma namespace(\"root\")\n\nclass A {\n};\nCLASS B : A {};", "x.mof");
     ASSERT_THAT(classes, SizeIs(2));
     EXPECT_EQ(classes[0].name, "A");
@@ -35,7 +35,7 @@ TEST(MofReader, readsAClassWithItsSuperclassAndPlace) {
     EXPECT_EQ(classes[1].place, "x.mof:5");
 }
 
-TEST(MofReader, readsPropertiesWithTypesAndDefaults) {
+TEST(MofReader, ReadsPropertiesWithTypesAndDefaults) {
     const auto classes = classesOf(R"(
         class A {
             string Text = "a\"b";
@@ -67,7 +67,7 @@ TEST(MofReader, readsPropertiesWithTypesAndDefaults) {
     EXPECT_EQ(classes[0].property("other")->referenceClass, "A");
 }
 
-TEST(MofReader, readsQualifiersOfEveryForm) {
+TEST(MofReader, ReadsQualifiersOfEveryForm) {
     const auto classes = classesOf(R"(
         [Abstract, Version("1.2"), Min(1), Max(-2), Ratio(0.5), Sign('+'), Off(FALSE), Empty(NULL),
          Values{"one", "two"}, Numbers{1, 2}, None{},
@@ -92,7 +92,7 @@ TEST(MofReader, readsQualifiersOfEveryForm) {
     EXPECT_EQ(valueOf("Text"), stringValue("one text of three"));
 }
 
-TEST(MofReader, readsMethodsWithQualifiedParameters) {
+TEST(MofReader, ReadsMethodsWithQualifiedParameters) {
     const auto classes = classesOf(R"(
         class A {
             uint32 Stop();
@@ -116,7 +116,7 @@ TEST(MofReader, readsMethodsWithQualifiedParameters) {
     EXPECT_EQ(directions(3), std::pair(true, true));
 }
 
-TEST(MofReader, readsQualifierTypesWithTheirScopesAndFlavors) {
+TEST(MofReader, ReadsQualifierTypesWithTheirScopesAndFlavors) {
     const auto types = readMof(R"(
         Qualifier Key : boolean = false, Scope(property, reference), Flavor(DisableOverride, ToSubclass);
         Qualifier Values : string[], Scope(any), Flavor(Translatable);
@@ -148,7 +148,7 @@ struct BadMof {
 
 class BadMofTest : public testing::TestWithParam<BadMof> {};
 
-TEST_P(BadMofTest, isReportedByFileAndLine) {
+TEST_P(BadMofTest, IsReportedByFileAndLine) {
     try {
         readMof(GetParam().text, "x.mof");
         FAIL() << GetParam().text << " was taken";

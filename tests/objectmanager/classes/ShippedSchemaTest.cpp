@@ -26,7 +26,7 @@ protected:
     std::vector<Registration> _registrations = readRegistrations(std::filesystem::path(ORV_SCHEMA_FOLDER));
 };
 
-TEST_F(ShippedSchemaTest, declaresEveryRegisteredClass) {
+TEST_F(ShippedSchemaTest, DeclaresEveryRegisteredClass) {
     ASSERT_FALSE(_registrations.empty());
     for (const Registration& registration : _registrations) {
         EXPECT_NE(_catalogue.find(registration.className), nullptr) << registration.className;
@@ -34,7 +34,7 @@ TEST_F(ShippedSchemaTest, declaresEveryRegisteredClass) {
     }
 }
 
-TEST_F(ShippedSchemaTest, registersTheServiceForInstancesAndMethods) {
+TEST_F(ShippedSchemaTest, RegistersTheServiceForInstancesAndMethods) {
     EXPECT_THAT(_registrations, Contains(AllOf(Field(&Registration::className, "TALVO_PowerManagementService"),
                                                Field(&Registration::provider, "PowerManagementServiceProvider"),
                                                Field(&Registration::location, "orvpowerstatemanagementprovider"),
@@ -44,7 +44,7 @@ TEST_F(ShippedSchemaTest, registersTheServiceForInstancesAndMethods) {
 }
 
 /** sfcb terminates if a registration has a key that it does not know. */
-TEST_F(ShippedSchemaTest, registersWithSfcbInItsOwnForm) {
+TEST_F(ShippedSchemaTest, RegistersWithSfcbInItsOwnForm) {
     const std::filesystem::path folder = ORV_SCHEMA_FOLDER;
     for (const char* name : {"orv-power-management.reg", "orv-computer-system.reg"}) {
         std::string text = readFile(folder / name);
@@ -56,7 +56,7 @@ TEST_F(ShippedSchemaTest, registersWithSfcbInItsOwnForm) {
     }
 }
 
-TEST_F(ShippedSchemaTest, registersTheCapabilitiesForInstancesOnly) {
+TEST_F(ShippedSchemaTest, RegistersTheCapabilitiesForInstancesOnly) {
     EXPECT_THAT(_registrations,
                 Contains(AllOf(Field(&Registration::className, "TALVO_PowerManagementCapabilities"),
                                Field(&Registration::provider, "PowerManagementCapabilitiesProvider"),
@@ -69,7 +69,7 @@ std::string instancesOf(const std::string& name) {
     return readFile(std::filesystem::path(ORV_SCHEMA_FOLDER) / "pg" / (name + ".mof"));
 }
 
-TEST_F(ShippedSchemaTest, registersTheLibrariesByInstancesToo) {
+TEST_F(ShippedSchemaTest, RegistersTheLibrariesByInstancesToo) {
     const std::string power = instancesOf("orv-power-management");
     EXPECT_THAT(power, HasSubstr("    Location = \"orvpowerstatemanagementprovider\";\n"));
     EXPECT_THAT(power, Not(HasSubstr("TALVO_ComputerSystem")));
@@ -98,7 +98,7 @@ struct Link {
     std::vector<std::string> ends;
 };
 
-TEST_F(ShippedSchemaTest, registersAndDeclaresTheAssociationsWithTheClassesAtTheirEnds) {
+TEST_F(ShippedSchemaTest, RegistersAndDeclaresTheAssociationsWithTheClassesAtTheirEnds) {
     const Link links[] = {
         {"TALVO_AssociatedPowerManagementService",
          "CIM_AssociatedPowerManagementService",
@@ -127,7 +127,7 @@ TEST_F(ShippedSchemaTest, registersAndDeclaresTheAssociationsWithTheClassesAtThe
     }
 }
 
-TEST_F(ShippedSchemaTest, givesTheServiceItsKeysAndItsMethod) {
+TEST_F(ShippedSchemaTest, GivesTheServiceItsKeysAndItsMethod) {
     EXPECT_THAT(_catalogue.keyNames("TALVO_PowerManagementService"),
                 ElementsAre("Name", "SystemCreationClassName", "SystemName", "CreationClassName"));
     const Method* method = _catalogue.find("TALVO_PowerManagementService")->method("RequestPowerStateChange");
@@ -145,7 +145,7 @@ TEST_F(ShippedSchemaTest, givesTheServiceItsKeysAndItsMethod) {
     EXPECT_THAT(meaning(*method, unsignedValue(CMPI_uint32, 0)), Optional(std::string("Completed with No Error")));
 }
 
-TEST_F(ShippedSchemaTest, givesTheCapabilitiesTheirKeyAndTheirCodes) {
+TEST_F(ShippedSchemaTest, GivesTheCapabilitiesTheirKeyAndTheirCodes) {
     EXPECT_THAT(_catalogue.keyNames("TALVO_PowerManagementCapabilities"), ElementsAre("InstanceID"));
     const Class& capabilities = *_catalogue.find("TALVO_PowerManagementCapabilities");
     const auto meaningOf = [&](const char* name, std::uint64_t code) {
@@ -159,7 +159,7 @@ TEST_F(ShippedSchemaTest, givesTheCapabilitiesTheirKeyAndTheirCodes) {
 }
 
 /** This lets the served classes be loaded beside the whole common model, whatever else that declares. */
-TEST_F(ShippedSchemaTest, hasTheServedClassesOverrideNothingButToNarrowReferences) {
+TEST_F(ShippedSchemaTest, HasTheServedClassesOverrideNothingButToNarrowReferences) {
     for (const Class* served : _catalogue.all()) {
         if (!served->name.starts_with("TALVO_")) {
             continue;
@@ -180,7 +180,7 @@ TEST_F(ShippedSchemaTest, hasTheServedClassesOverrideNothingButToNarrowReference
     }
 }
 
-TEST_F(ShippedSchemaTest, derivesTheServedClassesFromTheClassesOfTheProfile) {
+TEST_F(ShippedSchemaTest, DerivesTheServedClassesFromTheClassesOfTheProfile) {
     const std::pair<const char*, const char*> derivations[] = {
         {"TALVO_AssociatedPowerManagementService", "CIM_AssociatedPowerManagementService"},
         {"TALVO_ComputerSystem", "CIM_ComputerSystem"},
@@ -198,7 +198,7 @@ TEST_F(ShippedSchemaTest, derivesTheServedClassesFromTheClassesOfTheProfile) {
     EXPECT_THAT(served, testing::ElementsAreArray(derivations));
 }
 
-TEST_F(ShippedSchemaTest, hasTheServedClassesDescendFromTheCommonModel) {
+TEST_F(ShippedSchemaTest, HasTheServedClassesDescendFromTheCommonModel) {
     EXPECT_TRUE(_catalogue.isA("TALVO_PowerManagementService", "CIM_Service"));
     EXPECT_TRUE(_catalogue.isA("TALVO_PowerManagementService", "CIM_ManagedElement"));
     EXPECT_TRUE(_catalogue.isA("TALVO_PowerManagementCapabilities", "CIM_Capabilities"));

@@ -39,7 +39,7 @@ protected:
     }
 };
 
-TEST_P(AssociationTest, isAnsweredAsItsFileSays) {
+TEST_P(AssociationTest, IsAnsweredAsItsFileSays) {
     std::vector<std::string> arguments = {GetParam().command, pathOf(GetParam().source)};
     arguments.insert(arguments.end(), GetParam().options.begin(), GetParam().options.end());
     EXPECT_EQ(answerOf(arguments), contentOf(std::filesystem::path(ORVCIM_TEST_DATA) / GetParam().name));
@@ -76,7 +76,7 @@ struct Restricted {
     const char* association;
 };
 
-TEST_F(ProvidedTest, restrictsAssociationsByClassesTheirAncestorsAndRoles) {
+TEST_F(ProvidedTest, RestrictsAssociationsByClassesTheirAncestorsAndRoles) {
     const Restricted restrictions[] = {
         {"--assoc-class", "TALVO_PowerManagementHostedService", "TALVO_PowerManagementHostedService"},
         {"--assoc-class", "CIM_Dependency", "TALVO_PowerManagementHostedService"},
@@ -107,7 +107,7 @@ protected:
     }
 };
 
-TEST_F(NoComputerSystemTest, failsForTheAssociationsThatNeedItAndSaysWhy) {
+TEST_F(NoComputerSystemTest, FailsForTheAssociationsThatNeedItAndSaysWhy) {
     for (const char* command : {"associators", "associator-names", "references", "reference-names"}) {
         const Outcome outcome = withoutSystem({command, _service});
         EXPECT_EQ(outcome.err, "orvcim: " + _service +
@@ -119,14 +119,14 @@ TEST_F(NoComputerSystemTest, failsForTheAssociationsThatNeedItAndSaysWhy) {
     }
 }
 
-TEST_F(NoComputerSystemTest, servesTheAssociationThatDoesNotNeedIt) {
+TEST_F(NoComputerSystemTest, ServesTheAssociationThatDoesNotNeedIt) {
     const Outcome outcome = withoutSystem({"associator-names", _service, "--assoc-class", "CIM_ElementCapabilities"});
     EXPECT_EQ(outcome.out, "TALVO_PowerManagementElementCapabilities\n  " + _capabilities + "\n");
     EXPECT_EQ(outcome.err, "");
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST_F(NoComputerSystemTest, tellsWhatTheProviderLoggedBesideAnAnswerThatIsMerelyEmpty) {
+TEST_F(NoComputerSystemTest, TellsWhatTheProviderLoggedBesideAnAnswerThatIsMerelyEmpty) {
     const Outcome outcome = withoutSystem({"instances", "TALVO_AssociatedPowerManagementService"});
     EXPECT_EQ(outcome.out, "");
     EXPECT_EQ(outcome.err, "orvcim: the provider logged: CBEnumInstanceNames Failed for the target Class\n");
@@ -135,7 +135,7 @@ TEST_F(NoComputerSystemTest, tellsWhatTheProviderLoggedBesideAnAnswerThatIsMerel
 
 using GraphTest = ProvidedTest;
 
-TEST_F(GraphTest, hasEveryInstanceWithItsAssociations) {
+TEST_F(GraphTest, HasEveryInstanceWithItsAssociations) {
     EXPECT_EQ(answerOf({"graph"}), contentOf(std::filesystem::path(ORVCIM_TEST_DATA) / "graph.dot"));
 }
 

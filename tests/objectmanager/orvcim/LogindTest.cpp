@@ -60,7 +60,7 @@ protected:
     PrivateBus _bus;
 };
 
-TEST_F(LogindTest, rebootsAndShutsDown) {
+TEST_F(LogindTest, RebootsAndShutsDown) {
     const std::pair<const char*, const char*> requests[] = {{"reboot", "reboot"}, {"shutdown", "poweroff"}};
     for (const auto& [command, type] : requests) {
         _bus.startLogind();
@@ -76,14 +76,14 @@ TEST_F(LogindTest, rebootsAndShutsDown) {
     }
 }
 
-TEST_F(LogindTest, asksBeforeItActs) {
+TEST_F(LogindTest, AsksBeforeItActs) {
     _bus.startLogind();
     EXPECT_EQ(run({"power", "reboot"}).err, "orvcim: machine.example is not known to be a simulated machine: expected "
                                             "--yes, or a terminal on which to ask for confirmation\n");
     EXPECT_THAT(_bus.requests(), IsEmpty());
 }
 
-TEST_F(LogindTest, showsWhatTheMachineDoes) {
+TEST_F(LogindTest, ShowsWhatTheMachineDoes) {
     const std::string heading = "SYSTEM           SERVICE                      POWER STATE\n"
                                 "machine.example  PowerStateManagement_system  ";
     _bus.startLogind();
@@ -92,7 +92,7 @@ TEST_F(LogindTest, showsWhatTheMachineDoes) {
     EXPECT_EQ(run({"power", "status"}).out, heading + "1 (Other), as while it reboots or shuts down\n");
 }
 
-TEST_F(LogindTest, showsWhyTheMachineRefused) {
+TEST_F(LogindTest, ShowsWhyTheMachineRefused) {
     _bus.startLogind(R"({"Inhibitors": [["shutdown", "apt", "upgrade", "block", 0, 77]]})");
     const std::string refused =
         "Power request refused: reboot of this machine, node system: inhibited by apt \\(upgrade; "
@@ -105,7 +105,7 @@ TEST_F(LogindTest, showsWhyTheMachineRefused) {
     EXPECT_THAT(_bus.requests(), IsEmpty());
 }
 
-TEST_F(LogindTest, showsThatThereIsNoSystemdLogind) {
+TEST_F(LogindTest, ShowsThatThereIsNoSystemdLogind) {
     EXPECT_THAT(
         run({"power", "reboot", "--yes"}).err,
         StartsWith("orvcim: Power request refused: reboot of this machine, node system: systemd-logind is not on "
@@ -117,7 +117,7 @@ TEST_F(LogindTest, showsThatThereIsNoSystemdLogind) {
     EXPECT_EQ(status.status, 1);
 }
 
-TEST_F(LogindTest, showsThatTheLibraryOfSystemdIsMissing) {
+TEST_F(LogindTest, ShowsThatTheLibraryOfSystemdIsMissing) {
     std::filesystem::create_directory(_folder / "broken");
     std::ofstream(_folder / "broken/libsystemd.so.0") << "no library";
     setenv("LD_LIBRARY_PATH", (_folder / "broken").c_str(), 1);
@@ -129,7 +129,7 @@ TEST_F(LogindTest, showsThatTheLibraryOfSystemdIsMissing) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST_F(LogindTest, checksWhatTheMachineCanDo) {
+TEST_F(LogindTest, ChecksWhatTheMachineCanDo) {
     _bus.startLogind(R"({"CanHibernate": "na"})");
     const Outcome outcome = run({"check"});
     EXPECT_EQ(outcome.err, "");
@@ -154,7 +154,7 @@ TEST_F(LogindTest, checksWhatTheMachineCanDo) {
     EXPECT_THAT(_bus.requests(), IsEmpty());
 }
 
-TEST_F(LogindTest, checksWhatIsMissing) {
+TEST_F(LogindTest, ChecksWhatIsMissing) {
     const Outcome withoutLogind = run({"check", "--format", "json"});
     EXPECT_EQ(withoutLogind.err, "orvcim: not usable: the embedded agent\n");
     EXPECT_EQ(withoutLogind.status, 1);

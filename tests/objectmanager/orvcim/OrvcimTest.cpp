@@ -25,12 +25,12 @@ void expectDone(const Outcome& outcome, const std::string& out) {
     EXPECT_EQ(outcome.out, out);
 }
 
-TEST(Orvcim, listsTheClassesOfANamespace) {
+TEST(Orvcim, ListsTheClassesOfANamespace) {
     expectDone(orvcim({"classes", "--namespace", "root/test"}), "CLASS       SUPERCLASS  METHODS\n"
                                                                 "Test_Thing              Add, Refuse, Throw, Absent\n");
 }
 
-TEST(Orvcim, namesInstancesByPathsThatGetTakes) {
+TEST(Orvcim, NamesInstancesByPathsThatGetTakes) {
     expectDone(orvcim({"names", "Test_Thing"}), "root/cimv2:Test_Thing.Name=\"one\"\n"
                                                 "root/cimv2:Test_Thing.Name=\"two \\\"quoted\\\"\"\n");
     expectDone(orvcim({"get", R"(root/cimv2:Test_Thing.Name="two \"quoted\"")"}), "root/cimv2:Test_Thing\n"
@@ -38,7 +38,7 @@ TEST(Orvcim, namesInstancesByPathsThatGetTakes) {
                                                                                   "    Size  5\n");
 }
 
-TEST(Orvcim, showsInstancesAsTableJsonAndMof) {
+TEST(Orvcim, ShowsInstancesAsTableJsonAndMof) {
     expectDone(orvcim({"instances", "Test_Thing"}), "root/cimv2:Test_Thing\n"
                                                     "  * Name  one\n"
                                                     "    Size  5\n"
@@ -67,7 +67,7 @@ TEST(Orvcim, showsInstancesAsTableJsonAndMof) {
 )");
 }
 
-TEST(Orvcim, takesClassesAndPropertiesInAnyLetterCase) {
+TEST(Orvcim, TakesClassesAndPropertiesInAnyLetterCase) {
     expectDone(orvcim({"instances", "root/test:TEST_thing", "--properties", "NAME"}), "root/test:Test_Thing\n"
                                                                                       "  * Name  one\n"
                                                                                       "\n"
@@ -78,7 +78,7 @@ TEST(Orvcim, takesClassesAndPropertiesInAnyLetterCase) {
                                                                     "    Size  5\n");
 }
 
-TEST(Orvcim, passesArgumentsInTheTypesOfTheMethod) {
+TEST(Orvcim, PassesArgumentsInTheTypesOfTheMethod) {
     expectDone(orvcim({"invoke", thing, "Add", "left=65535", "RIGHT=1", "Right=2",
                        "Other=//elsewhere/ROOT/cimv2:test_thing.NAME=\"one\"", "When=00000000000001.500000:000"}),
                "Add\n"
@@ -114,7 +114,7 @@ void PrintTo(const Mistake& mistake, std::ostream* out) {
 
 class MistakeTest : public testing::TestWithParam<Mistake> {};
 
-TEST_P(MistakeTest, getsOneClearLineAndItsStatus) {
+TEST_P(MistakeTest, GetsOneClearLineAndItsStatus) {
     const Outcome outcome = orvcim(GetParam().arguments);
     EXPECT_EQ(outcome.err, "orvcim: " + GetParam().error + "\n");
     EXPECT_EQ(outcome.out, "");
@@ -260,13 +260,13 @@ INSTANTIATE_TEST_SUITE_P(
                 "Throw: CIM_ERR_FAILED (1): Thing threw an exception: thrown by the provider"},
         Mistake{{"invoke", thing, "Absent"}, 1, "Absent: CIM_ERR_METHOD_NOT_AVAILABLE (16): Thing gave no reason"}));
 
-TEST(Orvcim, reportsASchemaThatCannotBeRead) {
+TEST(Orvcim, ReportsASchemaThatCannotBeRead) {
     const Outcome outcome = runProcess({ORVCIM_PROGRAM, "--schema", "/nowhere/at/all", "classes"}, {});
     EXPECT_EQ(outcome.err, "orvcim: /nowhere/at/all: cannot be read: No such file or directory\n");
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Orvcim, reportsALibraryThatIsNotThere) {
+TEST(Orvcim, ReportsALibraryThatIsNotThere) {
     const Outcome outcome =
         runProcess({ORVCIM_PROGRAM, "--schema", ORVCIM_BROKEN_SCHEMA, "names", "Test_NoLibrary"}, {});
     EXPECT_THAT(outcome.err,
@@ -274,7 +274,7 @@ TEST(Orvcim, reportsALibraryThatIsNotThere) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Orvcim, tellsHowItIsUsed) {
+TEST(Orvcim, TellsHowItIsUsed) {
     const Outcome help = orvcim({"--help"});
     EXPECT_EQ(help.status, 0);
     EXPECT_THAT(help.out, AllOf(HasSubstr("--provider-path"), HasSubstr("invoke"), HasSubstr("check")));
@@ -288,7 +288,7 @@ TEST(Orvcim, tellsHowItIsUsed) {
     EXPECT_THAT(orvcim({"--version"}).out, StartsWith("orvcim 1."));
 }
 
-TEST(Orvcim, saysWhereStandardOutputCannotBeWritten) {
+TEST(Orvcim, SaysWhereStandardOutputCannotBeWritten) {
     const Outcome outcome =
         runProcess({"/bin/sh", "-c", "\"$0\" \"$@\" > /dev/full", ORVCIM_PROGRAM, "--schema", ORVCIM_TEST_SCHEMA,
                     "--provider-path", ORVCIM_TEST_LIBRARIES, "names", "Test_Thing"},
@@ -297,7 +297,7 @@ TEST(Orvcim, saysWhereStandardOutputCannotBeWritten) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Check, saysWhichProvidersLoadAndFromWhere) {
+TEST(Check, SaysWhichProvidersLoadAndFromWhere) {
     const Outcome outcome = orvcim({"check"});
     EXPECT_EQ(outcome.err, "");
     EXPECT_EQ(outcome.status, 0);
@@ -310,7 +310,7 @@ TEST(Check, saysWhichProvidersLoadAndFromWhere) {
                                        "  factory     Thing_Create_MethodMI: methodThing, versions 200 and 200\n"));
 }
 
-TEST(Check, saysWhatIsWrongAndFails) {
+TEST(Check, SaysWhatIsWrongAndFails) {
     const Outcome outcome = runProcess(
         {ORVCIM_PROGRAM, "--schema", ORVCIM_BROKEN_SCHEMA, "--provider-path", ORVCIM_TEST_LIBRARIES, "check"}, {});
     EXPECT_EQ(outcome.err, "orvcim: not usable: Test_NoLibrary, Test_NoFactory, Test_Undeclared\n");
@@ -325,7 +325,7 @@ TEST(Check, saysWhatIsWrongAndFails) {
     EXPECT_THAT(outcome.out, HasSubstr("  problem     the class is not declared in "));
 }
 
-TEST(Check, saysTheSameAsJson) {
+TEST(Check, SaysTheSameAsJson) {
     const Outcome outcome = runProcess({ORVCIM_PROGRAM, "--schema", ORVCIM_BROKEN_SCHEMA, "--provider-path",
                                         ORVCIM_TEST_LIBRARIES, "check", "--format", "json"},
                                        {});

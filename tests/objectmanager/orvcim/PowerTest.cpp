@@ -21,27 +21,27 @@ constexpr const char* unknownOutcome =
 const Environment simulated = {};
 const Environment real = {{"ORVCIM_TEST_MACHINE", "real"}};
 
-TEST(Power, rebootsASimulatedMachineWithoutAsking) {
+TEST(Power, RebootsASimulatedMachineWithoutAsking) {
     const Outcome outcome = orvcim({"power", "reboot"}, simulated);
     EXPECT_EQ(outcome.err, "");
     EXPECT_EQ(outcome.status, 0);
     EXPECT_EQ(outcome.out, "Power request accepted: 5 for TALVO_ComputerSystem TALVO_ComputerSystem testhost\n");
 }
 
-TEST(Power, shutsASimulatedMachineDownWithoutAsking) {
+TEST(Power, ShutsASimulatedMachineDownWithoutAsking) {
     const Outcome outcome = orvcim({"power", "shutdown"}, simulated);
     EXPECT_EQ(outcome.status, 0);
     EXPECT_EQ(outcome.out, "Power request accepted: 8 for TALVO_ComputerSystem TALVO_ComputerSystem testhost\n");
 }
 
-TEST(Power, answersProgramsWithTheResultOfTheMethod) {
+TEST(Power, AnswersProgramsWithTheResultOfTheMethod) {
     EXPECT_EQ(orvcim({"power", "reboot", "--format", "json"}, simulated).out,
               "{\n  \"method\": \"RequestPowerStateChange\",\n  \"returnValue\": 0,\n  \"outputs\": {}\n}\n");
     EXPECT_EQ(orvcim({"power", "reboot", "--format", "mof"}, simulated).out,
               "// RequestPowerStateChange\ninstance of __MethodParameters {\n    ReturnValue = 0;\n};\n");
 }
 
-TEST(Power, leavesAMachineThatMayBeRealAloneWhereItCannotAsk) {
+TEST(Power, LeavesAMachineThatMayBeRealAloneWhereItCannotAsk) {
     for (const char* machine : {"real", "silent"}) {
         const Outcome outcome = orvcim({"power", "shutdown"}, {{"ORVCIM_TEST_MACHINE", machine}});
         EXPECT_EQ(outcome.err, "orvcim: testhost is not known to be a simulated machine: expected --yes, or a terminal "
@@ -51,14 +51,14 @@ TEST(Power, leavesAMachineThatMayBeRealAloneWhereItCannotAsk) {
     }
 }
 
-TEST(Power, asksAtATerminalBeforeItActs) {
+TEST(Power, AsksAtATerminalBeforeItActs) {
     const Outcome outcome = orvcim({"power", "reboot"}, real, "y\n");
     EXPECT_EQ(outcome.err, "Really reboot testhost? [y/N] ");
     EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 5 "));
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(Power, leavesTheMachineAloneWithoutAYes) {
+TEST(Power, LeavesTheMachineAloneWithoutAYes) {
     for (const char* answer : {"n\n", "\n", "yesterday\n", "\x04"}) {
         const Outcome outcome = orvcim({"power", "reboot"}, real, answer);
         EXPECT_EQ(outcome.err, "Really reboot testhost? [y/N] orvcim: not confirmed: testhost was left alone\n");
@@ -67,14 +67,14 @@ TEST(Power, leavesTheMachineAloneWithoutAYes) {
     }
 }
 
-TEST(Power, doesNotAskWhereItWasToldNotTo) {
+TEST(Power, DoesNotAskWhereItWasToldNotTo) {
     const Outcome outcome = orvcim({"power", "reboot", "--yes"}, real);
     EXPECT_EQ(outcome.err, "");
     EXPECT_THAT(outcome.out, StartsWith("Power request accepted: 5 "));
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(Power, failsWhereTheAgentRefusedThoughTheMethodReturnedNothingWrong) {
+TEST(Power, FailsWhereTheAgentRefusedThoughTheMethodReturnedNothingWrong) {
     for (const char* format : {"table", "json", "mof"}) {
         const Outcome outcome = orvcim({"power", "reboot", "--format", format}, {{"ORVCIM_TEST_ANSWER", "refused"}});
         EXPECT_EQ(outcome.err,
@@ -84,7 +84,7 @@ TEST(Power, failsWhereTheAgentRefusedThoughTheMethodReturnedNothingWrong) {
     }
 }
 
-TEST(Power, failsWhereTheAgentSaidNothingOfARequest) {
+TEST(Power, FailsWhereTheAgentSaidNothingOfARequest) {
     const Outcome outcome = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_ANSWER", "nothing"}});
     EXPECT_EQ(outcome.err,
               "orvcim: RequestPowerStateChange ended without a failure, but the agent accepted no power request\n");
@@ -92,20 +92,20 @@ TEST(Power, failsWhereTheAgentSaidNothingOfARequest) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Power, givesTheResultOfTheMethodWhereTheAgentCannotBeHeard) {
+TEST(Power, GivesTheResultOfTheMethodWhereTheAgentCannotBeHeard) {
     const Outcome outcome = orvcim({"power", "reboot", "--yes"}, {{"ORVCIM_TEST_MACHINE", "silent"}});
     EXPECT_EQ(outcome.err, unknownOutcome);
     EXPECT_EQ(outcome.out, "RequestPowerStateChange\n    ReturnValue  0 (Completed with No Error)\n");
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(Power, failsWithWhatTheReturnValueMeans) {
+TEST(Power, FailsWithWhatTheReturnValueMeans) {
     const Outcome outcome = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_ANSWER", "4"}});
     EXPECT_EQ(outcome.err, "orvcim: RequestPowerStateChange failed with 4 (Failed)\n");
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Power, wantsAServiceToBeChosenWhereThereAreSeveral) {
+TEST(Power, WantsAServiceToBeChosenWhereThereAreSeveral) {
     const Environment three = {{"ORVCIM_TEST_SERVICES", "3"}};
     const Outcome undecided = orvcim({"power", "reboot"}, three);
     EXPECT_EQ(undecided.err, "orvcim: found 3 instances of TALVO_PowerManagementService, expected one, or --service "
@@ -116,7 +116,7 @@ TEST(Power, wantsAServiceToBeChosenWhereThereAreSeveral) {
     EXPECT_EQ(orvcim({"power", "reboot", "--service", second}, three).status, 0);
 }
 
-TEST(Power, doesNotTakeAServiceThatIsNotThere) {
+TEST(Power, DoesNotTakeAServiceThatIsNotThere) {
     const Outcome none = orvcim({"power", "reboot"}, {{"ORVCIM_TEST_SERVICES", "0"}});
     EXPECT_EQ(none.err, "orvcim: found 0 instances of TALVO_PowerManagementService, expected one\n");
     EXPECT_EQ(none.status, 1);
@@ -144,7 +144,7 @@ Outcome request(const std::vector<std::string>& arguments, const Environment& en
     return orvcim(command, environment);
 }
 
-TEST(PowerRequest, isMadeForTheSystemOfTheService) {
+TEST(PowerRequest, IsMadeForTheSystemOfTheService) {
     for (const std::string& element :
          {system("testhost"), "//elsewhere.example/root/cimv2:" + system("testhost"),
           "ROOT/CIMV2:" + system("testhost"),
@@ -155,14 +155,14 @@ TEST(PowerRequest, isMadeForTheSystemOfTheService) {
     }
 }
 
-TEST(PowerRequest, saysThatItsOutcomeIsNotKnownWhereTheAgentCannotBeHeard) {
+TEST(PowerRequest, SaysThatItsOutcomeIsNotKnownWhereTheAgentCannotBeHeard) {
     const Outcome outcome =
         request({"PowerState=5", "ManagedElement=" + system("testhost")}, {{"ORVCIM_TEST_MACHINE", "silent"}});
     EXPECT_EQ(outcome.err, unknownOutcome);
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(PowerRequest, isNotMadeWhereNothingIsAssociatedWithTheService) {
+TEST(PowerRequest, IsNotMadeWhereNothingIsAssociatedWithTheService) {
     const Outcome outcome = orvcim({"invoke", "root/unassociated:" + service, "RequestPowerStateChange", "PowerState=5",
                                     "ManagedElement=" + system("testhost")},
                                    simulated);
@@ -171,14 +171,14 @@ TEST(PowerRequest, isNotMadeWhereNothingIsAssociatedWithTheService) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Power, waitsUntilTheMachineIsThere) {
+TEST(Power, WaitsUntilTheMachineIsThere) {
     const Outcome outcome = orvcim({"power", "reboot", "--wait"}, simulated);
     EXPECT_EQ(outcome.err, "");
     EXPECT_THAT(outcome.out, EndsWith("\ntesthost: 2 (On)\n"));
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(Power, waitsNoLongerThanItIsTold) {
+TEST(Power, WaitsNoLongerThanItIsTold) {
     const Outcome outcome = orvcim({"power", "shutdown", "--wait=0.01"}, {{"ORVCIM_TEST_STATE", "1"}});
     EXPECT_EQ(outcome.err,
               "orvcim: the request is not done after 0.01 s: 'orvcim power status' shows how it goes on\n");
@@ -186,14 +186,14 @@ TEST(Power, waitsNoLongerThanItIsTold) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(Power, saysThatItsAgentCannotTakeBackARequest) {
+TEST(Power, SaysThatItsAgentCannotTakeBackARequest) {
     const Outcome outcome = orvcim({"power", "cancel"}, simulated);
     EXPECT_EQ(outcome.err, "orvcim: power cancel: CIM_ERR_NOT_SUPPORTED (7): the agent cannot be asked to take back a "
                            "power request\n");
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST(PowerStatus, showsTheStatesWhereTheyAreServed) {
+TEST(PowerStatus, ShowsTheStatesWhereTheyAreServed) {
     const Outcome outcome = orvcim({"power", "status"}, simulated);
     EXPECT_EQ(outcome.err, "");
     EXPECT_EQ(outcome.out, "SYSTEM    SERVICE   POWER STATE\n"
@@ -201,7 +201,7 @@ TEST(PowerStatus, showsTheStatesWhereTheyAreServed) {
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(PowerStatus, givesProgramsTheInstances) {
+TEST(PowerStatus, GivesProgramsTheInstances) {
     const Outcome outcome = orvcim({"power", "status", "--format", "mof"}, simulated);
     EXPECT_THAT(outcome.out, StartsWith("instance of TALVO_AssociatedPowerManagementService {\n"
                                         "    ServiceProvided = \""));
@@ -209,7 +209,7 @@ TEST(PowerStatus, givesProgramsTheInstances) {
     EXPECT_EQ(outcome.status, 0);
 }
 
-TEST(PowerStatus, failsWhereTheStateIsNotKnown) {
+TEST(PowerStatus, FailsWhereTheStateIsNotKnown) {
     for (const char* state : {"0", "none"}) {
         const Outcome outcome = orvcim({"power", "status"}, {{"ORVCIM_TEST_STATE", state}});
         EXPECT_EQ(outcome.err, "orvcim: the power state is unknown: 'orvcim check' says what is wrong\n");
@@ -219,7 +219,7 @@ TEST(PowerStatus, failsWhereTheStateIsNotKnown) {
     }
 }
 
-TEST(PowerStatus, showsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
+TEST(PowerStatus, ShowsWhatCanBeAskedForAndSaysThatTheStateIsNotServed) {
     const Outcome outcome = orvcim({"power", "status", "--namespace", "root/unassociated"}, simulated);
     EXPECT_EQ(outcome.err, "orvcim: no provider serves the power state: TALVO_AssociatedPowerManagementService is "
                            "not registered in root/unassociated\n"

@@ -13,11 +13,11 @@ using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::StartsWith;
 
-TEST_F(ProvidedTest, everyRegisteredProviderLoads) {
+TEST_F(ProvidedTest, EveryRegisteredProviderLoads) {
     EXPECT_EQ(orvcim({"check"}).status, 0);
 }
 
-TEST_F(ProvidedTest, checksTheAgent) {
+TEST_F(ProvidedTest, ChecksTheAgent) {
     EXPECT_THAT(answerOf({"check"}), HasSubstr("Embedded agent: ok\n"
                                                "  user                 uid " +
                                                std::to_string(geteuid()) +
@@ -34,7 +34,7 @@ TEST_F(ProvidedTest, checksTheAgent) {
                                                "  node chassis/blade1  2 (On)\n"));
 }
 
-TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
+TEST_F(ProvidedTest, ChecksTheAgentsConfiguration) {
     configure("reboot-time = \"soon\"\n");
     const Outcome wrong = orvcim({"check", "--format", "json"});
     EXPECT_EQ(wrong.err, "orvcim: not usable: the embedded agent\n");
@@ -54,13 +54,13 @@ TEST_F(ProvidedTest, checksTheAgentsConfiguration) {
             "the log /nowhere/agent.log cannot be written: there is no folder /nowhere: make it, or name another "));
 }
 
-TEST_F(ProvidedTest, namesTheService) {
+TEST_F(ProvidedTest, NamesTheService) {
     EXPECT_EQ(answerOf({"names", "TALVO_PowerManagementService"}), _service + "\n");
     EXPECT_EQ(answerOf({"names", "TALVO_PowerManagementService", "--namespace", "root/interop"}).substr(0, 13),
               "root/interop:");
 }
 
-TEST_F(ProvidedTest, showsTheServiceInEveryFormat) {
+TEST_F(ProvidedTest, ShowsTheServiceInEveryFormat) {
     const std::string table = answerOf({"get", _service});
     EXPECT_THAT(table, StartsWith("root/cimv2:TALVO_PowerManagementService\n"
                                   "  * CreationClassName        TALVO_PowerManagementService\n"
@@ -82,7 +82,7 @@ TEST_F(ProvidedTest, showsTheServiceInEveryFormat) {
                 HasSubstr("\"SystemName\": \"machine.example\",\n    \"Caption\": \""));
 }
 
-TEST_F(ProvidedTest, showsTheCapabilitiesWithWhatTheirCodesMean) {
+TEST_F(ProvidedTest, ShowsTheCapabilitiesWithWhatTheirCodesMean) {
     EXPECT_EQ(answerOf({"instances", "TALVO_PowerManagementCapabilities"}),
               "root/cimv2:TALVO_PowerManagementCapabilities\n"
               "  * InstanceID               chassis/blade1\n"
@@ -92,7 +92,7 @@ TEST_F(ProvidedTest, showsTheCapabilitiesWithWhatTheirCodesMean) {
               "    PowerStatesSupported     2 (On), 5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n");
 }
 
-TEST_F(ProvidedTest, showsTheComputerSystemWithWhatItsCodesMean) {
+TEST_F(ProvidedTest, ShowsTheComputerSystemWithWhatItsCodesMean) {
     EXPECT_EQ(answerOf({"instances", "TALVO_ComputerSystem", "--properties",
                         "ElementName,NameFormat,EnabledState,RequestedState,Dedicated"}),
               "root/cimv2:TALVO_ComputerSystem\n"
@@ -109,7 +109,7 @@ TEST_F(ProvidedTest, showsTheComputerSystemWithWhatItsCodesMean) {
         0);
 }
 
-TEST_F(ProvidedTest, reportsAnInstanceThatIsNotThere) {
+TEST_F(ProvidedTest, ReportsAnInstanceThatIsNotThere) {
     std::string other = _service;
     other.replace(other.find("blade1"), 6, "blade2");
     const Outcome outcome = orvcim({"get", other});
@@ -117,7 +117,7 @@ TEST_F(ProvidedTest, reportsAnInstanceThatIsNotThere) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST_F(ProvidedTest, rebootsAndShutsDownTheSimulatedMachine) {
+TEST_F(ProvidedTest, RebootsAndShutsDownTheSimulatedMachine) {
     configure("reboot-time = 0\nshutdown-time = 0\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     EXPECT_THAT(answerOf({"power", "reboot"}), StartsWith("Power request accepted: reboot of simulated node"));
     EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
@@ -126,7 +126,7 @@ TEST_F(ProvidedTest, rebootsAndShutsDownTheSimulatedMachine) {
               "RequestPowerStateChange\n    ReturnValue  0 (Completed with No Error)\n");
 }
 
-TEST_F(ProvidedTest, showsARefusedRequestAsRefused) {
+TEST_F(ProvidedTest, ShowsARefusedRequestAsRefused) {
     const std::string system = "ManagedElement=" + _system;
     const std::pair<std::vector<std::string>, std::string> requests[] = {
         {{"PowerState=2", system}, "Requested Power State change Not Supported"},
@@ -143,7 +143,7 @@ TEST_F(ProvidedTest, showsARefusedRequestAsRefused) {
     EXPECT_FALSE(std::filesystem::exists(_folder / "state.json"));
 }
 
-TEST_F(ProvidedTest, logsWhatWasAskedForBesideWhyItWasRefused) {
+TEST_F(ProvidedTest, LogsWhatWasAskedForBesideWhyItWasRefused) {
     orvcim({"invoke", _service, "RequestPowerStateChange", "PowerState=2", "ManagedElement=" + _system});
     std::ifstream log(_folder / "log");
     std::vector<std::string> lines;
@@ -156,7 +156,7 @@ TEST_F(ProvidedTest, logsWhatWasAskedForBesideWhyItWasRefused) {
     EXPECT_THAT(lines.front(), HasSubstr(" VARIABLE: 'powerState' has Value '2' "));
 }
 
-TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
+TEST_F(ProvidedTest, ShowsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
     const std::string heading = "SYSTEM           SERVICE                              POWER STATE\n"
                                 "machine.example  PowerStateManagement_chassis/blade1  ";
     const auto rebootsIn = [this](const char* seconds) {
@@ -170,7 +170,7 @@ TEST_F(ProvidedTest, showsThatTheMachineIsNeitherOnNorOffWhileItReboots) {
     EXPECT_EQ(rebootsIn("3600"), heading + "1 (Other), as while it reboots or shuts down\n");
 }
 
-TEST_F(ProvidedTest, takesBackWhatIsUnderWay) {
+TEST_F(ProvidedTest, TakesBackWhatIsUnderWay) {
     EXPECT_THAT(orvcim({"power", "cancel"}).err, HasSubstr("no request is in progress"));
     configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     answerOf({"power", "reboot"});
@@ -179,12 +179,12 @@ TEST_F(ProvidedTest, takesBackWhatIsUnderWay) {
     EXPECT_EQ(orvcim({"power", "cancel"}).status, 1);
 }
 
-TEST_F(ProvidedTest, waitsForARebootUntilTheMachineIsOnAgain) {
+TEST_F(ProvidedTest, WaitsForARebootUntilTheMachineIsOnAgain) {
     configure("reboot-time = 1\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     EXPECT_THAT(answerOf({"power", "reboot", "--wait"}), HasSubstr("\nmachine.example: 2 (On)\n"));
 }
 
-TEST_F(ProvidedTest, showsTheStateWheneverItChanges) {
+TEST_F(ProvidedTest, ShowsTheStateWheneverItChanges) {
     configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     const std::string on = answerOf({"power", "status"});
     const RunningProcess watch({ORVCIM_PROGRAM, "power", "status", "--watch"}, environment());
@@ -196,7 +196,7 @@ TEST_F(ProvidedTest, showsTheStateWheneverItChanges) {
     EXPECT_EQ(watch.outputWith(on + rebooting + on), on + rebooting + on);
 }
 
-TEST_F(ProvidedTest, namesTheLibraryThatIsMissingWhereTheMachineIsNotKnown) {
+TEST_F(ProvidedTest, NamesTheLibraryThatIsMissingWhereTheMachineIsNotKnown) {
     std::filesystem::create_directories(_folder / "bin");
     std::filesystem::copy_file(ORVCIM_PROGRAM, _folder / "bin" / "orvcim");
     const Outcome outcome = runProcess(
@@ -208,7 +208,7 @@ TEST_F(ProvidedTest, namesTheLibraryThatIsMissingWhereTheMachineIsNotKnown) {
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST_F(ProvidedTest, switchesNoOtherNodeThanTheOneThatIsNamed) {
+TEST_F(ProvidedTest, SwitchesNoOtherNodeThanTheOneThatIsNamed) {
     configure("[[instrumentation.simulated.node]]\npath = \"z\"\n"
               "[[instrumentation.simulated.node]]\npath = \"a\"\n");
     const auto service = [](const std::string& node) {
@@ -229,7 +229,7 @@ TEST_F(ProvidedTest, switchesNoOtherNodeThanTheOneThatIsNamed) {
     EXPECT_THAT(answerOf({"power", "reboot", "--service", service("z")}), HasSubstr("node z"));
 }
 
-TEST_F(ProvidedTest, failsWhereNoStateCanBeRead) {
+TEST_F(ProvidedTest, FailsWhereNoStateCanBeRead) {
     configure("backend = 5\n");
     const Outcome outcome = orvcim({"power", "status"});
     EXPECT_THAT(outcome.err, HasSubstr("unknown"));
@@ -239,7 +239,7 @@ TEST_F(ProvidedTest, failsWhereNoStateCanBeRead) {
 
 /* Every element that is not the machine: it stays as it is. */
 
-TEST_F(ProvidedTest, makesNoRequestForAnotherElementThanTheMachine) {
+TEST_F(ProvidedTest, MakesNoRequestForAnotherElementThanTheMachine) {
     std::string other = _system;
     other.replace(other.find("machine.example"), 15, "other.example");
     const std::pair<std::string, std::string> elements[] = {
@@ -268,7 +268,7 @@ TEST_F(ProvidedTest, makesNoRequestForAnotherElementThanTheMachine) {
     EXPECT_FALSE(std::filesystem::exists(_folder / "state.json")) << "the machine moved";
 }
 
-TEST_F(ProvidedTest, followsAssociationsOfInstancesOnlyThatAreThere) {
+TEST_F(ProvidedTest, FollowsAssociationsOfInstancesOnlyThatAreThere) {
     std::string other = _service;
     other.replace(other.find("blade1"), 6, "blade2");
     for (const char* command : {"associators", "associator-names", "references", "reference-names"}) {
@@ -278,7 +278,7 @@ TEST_F(ProvidedTest, followsAssociationsOfInstancesOnlyThatAreThere) {
     }
 }
 
-TEST_F(ProvidedTest, offersNoServiceWhereTheConfigurationIsWrong) {
+TEST_F(ProvidedTest, OffersNoServiceWhereTheConfigurationIsWrong) {
     configure("backend = 5\n");
     const Outcome outcome = orvcim({"power", "reboot", "--yes"});
     EXPECT_THAT(outcome.err, HasSubstr("orvcim: "));

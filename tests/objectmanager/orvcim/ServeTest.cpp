@@ -49,7 +49,7 @@ protected:
     }
 };
 
-TEST_F(ServeTest, saysWhereItListensAndEndsOnASignal) {
+TEST_F(ServeTest, SaysWhereItListensAndEndsOnASignal) {
     for (const int signal : {SIGTERM, SIGINT}) {
         serve();
         _server->send(signal);
@@ -93,7 +93,7 @@ private:
     const int _socket;
 };
 
-TEST_F(ServeTest, tellsTheServiceManagerWhenItListensAndWhenItEnds) {
+TEST_F(ServeTest, TellsTheServiceManagerWhenItListensAndWhenItEnds) {
     for (const std::string& name : {(_folder / "notify").string(), "@orv-test-" + std::to_string(getpid())}) {
         const NotifySocket manager(name);
         const RunningProcess server({ORVCIM_PROGRAM, "serve", "--port=0"},
@@ -104,7 +104,7 @@ TEST_F(ServeTest, tellsTheServiceManagerWhenItListensAndWhenItEnds) {
     }
 }
 
-TEST_F(ServeTest, tellsTheServiceManagerAgainAndAgainThatItServes) {
+TEST_F(ServeTest, TellsTheServiceManagerAgainAndAgainThatItServes) {
     const std::string certificate = makeCertificate();
     for (const std::vector<std::string>& options :
          {std::vector<std::string>{}, {"--listen=::1"}, {"--tls-cert=" + certificate, "--tls-key=" + certificate}}) {
@@ -123,12 +123,12 @@ TEST_F(ServeTest, tellsTheServiceManagerAgainAndAgainThatItServes) {
     }
 }
 
-TEST_F(ServeTest, listensOnIpv6) {
+TEST_F(ServeTest, ListensOnIpv6) {
     serve({"--listen", "::1"});
     EXPECT_THAT(_server->firstLine(), StartsWith("Listening on http://[::1]:"));
 }
 
-TEST_F(ServeTest, isNotReachedByOtherMachinesWithoutTlsAndLogIns) {
+TEST_F(ServeTest, IsNotReachedByOtherMachinesWithoutTlsAndLogIns) {
     const std::vector<std::string> tls = {"--tls-cert=/dev/null", "--tls-key=/dev/null"};
     for (const std::string address : {"0.0.0.0", "::", "192.0.2.1", "2001:db8::1", "::ffff:127.0.0.1"}) {
         for (std::vector<std::string> options :
@@ -148,7 +148,7 @@ TEST_F(ServeTest, isNotReachedByOtherMachinesWithoutTlsAndLogIns) {
     EXPECT_EQ(both.status, 1);
 }
 
-TEST_F(ServeTest, doesNotServeAMachineThatMayBeRealWithoutLogIns) {
+TEST_F(ServeTest, DoesNotServeAMachineThatMayBeRealWithoutLogIns) {
     for (const char* machine : {"real", "silent"}) {
         const Outcome outcome = OrvcimTest::orvcim({"serve", "--port=0"}, {{"ORVCIM_TEST_MACHINE", machine}});
         EXPECT_EQ(outcome.err, "orvcim: the machine is not known to be a simulated one: expected --authenticate, so "
@@ -162,7 +162,7 @@ TEST_F(ServeTest, doesNotServeAMachineThatMayBeRealWithoutLogIns) {
     EXPECT_THAT(server.firstLine(), StartsWith("Listening on http://127.0.0.1:"));
 }
 
-TEST_F(ServeTest, tellsWhyTheMachineIsNotKnown) {
+TEST_F(ServeTest, TellsWhyTheMachineIsNotKnown) {
     std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
     const Outcome outcome = refused({});
     EXPECT_THAT(outcome.err, HasSubstr("orvcim: the machine is not known to be a simulated one; the agent logged: " +
@@ -175,7 +175,7 @@ struct Usage {
     std::string message;
 };
 
-TEST_F(ServeTest, saysWhatIsWrongWithTheCommandLine) {
+TEST_F(ServeTest, SaysWhatIsWrongWithTheCommandLine) {
     const Usage cases[] = {
         {{"--tls-cert=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
         {{"--tls-key=/dev/null"}, "orvcim: found one of --tls-cert and --tls-key, expected both or none\n"},
@@ -199,7 +199,7 @@ TEST_F(ServeTest, saysWhatIsWrongWithTheCommandLine) {
     }
 }
 
-TEST_F(ServeTest, saysThatTheSystemGivesTooLittle) {
+TEST_F(ServeTest, SaysThatTheSystemGivesTooLittle) {
     const auto limitedTo = [](const std::string& limit, const std::string& options) {
         return runProcess({"sh", "-c",
                            "ulimit " + limit +
@@ -215,14 +215,14 @@ TEST_F(ServeTest, saysThatTheSystemGivesTooLittle) {
     EXPECT_EQ(files.status, 2);
 }
 
-TEST_F(ServeTest, saysWhereItCannotListen) {
+TEST_F(ServeTest, SaysWhereItCannotListen) {
     serve();
     const Outcome outcome = start({"--port", _port})->wait();
     EXPECT_EQ(outcome.err, "orvcim: cannot listen on 127.0.0.1:" + _port + ": Address already in use\n");
     EXPECT_EQ(outcome.status, 1);
 }
 
-TEST_F(ServeTest, logsABadRequestInOneLine) {
+TEST_F(ServeTest, LogsABadRequestInOneLine) {
     serve();
     EXPECT_EQ(ask("--output /dev/null --write-out '%{http_code}' " + url("")), "405");
     EXPECT_EQ(
@@ -236,7 +236,7 @@ TEST_F(ServeTest, logsABadRequestInOneLine) {
                    "orvcim: 127.0.0.1: answered 400: request-not-well-formed\n");
 }
 
-TEST_F(ServeTest, takesLimitsFromTheCommandLine) {
+TEST_F(ServeTest, TakesLimitsFromTheCommandLine) {
     serve({"--max-body=100", "--max-headers=1000", "--request-time=0.3", "--idle-time=0.3"});
     const auto statusOf = [this](const std::string& options) {
         return ask(options + " --output /dev/null --write-out '%{http_code}' " + url(""));
@@ -249,7 +249,7 @@ TEST_F(ServeTest, takesLimitsFromTheCommandLine) {
 
 /* Who may do what. */
 
-TEST_F(ServeTest, letsUsersDoWhatTheirGroupsMay) {
+TEST_F(ServeTest, LetsUsersDoWhatTheirGroupsMay) {
     serve({"--authenticate", "--pam-folder", makeUsers(), "--power-group", "daemon", "--allow-root",
            "--allow-without-shell"});
     const std::string request = "RequestPowerStateChange.PowerState=5,ManagedElement=" + _system;
@@ -273,7 +273,7 @@ TEST_F(ServeTest, letsUsersDoWhatTheirGroupsMay) {
                          "orvcim: 127.0.0.1: log-in as \"stranger\" failed: Authentication failure\n"));
 }
 
-TEST_F(ServeTest, letsOnlyAGroupReadWhereItIsToldTo) {
+TEST_F(ServeTest, LetsOnlyAGroupReadWhereItIsToldTo) {
     serve({"--authenticate", "--pam-folder", makeUsers(), "--power-group", "daemon", "--read-group", "bin",
            "--allow-root", "--allow-without-shell"});
     const Outcome denied = wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", "nobody:small")});
@@ -281,7 +281,7 @@ TEST_F(ServeTest, letsOnlyAGroupReadWhereItIsToldTo) {
     EXPECT_EQ(wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", "root:top")}).status, 0);
 }
 
-TEST_F(ServeTest, servesWithTls) {
+TEST_F(ServeTest, ServesWithTls) {
     const std::string certificate = makeCertificate();
     serve({"--tls-cert", certificate, "--tls-key", certificate, "--authenticate", "--pam-folder", makeUsers(),
            "--power-group=daemon", "--listen=0.0.0.0", "--allow-root", "--allow-without-shell"});

@@ -164,7 +164,7 @@ INSTANTIATE_TEST_SUITE_P(Class, WbemcliClassTest,
                                          "TALVO_PowerManagementHostedService"),
                          [](const auto& tested) { return std::string(tested.param).substr(6); });
 
-TEST_P(WbemcliClassTest, enumeratesTheSameInstances) {
+TEST_P(WbemcliClassTest, EnumeratesTheSameInstances) {
     const std::string className = GetParam();
     const Objects names = commandLinesObjects(inProcess({"names", className}));
     EXPECT_FALSE(names.empty());
@@ -173,7 +173,7 @@ TEST_P(WbemcliClassTest, enumeratesTheSameInstances) {
               commandLinesObjects(inProcess({"instances", className})));
 }
 
-TEST_P(WbemcliClassTest, getsTheSameInstanceAndProperties) {
+TEST_P(WbemcliClassTest, GetsTheSameInstanceAndProperties) {
     for (const Path& path : pathsOf(GetParam())) {
         const Json instance = inProcess({"get", path.commandLines});
         EXPECT_EQ(clientsObjects(clientsAnswer({"gi", "-nl", path.clients})), commandLinesObjects(instance));
@@ -188,7 +188,7 @@ TEST_P(WbemcliClassTest, getsTheSameInstanceAndProperties) {
     }
 }
 
-TEST_P(WbemcliClassTest, followsTheSameAssociations) {
+TEST_P(WbemcliClassTest, FollowsTheSameAssociations) {
     const std::pair<const char*, const char*> operations[] = {
         {"ain", "associator-names"}, {"ai", "associators"}, {"rin", "reference-names"}, {"ri", "references"}};
     for (const Path& path : pathsOf(GetParam())) {
@@ -200,7 +200,7 @@ TEST_P(WbemcliClassTest, followsTheSameAssociations) {
     }
 }
 
-TEST_P(WbemcliClassTest, knowsTheSameClass) {
+TEST_P(WbemcliClassTest, KnowsTheSameClass) {
     const std::string className = GetParam();
     std::vector<std::string> properties;
     for (const Json& known : inProcess({"classes"})) {
@@ -220,7 +220,7 @@ TEST_P(WbemcliClassTest, knowsTheSameClass) {
                 HasSubstr("localhost:" + _port + "/root/cimv2:" + className + '\n'));
 }
 
-TEST_P(WbemcliClassTest, isToldThatNothingElseCanBeChanged) {
+TEST_P(WbemcliClassTest, IsToldThatNothingElseCanBeChanged) {
     const Path path = pathsOf(GetParam()).at(0);
     // The client gets the instance first, and sends no other property.
     std::vector<Json> found;
@@ -239,7 +239,7 @@ TEST_P(WbemcliClassTest, isToldThatNothingElseCanBeChanged) {
     }
 }
 
-TEST_F(WbemcliTest, restrictsAssociationsInTheSameWay) {
+TEST_F(WbemcliTest, RestrictsAssociationsInTheSameWay) {
     const std::pair<std::vector<std::string>, std::vector<std::string>> restrictions[] = {
         {{"-ac", "CIM_HostedService"}, {"--assoc-class", "CIM_HostedService"}},
         {{"-arc", "CIM_Capabilities"}, {"--result-class", "CIM_Capabilities"}},
@@ -256,7 +256,7 @@ TEST_F(WbemcliTest, restrictsAssociationsInTheSameWay) {
     }
 }
 
-TEST_F(WbemcliTest, isToldWhatDoesNotExist) {
+TEST_F(WbemcliTest, IsToldWhatDoesNotExist) {
     const std::pair<std::vector<std::string>, const char*> cases[] = {
         {{"ein", url("root/cimv2:Nothing")}, "(5) CIM_ERR_INVALID_CLASS"},
         {{"gc", url("root/cimv2:Nothing")}, "there is no class Nothing"},
@@ -274,7 +274,7 @@ TEST_F(WbemcliTest, isToldWhatDoesNotExist) {
 }
 
 /** Uses only the client: goes from the host to its power state, and watches a reboot. */
-TEST_F(WbemcliTest, reboots) {
+TEST_F(WbemcliTest, Reboots) {
     configure("reboot-time = 3600\n[[instrumentation.simulated.node]]\npath = \"system\"\n");
     serve();
     const auto lineOf = [](std::string text) { return text.substr(0, text.find('\n')); };
@@ -295,7 +295,7 @@ TEST_F(WbemcliTest, reboots) {
     EXPECT_THAT(state(), HasSubstr("PowerState=2,"));
 }
 
-TEST_F(WbemcliTest, isToldWhyARequestIsRefused) {
+TEST_F(WbemcliTest, IsToldWhyARequestIsRefused) {
     const Outcome outcome =
         wbemcli({"cm", url(_service), "RequestPowerStateChange.PowerState=2,ManagedElement=" + _system});
     EXPECT_THAT(outcome.err + outcome.out, HasSubstr("Requested Power State change Not Supported"));
@@ -317,7 +317,7 @@ std::vector<std::string> guide() {
     return lines;
 }
 
-TEST_F(WbemcliTest, doesWhatTheGuideShows) {
+TEST_F(WbemcliTest, DoesWhatTheGuideShows) {
     configure("[[instrumentation.simulated.node]]\npath = \"system\"\n");
     serve();
     std::string expected;

@@ -66,46 +66,46 @@ protected:
     }
 };
 
-TEST_F(WrongRequestTest, namesAnotherMachine) {
+TEST_F(WrongRequestTest, NamesAnotherMachine) {
     serveUsers();
     std::string other = _system;
     other.replace(other.find("machine.example"), 15, "other.example");
     expectRefused(reboot(other), "there is no instance root/cimv2:TALVO_ComputerSystem.");
 }
 
-TEST_F(WrongRequestTest, namesAnotherClass) {
+TEST_F(WrongRequestTest, NamesAnotherClass) {
     serveUsers();
     expectRefused(reboot(_capabilities), "expected an element whose power the service manages: root/cimv2:TALVO_Comp");
 }
 
-TEST_F(WrongRequestTest, namesNoInstance) {
+TEST_F(WrongRequestTest, NamesNoInstance) {
     serveUsers();
     expectRefused(reboot("root/cimv2:TALVO_ComputerSystem"), "ManagedElement: found ");
 }
 
-TEST_F(WrongRequestTest, hasAnotherType) {
+TEST_F(WrongRequestTest, HasAnotherType) {
     serveUsers();
     expectRefused(reboot("5"), "ManagedElement: ");
 }
 
-TEST_F(WrongRequestTest, comesFromAUserWithoutRights) {
+TEST_F(WrongRequestTest, ComesFromAUserWithoutRights) {
     serveUsers();
     expectRefused(reboot(_system, bob), "nobody may read, but not change anything", "nobody", "denied");
 }
 
-TEST_F(WrongRequestTest, findsNoAgent) {
+TEST_F(WrongRequestTest, FindsNoAgent) {
     std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
     serveUsers();
     expectRefused(reboot(_system), "expected \"simulated\"");
 }
 
-TEST_F(WrongRequestTest, findsAFullDisk) {
+TEST_F(WrongRequestTest, FindsAFullDisk) {
     // The agent cannot write its log either.
     serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, sanitizersGoSecond, {"TEST_FULL_FOLDER", _folder.string()}});
     expectRefused(reboot(_system), "No space left on device");
 }
 
-TEST_F(WrongRequestTest, isNotHeardToHaveBeenAccepted) {
+TEST_F(WrongRequestTest, IsNotHeardToHaveBeenAccepted) {
     serveUsers({{"ORVCIM_TEST_ANSWER", "nothing"}},
                {"--schema", ORVCIM_TEST_SCHEMA, "--provider-path", ORVCIM_TEST_LIBRARIES});
     const std::string service =
@@ -119,7 +119,7 @@ TEST_F(WrongRequestTest, isNotHeardToHaveBeenAccepted) {
 
 /* The right way, to compare, and requests that are none for another power state. */
 
-TEST_F(WrongRequestTest, isNoneWhereEverythingIsRight) {
+TEST_F(WrongRequestTest, IsNoneWhereEverythingIsRight) {
     serveUsers();
     EXPECT_THAT(reboot(_system).out, EndsWith("RequestPowerStateChange: 0\n"));
     EXPECT_TRUE(std::filesystem::exists(_folder / "state.json"));
@@ -129,7 +129,7 @@ TEST_F(WrongRequestTest, isNoneWhereEverythingIsRight) {
                       HasSubstr("on behalf of root from 127.0.0.1]\n")));
 }
 
-TEST_F(WrongRequestTest, isRecordedWhateverItAsksFor) {
+TEST_F(WrongRequestTest, IsRecordedWhateverItAsksFor) {
     serveUsers();
     wbemcli({"di", url(_system, bob)});
     EXPECT_THAT(_server->errWith("change anything\n"),
@@ -137,7 +137,7 @@ TEST_F(WrongRequestTest, isRecordedWhateverItAsksFor) {
                              "of root/cimv2: denied: nobody may read, but not change anything\n"));
 }
 
-TEST_F(WrongRequestTest, isNotRecordedWhereItOnlyReads) {
+TEST_F(WrongRequestTest, IsNotRecordedWhereItOnlyReads) {
     serveUsers();
     wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem", bob)});
     // Log lines stand in the order of the requests.
@@ -171,7 +171,7 @@ private:
     const int _socket = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
 };
 
-TEST_F(WrongRequestTest, isAnEntryOfTheJournalWithFieldsUnderSystemd) {
+TEST_F(WrongRequestTest, IsAnEntryOfTheJournalWithFieldsUnderSystemd) {
     const Journal journal(_folder / "journal");
     const std::vector<std::string> command = {"/bin/sh",
                                               "-c",

@@ -13,7 +13,7 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
-TEST(RegistrationReader, readsSectionsWithLinesInAnyOrder) {
+TEST(RegistrationReader, ReadsSectionsWithLinesInAnyOrder) {
     const auto registrations = readRegistrations(std::string_view("# two classes\n"
                                                                   "[A]\n"
                                                                   "   provider: AProvider\n"
@@ -47,7 +47,7 @@ TEST(RegistrationReader, readsSectionsWithLinesInAnyOrder) {
     EXPECT_TRUE(!b.instance && !b.method && b.association && b.property && b.indication);
 }
 
-TEST(RegistrationReader, readsNothingFromAnEmptyText) {
+TEST(RegistrationReader, ReadsNothingFromAnEmptyText) {
     EXPECT_THAT(readRegistrations(std::string_view(""), "x.reg"), IsEmpty());
 }
 
@@ -58,7 +58,7 @@ struct BadRegistration {
 
 class BadRegistrationTest : public testing::TestWithParam<BadRegistration> {};
 
-TEST_P(BadRegistrationTest, isReportedByFileAndLine) {
+TEST_P(BadRegistrationTest, IsReportedByFileAndLine) {
     try {
         readRegistrations(std::string_view(GetParam().text), "x.reg");
         FAIL() << GetParam().text << " was taken";

@@ -36,7 +36,7 @@ Registration diskInBay() {
     return registration;
 }
 
-TEST(RegistrationSections, areWhatObjectManagersRead) {
+TEST(RegistrationSections, AreWhatObjectManagersRead) {
     EXPECT_EQ(registrationSections({disk(), diskInBay()}), "[Test_Disk]\n"
                                                            "   provider: DiskProvider\n"
                                                            "   location: testdisks\n"
@@ -50,7 +50,7 @@ TEST(RegistrationSections, areWhatObjectManagersRead) {
                                                            "   namespace: root/cimv2\n");
 }
 
-TEST(RegistrationSections, areReadBackAsTheyWere) {
+TEST(RegistrationSections, AreReadBackAsTheyWere) {
     Registration all = disk();
     all.association = all.property = all.indication = true;
     const std::string text = registrationSections({all});
@@ -60,7 +60,7 @@ TEST(RegistrationSections, areReadBackAsTheyWere) {
     EXPECT_EQ(registrationSections(read), text);
 }
 
-TEST(RegistrationInstances, areOneModuleWithEachProviderOnceAndTheCapabilitiesOfEachClass) {
+TEST(RegistrationInstances, AreOneModuleWithEachProviderOnceAndTheCapabilitiesOfEachClass) {
     EXPECT_EQ(registrationInstances({disk(), diskInBay()}, module), "instance of PG_ProviderModule {\n"
                                                                     "    Name = \"disks\";\n"
                                                                     "    Vendor = \"Test\";\n"
@@ -108,14 +108,14 @@ std::string errorOf(const std::vector<Registration>& registrations) {
     return "";
 }
 
-TEST(RegistrationInstances, areOfOneLibrary) {
+TEST(RegistrationInstances, AreOfOneLibrary) {
     Registration elsewhere = diskInBay();
     elsewhere.location = "testbays";
     EXPECT_EQ(errorOf({disk(), elsewhere}), "Test_DiskInBay: found location 'testbays', expected 'testdisks'");
     EXPECT_EQ(errorOf({}), "found no registration, expected those of a library");
 }
 
-TEST(RegistrationInstances, haveNoNumberForPropertyProviders) {
+TEST(RegistrationInstances, HaveNoNumberForPropertyProviders) {
     Registration property = disk();
     property.property = true;
     EXPECT_EQ(errorOf({property}),

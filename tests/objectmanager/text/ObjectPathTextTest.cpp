@@ -42,7 +42,7 @@ protected:
                                  "x.mof")};
 };
 
-TEST_F(ObjectPathTextTest, namesAClass) {
+TEST_F(ObjectPathTextTest, NamesAClass) {
     const ObjectPath path = parse("root/cimv2:Thing");
     EXPECT_EQ(path.host, "");
     EXPECT_EQ(path.nameSpace, "root/cimv2");
@@ -50,20 +50,20 @@ TEST_F(ObjectPathTextTest, namesAClass) {
     EXPECT_THAT(path.keys, IsEmpty());
 }
 
-TEST_F(ObjectPathTextTest, hasTheDefaultNamespaceWhereItNamesNone) {
+TEST_F(ObjectPathTextTest, HasTheDefaultNamespaceWhereItNamesNone) {
     EXPECT_EQ(parse("Thing").nameSpace, "root/default");
     EXPECT_EQ(parse("Thing.Name=\"a:b\"").nameSpace, "root/default");
     EXPECT_EQ(parse("/root/cimv2:Thing").nameSpace, "root/cimv2");
 }
 
-TEST_F(ObjectPathTextTest, mayNameAHost) {
+TEST_F(ObjectPathTextTest, MayNameAHost) {
     const ObjectPath path = parse("//some.host:5989/root/cimv2:Thing.Number=1");
     EXPECT_EQ(path.host, "some.host:5989");
     EXPECT_EQ(path.nameSpace, "root/cimv2");
     EXPECT_EQ(path.className, "Thing");
 }
 
-TEST_F(ObjectPathTextTest, givesKeysTheTypesThatTheClassDeclares) {
+TEST_F(ObjectPathTextTest, GivesKeysTheTypesThatTheClassDeclares) {
     const ObjectPath path =
         parse(R"(Thing.Name="5",Number=0x10,Flag=true,Letter='x',When="00000001000000.000000:000",Ratio=2)");
     EXPECT_EQ(find(path.keys, "Name")->value, stringValue("5"));
@@ -74,7 +74,7 @@ TEST_F(ObjectPathTextTest, givesKeysTheTypesThatTheClassDeclares) {
     EXPECT_EQ(find(path.keys, "Ratio")->value, realValue(CMPI_real64, 2));
 }
 
-TEST_F(ObjectPathTextTest, givesKeysOfAnUnknownClassTheTypesThatTheyLookLike) {
+TEST_F(ObjectPathTextTest, GivesKeysOfAnUnknownClassTheTypesThatTheyLookLike) {
     const ObjectPath path = parse(R"(Other.A="x:y.z=1",B=-5,C=FALSE,D='x',E=1.5)");
     EXPECT_EQ(find(path.keys, "A")->value, stringValue("x:y.z=1"));
     EXPECT_EQ(find(path.keys, "B")->value, signedValue(CMPI_sint64, -5));
@@ -83,13 +83,13 @@ TEST_F(ObjectPathTextTest, givesKeysOfAnUnknownClassTheTypesThatTheyLookLike) {
     EXPECT_EQ(find(path.keys, "E")->value, realValue(CMPI_real64, 1.5));
 }
 
-TEST_F(ObjectPathTextTest, spellsNamesAsTheyAreDeclared) {
+TEST_F(ObjectPathTextTest, SpellsNamesAsTheyAreDeclared) {
     const ObjectPath path = parse("thing.NUMBER=1");
     EXPECT_EQ(path.className, "Thing");
     EXPECT_EQ(path.keys.at(0).name, "Number");
 }
 
-TEST_F(ObjectPathTextTest, readsReferencesInReferences) {
+TEST_F(ObjectPathTextTest, ReadsReferencesInReferences) {
     const ObjectPath path = parse(R"(root/a:Link.First="Thing.Name=\"say \\\"no\\\"\"",)"
                                   R"(Second="//h/root/b:Link.First=\"root/c:Thing.Number=1\"")");
     const ObjectPath thing{"", "root/a", "Thing", {{"Name", stringValue("say \"no\"")}}};
@@ -99,7 +99,7 @@ TEST_F(ObjectPathTextTest, readsReferencesInReferences) {
     EXPECT_EQ(find(path.keys, "Second")->value, referenceValue(link));
 }
 
-TEST_F(ObjectPathTextTest, isReadBackAsItWasWritten) {
+TEST_F(ObjectPathTextTest, IsReadBackAsItWasWritten) {
     for (const char* text :
          {R"(root/cimv2:Thing)", R"(//h:1/root/cimv2:Thing)",
           R"(root/cimv2:Thing.Name="a \"b\" \\ c,d=e",Number=65535,Flag=TRUE,Letter='\'',Ratio=0.5)",
@@ -109,12 +109,12 @@ TEST_F(ObjectPathTextTest, isReadBackAsItWasWritten) {
     }
 }
 
-TEST_F(ObjectPathTextTest, leavesHostsOutOfALocalPathAtEveryDepth) {
+TEST_F(ObjectPathTextTest, LeavesHostsOutOfALocalPathAtEveryDepth) {
     EXPECT_EQ(formatLocalPath(parse(R"(//h/root/a:Link.First="//h/root/a:Thing.Number=1")")),
               R"(root/a:Link.First="root/a:Thing.Number=1")");
 }
 
-TEST_F(ObjectPathTextTest, isReportedWithThePositionWhereItIsWrong) {
+TEST_F(ObjectPathTextTest, IsReportedWithThePositionWhereItIsWrong) {
     const std::pair<const char*, const char*> cases[] = {
         {"", "position 1: found the end, expected the name of a class"},
         {"root/cimv2:", "position 12: found the end, expected the name of a class"},

@@ -5,7 +5,7 @@
 namespace ObjectManager {
 namespace {
 
-TEST(StatusText, namesTheCodesOfOperationsAndOfTheProviderInterface) {
+TEST(StatusText, NamesTheCodesOfOperationsAndOfTheProviderInterface) {
     EXPECT_EQ(statusText(CMPI_RC_ERR_FAILED), "CIM_ERR_FAILED (1)");
     EXPECT_EQ(statusText(CMPI_RC_ERR_NOT_FOUND), "CIM_ERR_NOT_FOUND (6)");
     EXPECT_EQ(statusText(CMPI_RC_ERR_METHOD_NOT_FOUND), "CIM_ERR_METHOD_NOT_FOUND (17)");
@@ -13,7 +13,7 @@ TEST(StatusText, namesTheCodesOfOperationsAndOfTheProviderInterface) {
     EXPECT_EQ(statusText(CMPI_RC_ERROR), "CMPI_RC_ERROR (200)");
 }
 
-TEST(StatusText, givesAnyOtherCodeByItsNumber) {
+TEST(StatusText, GivesAnyOtherCodeByItsNumber) {
     EXPECT_EQ(statusText(static_cast<CMPIrc>(123)), "return code (123)");
 }
 

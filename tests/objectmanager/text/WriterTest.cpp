@@ -88,59 +88,59 @@ INSTANTIATE_TEST_SUITE_P(formats, WriterTest,
                                          FormatName{Format::mof, "mof"}),
                          [](const auto& format) { return std::string(format.param.name); });
 
-TEST_P(WriterTest, writesNames) {
+TEST_P(WriterTest, WritesNames) {
     ObjectPath second = thing().path;
     second.keys = {{"Name", stringValue("say \"no\"")}};
     _writer->names({thing().path, second});
     expectFile("names");
 }
 
-TEST_P(WriterTest, writesOneInstance) {
+TEST_P(WriterTest, WritesOneInstance) {
     _writer->instance(thing());
     expectFile("instance");
 }
 
-TEST_P(WriterTest, writesInstances) {
+TEST_P(WriterTest, WritesInstances) {
     _writer->instances({{{"", "root/cimv2", "Thing", {}}, {{"Name", stringValue("one")}}},
                         {{"", "root/cimv2", "Unknown", {}}, {{"Name", stringValue("two")}}}});
     expectFile("instances");
 }
 
-TEST_P(WriterTest, writesAssociatedNamesByTheirAssociation) {
+TEST_P(WriterTest, WritesAssociatedNamesByTheirAssociation) {
     _writer->associatedNames({{"Has", {thing().path, thing().path}}, {"Knows", {thing().path}}});
     expectFile("associatedNames");
 }
 
-TEST_P(WriterTest, writesAssociatedInstancesByTheirAssociation) {
+TEST_P(WriterTest, WritesAssociatedInstancesByTheirAssociation) {
     const Instance one{{"", "root/cimv2", "Thing", {}}, {{"Name", stringValue("one")}}};
     _writer->associatedInstances({{"Has", {one, one}}, {"Knows", {one}}});
     expectFile("associatedInstances");
 }
 
-TEST_P(WriterTest, writesClasses) {
+TEST_P(WriterTest, WritesClasses) {
     _writer->classes({*_catalogue.find("Base"), *_catalogue.find("Thing")});
     expectFile("classes");
 }
 
-TEST_P(WriterTest, writesTheResultOfAMethod) {
+TEST_P(WriterTest, WritesTheResultOfAMethod) {
     _writer->methodResult(*_catalogue.find("Thing")->method("Do"), unsignedValue(CMPI_uint32, 1),
                           {{"Got", unsignedValue(CMPI_uint8, 7)}});
     expectFile("result");
 }
 
-TEST_P(WriterTest, writesASummary) {
+TEST_P(WriterTest, WritesASummary) {
     _writer->summary(
         {{"NAME", "LEVEL"}, {"one", "-1"}},
         {{{"", "root/cimv2", "Thing", {}}, {{"Name", stringValue("one")}, {"Level", signedValue(CMPI_sint16, -1)}}}});
     expectFile("summary");
 }
 
-TEST_P(WriterTest, takesATextThatIsNoUtf8) {
+TEST_P(WriterTest, TakesATextThatIsNoUtf8) {
     _writer->instance({{"", "root/cimv2", "Thing", {}}, {{"Name", stringValue("a\xff")}}});
     EXPECT_THAT(_out.str(), testing::HasSubstr("a"));
 }
 
-TEST(MofText, ofAClassIsReadBackAsTheSameClass) {
+TEST(MofText, OfAClassIsReadBackAsTheSameClass) {
     const auto declared = readMof(schema, "x.mof");
     for (const Class& each : declared.classes) {
         const auto again = readMof(mofClass(each), "x.mof").classes;

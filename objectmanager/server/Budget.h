@@ -1,4 +1,4 @@
-/** Memory that requests share. */
+/** A limit for memory that all requests share. */
 #ifndef SERVER_BUDGET_H
 #define SERVER_BUDGET_H
 
@@ -10,14 +10,17 @@
 
 namespace ObjectManager::Server {
 
-/** A number of bytes, of which one network may have half. Used by several threads at once. */
+/**
+ * A limit in bytes for all requests together; the requests of one network may have half of it. Used by several threads
+ * at once.
+ */
 class Budget {
 public:
     explicit Budget(std::size_t bytes) : _bytes(bytes) {}
 
     std::size_t bytes() const { return _bytes; }
 
-    /** What one request has of it, given back with its end. */
+    /** The bytes that one request has taken. They are given back when the object is destroyed. */
     class Share {
     public:
         Share(Budget& budget, std::string network) : _budget(budget), _network(std::move(network)) {}
@@ -25,7 +28,10 @@ public:
         Share& operator=(const Share&) = delete;
         ~Share() { _budget.giveBack(_network, _size); }
 
-        /** @return false where there is not so much left: nothing has changed then. */
+        /**
+         * Takes bytes until the request has `size`. @return false if the budget has too few bytes left: then nothing
+         * changes.
+         */
         bool grow(std::size_t size) {
             if (size > _size && !_budget.take(_network, size - _size)) {
                 return false;

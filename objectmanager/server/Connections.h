@@ -1,4 +1,4 @@
-/** The clients' connections: how many there may be, and which of them makes room for another. */
+/** The clients' connections: their limits, and which of them is closed to accept another one. */
 #ifndef SERVER_CONNECTIONS_H
 #define SERVER_CONNECTIONS_H
 
@@ -17,10 +17,10 @@
 namespace ObjectManager::Server {
 
 /**
- * All open connections. Where there are too many, the oldest that waits for its client is shut down for a new one: of
- * the new one's network where that has too many, otherwise of the network that has most. Those of clients that were
- * never served go first. Where all wait for the server, the new one is told so by whoever serves it. Used by several
- * threads at once.
+ * All open connections. If there are too many, one that waits for its client is shut down for a new connection: one of
+ * the new connection's network if that has too many, otherwise one of the network that has most. Connections that never
+ * had a request answered go first, then the oldest. If all connections wait for the server, the new one is marked as
+ * `surplus`, and its thread answers that the server is busy. Used by several threads at once.
  */
 class Connections {
 public:
@@ -29,34 +29,34 @@ public:
     enum class State {
         /** No request has begun. */
         idle,
-        /** A request has begun and is not yet here. */
+        /** A request has begun, but has not arrived as a whole. */
         receiving,
-        /** The client waits because of its log-in: for its turn, or because it failed. */
+        /** The client waits because of its log-in: for its turn, or for the answer to a failed one. */
         loggingIn,
-        /** The client takes its answer. */
+        /** The client is reading the answer. */
         sending,
-        /** The server has the request, and makes the answer. */
+        /** The server has the request and is making the answer. */
         answering,
-        /** Shut down by the server, and about to be closed. */
+        /** The server has shut the connection down; it is about to be closed. */
         leaving,
     };
     static constexpr std::size_t states = 6;
 
     struct Connection {
         int socket;
-        /** The client's, for people. */
+        /** The client's address, for people. */
         std::string address;
         std::string network;
-        /** There was no room for it. */
+        /** Whether there was no room for the connection, so that it only gets an answer that says so. */
         bool surplus = false;
-        /** The client has got what it asked for once. */
+        /** Whether a request on this connection was answered. */
         std::atomic<bool> served = false;
         State state = State::idle;
-        /** Where it is in the list of its state. */
+        /** The connection's place in the list of its state. */
         std::list<Connection>::iterator self{};
     };
 
-    /** How many are in each state, and how many were refused since the start. */
+    /** How many connections are in each state, and how many were refused since the start. */
     struct Counts {
         std::array<std::size_t, states> of{};
         std::size_t refused = 0;
@@ -65,19 +65,19 @@ public:
     Connections(const Limits& limits, EventLog& events) : _limits(limits), _events(events) {}
 
     /**
-     * @param socket stays open until `closed`.
-     * @return null where there is not even room for telling the client so.
+     * Adds a connection. @param socket must stay open until `closed`.
+     * @return null if there is not even room to answer the client that the server is busy.
      */
     Connection* opened(int socket, const std::string& address, const std::string& network);
     void closed(Connection& connection);
 
-    /** @return false where it was shut down, which cannot be undone. */
+    /** Changes the connection's state. @return false if the connection was shut down, which is final. */
     bool enter(Connection& connection, State state);
 
-    /** Shuts down those that are in none of the states in which the client will get an answer. */
+    /** Shuts down the connections whose clients do not wait for an answer. */
     void endIdle();
     void endAll();
-    /** Waits until no client waits for an answer. @return false where the time was over before. */
+    /** Waits until no client waits for an answer. @return false if the time was over before. */
     bool waitForAnswers(std::chrono::milliseconds time);
 
     Counts counts();
@@ -89,19 +89,22 @@ private:
     void move(Connection& connection, State state);
     void end(Connection& connection);
     void endList(State state);
-    /** Shuts one down that waits for its client. @param network whose; anybody's where it is empty. */
+    /**
+     * Shuts down a connection that waits for its client. @param network the connection's network; empty for any
+     * network.
+     */
     bool makeRoom(const std::string& network);
     const std::string& largestNetwork() const;
-    /** Says it at most once a minute, since it is said of clients who may be many. */
+    /** Logs the line at most once a minute, since very many clients may cause it. */
     void reportCrowd(const std::string& line);
 
     const Limits _limits;
     EventLog& _events;
     std::mutex _mutex;
     std::condition_variable _changed;
-    /** One for each state, in the order in which the connections entered it. */
+    /** One list for each state, in the order in which the connections entered the state. */
     std::array<List, states> _lists;
-    /* Without those that leave. */
+    /* The numbers of connections without those that are leaving. */
     unsigned int _count = 0;
     std::map<std::string, unsigned int> _countOfNetwork;
     std::map<std::string, unsigned int> _leavingOfNetwork;

@@ -1,4 +1,4 @@
-/** What the server logs of its clients. */
+/** The server's log of its clients. */
 #ifndef SERVER_EVENTLOG_H
 #define SERVER_EVENTLOG_H
 
@@ -10,13 +10,15 @@
 
 namespace ObjectManager::Server {
 
-/** Takes one line for the person who runs the server. Called by several threads at once; must not throw or wait. */
+/**
+ * Writes one line for the person who runs the server. Called by several threads at once; must neither throw nor wait.
+ */
 using Log = std::function<void(const std::string& line)>;
 
 /**
- * Lines about clients, so that no client can fill the log: each line is cut, and each network, as well as all of them
- * together, has so many lines a minute. What is left out is counted, and the count is logged. Used by several threads
- * at once.
+ * Logs lines about clients, so that no client can fill the log: long lines are cut off, and the lines a minute are
+ * limited for each network and for all networks together. Lines that are left out are counted, and the count is logged.
+ * Used by several threads at once.
  */
 class EventLog {
 public:
@@ -30,7 +32,7 @@ public:
 
     void report(const std::string& network, const std::string& line, Clock::time_point now = Clock::now());
 
-    /** Of no client; never left out. */
+    /** Logs a line that is not about a client; it is never left out. */
     void report(const std::string& line);
 
     /** Logs how many lines were left out in periods that are over. */

@@ -1,4 +1,4 @@
-/** By which names clients may call the server. */
+/** The names that clients may use for the server. */
 #ifndef SERVER_HOSTS_H
 #define SERVER_HOSTS_H
 
@@ -11,17 +11,18 @@
 namespace ObjectManager::Server {
 
 /**
- * A page in somebody's browser can reach a server by a name of its author's that leads to the server's address: so a
- * request has to name an address in numbers, or a name that is the server's.
+ * Checks the host that a request names. A page in a user's browser can reach the server by a name of the page's author
+ * that leads to the server's address (DNS rebinding). So a request must name a numeric address, or a name of the
+ * server.
  */
 class Hosts {
 public:
-    /** @param others names beside the machine's and localhost. */
+    /** @param others names that are accepted beside the machine's and localhost. */
     explicit Hosts(const std::vector<std::string>& others);
 
     /**
-     * @param name as hostNameOf gives it.
-     * @param keys null where there are none.
+     * Whether the server has a name. @param name in the form that hostNameOf returns.
+     * @param keys the certificate, whose names are accepted, too; null without TLS.
      */
     bool areCalled(const std::string& name, const TlsKeys* keys) const;
 

@@ -15,22 +15,22 @@
 namespace ObjectManager::Server {
 
 /**
- * Serves from when it is made until it ends.
+ * Serves clients from its construction until it is stopped or destroyed.
  *
- * One thread accepts connections, and each connection has a thread of its own. What a client does wrong, and what it is
- * refused, is logged in one line.
+ * One thread accepts connections, and each connection has a thread of its own. Mistakes and refused requests of clients
+ * are logged, each in one line.
  */
 class HttpServer {
 public:
     /**
-     * @param authenticator is asked about every client; where it is null, everybody may do everything. Outlives the
-     *        server.
+     * @param authenticator checks the log-in of every client; if it is null, every client may do everything. It must
+     *        outlive the server.
      * @throws ServerError
      */
     HttpServer(const Settings& settings, Handler handler, Authenticator* authenticator, Log log);
     HttpServer(const HttpServer&) = delete;
     HttpServer& operator=(const HttpServer&) = delete;
-    /** Stops it, and waits for every handler that still runs, however long that takes. */
+    /** Stops the server, and waits for every handler that still runs, however long that takes. */
     ~HttpServer();
 
     std::uint16_t port() const;
@@ -38,17 +38,17 @@ public:
     /**
      * Accepts no more connections, sends the answers that are under way, and closes the others, within the settings'
      * stopTime and a second.
-     * @return false where a handler, or the authenticator, still runs then.
+     * @return false if a handler or the authenticator still runs after this time.
      */
     bool stop();
 
     /**
-     * Reads the certificate and its key again. New connections get them; where they are wrong, the old ones stay, and
-     * the log says so.
+     * Reads the certificate and its key again. New connections use them; if the new files are wrong, the old ones stay
+     * in use, and the log says so.
      */
     void renewKeys();
 
-    /** In one line, what it does and has done. */
+    /** One line with the numbers of connections, requests and log-ins. */
     std::string health() const;
 
 private:

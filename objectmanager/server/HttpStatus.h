@@ -26,7 +26,7 @@ constexpr unsigned int serviceUnavailable = 503;
 constexpr unsigned int versionNotSupported = 505;
 constexpr unsigned int notExtended = 510;
 
-/** What people call a status; "Other" where HTTP has no name for it. */
+/** The reason phrase of a status; "Other" for statuses without one here. */
 constexpr std::string_view reasonOf(unsigned int status) {
     constexpr std::array<std::pair<unsigned int, std::string_view>, 17> reasons = {{
         {ok, "OK"},

@@ -14,7 +14,7 @@ namespace ObjectManager::Server {
 /** A numeric IP address. */
 class Address {
 public:
-    /** @throws ServerError where the text is none. */
+    /** @throws ServerError if the text is not a numeric address. */
     explicit Address(const std::string& text, std::uint16_t port = 0);
 
     bool isLoopback() const;
@@ -26,19 +26,19 @@ private:
     socklen_t _size = 0;
 };
 
-/** The address of a client, as people write it. */
+/** The address of a client as text. */
 std::string textOf(const sockaddr& address);
 
 /**
- * What counts as one client: the address, and where one client can easily have many, their network, which is
- * 127.0.0.0/8 and of IPv6 addresses the first 64 bits.
+ * The network of a client, for limits: its address; but one client can easily have all addresses in 127.0.0.0/8, or all
+ * IPv6 addresses with the same first 64 bits, so these count as one network.
  */
 std::string networkOf(const sockaddr& address);
 
-/** Whose address, with its port, stands in a URL. */
+/** The address and port in the form that URLs have. */
 std::string hostAndPort(const std::string& address, std::uint16_t port);
 
-/** The listening socket, which is the caller's. @throws ServerError */
+/** Makes a listening socket, which the caller has to close. @throws ServerError */
 int listenOn(const std::string& address, std::uint16_t port);
 std::uint16_t portOf(int socket);
 

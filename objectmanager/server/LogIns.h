@@ -1,4 +1,4 @@
-/** Who a client is, and what he may do. */
+/** Log-ins: which user a client is, and which rights the user has. */
 #ifndef SERVER_LOGINS_H
 #define SERVER_LOGINS_H
 
@@ -18,9 +18,9 @@
 namespace ObjectManager::Server {
 
 struct LogIn {
-    /** Nothing where the log-in failed. */
+    /** The user and his rights; no value if the log-in failed. */
     std::optional<Caller> caller;
-    /** Why it failed, for the person who runs the server. */
+    /** Why the log-in failed, for the person who runs the server. */
     std::string problem;
 };
 
@@ -30,12 +30,12 @@ struct Credentials {
 };
 
 /**
- * What the value of the header Authorization gives for HTTP's scheme Basic (RFC 7617); nothing where it is of another
- * scheme or wrong, or has a character that no log-in can have.
+ * The user and password in the value of the header Authorization, in HTTP's scheme Basic (RFC 7617). No value if it has
+ * another scheme, is malformed, or contains a character that no log-in can have.
  */
 std::optional<Credentials> credentialsOf(std::string_view authorization);
 
-/** Decides on log-ins. Used by several threads at once. */
+/** Checks log-ins. Used by several threads at once. */
 class Authenticator {
 public:
     Authenticator() = default;
@@ -43,31 +43,32 @@ public:
     Authenticator& operator=(const Authenticator&) = delete;
     virtual ~Authenticator() = default;
 
-    /** May take its time. @param address the client's. */
+    /** Checks a log-in, which may take long. @param address the client's address. */
     virtual LogIn logIn(const std::string& user, const std::string& password, const std::string& address) = 0;
 };
 
 /**
- * Log-ins that succeeded, since clients send their password with every request and it is expensive to check. Keeps no
- * password, only what tells whether the same one comes again. Used by several threads at once.
+ * Remembers successful log-ins, since clients send their password with every request and checking it is expensive. It
+ * does not keep passwords, but keyed digests that tell whether the same password comes again. Used by several threads
+ * at once.
  */
 class RecentLogIns {
 public:
     using Clock = std::chrono::steady_clock;
-    /** For how long a log-in is good after its last use, and after it was checked. */
+    /** How long a log-in stays valid without another check: after its last use, and after its last check. */
     static constexpr std::chrono::seconds lifetime{30};
     static constexpr std::chrono::minutes longestLifetime{5};
-    /** For how long it is known that a log-in was good. */
+    /** How long the server remembers that a log-in was correct. */
     static constexpr std::chrono::hours memory{24};
     static constexpr std::size_t capacity = 1000;
 
     RecentLogIns();
 
-    /** The caller where the log-in need not be checked, which renews it. */
+    /** The caller, if the log-in is still valid; then its last use is now. */
     std::optional<Caller> find(const Credentials& given, Clock::time_point now = Clock::now());
-    /** Whether the log-in was good the last time that it was checked. */
+    /** Whether the log-in was correct when it was last checked. */
     bool isKnown(const Credentials& given, Clock::time_point now = Clock::now());
-    /** Where there are too many, the one that was used longest ago is forgotten. */
+    /** Remembers a log-in that was checked. If there are too many, forgets the one that was used longest ago. */
     void remember(const Credentials& given, const Caller& caller, Clock::time_point now = Clock::now());
     void forget(const Credentials& given);
 
@@ -88,57 +89,61 @@ private:
 };
 
 /**
- * Decides whom the server lets in. Who was let in lately is not checked again; the others are, a few at a time, which
- * the networks take in turns, users who were good before ahead of strangers. Used by several threads at once.
+ * Decides on the log-ins of clients. A recent log-in is not checked again. Other log-ins are checked, a few at the same
+ * time: networks take turns, and users whose password was correct before come before strangers. Used by several threads
+ * at once.
  */
 class LogIns {
 public:
     using Clock = std::chrono::steady_clock;
 
-    /** Where and how a log-in is asked for. */
+    /** The client that logs in. */
     struct Client {
         const std::string& address;
         const std::string& network;
-        /** Whether the client has gone, and the log-in need not be checked. */
+        /** Whether the client has closed the connection, so that the log-in need not be checked. */
         std::function<bool()> isGone;
     };
 
     enum class Verdict {
         in,
         wrong,
-        /** Too many wait already, or it took too long. */
+        /** Too many log-ins wait already, or the turn did not come in time. */
         busy,
     };
 
     struct Decision {
         Verdict verdict;
         std::optional<Caller> caller{};
-        /** Why it is wrong, for the person who runs the server. */
+        /** Why the log-in is wrong, for the person who runs the server. */
         std::string problem{};
-        /** When the client may learn that it is wrong: the same for a wrong password and a user who does not exist. */
+        /**
+         * When to answer that the log-in is wrong: this time does not tell a wrong password from a user that does not
+         * exist.
+         */
         Clock::time_point answerAt{};
     };
 
     /**
-     * @param authenticator outlives this.
-     * @param delay after which a wrong log-in is answered; what takes longer is answered after twice as long, and so
-     * on.
+     * @param authenticator must outlive this object.
+     * @param delay the time after which a wrong log-in is answered. If the check takes longer, the answer is sent after
+     * the next multiple of it.
      */
     LogIns(Authenticator& authenticator, std::chrono::milliseconds delay);
 
-    /** Where it need not be checked. */
+    /** The caller, if the log-in need not be checked. */
     std::optional<Caller> recent(const Credentials& given) { return _recent.find(given); }
-    /** Waits for its turn, and checks. @param until when waiting for the turn ends. */
+    /** Waits for a turn, and checks the log-in. @param until when waiting for the turn ends. */
     Decision check(const Credentials& given, const Client& client, Clock::time_point until);
 
-    /** Nothing is checked any more; those who wait are told that it is busy. */
+    /** Ends all checks: log-ins that wait for a turn get the verdict `busy`. */
     void close() { _turns.close(); }
 
     struct Counts {
         std::size_t good;
         std::size_t wrong;
     };
-    /** Of those that were checked since the start. */
+    /** How many of the log-ins that were checked since the start were correct, and how many wrong. */
     Counts counts() const { return {_good, _wrong}; }
 
 private:

@@ -1,4 +1,4 @@
-/** Log-ins against the system's users. */
+/** Log-ins of the system's users. */
 #ifndef SERVER_PAMAUTHENTICATOR_H
 #define SERVER_PAMAUTHENTICATOR_H
 
@@ -10,7 +10,7 @@
 
 namespace ObjectManager::Server {
 
-/** Asks PAM, and takes roles from the groups that the user is in. */
+/** Checks passwords with PAM, and derives rights from the user's groups. */
 class PamAuthenticator final : public Authenticator {
 public:
     explicit PamAuthenticator(PamSettings settings) : _settings(std::move(settings)) {}

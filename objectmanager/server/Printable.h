@@ -1,4 +1,4 @@
-/** Texts of clients in the log. */
+/** Makes clients' texts safe for the log. */
 #ifndef SERVER_PRINTABLE_H
 #define SERVER_PRINTABLE_H
 
@@ -8,9 +8,9 @@
 namespace ObjectManager::Server {
 
 /**
- * The text without what would break or forge lines of a log, or do something to a terminal: control characters, those
- * beyond ASCII (U+0080 to U+009F) included, characters that turn the direction of a text, and what is not UTF-8 become
- * \x and the digits of their bytes.
+ * The text without characters that could break or forge lines of a log, or control a terminal. Control characters
+ * (including U+0080 to U+009F), characters that change the direction of text, and bytes that are not valid UTF-8 become
+ * \x and the hexadecimal digits of their bytes.
  */
 std::string printable(std::string_view text);
 

@@ -1,4 +1,4 @@
-/** Why a server cannot be started. */
+/** The error of a server that cannot be started. */
 #ifndef SERVER_SERVERERROR_H
 #define SERVER_SERVERERROR_H
 

@@ -13,13 +13,13 @@
 
 namespace ObjectManager::Server {
 
-/** What sessions need of TLS. Sessions that began with it keep it. */
+/** The certificate, key and algorithms that TLS sessions use. A session keeps those with which it began. */
 class TlsKeys {
 public:
     /**
-     * @param log is told of what is unwise.
-     * @throws ServerError where the files cannot be read or do not belong together, the certificate's time is over, or
-     *         a key is too weak.
+     * @param log gets warnings about unsafe files.
+     * @throws ServerError if the files cannot be read or do not belong together, the certificate has expired, or a key
+     *         is too weak.
      */
     TlsKeys(const Tls& files, const Log& log);
 

@@ -1,4 +1,4 @@
-/** Who may use something that there is little of. */
+/** Shares a scarce resource fairly between networks. */
 #ifndef SERVER_TURNS_H
 #define SERVER_TURNS_H
 
@@ -15,9 +15,9 @@
 namespace ObjectManager::Server {
 
 /**
- * A number of places, which the clients' networks take in turns: however many connections one network has, another that
- * wants a place waits for the end of one turn at most, and no network holds all of them.
- * Clients that are known come before strangers, who never have the last place where there are several.
+ * A number of places, for which the clients' networks take turns. However many connections one network has, another
+ * network that wants a place waits for the end of one turn at most, and no network holds all places. Known clients come
+ * before strangers, who never get the last place if there are several.
  *
  * Used by several threads at once.
  */
@@ -25,7 +25,7 @@ class Turns {
 public:
     using Clock = std::chrono::steady_clock;
 
-    /** A place, until it ends. Without one it converts to false. */
+    /** Holds a place until it is destroyed. It converts to false if it holds none. */
     class Turn {
     public:
         Turn() = default;
@@ -52,23 +52,24 @@ public:
     };
 
     /**
-     * @param placesOfNetwork how many one network may hold.
+     * @param placesOfNetwork how many places one network may hold.
      * @param waiting how many turns one network may wait for.
      */
     Turns(unsigned int places, unsigned int placesOfNetwork, unsigned int waiting);
 
     /**
      * Waits for a turn.
-     * @param until when waiting ends without one.
-     * @param isGone says, now and then, whether the client has gone, so that nobody needs the turn.
-     * @return no turn where there was none in time, the network waits for too many, or nobody gets one any more.
+     * @param until when waiting ends without a turn.
+     * @param isGone is called now and then; returns true if the client has closed the connection, so that it needs no
+     * turn.
+     * @return no turn if none came in time, if the network waits for too many turns already, or after `close`.
      */
     Turn take(const std::string& network, bool known, Clock::time_point until, const std::function<bool()>& isGone);
 
-    /** How many wait for a turn. */
+    /** The number of clients that wait for a turn. */
     std::size_t waiting();
 
-    /** Nobody gets a turn any more; those who wait go without. */
+    /** Ends all waiting: from now on, nobody gets a turn. */
     void close();
 
 private:
@@ -87,7 +88,7 @@ private:
 
     bool mayRun(const Waiter& waiter) const;
     void start(Waiter& waiter);
-    /** Gives free places to those who wait. */
+    /** Gives free places to waiting clients. */
     void grant();
     void end(const Turn& turn);
     void forget(const std::string& network);

@@ -1,4 +1,4 @@
-/** The characters of XML, in UTF-8. */
+/** Writes texts as characters of XML, in UTF-8. */
 #ifndef CIMXML_CHARACTERS_H
 #define CIMXML_CHARACTERS_H
 
@@ -7,7 +7,9 @@
 
 namespace ObjectManager::CimXml {
 
-/* Append a text so that a reader of the document gets it back. What XML cannot say becomes U+FFFD. */
+/*
+ * These append a text so that a reader of the document gets it back. Characters that XML does not allow become U+FFFD.
+ */
 
 void appendText(std::string& document, std::string_view text);
 /** For attribute values in double quotes. */

@@ -1,4 +1,4 @@
-/** Which associations between classes their declarations allow. */
+/** The associations between classes that the declarations allow. */
 #ifndef CIMXML_CLASSASSOCIATIONS_H
 #define CIMXML_CLASSASSOCIATIONS_H
 
@@ -10,13 +10,13 @@
 namespace ObjectManager::CimXml {
 
 /**
- * The association classes that can refer to instances of the class: those with a reference to the class or to one of
- * its ancestors. By name.
+ * The association classes that can refer to instances of the source: those with a reference to this class or to one of
+ * its ancestors, sorted by name.
  */
 std::vector<const Class*> referencesOfClass(const Catalogue& catalogue, const Class& source,
                                             const AssociationFilter& filter);
 
-/** The classes that the other references of these association classes are declared with, each once. */
+/** The classes to which the other references of these association classes refer, each of them once. */
 std::vector<const Class*> associatorsOfClass(const Catalogue& catalogue, const Class& source,
                                              const AssociationFilter& filter);
 

@@ -1,4 +1,4 @@
-/** XML as it comes from the network. */
+/** Reads XML that comes from the network. */
 #ifndef CIMXML_MARKUP_H
 #define CIMXML_MARKUP_H
 
@@ -10,28 +10,28 @@
 
 namespace ObjectManager::CimXml {
 
-/* How much a document may have: elements within each other, attributes of one element, elements altogether. */
+/* Limits for a document: nested elements, attributes of one element, elements altogether. */
 constexpr std::size_t maximumDepth = 100;
 constexpr std::size_t maximumAttributes = 50;
 constexpr std::size_t maximumElements = 100'000;
 
-/** An element of a document, with everything that stands in it. */
+/** An element of a document, with its content. */
 struct XmlElement {
     std::string name;
     std::vector<std::pair<std::string, std::string>> attributes;
-    /** The text that stands in the element itself and not in one of its children, white space included. */
+    /** The text of the element itself, without the text of its children; white space is included. */
     std::string text;
     std::vector<XmlElement> children;
 
-    /** The value of an attribute; null where the element has no attribute of that name. */
+    /** The value of an attribute; null if the element does not have it. */
     const std::string* attribute(std::string_view attributeName) const;
 };
 
 /**
- * Reads a document in UTF-8 and gives its root. A document may name a document type, of which nothing is read, and must
- * not declare anything; the only entities are the five of XML itself.
+ * Reads a document in UTF-8. @return its root. A document may name a document type, which is not read, and must not
+ * declare anything; only XML's own five entities are allowed.
  *
- * @throws ProtocolError where the document is not well-formed, beyond one of the limits above, or in another encoding.
+ * @throws ProtocolError if the document is not well-formed, exceeds one of the limits above, or has another encoding.
  */
 XmlElement parseMarkup(std::string_view text);
 

@@ -1,4 +1,4 @@
-/** How a request fails before it is known to be a CIM operation. */
+/** Errors of requests that are not CIM operations. */
 #ifndef CIMXML_PROTOCOLERROR_H
 #define CIMXML_PROTOCOLERROR_H
 
@@ -9,10 +9,10 @@
 
 namespace ObjectManager::CimXml {
 
-/** A request that is refused by its HTTP status; what() is one line for the person who asked. */
+/** A request that is refused with an HTTP status. what() is one line for the client's user. */
 class ProtocolError : public std::runtime_error {
 public:
-    /** `cimError` is the value of the reply's header CIMError, a literal; null where it has none. */
+    /** @param cimError the value of the reply's header CIMError, a literal; null if the reply does not have it. */
     ProtocolError(unsigned int status, const char* cimError, const std::string& message)
         : std::runtime_error(message), _status(status), _cimError(cimError) {}
 
@@ -26,17 +26,19 @@ private:
 
 namespace Http = Server::Status;
 
-/** The body is no XML. */
+/** The body is not well-formed XML. */
 inline ProtocolError notWellFormed(const std::string& message) {
     return {Http::badRequest, "request-not-well-formed", message};
 }
 
-/** The body is XML, but lacks what the document type demands. What is there beyond that is not minded. */
+/**
+ * The body is XML, but lacks something that the document type requires. Anything that it has beyond that is ignored.
+ */
 inline ProtocolError notLooselyValid(const std::string& message) {
     return {Http::badRequest, "request-not-loosely-valid", message};
 }
 
-/** A header says something else than the body. */
+/** A header contradicts the body. */
 inline ProtocolError headerMismatch(const std::string& message) {
     return {Http::badRequest, "header-mismatch", message};
 }

@@ -1,4 +1,4 @@
-/** The pull operations of DSP0200: enumerations that a client opens, and takes a part of at a time. */
+/** The pull operations of DSP0200: a client opens an enumeration, and pulls its objects part by part. */
 #ifndef CIMXML_PULLOPERATIONS_H
 #define CIMXML_PULLOPERATIONS_H
 
@@ -7,8 +7,8 @@
 namespace ObjectManager::CimXml {
 
 /*
- * The objects are asked of the providers when the enumeration is opened, and kept in the form in which they are sent.
- * What is left of an enumeration is bounded by EnumerationLimits.
+ * The providers are asked for the objects when the enumeration is opened. The objects are kept in the form in which
+ * they are sent, within EnumerationLimits.
  */
 
 void openEnumerateInstances(const Call& call);
@@ -17,7 +17,7 @@ void openAssociatorInstances(const Call& call);
 void openAssociatorInstancePaths(const Call& call);
 void openReferenceInstances(const Call& call);
 void openReferenceInstancePaths(const Call& call);
-/** What ExecQuery answers: instances without their paths. */
+/** Opens an enumeration of the instances that a query selects, without their paths. */
 void openQueryInstances(const Call& call);
 void pullInstances(const Call& call);
 void pullInstancesWithPath(const Call& call);

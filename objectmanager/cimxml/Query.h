@@ -1,4 +1,4 @@
-/** Queries of the instances of one class: what WQL and the CIM Query Language (DSP0202) have in common. */
+/** Queries for instances of one class, in the part that WQL and the CIM Query Language (DSP0202) have in common. */
 #ifndef CIMXML_QUERY_H
 #define CIMXML_QUERY_H
 
@@ -12,7 +12,7 @@
 
 namespace ObjectManager::CimXml {
 
-/** What a property is compared with. */
+/** The comparison of a property with a literal. */
 struct Comparison {
     enum class Operator { equal, notEqual, less, lessOrEqual, greater, greaterOrEqual, isNull };
 
@@ -26,33 +26,33 @@ struct Condition {
     enum class Kind { all, any, none, comparison };
 
     Kind kind = Kind::all;
-    /** Of all, any and none; none has one. */
+    /** The operands of `all`, `any` and `none`; `none` has one. */
     std::vector<Condition> operands{};
     Comparison comparison{};
 };
 
 struct Query {
     std::string className;
-    /** The properties to give; nothing means all. */
+    /** The properties to return; no value for all. */
     std::optional<std::vector<std::string>> properties;
     std::optional<Condition> condition;
 
-    /** The properties whose values are needed to tell whether an instance matches. */
+    /** The properties that the condition compares. */
     std::vector<std::string> compared() const;
 };
 
 /**
- * Reads "SELECT * | name, ... FROM class [WHERE condition]". A condition has comparisons (=, <>, !=, <, <=, >, >=, IS
- * [NOT] NULL) of a property with a literal, AND, OR, NOT and parentheses. A name may have the class before it.
+ * Reads "SELECT * | name, ... FROM class [WHERE condition]". A condition consists of comparisons (=, <>, !=, <, <=, >,
+ * >=, IS [NOT] NULL) of a property with a literal, AND, OR, NOT and parentheses. The class may stand before a name.
  *
- * @throws CimError with CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED where the language is none of the two or the text uses
- *         more of it, with CMPI_RC_ERR_INVALID_QUERY where the text is no query.
+ * @throws CimError with CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED if the language is another one or the text uses other
+ *         parts of it, with CMPI_RC_ERR_INVALID_QUERY if the text is not a query.
  */
 Query parseQuery(const std::string& text, std::string_view language);
 
 /**
- * @throws CimError with CMPI_RC_ERR_INVALID_QUERY where the class lacks a property of the query, or has it in a type
- *         that cannot be compared as the query wants.
+ * Checks a query against its class. @throws CimError with CMPI_RC_ERR_INVALID_QUERY if the class lacks a property of
+ *         the query, or the type of a property does not allow the comparison.
  */
 void checkQuery(const Query& query, const Class& declared);
 

@@ -1,4 +1,4 @@
-/** What is recorded of a message: who asked for what, in the client's own words. */
+/** Makes the record of a message: who made which request, in the client's own words. */
 #ifndef CIMXML_RECORDING_H
 #define CIMXML_RECORDING_H
 
@@ -11,7 +11,7 @@
 
 namespace ObjectManager::CimXml {
 
-/** Texts are in one line and bounded. What makes no sense is given as far as it can be read. */
+/** Each text is one line of limited length. A malformed message is recorded as far as it can be read. */
 Audit::CallRecord recordOf(const Message& message, const Server::Caller& caller, const Catalogue& catalogue,
                            Audit::Verdict verdict, const std::string& reason);
 

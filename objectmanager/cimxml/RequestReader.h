@@ -1,4 +1,4 @@
-/** The CIM document of a request. */
+/** Reads the CIM document of a request. */
 #ifndef CIMXML_REQUESTREADER_H
 #define CIMXML_REQUESTREADER_H
 
@@ -14,28 +14,28 @@ namespace ObjectManager::CimXml {
 /** An IPARAMVALUE or PARAMVALUE. */
 struct Argument {
     std::string name;
-    /** What it holds; null where it is null. Belongs to the message. */
+    /** The element with the value; null for a null value. It belongs to the message. */
     const XmlElement* content;
 };
 
-/** One operation, as far as it can be read without knowing which. */
+/** One operation, read as far as that does not depend on which operation it is. */
 class Message {
 public:
-    /** @throws ProtocolError where the document is none that asks for one operation. */
+    /** @throws ProtocolError if the document does not ask for exactly one operation. */
     explicit Message(std::string_view body);
     Message(const Message&) = delete;
     Message& operator=(const Message&) = delete;
 
     const std::string& id() const { return _id; }
     const std::string& protocolVersion() const { return _protocolVersion; }
-    /** Whether the operation is one of the object manager's, and no class's own method. */
+    /** Whether the operation is one of the object manager's own, and not a method of a class. */
     bool isIntrinsic() const { return _intrinsic; }
     const std::string& method() const { return _method; }
-    /** For example "root/cimv2". */
+    /** The namespace, for example "root/cimv2". */
     const std::string& nameSpace() const { return _nameSpace; }
     /** The CLASSNAME or INSTANCENAME whose method is called. Not for intrinsic methods. */
     const XmlElement& target() const { return *_target; }
-    /** In the order of the document. */
+    /** The arguments in the order of the document. */
     const std::vector<Argument>& arguments() const { return _arguments; }
 
 private:
@@ -54,13 +54,13 @@ private:
     std::vector<Argument> _arguments;
 };
 
-/* Elements that nobody knows are passed over. All throw ProtocolError. */
+/* These functions ignore unknown elements. All throw ProtocolError. */
 
-/** The one child with one of these names, or null where there is none. */
+/** The only child with one of these names; null if there is none. */
 const XmlElement* optionalChild(const XmlElement& element, std::initializer_list<std::string_view> names);
-/** The one child with one of these names. */
+/** The only child with one of these names, which must exist. */
 const XmlElement& requiredChild(const XmlElement& element, std::initializer_list<std::string_view> names);
-/** The value of an attribute that must be there. */
+/** The value of an attribute, which must exist. */
 const std::string& requiredAttribute(const XmlElement& element, std::string_view name);
 /** The namespace that a LOCALNAMESPACEPATH names. */
 std::string nameSpaceOf(const XmlElement& localNameSpacePath);

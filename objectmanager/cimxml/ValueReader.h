@@ -1,4 +1,4 @@
-/** Values, object names and instances as CIM-XML writes them. */
+/** Reads values, object names and instances in the form of CIM-XML. */
 #ifndef CIMXML_VALUEREADER_H
 #define CIMXML_VALUEREADER_H
 
@@ -11,49 +11,49 @@
 
 namespace ObjectManager::CimXml {
 
-/** How many keys, properties and names of properties a request may list. */
+/** The limit for the keys, for the properties and for the property names in one list of a request. */
 constexpr std::size_t maximumNames = 1000;
 
 /**
- * The value that a text means in a type. White space around numbers, truth values and dates does not matter.
+ * The value of a given type that a text stands for. White space around numbers, booleans and datetimes is ignored.
  *
- * @param type no array, no reference and no instance.
- * @throws CimError with CMPI_RC_ERR_INVALID_PARAMETER where the text says no value of the type.
+ * @param type any type but arrays, references and instances.
+ * @throws CimError with CMPI_RC_ERR_INVALID_PARAMETER if the text is not a value of the type.
  */
 Value valueOfWireText(const std::string& text, CMPIType type);
 
 /**
- * Reads what names classes decide the types of: the catalogue's class does, and what the document says where it knows
- * none. Names of known classes and properties are spelled as they are declared.
+ * Reads elements whose types depend on classes. The class in the catalogue decides the types; for an unknown class, the
+ * document does. The names of known classes and properties are returned in the spelling of their declarations.
  *
- * Everything throws ProtocolError where an element lacks what the document type demands, and CimError with
- * CMPI_RC_ERR_INVALID_PARAMETER where what it says is wrong.
+ * Every function throws ProtocolError if an element lacks something that the document type requires, and CimError with
+ * CMPI_RC_ERR_INVALID_PARAMETER if its content is wrong.
  */
 class ValueReader {
 public:
-    /** Both outlive the reader. `nameSpace` is that of names that say none. */
+    /** Both arguments must outlive the reader. `nameSpace` is used for names that have no namespace. */
     ValueReader(const Catalogue& catalogue, const std::string& nameSpace)
         : _catalogue(catalogue), _nameSpace(nameSpace) {}
 
-    /** A CLASSNAME. */
+    /** Reads a CLASSNAME. */
     ObjectPath className(const XmlElement& element) const;
-    /** An INSTANCENAME; of a known class, with every key. */
+    /** Reads an INSTANCENAME. If its class is known, it must have every key. */
     ObjectPath instanceName(const XmlElement& element) const;
-    /** What a VALUE.REFERENCE holds. */
+    /** Reads the path in a VALUE.REFERENCE. */
     ObjectPath reference(const XmlElement& valueReference) const;
 
-    /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY of a type; `what` it is the value of. */
+    /** Reads a VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY of a type. @param what names it in messages. */
     Value value(const XmlElement& element, CMPIType type, const std::string& what) const;
 
     /**
-     * What a PARAMVALUE holds, as the value of the parameter. A reference may also come as a text, in the form in which
-     * people write object paths.
+     * Reads the value of a parameter from a PARAMVALUE. A reference may also be given as text, in the URI form of
+     * object paths.
      */
     Value argument(const XmlElement& element, const Parameter& parameter) const;
 
     /**
-     * An INSTANCE. Its path has the keys that are among its properties. For a property that its class lacks, DSP0200
-     * has a code with one operation that it has not with another: it is `unknownProperty`.
+     * Reads an INSTANCE. Its path has the keys that are among its properties. @param unknownProperty the status code
+     * for a property that the class lacks: in DSP0200, it depends on the operation.
      */
     Instance instance(const XmlElement& element, CMPIrc unknownProperty) const;
 

@@ -13,8 +13,8 @@ namespace {
 constexpr int folderFlags = O_PATH | O_DIRECTORY | O_CLOEXEC;
 
 /**
- * Whether a user other than the superuser may make links in an open folder that are followed. In one with the sticky
- * bit, such as /tmp, the kernel follows none that is not the caller's own.
+ * Whether a user other than root may make links in an open folder that root would follow. In a folder with the sticky
+ * bit, such as /tmp, the kernel lets a process follow only links of its own user.
  */
 bool isOthers(const Descriptor& folder) {
     struct stat status {};
@@ -22,7 +22,10 @@ bool isOthers(const Descriptor& folder) {
            ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0 && (status.st_mode & S_ISVTX) == 0);
 }
 
-/** The folder of a file, step by step; `isGuarded` becomes true where the way leads through one that is others'. */
+/**
+ * Opens the folder of a file step by step. `isGuarded` becomes true at the first folder in which another user may make
+ * links.
+ */
 Descriptor enterFolder(const std::string& file, bool& isGuarded) {
     Descriptor folder(::open("/", folderFlags));
     std::size_t begin = file.find_first_not_of('/');

@@ -10,19 +10,19 @@
 namespace Norv::Agent {
 
 /**
- * The folder of a file, held open: nothing takes its place between one step and the next.
+ * The folder of a file, which is held open so that no other folder can take its place between two steps.
  *
- * What the superuser does here cannot be led elsewhere by those who may change the folder. From the first folder on
- * that belongs to another user, or that others may write to, he follows no symbolic link, and opens no file that has a
- * second name. Other users follow what they find: it leads them to nothing that they could not change anyway.
+ * Users who may change the folder cannot redirect what root does here. From the first folder in the path that belongs
+ * to another user, or that others may write to, root follows no symbolic link, and opens no file that has a second
+ * name. Other users follow links: these lead only to files that they could change anyway.
  */
 class FolderOfFile {
 public:
-    /** @param file an absolute path. Where its folder cannot be opened, isOpen() is false and errno says why. */
+    /** @param file an absolute path. If its folder cannot be opened, isOpen() is false and errno says why. */
     explicit FolderOfFile(const std::string& file);
 
     bool isOpen() const { return _folder.isOpen(); }
-    /** For calls that take a folder, such as renameat(2). */
+    /** The folder's descriptor, for calls such as renameat(2). */
     int number() const { return _folder.number(); }
     /** The file's name in the folder. */
     const std::string& name() const { return _name; }
@@ -30,8 +30,8 @@ public:
     /**
      * Opens the file as open(2) does.
      *
-     * @return not open where that fails; errno says why: ELOOP for a link, and EMLINK for a second name, that the
-     * superuser does not accept.
+     * @return a descriptor that is not open if that fails; errno says why: ELOOP and EMLINK for a link and for a second
+     * name that root does not accept.
      */
     Descriptor openFile(int flags, mode_t mode = 0) const;
 

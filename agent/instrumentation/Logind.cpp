@@ -31,8 +31,8 @@ constexpr std::array<std::string_view, 3> noServiceErrors = {
 /** systemd's error for a service that must not be started. */
 constexpr std::string_view maskedError = "org.freedesktop.systemd1.UnitMasked";
 /**
- * systemd's error instead of that, if systemd-logind was masked while it ran: D-Bus starts it by an alias, which
- * systemd cannot load any more.
+ * systemd's error if systemd-logind was masked while it ran: D-Bus starts it by an alias, which systemd cannot load any
+ * more.
  */
 constexpr std::string_view maskedAliasError = SD_BUS_ERROR_FILE_EXISTS;
 /** The bus's errors for a service that ended before it answered. */

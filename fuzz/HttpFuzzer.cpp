@@ -1,6 +1,6 @@
 /*
- * What a client may send on a connection, from the first byte to the last, through a pair of sockets. Whatever comes,
- * the server takes it or refuses it, and closes the connection when the client has.
+ * Sends the bytes of a whole connection to the server, through a pair of sockets. Whatever they are, the server must
+ * accept or refuse them, and close the connection when the client has closed it.
  */
 #include "server/Exchange.h"
 

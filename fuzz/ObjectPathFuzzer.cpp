@@ -1,4 +1,4 @@
-/* Object paths as people write them: what is read is written so that it is read as the same. */
+/* Reads object paths in URI form. A path that can be read must be written in a form that is read as the same path. */
 #include "text/ObjectPathText.h"
 
 #include <cstdint>

@@ -1,6 +1,6 @@
 /*
- * Requests in the form of the wire cases, which are its corpus. Whatever comes, there is a reply, and it is either a
- * document that is well-formed or a refusal. No provider is called.
+ * Reads requests in the form of the wire cases, which are its corpus. Every request must get a reply, which is a
+ * well-formed document or a refusal. No provider is called.
  */
 #include "WireCase.h"
 #include "cimxml/Markup.h"
@@ -15,7 +15,7 @@ using namespace ObjectManager;
 
 namespace {
 
-/** The registrations as they are shipped, but that they offer nothing. */
+/** The shipped registrations, without any kind of provider. */
 Registry registryWithoutProviders() {
     std::vector<Registration> registrations = readRegistrations(std::filesystem::path(FUZZ_SCHEMA));
     for (Registration& registration : registrations) {

@@ -68,7 +68,7 @@ public:
      */
     std::vector<unsigned short> getPowerStatesSupported();
 
-    /** As `getPowerStatesSupported`, with 3 (Power State Settable), 4 (Power Cycling Supported) and 8 (Graceful). */
+    /** Does the same with its own list and 3 (Power State Settable), 4 (Power Cycling Supported) and 8 (Graceful). */
     std::vector<unsigned short> getPowerChangeCapabilities();
 
 private:

@@ -55,7 +55,7 @@ struct ListedState {
     const char* canMethod;
 };
 
-/** By CIM's numbers of power states: sleep - deep, power cycle (off - soft), hibernate, off - soft. */
+/** The numbers are CIM's power states: sleep - deep, power cycle (off - soft), hibernate, off - soft. */
 constexpr std::array listedStates = {ListedState{4, "CanSuspend"}, ListedState{5, "CanReboot"},
                                      ListedState{7, "CanHibernate"}, ListedState{8, "CanPowerOff"}};
 /** CIM's power state "on": the machine that runs this program is always in it. */

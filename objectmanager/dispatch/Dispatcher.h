@@ -29,9 +29,9 @@ public:
     struct Settings {
         /** The folders that are searched for provider libraries, in this order. */
         std::vector<std::filesystem::path> folders;
-        /** May be null; outlives the dispatcher. */
+        /** The class declarations. May be null; must outlive the dispatcher. */
         const ClassInformation* classes = nullptr;
-        /** Where failures' reasons come from; may be null; outlives the dispatcher. */
+        /** The agent's log, which has the reasons of failures. May be null; must outlive the dispatcher. */
         LogTap* log = nullptr;
         /** A call follows the first rule that is about its method. The rules must outlive the dispatcher. */
         std::vector<const MethodRule*> rules{};
@@ -41,7 +41,7 @@ public:
 
     const Registry& registry() const { return _registry; }
     Broker& broker() { return _broker; }
-    /** Where failures' reasons come from; may be null. */
+    /** The agent's log, which has the reasons of failures; may be null. */
     LogTap* log() { return _log; }
 
     /** Loads a registered provider, and reports whether it can be used. */

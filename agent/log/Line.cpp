@@ -81,20 +81,36 @@ void Line::appendNumber(int number) {
     append({digits.data(), end});
 }
 
+// As much of the text as there is room for.
+void Line::appendText(std::string_view text) {
+    const std::size_t room = _full ? 0 : _capacity - cutOff.size() - _size;
+    append(text.substr(0, room));
+    _full = _full || text.size() > room;
+}
+
 void Line::appendEscaped(std::string_view text) {
     constexpr std::string_view hexadecimal = "0123456789abcdef";
-    for (const char& character : text) {
+    constexpr auto isControl = [](char character) {
         const auto code = static_cast<unsigned char>(character);
-        if (character == '\n') {
+        return code < 0x20 || code == 0x7f;
+    };
+    for (;;) {
+        const auto control = std::ranges::find_if(text, isControl);
+        const auto plain = static_cast<std::size_t>(control - text.begin());
+        appendText(text.substr(0, plain));
+        if (control == text.end()) {
+            return;
+        }
+        const auto code = static_cast<unsigned char>(*control);
+        if (code == '\n') {
             append("\\n");
-        } else if (character == '\t') {
+        } else if (code == '\t') {
             append("\\t");
-        } else if (code < 0x20 || code == 0x7f) {
+        } else {
             const std::array escape{'\\', 'x', hexadecimal[code / 16], hexadecimal[code % 16]};
             append({escape.data(), escape.size()});
-        } else {
-            append({&character, 1});
         }
+        text.remove_prefix(plain + 1);
     }
 }
 

@@ -29,6 +29,7 @@ public:
 private:
     void append(std::string_view piece);
     void appendNumber(int number);
+    void appendText(std::string_view text);
     void appendEscaped(std::string_view text);
     void end();
 

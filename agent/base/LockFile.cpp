@@ -18,17 +18,20 @@ namespace Norv::Agent {
 
 namespace {
 
-/** @throws std::system_error of errno. */
+/** @throws std::system_error with the number in errno. */
 [[noreturn]] void fail(const std::filesystem::path& path, const char* problem) {
     throw std::system_error(errno, std::generic_category(), path.string() + ": " + problem);
 }
 
-/** The same of another error number. */
+/** The same with another error number. */
 [[noreturn]] void fail(const std::filesystem::path& path, const std::string& problem, int error) {
     throw std::system_error(error, std::generic_category(), path.string() + ": " + problem);
 }
 
-/** For whoever waits. What cannot be written is not worth more: the file is locked all the same. */
+/**
+ * Writes into the file which process has locked it, for the messages of others. A failure is ignored: the file is
+ * locked without the text, too.
+ */
 void writeHolder(const Descriptor& file) {
     const std::string holder = std::string(program_invocation_short_name) + ", process " + std::to_string(getpid());
     if (::ftruncate(file.number(), 0) == 0) {
@@ -36,21 +39,22 @@ void writeHolder(const Descriptor& file) {
     }
 }
 
-/** Whoever has the file, for people. */
+/** The process that has locked the file, for people. */
 std::string holderIn(const Descriptor& file) {
     std::array<char, 100> text{};
     const ssize_t size = ::pread(file.number(), text.data(), text.size(), 0);
     std::string holder(text.data(), static_cast<std::size_t>(std::max<ssize_t>(size, 0)));
     std::ranges::replace_if(
         holder, [](unsigned char character) { return character < 0x20 || character == 0x7f; }, ' ');
-    return holder.empty() ? "somebody who is not named in it" : holder;
+    return holder.empty() ? "a process that is not named in it" : holder;
 }
 
-// Neither a link to another file must be followed, nor one be waited for that has another end.
+// The name may have been replaced by a symbolic link or a named pipe: the former must not be followed, and opening the
+// latter must not wait.
 constexpr int openFlags = O_RDWR | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY;
 constexpr mode_t forOwnerOnly = 0600;
 
-/** The owner of the folder in which the file is: what he has in it, the superuser shares with him. */
+/** The owner of the file's folder. Root may use a lock file that belongs to this user. */
 uid_t ownerOfFolder(const std::filesystem::path& file) {
     struct stat folder {};
     if (::stat(file.parent_path().c_str(), &folder) != 0) {
@@ -59,7 +63,7 @@ uid_t ownerOfFolder(const std::filesystem::path& file) {
     return folder.st_uid;
 }
 
-/** Makes the file; not open where there is one already. */
+/** Makes the file. @return a descriptor that is not open if the file exists, or cannot be made. */
 Descriptor make(const std::filesystem::path& file) {
     Descriptor made(::open(file.c_str(), openFlags | O_CREAT | O_EXCL, forOwnerOnly));
     if (made.isOpen() && !giveToOwnerOfFolder(made, file)) {
@@ -68,14 +72,16 @@ Descriptor make(const std::filesystem::path& file) {
     return made;
 }
 
-/** Refuses what is not a lock file of ours, since it may be somebody else's, or another file under a second name. */
+/**
+ * Refuses an existing file that need not be a lock file of ours: one that another user owns, or that has a second name.
+ */
 void requireOwn(const Descriptor& found, const std::filesystem::path& file) {
     struct stat status {};
     if (::fstat(found.number(), &status) != 0) {
         fail(file, "cannot be opened");
     }
     if (!S_ISREG(status.st_mode) || status.st_nlink != 1) {
-        fail(file, "is not a file of its own: remove it", EINVAL);
+        fail(file, "is not a regular file with a single name: remove it", EINVAL);
     }
     if (status.st_uid != ::geteuid() && status.st_uid != ownerOfFolder(file)) {
         fail(file, "belongs to uid " + std::to_string(status.st_uid) + ": remove it", EPERM);
@@ -117,7 +123,7 @@ LockFile::LockFile(const std::filesystem::path& file, const Deadline& deadline) 
 }
 
 LockFile::~LockFile() {
-    // Closing would not do: a child that the host has just forked holds the same lock.
+    // Closing the descriptor is not enough: a child process that the host has just forked holds the same lock.
     ::flock(_file.number(), LOCK_UN);
 }
 

@@ -43,7 +43,7 @@ constexpr Integer<unsigned int> fileCount{0, 1000};
 constexpr Seconds transitionTime{std::chrono::seconds{0}, std::chrono::hours{24}};
 constexpr Seconds waitingTime{std::chrono::milliseconds{100}, std::chrono::minutes{1}};
 
-// Nothing where the variable is not set or empty.
+// The value of an environment variable; no value if it is not set or empty.
 std::optional<std::string> environment(const char* name) {
     const char* value = std::getenv(name);
     return value == nullptr || *value == '\0' ? std::nullopt : std::optional<std::string>(value);
@@ -64,7 +64,7 @@ void readLog(TableReader& table, LogSettings& log) {
         CategoryThreshold threshold;
         category.require("prefix", Text{}, threshold.prefix);
         if (!prefixes.insert(threshold.prefix).second) {
-            category.reject("prefix", "a prefix that stands here once");
+            category.reject("prefix", "a prefix that no other category has");
         }
         category.read("level", level, threshold.logLevel);
         category.read("trace-level", level, threshold.traceLevel);
@@ -131,7 +131,7 @@ std::string contentOf(const std::string& file) {
     errno = 0;
     std::ifstream stream(file, std::ios::binary);
     std::ostringstream content;
-    // An empty file makes the insertion fail, which is no failure to read it.
+    // Inserting an empty file fails without errno: that is not a failure to read it.
     if (!stream || (!(content << stream.rdbuf()) && errno != 0)) {
         rejectFile(file, std::generic_category().message(errno));
     }
@@ -152,20 +152,22 @@ Configuration configurationFrom(const std::string& file) {
     return configuration;
 }
 
-// Whether the built-in defaults hold. A file that is there but cannot be reached counts as there: it is an error, not a
-// reason to go on without it.
+// Whether there is no file, so that the built-in defaults hold. A file that exists but cannot be reached is an error,
+// not a reason for the defaults.
 bool isWithoutFile() {
     std::error_code error;
     return !environment(fileVariable) &&
            std::filesystem::symlink_status(defaultFile, error).type() == std::filesystem::file_type::not_found;
 }
 
-/** A file of the agent's own, where the key does not name another one. */
+/**
+ * The default path of a file that the agent writes. `key` is the one that can name another path, for the error message.
+ */
 std::filesystem::path ownFile(const char* name, const char* key) {
     if (geteuid() == 0) {
         return std::filesystem::path("/var/lib/orv") / name;
     }
-    // The XDG base directory specification has relative paths ignored.
+    // The XDG Base Directory Specification requires that relative paths are ignored.
     if (const auto state = environment("XDG_STATE_HOME"); state && state->starts_with('/')) {
         return std::filesystem::path(*state) / "orv" / name;
     }
@@ -176,7 +178,10 @@ std::filesystem::path ownFile(const char* name, const char* key) {
                                                 "XDG_STATE_HOME or HOME to say where state is kept");
 }
 
-/** Of the machine in use only: what another one would need may be missing. */
+/**
+ * Completes the paths of the configured backend only: environment variables that another backend would need may be
+ * missing.
+ */
 void completePaths(InstrumentationSettings& instrumentation) {
     if (instrumentation.backend == Backend::simulated && instrumentation.simulated.stateFile.empty()) {
         instrumentation.simulated.stateFile = ownFile("simulated-machine.json", "instrumentation.simulated.state-file");

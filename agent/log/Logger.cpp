@@ -28,7 +28,7 @@ namespace {
 
 class Log {
 public:
-    /** `watch` was made before the settings were read. */
+    /** @param watch must be constructed before the settings are read, so that no change is missed. */
     Log(const Norv::Agent::LogSettings& settings, std::unique_ptr<Norv::Agent::ConfigurationWatch> watch)
         : _watch(std::move(watch)), _generations{Thresholds(settings)}, _thresholds(&_generations.front()),
           _destination(destinationFor(settings)) {}
@@ -47,7 +47,7 @@ public:
     }
 
 private:
-    // What holds for the thresholds holds for nothing else: records go where they went before.
+    // Only the thresholds are read again; the destination stays the same.
     void renewThresholds() {
         try {
             const auto configuration = Norv::Agent::loadConfiguration();
@@ -58,10 +58,10 @@ private:
             }
             _generations.push_front(thresholds);
             _thresholds.store(&_generations.front(), std::memory_order_release);
-            report(ownRecord(Norv::Agent::configurationFile() + " has changed: its thresholds hold from now on"));
+            report(ownRecord(Norv::Agent::configurationFile() + " has changed: its thresholds apply from now on"));
         } catch (const Norv::Agent::ConfigurationError& error) {
             if (std::exchange(_mistake, error.what()) != error.what()) {
-                report(ownRecord(_mistake + ": the former thresholds go on to hold"));
+                report(ownRecord(_mistake + ": the former thresholds still apply"));
             }
         }
     }
@@ -87,7 +87,8 @@ private:
         return standardErrorDestination();
     }
 
-    // Records that the destination did not take are counted; their number stands before the first that it takes again.
+    // Counts the records that the destination did not take. Their number is written before the first record that it
+    // takes again.
     void write(const Record& record) {
         if (const auto lost = _lost.exchange(0); lost != 0) {
             const std::string text = std::to_string(lost) + (lost == 1 ? " record" : " records") +
@@ -111,10 +112,10 @@ private:
     }
 
     const std::unique_ptr<Norv::Agent::ConfigurationWatch> _watch;
-    /** The newest first. Those before stay, since other threads may be reading them. */
+    /** All thresholds so far, the newest first. Older ones stay, since other threads may be reading them. */
     std::forward_list<Thresholds> _generations;
     std::atomic<const Thresholds*> _thresholds;
-    /** What was wrong in the file at the last look, and was reported; empty where nothing was. */
+    /** The mistake that the file had at the last look, which was reported; empty if it had none. */
     std::string _mistake;
     const std::unique_ptr<Destination> _destination;
     Gate _gate;
@@ -139,11 +140,11 @@ void report(Kind kind, const char* function, const char* file, int line, const s
     constexpr auto textOf = [](const char* nullable) { return std::string_view(nullable == nullptr ? "" : nullable); };
     const int error = errno;
     try {
-        // Never destroyed, see the build's -z nodelete.
+        // Never destroyed: see -z nodelete in CMakeLists.txt.
         static Log& log = *makeLog().release();
         log.report({kind, level, category, textOf(function), textOf(file), line, text, toldKind});
     } catch (const std::exception&) {
-        // Nothing but memory can be short here, and there is nowhere to say so.
+        // Only memory can be short here, and there is no place left to report that.
     }
     errno = error;
 }

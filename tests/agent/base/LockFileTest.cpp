@@ -26,7 +26,7 @@ using testing::StartsWith;
 
 class LockFileTest : public testing::Test {
 protected:
-    /** Why the file cannot be had within a time; "had" where it can. */
+    /** Why the lock cannot be taken within a time; "had" if it can. */
     std::string attempt(std::chrono::milliseconds patience = 0ms) const {
         try {
             const LockFile held(file, Deadline(patience));
@@ -115,13 +115,13 @@ TEST_F(LockFileTest, IsNotFollowedToAnotherFile) {
     EXPECT_THAT(attempt(), StartsWith(file.string() + ": is a link: remove it"));
     std::filesystem::remove(file);
     std::filesystem::create_hard_link(folder / "other", file);
-    EXPECT_THAT(attempt(), StartsWith(file.string() + ": is not a file of its own: remove it"));
+    EXPECT_THAT(attempt(), StartsWith(file.string() + ": is not a regular file with a single name: remove it"));
     EXPECT_EQ(contentOf(folder / "other"), "precious");
 }
 
 TEST_F(LockFileTest, IsNotWaitedForWhereItIsNoFile) {
     ASSERT_EQ(mkfifo(file.c_str(), 0666), 0);
-    EXPECT_THAT(attempt(), StartsWith(file.string() + ": is not a file of its own: remove it"));
+    EXPECT_THAT(attempt(), StartsWith(file.string() + ": is not a regular file with a single name: remove it"));
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);
     EXPECT_THAT(attempt(), StartsWith(file.string() + ": cannot be opened"));

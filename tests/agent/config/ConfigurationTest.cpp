@@ -203,7 +203,7 @@ TEST_F(ConfigurationTest, TheBackendLogindCanBeChosenWhereItIsBuiltIn) {
     }
 }
 
-/** Whether a watch tells of a change when it next looks at the file. */
+/** Whether a watch reports a change when it next looks at the file. */
 bool tellsOfAChange(Norv::Agent::ConfigurationWatch& watch) {
     AgentTest::passTime(std::chrono::seconds{1});
     bool told = false;
@@ -224,7 +224,7 @@ TEST_F(ConfigurationTest, AChangeIsToldOnce) {
 }
 
 TEST_F(ConfigurationTest, AChangeThatLooksLikeTheOneJustBeforeIsTold) {
-    // However late it is when the watch looks, this was just before.
+    // Even if the watch looks late, this time is just before.
     const auto time = std::filesystem::file_time_type::clock::now() + std::chrono::hours{1};
     writeFile(file, "log.level = 1");
     std::filesystem::last_write_time(file, time);
@@ -237,7 +237,7 @@ TEST_F(ConfigurationTest, AChangeThatLooksLikeTheOneJustBeforeIsTold) {
 struct WrongFile {
     const char* name;
     const char* text;
-    /** What follows the file's name. */
+    /** The message behind the file's name. */
     const char* error;
 };
 
@@ -287,7 +287,7 @@ constexpr WrongFile wrongFiles[] = {
     {"CategoryWithoutPrefix", "[[log.category]]\nlevel = 1\n",
      ":1: log.category[0].prefix: missing: expected a text that is not empty"},
     {"PrefixTwice", "[[log.category]]\nprefix = \"A\"\n[[log.category]]\nprefix = \"A\"\n",
-     ":4: log.category[1].prefix: \"A\": expected a prefix that stands here once"},
+     ":4: log.category[1].prefix: \"A\": expected a prefix that no other category has"},
     {"UnknownBackend", "[instrumentation]\nbackend = \"ipmi\"\n",
      ":2: instrumentation.backend: \"ipmi\": expected \"simulated\" or \"logind\""},
     {"NoTimeToWait", "[instrumentation.logind]\ntimeout = 0\n",

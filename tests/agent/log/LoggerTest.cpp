@@ -178,7 +178,7 @@ TEST(LoggerTest, NothingIsSaidWhereThereIsNoConfiguration) {
     EXPECT_THAT(textsOf(process.standardError()), ElementsAre("text"));
 }
 
-/** Writes records below the default thresholds until something is said on standard error. */
+/** Writes records below the default thresholds until standard error has a line. */
 void writeUntilSomethingIsSaid(const LogProcess& process) {
     LogTest::waitUntil([&process] {
         AgentTest::passTime(std::chrono::seconds(1));
@@ -198,7 +198,7 @@ TEST(LoggerTest, ThresholdsFollowTheConfigurationWhileTheProcessRuns) {
         writeLog(3000, "below");
     });
     EXPECT_THAT(textsOf(process.standardError()),
-                ElementsAre((process.folder / "agent.toml").string() + " has changed: its thresholds hold from now on",
+                ElementsAre((process.folder / "agent.toml").string() + " has changed: its thresholds apply from now on",
                             "power", "trace"));
 }
 
@@ -218,11 +218,11 @@ TEST(LoggerTest, AFileThatIsMadeOrRemovedIsAChange) {
     const std::string file = process.folder / "agent.toml";
     EXPECT_THAT(textsOf(process.standardError()),
                 ElementsAre(file + ": No such file or directory: expected a file that can be read: the former "
-                                   "thresholds go on to hold",
-                            file + " has changed: its thresholds hold from now on", "heard"));
+                                   "thresholds still apply",
+                            file + " has changed: its thresholds apply from now on", "heard"));
 }
 
-TEST(LoggerTest, AWrongChangeIsReportedOnceAndTheFormerThresholdsGoOnToHold) {
+TEST(LoggerTest, AWrongChangeIsReportedOnceAndTheFormerThresholdsStillApply) {
     const LogProcess process;
     process.configure("[log]\nlevel = 5000\n");
     process.run([&process] {
@@ -232,12 +232,11 @@ TEST(LoggerTest, AWrongChangeIsReportedOnceAndTheFormerThresholdsGoOnToHold) {
         writeLog(4999, "below", "Corvane.Other");
         writeLog(5000, "at the threshold");
     });
-    EXPECT_THAT(
-        textsOf(process.standardError()),
-        ElementsAre((process.folder / "agent.toml").string() +
-                        ":3: log.trace-level: -1: expected an integer from 0 to 10000: the former thresholds go "
-                        "on to hold",
-                    "at the threshold"));
+    EXPECT_THAT(textsOf(process.standardError()),
+                ElementsAre((process.folder / "agent.toml").string() +
+                                ":3: log.trace-level: -1: expected an integer from 0 to 10000: the former thresholds "
+                                "still apply",
+                            "at the threshold"));
 }
 
 TEST(LoggerTest, AChangeOfSomethingElseIsNotTold) {
@@ -245,7 +244,7 @@ TEST(LoggerTest, AChangeOfSomethingElseIsNotTold) {
     process.run([&process] {
         writeLog(1, "first use");
         process.configure("[system]\nname = \"other\"\n");
-        // A change that is this recent is looked at twice.
+        // The log looks twice at a change that is this recent.
         for (int look = 0; look < 3; ++look) {
             AgentTest::passTime(std::chrono::seconds(1));
             writeLog(3000, "below");

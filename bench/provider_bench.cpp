@@ -248,7 +248,7 @@ std::vector<Measured> associationOperations(const Setup& setup) {
 /** Sends each measurement to the parent process as a line "name<TAB>nanoseconds of one object", and shows it. */
 class Reporter : public benchmark::ConsoleReporter {
 public:
-    explicit Reporter(std::FILE* results) : _results(results) {}
+    explicit Reporter(std::FILE* results) : ConsoleReporter(OO_Tabular), _results(results) {}
 
     void ReportRuns(const std::vector<Run>& runs) override {
         ConsoleReporter::ReportRuns(runs);

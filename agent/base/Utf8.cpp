@@ -23,6 +23,11 @@ constexpr bool isCharacter(char32_t code) {
 } // namespace
 
 std::string utf8From(std::wstring_view text) {
+    // Most texts have ASCII characters only, each of which is its own byte.
+    constexpr char32_t endOfAscii = 0x80;
+    if (std::ranges::all_of(text, [](wchar_t code) { return static_cast<char32_t>(code) < endOfAscii; })) {
+        return {text.begin(), text.end()};
+    }
     constexpr char32_t replacement = 0xFFFD;
     std::u32string codes(text.begin(), text.end());
     std::ranges::replace_if(

@@ -103,6 +103,7 @@ void addServeOptions(CLI::App& command, ServeOptions& options) {
     addCount(command, "--threads", server.threads, "Requests that are answered at the same time", mostThreads);
     addCount(command, "--max-body", limits.bodyBytes, "Largest body of a request, in bytes");
     addCount(command, "--max-bodies", limits.allBodiesBytes, "Largest size of all requests' bodies together, in bytes");
+    addCount(command, "--max-answers", limits.allAnswersBytes, "Memory that large answers may take, in bytes");
     addCount(command, "--max-headers", limits.headerBytes, "Largest size of a request's headers, in bytes");
     addCount(command, "--max-connections", limits.connections, "Connections that may be open at the same time");
     addCount(command, "--max-connections-per-address", limits.connectionsPerAddress,

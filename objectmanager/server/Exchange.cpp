@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <ctime>
+#include <iterator>
 #include <new>
 #include <thread>
 #include <utility>
@@ -26,6 +27,9 @@ constexpr std::size_t freeBody = std::size_t{16} * 1024;
 
 /** Memory of answers this large is returned to the system; the allocator would keep it. */
 constexpr std::size_t largeAnswer = std::size_t{1024} * 1024;
+
+/** What each answer may be made of without a share of the memory for all of them, and the steps in which it gets it. */
+constexpr std::size_t freeAnswer = std::size_t{256} * 1024;
 
 /** Answers up to this size are sent in one piece with their headers. */
 constexpr std::size_t smallAnswer = std::size_t{16} * 1024;
@@ -68,15 +72,18 @@ const std::string* headerOf(const HttpHeaders& headers, std::string_view name) {
     return found == headers.end() ? nullptr : &found->second;
 }
 
-/** What stands before an answer's body. */
-std::string headOf(const HttpReply& reply, bool keepAlive) {
-    std::string head = fmt::format("HTTP/1.1 {} {}\r\nDate: {:%a, %d %b %Y %H:%M:%S} GMT\r\nConnection: {}\r\n"
-                                   "Content-Length: {}\r\n",
-                                   reply.status, Status::reasonOf(reply.status), fmt::gmtime(std::time(nullptr)),
-                                   keepAlive ? "Keep-Alive" : "close", reply.body.size());
-    for (const auto& [name, value] : reply.headers) {
-        head.append(name).append(": ").append(value).append("\r\n");
+void appendHeaders(std::string& text, const HttpHeaders& headers) {
+    for (const auto& [name, value] : headers) {
+        text.append(name).append(": ").append(value).append("\r\n");
     }
+}
+
+/** What stands before an answer's body. @param framing the header that tells where the body ends, with its line end. */
+std::string headOf(const HttpReply& reply, bool keepAlive, std::string_view framing) {
+    std::string head = fmt::format("HTTP/1.1 {} {}\r\nDate: {:%a, %d %b %Y %H:%M:%S} GMT\r\nConnection: {}\r\n{}",
+                                   reply.status, Status::reasonOf(reply.status), fmt::gmtime(std::time(nullptr)),
+                                   keepAlive ? "Keep-Alive" : "close", framing);
+    appendHeaders(head, reply.headers);
     return head += "\r\n";
 }
 
@@ -88,7 +95,7 @@ Shared::Shared(Settings given, Handler function, Authenticator* authenticator, L
       handshakes(handshakesAtATime(), handshakesAtATime(), waitingOfNetwork),
       // A quarter is for others than the network that has most.
       answers(settings.threads, (3 * settings.threads + 3) / 4, waitingOfNetwork),
-      bodies(settings.limits.allBodiesBytes) {
+      bodies(settings.limits.allBodiesBytes), answerMemory(settings.limits.allAnswersBytes) {
     if (authenticator != nullptr) {
         logIns.emplace(*authenticator, settings.failedLogInDelay);
     }
@@ -109,7 +116,7 @@ Exchange::Exchange(Shared& shared, Connections::Connection& connection)
 
 void Exchange::run() noexcept {
     try {
-        begin();
+        shakeHands();
         while (serve()) {
         }
         enter(State::idle);
@@ -117,18 +124,20 @@ void Exchange::run() noexcept {
     } catch (const Ended&) {
         // The client knows as much as it can.
     } catch (const std::exception& error) {
-        if (_stream) {
+        if (_stream && !_begun) {
             _stream->send(noMemory, std::chrono::milliseconds{0});
+        } else if (_stream && !_head.takesChunks) {
+            _stream->endWithReset();
         }
         try {
-            report(fmt::format("answered 503: {}", error.what()));
+            report(fmt::format("{}: {}", _begun ? "broke off the answer" : "answered 503", error.what()));
         } catch (const std::exception&) {
             // There is no memory for the line either.
         }
     }
 }
 
-void Exchange::begin() {
+void Exchange::shakeHands() {
     _stream.emplace(_connection.socket, _shared.keys());
     const auto compute = [this](const std::function<void()>& step) {
         const Turns::Turn turn = _shared.handshakes.take(_connection.network, true, Clock::now() + _limits.idleTime,
@@ -152,6 +161,8 @@ bool Exchange::serve() {
     _user.clear();
     _body.clear();
     _bodyIsMissing = false;
+    _begun = false;
+    _sent = 0;
     bool keepAlive = false;
     HttpReply reply{};
     try {
@@ -170,8 +181,12 @@ bool Exchange::serve() {
         reply = unauthorized(error.text);
         keepAlive = _head.keepAlive;
     }
+    if (_begun) {
+        finish(reply);
+        return _keepAlive;
+    }
     keepAlive = keepAlive && !_shared.stopping;
-    send(std::move(reply), keepAlive);
+    sendWhole(std::move(reply), keepAlive);
     if (keepAlive) {
         skipBody();
     }
@@ -356,22 +371,28 @@ void Exchange::skipBody() {
 
 HttpReply Exchange::answer(const Caller& caller) {
     enter(State::answering);
-    const Turns::Turn turn = _shared.answers.take(_connection.network, true, Clock::now() + _limits.requestTime,
-                                                  [this] { return _stream->isBroken(); });
+    Turns::Turn turn = _shared.answers.take(_connection.network, true, Clock::now() + _limits.requestTime,
+                                            [this] { return _stream->isBroken(); });
     if (!turn) {
         throw HttpError(Status::serviceUnavailable, _shared.stopping ? "the server is stopping" : "too much to do");
     }
-    return _shared.handler({_head.method, std::move(_head.headers), _body}, caller);
+    _turn.emplace(std::move(turn));
+    HttpReply reply = _shared.handler({_head.method, std::move(_head.headers), _body, this}, caller);
+    _turn.reset();
+    _memory.reset();
+    return reply;
 }
 
-void Exchange::send(HttpReply reply, bool keepAlive) {
+void Exchange::sendWhole(HttpReply reply, bool keepAlive) {
     if (!reply.problem.empty()) {
         report(fmt::format("answered {}: {}", reply.status, printable(reply.problem)));
     }
     enter(State::sending);
-    std::string head = headOf(reply, keepAlive);
+    _status = reply.status;
+    _sent = reply.body.size();
+    std::string head = headOf(reply, keepAlive, fmt::format("Content-Length: {}\r\n", _sent));
     const bool hasBody = _head.method != "HEAD";
-    const bool isSmall = hasBody && reply.body.size() <= smallAnswer;
+    const bool isSmall = hasBody && _sent <= smallAnswer;
     if (isSmall) {
         head += reply.body;
     }
@@ -379,21 +400,134 @@ void Exchange::send(HttpReply reply, bool keepAlive) {
     if (outcome == Stream::Outcome::done && hasBody && !isSmall) {
         outcome = _stream->send(reply.body, _limits.idleTime);
     }
-    const std::size_t size = reply.body.size();
-    if (size >= largeAnswer) {
+    if (_sent >= largeAnswer) {
         std::string().swap(reply.body);
         malloc_trim(0);
     }
-    if (_shared.settings.accessLog) {
-        _shared.events.report(fmt::format("{}: {} \"{} {}\" {} {} {:.1f} ms", _connection.address,
-                                          _user.empty() ? "-" : printable(_user), printable(_head.method),
-                                          printable(_head.target), reply.status, size,
-                                          std::chrono::duration<double, std::milli>(Clock::now() - _begin).count()));
-    }
+    logAccess();
     if (outcome != Stream::Outcome::done) {
         enter(State::sending);
         report("gone before the answer was sent");
         throw Ended{};
+    }
+}
+
+void Exchange::hold(std::size_t bytes) {
+    if (bytes <= freeAnswer) {
+        return;
+    }
+    if (!_memory) {
+        _memory.emplace(_shared.answerMemory, _connection.network);
+    }
+    _memory->grow((bytes + freeAnswer - 1) / freeAnswer * freeAnswer);
+}
+
+/**
+ * To clients that know no chunks, the end of the connection is the end of the body. What makes the answer waits for its
+ * client from now on, and nobody shall wait for both: the turn is for others.
+ */
+void Exchange::begin(const HttpReply& reply) {
+    _turn.reset();
+    _begun = true;
+    _status = reply.status;
+    _keepAlive = _head.takesChunks && _head.keepAlive && !_shared.stopping;
+    enter(State::sending);
+    std::string text = headOf(reply, _keepAlive, _head.takesChunks ? "Transfer-Encoding: chunked\r\n" : "");
+    append(text, reply.body);
+    deliver(text);
+}
+
+void Exchange::send(std::string_view piece) {
+    std::string text;
+    append(text, piece);
+    deliver(text);
+}
+
+void Exchange::finish(const HttpReply& rest) {
+    if (rest.problem.empty()) {
+        std::string text;
+        append(text, rest.body);
+        if (_head.takesChunks && _head.method != "HEAD") {
+            text += "0\r\n\r\n";
+        }
+        deliver(text);
+    } else {
+        breakOff(rest);
+    }
+    if (_sent >= largeAnswer) {
+        malloc_trim(0);
+    }
+    logAccess();
+}
+
+/**
+ * A client that has said so takes the reason from headers behind the last chunk (RFC 9110, section 6.5). To all others
+ * the answer has no end: the last chunk is missing, or the connection is reset.
+ */
+void Exchange::breakOff(const HttpReply& rest) {
+    if (!_head.takesTrailers || rest.headers.empty()) {
+        abandon("broke off the answer: " + printable(rest.problem));
+    }
+    report("broke off the answer: " + printable(rest.problem));
+    _keepAlive = false;
+    std::string text = "0\r\n";
+    appendHeaders(text, rest.headers);
+    deliver(text += "\r\n");
+}
+
+/** Appends a piece of the body as it is sent. */
+void Exchange::append(std::string& text, std::string_view piece) {
+    _sent += piece.size();
+    if (piece.empty() || _head.method == "HEAD") {
+        return;
+    }
+    if (!_head.takesChunks) {
+        text += piece;
+        return;
+    }
+    text.reserve(text.size() + piece.size() + 20);
+    fmt::format_to(std::back_inserter(text), "{:x}\r\n", piece.size());
+    text.append(piece).append("\r\n");
+}
+
+/** Sends a part of an answer in pieces. */
+void Exchange::deliver(std::string_view text) {
+    const Clock::time_point start = Clock::now();
+    Clock::time_point lastTaken = start;
+    while (!text.empty()) {
+        const bool isHurried = _memory && _shared.answerMemory.isAwaited();
+        const Clock::time_point until = isHurried ? start + _shared.settings.hurryTime : lastTaken + _limits.idleTime;
+        // Somebody may begin to wait for the memory meanwhile.
+        const Stream::Outcome outcome =
+            _stream->sendSome(text, std::min(until, Clock::now() + _shared.settings.hurryTime));
+        if (outcome == Stream::Outcome::done) {
+            lastTaken = Clock::now();
+        } else if (outcome == Stream::Outcome::gone || Clock::now() >= until) {
+            abandon(outcome == Stream::Outcome::late && isHurried
+                        ? "cut off: others wait for the memory of an answer that is taken too slowly"
+                        : "gone before the answer was sent");
+        }
+    }
+}
+
+/** Ends the connection in the middle of an answer in pieces. */
+void Exchange::abandon(const std::string& problem) {
+    if (!_head.takesChunks) {
+        _stream->endWithReset();
+    }
+    logAccess();
+    // Throws where the server has shut the connection down, which is no news.
+    enter(State::sending);
+    report(problem);
+    throw Ended{};
+}
+
+void Exchange::logAccess() {
+    if (_shared.settings.accessLog) {
+        _shared.events.report(fmt::format("{}: {} \"{} {}\" {} {} {:.1f} ms", _connection.address,
+                                          _user.empty() ? "-" : printable(_user), printable(_head.method),
+                                          printable(_head.target), _status, _sent,
+                                          std::chrono::duration<double, std::milli>(Clock::now() - _begin).count()));
     }
 }
 

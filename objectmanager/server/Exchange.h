@@ -2,6 +2,7 @@
 #ifndef SERVER_EXCHANGE_H
 #define SERVER_EXCHANGE_H
 
+#include "server/AnswerMemory.h"
 #include "server/Budget.h"
 #include "server/Connections.h"
 #include "server/Hosts.h"
@@ -34,6 +35,7 @@ struct Shared {
     Turns handshakes;
     Turns answers;
     Budget bodies;
+    AnswerMemory answerMemory;
     /** Nothing where everybody may do everything. */
     std::optional<LogIns> logIns;
     std::atomic<bool> stopping = false;
@@ -54,7 +56,7 @@ private:
  * One connection, from its first byte to its last, in the thread that runs it. It waits for its client, for its turn,
  * for the authenticator and for the handler, and holds up nobody meanwhile.
  */
-class Exchange {
+class Exchange final : private Outlet {
 public:
     /** Both outlive it. */
     Exchange(Shared& shared, Connections::Connection& connection);
@@ -69,7 +71,7 @@ private:
     /** Thrown where the connection is to be closed, and whatever there is to say has been said. */
     struct Ended {};
 
-    void begin();
+    void shakeHands();
     /** @return false where the connection is to be closed. */
     bool serve();
 
@@ -82,7 +84,20 @@ private:
     /** Takes the body of a request that has been answered without it. */
     void skipBody();
     HttpReply answer(const Caller& caller);
-    void send(HttpReply reply, bool keepAlive);
+    /** Sends an answer as a whole. */
+    void sendWhole(HttpReply reply, bool keepAlive);
+
+    /* An answer in pieces. */
+    void hold(std::size_t bytes) override;
+    void begin(const HttpReply& reply) override;
+    void send(std::string_view piece) override;
+    /** Sends the rest of an answer that has begun. */
+    void finish(const HttpReply& rest);
+    void breakOff(const HttpReply& rest);
+    void append(std::string& text, std::string_view piece);
+    void deliver(std::string_view text);
+    [[noreturn]] void abandon(const std::string& problem);
+    void logAccess();
 
     /** @throws Ended where the connection has been shut down. */
     void enter(State state);
@@ -108,6 +123,17 @@ private:
     std::string _body;
     /** The body, or its rest, has still to be taken from what comes. */
     bool _bodyIsMissing = false;
+
+    /* Of its answer. */
+    std::optional<Turns::Turn> _turn;
+    std::optional<AnswerMemory::Share> _memory;
+    /** It goes to the client in pieces, and the first is gone. */
+    bool _begun = false;
+    /** Whether the connection stays open behind an answer in pieces. */
+    bool _keepAlive = false;
+    unsigned int _status = 0;
+    /** Bytes of the body. */
+    std::size_t _sent = 0;
 };
 
 } // namespace ObjectManager::Server

@@ -2,6 +2,8 @@
 #ifndef SERVER_HTTPMESSAGE_H
 #define SERVER_HTTPMESSAGE_H
 
+#include "server/Outlet.h"
+
 #include <strings.h>
 
 #include <algorithm>
@@ -26,6 +28,8 @@ struct HttpRequest {
     std::string method;
     HttpHeaders headers;
     std::string_view body;
+    /** For an answer that is too large to be held as a whole; null where every answer has to be returned. */
+    Outlet* outlet{};
 
     /** The value of the first header of that name; null where there is none. */
     const std::string* header(std::string_view name) const {
@@ -52,7 +56,12 @@ struct Caller {
     std::string address{};
 };
 
-/** Answers a request. Called by several threads at once; must not throw. */
+/**
+ * Answers a request. Called by several threads at once; must not throw, but for what the request's outlet throws.
+ *
+ * Of an answer that has begun at the outlet, it returns the rest: the last piece of the body. Where the answer cannot
+ * be ended, it returns a `problem`, and the headers tell of it to a client that takes trailers.
+ */
 using Handler = std::function<HttpReply(const HttpRequest&, const Caller&)>;
 
 } // namespace ObjectManager::Server

@@ -189,6 +189,8 @@ RequestHead parseHead(std::string_view text) {
     head.framing = framingOf(head.headers, minorVersion);
     head.keepAlive = minorVersion > 0 ? !hasToken(head.headers, "Connection", "close")
                                       : hasToken(head.headers, "Connection", "keep-alive");
+    head.takesChunks = minorVersion > 0;
+    head.takesTrailers = head.takesChunks && hasToken(head.headers, "TE", "trailers");
     head.expectsContinue = minorVersion > 0 && hasToken(head.headers, "Expect", "100-continue");
     return head;
 }

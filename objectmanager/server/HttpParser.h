@@ -44,6 +44,9 @@ struct RequestHead {
     std::string host;
     /** The connection stays open after the answer, if it is up to the client. */
     bool keepAlive = true;
+    /** The client understands an answer in chunks, as from HTTP/1.1 on, and headers behind its last one. */
+    bool takesChunks = true;
+    bool takesTrailers = false;
     /** The client waits for leave to send its body. */
     bool expectsContinue = false;
 };

@@ -136,6 +136,7 @@ bool HttpServer::Implementation::stop() {
         _listener.reset();
         _shared.handshakes.close();
         _shared.answers.close();
+        _shared.answerMemory.close();
         if (_shared.logIns) {
             _shared.logIns->close();
         }

@@ -19,6 +19,8 @@ struct Limits {
     std::size_t headerBytes = std::size_t{16} * 1024;
     /** Memory of all bodies beyond the first 16 KiB of each. */
     std::size_t allBodiesBytes = std::size_t{64} * 1024 * 1024;
+    /** Memory of what answers are made of, beyond the first 256 KiB of each. */
+    std::size_t allAnswersBytes = std::size_t{64} * 1024 * 1024;
     /** Connections at a time, altogether and from one network (see networkOf). */
     unsigned int connections = 1000;
     unsigned int connectionsPerAddress = 500;
@@ -50,6 +52,8 @@ struct Settings {
     Limits limits;
     /** After which a failed log-in is answered. */
     std::chrono::milliseconds failedLogInDelay = std::chrono::seconds{2};
+    /** In which a client has to take 64 KiB of its answer where others wait for the memory that it takes. */
+    std::chrono::milliseconds hurryTime = std::chrono::seconds{10};
     /** How long a stopping server waits for the answers under way. */
     std::chrono::milliseconds stopTime = std::chrono::seconds{8};
 };

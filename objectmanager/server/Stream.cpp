@@ -100,20 +100,33 @@ Stream::Outcome Stream::receive(std::string& to, Clock::time_point until) {
 
 Stream::Outcome Stream::send(std::string_view text, std::chrono::milliseconds patience) {
     Outcome outcome = Outcome::done;
-    auto until = Clock::now() + patience;
     while (!text.empty() && outcome == Outcome::done) {
+        outcome = sendSome(text, Clock::now() + patience);
+    }
+    return outcome;
+}
+
+Stream::Outcome Stream::sendSome(std::string_view& text, Clock::time_point until) {
+    Outcome outcome = Outcome::done;
+    while (outcome == Outcome::done) {
         const ssize_t size = isEncrypted() ? gnutls_record_send(_session.get(), text.data(), text.size())
                                            : push(this, text.data(), text.size());
         if (size > 0) {
             text.remove_prefix(static_cast<std::size_t>(size));
-            until = Clock::now() + patience;
-        } else if (isEncrypted()) {
+            return Outcome::done;
+        }
+        if (isEncrypted()) {
             outcome = proceed(size, until);
         } else {
             outcome = errno == EAGAIN || errno == EINTR ? wait(POLLOUT, until) : Outcome::gone;
         }
     }
     return outcome;
+}
+
+void Stream::endWithReset() {
+    constexpr linger atOnce{1, 0};
+    setsockopt(_socket, SOL_SOCKET, SO_LINGER, &atOnce, sizeof atOnce);
 }
 
 void Stream::pause(Clock::time_point until, int wake) const {

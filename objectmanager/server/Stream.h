@@ -55,6 +55,16 @@ public:
     /** @param patience for how long the client may take nothing. */
     Outcome send(std::string_view text, std::chrono::milliseconds patience);
 
+    /** Sends as much of the text as the client takes at once, and removes that from it. Waits where it takes nothing.
+     */
+    Outcome sendSome(std::string_view& text, Clock::time_point until);
+
+    /**
+     * The end of the connection will be a reset, by which the client sees that it did not get everything. For what has
+     * no other end than the connection's.
+     */
+    void endWithReset();
+
     /** Waits until the time is over, the connection is broken, or `wake` is readable. */
     void pause(Clock::time_point until, int wake) const;
 

@@ -181,6 +181,30 @@ TEST_F(AttackTest, answersThatAreNeverRead) {
     attack([this] { hold(post("much") + post("much")); });
 }
 
+/** The well-behaved client's answer needs as much of the memory for answers as each of the attackers'. */
+TEST_F(AttackTest, largeAnswersThatAreNeverRead) {
+    _settings.stopTime = 100ms;
+    _settings.limits.allAnswersBytes = std::size_t{8} * 1024 * 1024;
+    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
+        request.outlet->hold(1'000'000);
+        if (request.body == "much") {
+            const std::string piece(Server::Outlet::pieceBytes, 'x');
+            request.outlet->begin({200, {}, piece});
+            for (int i = 0; i < 1000; ++i) {
+                request.outlet->send(piece);
+            }
+        }
+        return echo(request, caller);
+    });
+    attack([this] {
+        if (_held.size() < 100) {
+            hold(post("much"));
+        }
+        std::this_thread::sleep_for(1ms);
+    });
+    _server.reset();
+}
+
 TEST_F(AttackTest, handlersThatHang) {
     Gate gate;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {

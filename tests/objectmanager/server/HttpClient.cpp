@@ -84,7 +84,7 @@ HttpClient::HttpClient(std::uint16_t port, const std::string& to, const std::str
 }
 
 HttpClient::HttpClient(HttpClient&& other) noexcept
-    : _socket(std::exchange(other._socket, -1)), _received(std::move(other._received)) {}
+    : _socket(std::exchange(other._socket, -1)), _received(std::move(other._received)), _wasReset(other._wasReset) {}
 
 HttpClient::~HttpClient() {
     if (_socket >= 0) {
@@ -108,6 +108,7 @@ bool HttpClient::fill() {
     std::array<char, 65536> buffer{};
     const ssize_t size = receiveFrom(_socket, buffer.data(), buffer.size());
     if (size < 0 && errno == ECONNRESET) {
+        _wasReset = true;
         return false;
     }
     require(size >= 0, "recv");
@@ -115,36 +116,63 @@ bool HttpClient::fill() {
     return size > 0;
 }
 
-Reply HttpClient::receive() {
-    constexpr std::string_view headerEnd = "\r\n\r\n";
-    const auto needMore = [this] {
-        if (!fill()) {
-            throw std::runtime_error("the connection ended after \"" + _received + '"');
-        }
-    };
-    while (_received.find(headerEnd) == std::string::npos) {
-        needMore();
+void HttpClient::requireMore() {
+    if (!fill()) {
+        throw std::runtime_error("the connection ended after \"" + _received + '"');
     }
-    const std::size_t bodyStart = _received.find(headerEnd) + headerEnd.size();
-    Reply reply;
-    std::size_t at = _received.find("\r\n") + 2;
-    reply.status = std::stoi(_received.substr(_received.find(' ') + 1, 3));
-    while (at + 2 < bodyStart) {
-        const std::size_t end = _received.find("\r\n", at);
-        const std::size_t colon = _received.find(": ", at);
-        std::string name = _received.substr(at, colon - at);
+}
+
+std::string HttpClient::takeLine() {
+    constexpr std::string_view lineEnd = "\r\n";
+    std::size_t end = 0;
+    while ((end = _received.find(lineEnd)) == std::string::npos) {
+        requireMore();
+    }
+    std::string line = takeBytes(end);
+    takeBytes(lineEnd.size());
+    return line;
+}
+
+std::string HttpClient::takeBytes(std::size_t size) {
+    while (_received.size() < size) {
+        requireMore();
+    }
+    std::string bytes = _received.substr(0, size);
+    _received.erase(0, size);
+    return bytes;
+}
+
+std::map<std::string, std::string> HttpClient::takeHeaders() {
+    std::map<std::string, std::string> headers;
+    for (std::string line = takeLine(); !line.empty(); line = takeLine()) {
+        const std::size_t colon = line.find(": ");
+        std::string name = line.substr(0, colon);
         std::transform(name.begin(), name.end(), name.begin(), [](unsigned char c) { return std::tolower(c); });
-        std::string& value = reply.headers[name];
-        value = _received.substr(colon + 2, end - colon - 2);
+        std::string& value = headers[name];
+        value = line.substr(colon + 2);
         value.erase(value.find_last_not_of(' ') + 1);
-        at = end + 2;
     }
-    const std::size_t size = std::stoul(reply.headers.at("content-length"));
-    while (_received.size() < bodyStart + size) {
-        needMore();
+    return headers;
+}
+
+Reply HttpClient::receive() {
+    Reply reply;
+    const std::string line = takeLine();
+    reply.status = std::stoi(line.substr(line.find(' ') + 1));
+    reply.headers = takeHeaders();
+    if (const auto length = reply.headers.find("content-length"); length != reply.headers.end()) {
+        reply.body = takeBytes(std::stoul(length->second));
+    } else if (reply.headers.contains("transfer-encoding")) {
+        constexpr int hexadecimal = 16;
+        while (const std::size_t size = std::stoul(takeLine(), nullptr, hexadecimal)) {
+            reply.body += takeBytes(size);
+            takeBytes(2);
+            ++reply.chunks;
+        }
+        reply.trailers = takeHeaders();
+    } else {
+        reply.body = receiveAll();
     }
-    reply.body = _received.substr(bodyStart, size);
-    _received.erase(0, bodyStart + size);
     return reply;
 }
 

@@ -15,7 +15,12 @@ struct Reply {
     int status = 0;
     /** Names in lower case. */
     std::map<std::string, std::string> headers;
+    /** Of a body in chunks: all of them joined. */
     std::string body;
+    /** How many chunks there were. */
+    std::size_t chunks = 0;
+    /** What came behind the last chunk. */
+    std::map<std::string, std::string> trailers;
 };
 
 /** One connection. Whatever the server does not do in good time ends the test with an exception. */
@@ -33,21 +38,32 @@ public:
 
     /** @return false where the server has closed the connection. */
     bool send(std::string_view text) const;
-    /** Waits for the whole reply. @throws std::runtime_error where the connection ends before. */
+    /**
+     * Waits for the whole reply. One without a length or chunks ends with the connection.
+     * @throws std::runtime_error where the connection ends before.
+     */
     Reply receive();
     /** Waits until something has come, and takes as much of it as there is room for. */
     std::string receiveSome(std::size_t most) const;
     /** Waits for the end of the connection. @return what came before. */
     std::string receiveAll();
+    /** Whether the connection has ended with a reset. */
+    bool wasReset() const { return _wasReset; }
     /** Goes away without a word. */
     void reset();
 
 private:
     bool fill();
+    void requireMore();
+    /** What has come up to the end of the line, without it. Waits for that. */
+    std::string takeLine();
+    std::string takeBytes(std::size_t size);
+    std::map<std::string, std::string> takeHeaders();
 
     int _socket;
     /** What was received and is not part of a reply yet. */
     std::string _received;
+    bool _wasReset = false;
 };
 
 /** The text of a request. @param headers each with its line end. */

@@ -23,6 +23,21 @@ void requireTls(int status) {
     }
 }
 
+constexpr std::string_view lineEnd = "\r\n";
+
+/** Where the data of a chunk stands in a reply, which has at least the line with its size. */
+struct Chunk {
+    Chunk(const std::string& reply, std::size_t start)
+        : data(reply.find(lineEnd, start) + lineEnd.size()),
+          size(std::stoul(reply.substr(start, data - start), nullptr, hexadecimal)) {}
+
+    std::size_t end() const { return data + size + lineEnd.size(); }
+
+    static constexpr int hexadecimal = 16;
+    std::size_t data;
+    std::size_t size;
+};
+
 } // namespace
 
 Client::Client(std::uint16_t port, Transport transport) : _socket(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
@@ -61,6 +76,8 @@ Client::~Client() {
 void Client::ask(const std::string& request) {
     _received.clear();
     _size = 0;
+    _bodySize = 0;
+    _nextChunk = 0;
     _begin = Clock::now();
     const ssize_t sent = _session ? gnutls_record_send(_session.get(), request.data(), request.size())
                                   : send(_socket, request.data(), request.size(), MSG_NOSIGNAL);
@@ -105,11 +122,48 @@ const std::string& Client::answerTo(const std::string& request) {
 void Client::findSize() {
     constexpr std::string_view end = "\r\n\r\n";
     constexpr std::string_view length = "Content-Length: ";
-    const std::size_t headers = _received.find(end);
-    if (headers != std::string::npos) {
-        _bodySize = std::stoul(_received.substr(_received.find(length) + length.size()));
-        _size = headers + end.size() + _bodySize;
+    if (_nextChunk == 0) {
+        const std::size_t headers = _received.find(end);
+        if (headers == std::string::npos) {
+            return;
+        }
+        _bodyStart = headers + end.size();
+        const std::size_t found = _received.find(length);
+        if (found < headers) {
+            _bodySize = std::stoul(_received.substr(found + length.size()));
+            _size = _bodyStart + _bodySize;
+            return;
+        }
+        _nextChunk = _bodyStart;
     }
+    findChunks();
+}
+
+void Client::findChunks() {
+    while (_size == 0 && _received.find(lineEnd, _nextChunk) != std::string::npos) {
+        const Chunk chunk(_received, _nextChunk);
+        if (_received.size() < chunk.end()) {
+            return;
+        }
+        _bodySize += chunk.size;
+        _nextChunk = chunk.end();
+        if (chunk.size == 0) {
+            _size = _nextChunk;
+        }
+    }
+}
+
+std::string Client::body() const {
+    if (_nextChunk == 0) {
+        return _received.substr(_bodyStart);
+    }
+    std::string joined;
+    for (std::size_t next = _bodyStart; next < _nextChunk;) {
+        const Chunk chunk(_received, next);
+        joined.append(_received, chunk.data, chunk.size);
+        next = chunk.end();
+    }
+    return joined;
 }
 
 } // namespace Bench

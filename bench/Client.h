@@ -36,8 +36,8 @@ public:
     const std::string& answerTo(const std::string& request);
 
     const std::string& reply() const { return _received; }
-    /** Without the headers, of which one tells how long the server took. */
-    std::string body() const { return _received.substr(_received.size() - _bodySize); }
+    /** Without the headers, of which one tells how long the server took. Chunks are joined. */
+    std::string body() const;
     std::size_t bodySize() const { return _bodySize; }
     /** In milliseconds. */
     double latency() const { return Milliseconds(_end - _begin).count(); }
@@ -56,6 +56,8 @@ private:
     void shakeHands();
     void add(std::string_view piece);
     void findSize();
+    /** Goes on from chunk to chunk as far as they have come. */
+    void findChunks();
 
     int _socket;
     std::unique_ptr<gnutls_certificate_credentials_st, Freed<gnutls_certificate_free_credentials>> _credentials;
@@ -65,6 +67,9 @@ private:
     /** Of the reply; 0 while it is not known. */
     std::size_t _size = 0;
     std::size_t _bodySize = 0;
+    std::size_t _bodyStart = 0;
+    /** Where the next chunk begins, of a body in chunks; 0 otherwise. */
+    std::size_t _nextChunk = 0;
     Clock::time_point _begin;
     Clock::time_point _firstByte;
     Clock::time_point _end;

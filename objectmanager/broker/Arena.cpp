@@ -101,7 +101,12 @@ private:
     std::size_t _retained = 0;
 };
 
+thread_local Arena::Meter* Arena::Meter::_ofThread = nullptr;
+
 Arena::~Arena() {
+    if (_meter != nullptr) {
+        _meter->_bytes -= _bytes;
+    }
     if (_chunks != nullptr) {
         Pool::instance().release(_chunks);
     }
@@ -132,6 +137,7 @@ void* Arena::do_allocate(std::size_t bytes, std::size_t alignment) {
         return block;
     }
     if (static_cast<std::size_t>(_end - _next) < size) {
+        count(chunkBytes);
         Chunk* chunk = Pool::instance().acquire();
         chunk->next = _chunks;
         _chunks = chunk;
@@ -156,6 +162,10 @@ void Arena::do_deallocate(void* block, std::size_t bytes, std::size_t /*alignmen
         }
         ::operator delete(large);
         largeBlocks.fetch_sub(1, std::memory_order_relaxed);
+        if (_meter != nullptr) {
+            _bytes -= roundUp(sizeof(LargeBlock), granule) + bytes;
+            _meter->_bytes -= roundUp(sizeof(LargeBlock), granule) + bytes;
+        }
         return;
     }
     const std::size_t size = roundUp(bytes, granule);
@@ -170,6 +180,7 @@ void* Arena::allocateLarge(std::size_t bytes) {
     if (bytes > PTRDIFF_MAX - head) {
         throw std::bad_alloc();
     }
+    count(head + bytes);
     auto* block = new (::operator new(head + bytes)) LargeBlock{_large, nullptr};
     if (_large != nullptr) {
         _large->previous = block;
@@ -177,6 +188,14 @@ void* Arena::allocateLarge(std::size_t bytes) {
     _large = block;
     largeBlocks.fetch_add(1, std::memory_order_relaxed);
     return reinterpret_cast<std::byte*>(block) + head;
+}
+
+void Arena::count(std::size_t bytes) {
+    if (_meter != nullptr) {
+        _bytes += bytes;
+        _meter->_bytes += bytes;
+        _meter->grow(_meter->_bytes);
+    }
 }
 
 } // namespace ObjectManager

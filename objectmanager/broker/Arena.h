@@ -20,7 +20,29 @@ public:
     static constexpr std::size_t chunkBytes = std::size_t{64} * 1024;
     static constexpr std::size_t retainedBytes = std::size_t{128} * 1024 * 1024;
 
-    Arena() = default;
+    /**
+     * Is told what the arenas hold together that its thread makes while it is there. It is the only one of its thread,
+     * and outlives those arenas.
+     */
+    class Meter {
+    public:
+        Meter() { _ofThread = this; }
+        Meter(const Meter&) = delete;
+        Meter& operator=(const Meter&) = delete;
+        virtual ~Meter() { _ofThread = nullptr; }
+
+    private:
+        friend class Arena;
+
+        /** Before they hold so many bytes. May wait; what it throws, the allocation throws. */
+        virtual void grow(std::size_t bytes) = 0;
+
+        static thread_local Meter* _ofThread;
+
+        std::size_t _bytes = 0;
+    };
+
+    Arena() : _meter(Meter::_ofThread) {}
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
     ~Arena() override;
@@ -47,7 +69,12 @@ private:
     bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override { return this == &other; }
 
     void* allocateLarge(std::size_t bytes);
+    /** Counts bytes that are about to be taken. */
+    void count(std::size_t bytes);
 
+    /** Null where nobody wants to know. */
+    Meter* const _meter;
+    std::size_t _bytes = 0;
     Chunk* _chunks = nullptr;
     std::byte* _next = nullptr;
     std::byte* _end = nullptr;

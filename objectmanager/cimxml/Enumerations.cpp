@@ -59,8 +59,8 @@ std::string Enumerations::open(const EnumerationOwner& owner, Pulled kind, Objec
     for (const auto& [context, enumeration] : _open) {
         const bool own = enumeration.owner.user == owner.user;
         ofUser += own ? 1 : 0;
-        bytes += enumeration.objects.bytes();
-        bytesOfUser += own ? enumeration.objects.bytes() : 0;
+        bytes += enumeration.objects->bytes();
+        bytesOfUser += own ? enumeration.objects->bytes() : 0;
     }
     if (_open.size() >= _limits.count) {
         throw limitExceeded(std::to_string(_open.size()) + " open enumerations", _limits.count, "at a time");
@@ -77,30 +77,36 @@ std::string Enumerations::open(const EnumerationOwner& owner, Pulled kind, Objec
         throw limitExceeded(std::to_string(bytes) + " bytes", _limits.bytes, "bytes in all enumerations");
     }
     std::string context = _newContext();
-    _open.emplace(context, Enumeration{owner, kind, std::move(rest), given, 0, time, _clock() + time});
+    _open.emplace(context, Enumeration{owner, kind, std::make_shared<const ObjectTexts>(std::move(rest)), given, 0,
+                                       time, _clock() + time});
     return context;
 }
 
 bool Enumerations::pull(const EnumerationOwner& owner, const std::string& context, Pulled kind, std::size_t count,
                         const std::function<void(std::string_view objects)>& take) {
-    const std::scoped_lock lock(_mutex);
+    std::unique_lock lock(_mutex);
     const auto found = find(owner, context);
     Enumeration& enumeration = found->second;
     if (enumeration.kind != kind) {
         throw CimError(invalidEnumerationContext, std::string("found an enumeration of ") + nameOf(enumeration.kind) +
                                                       ", expected one of " + nameOf(kind));
     }
-    const ObjectTexts& objects = enumeration.objects;
-    const std::size_t end = enumeration.next + std::min(count, objects.ends.size() - enumeration.next);
-    const auto offset = [&](std::size_t index) { return index == 0 ? 0 : objects.ends[index - 1]; };
-    take(std::string_view(objects.text).substr(offset(enumeration.next), offset(end) - offset(enumeration.next)));
-    enumeration.next = end;
-    if (end == objects.ends.size()) {
+    const std::shared_ptr<const ObjectTexts> objects = enumeration.objects;
+    const std::vector<std::size_t>& ends = objects->ends;
+    const auto offset = [&](std::size_t index) { return index == 0 ? 0 : ends[index - 1]; };
+    const std::size_t next = enumeration.next;
+    const std::size_t end = next + std::min(count, ends.size() - next);
+    const bool isLast = end == ends.size();
+    if (isLast) {
         _open.erase(found);
-        return true;
+    } else {
+        enumeration.next = end;
+        enumeration.expires = _clock() + enumeration.time;
     }
-    enumeration.expires = _clock() + enumeration.time;
-    return false;
+    lock.unlock();
+    // Others do not wait until the client has taken them.
+    take(std::string_view(objects->text).substr(offset(next), offset(end) - offset(next)));
+    return isLast;
 }
 
 void Enumerations::close(const EnumerationOwner& owner, const std::string& context) {
@@ -111,7 +117,7 @@ void Enumerations::close(const EnumerationOwner& owner, const std::string& conte
 std::uint64_t Enumerations::count(const EnumerationOwner& owner, const std::string& context) {
     const std::scoped_lock lock(_mutex);
     const Enumeration& enumeration = find(owner, context)->second;
-    return enumeration.givenBefore + enumeration.objects.ends.size();
+    return enumeration.givenBefore + enumeration.objects->ends.size();
 }
 
 void Enumerations::closeExpired() {

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <functional>
 #include <map>
+#include <memory>
 #include <mutex>
 #include <string>
 #include <string_view>
@@ -81,8 +82,8 @@ public:
                      std::chrono::milliseconds time);
 
     /**
-     * Calls `take` with the next objects, as many as `count` at most, and closes the enumeration when there are no
-     * more.
+     * Calls `take` with the next objects, as many as `count` at most, when it has closed the enumeration if there are
+     * no more. What `take` throws changes nothing in that.
      *
      * @param kind an enumeration that gives something else is not found.
      * @return whether there are no more.
@@ -102,7 +103,7 @@ private:
     struct Enumeration {
         EnumerationOwner owner;
         Pulled kind;
-        ObjectTexts objects;
+        std::shared_ptr<const ObjectTexts> objects;
         std::size_t givenBefore;
         /** The index of the next object in `objects`. */
         std::size_t next;

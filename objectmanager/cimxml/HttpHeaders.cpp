@@ -1,5 +1,7 @@
 #include "cimxml/HttpHeaders.h"
 
+#include "cimxml/StatusCodes.h"
+
 #include "cimxml/Markup.h"
 #include "cimxml/ProtocolError.h"
 #include "classes/Literals.h"
@@ -90,6 +92,21 @@ std::string decoded(std::string_view value) {
         }
     }
     return text;
+}
+
+/** As `decoded` takes it, in one line of ASCII. */
+std::string encoded(std::string_view text) {
+    constexpr std::string_view digits = "0123456789ABCDEF";
+    std::string value;
+    for (const char character : text) {
+        const auto byte = static_cast<unsigned char>(character);
+        if (byte < ' ' || byte > '~' || character == '%') {
+            value.append({'%', digits[byte >> 4U], digits[byte & 0xFU]});
+        } else {
+            value += character;
+        }
+    }
+    return value;
 }
 
 /** A request must not be answered without an extension that it calls mandatory. */
@@ -277,6 +294,12 @@ std::vector<std::pair<std::string, std::string>> RequestHeaders::ofAnswer(std::c
     headers.emplace_back(replyPrefix() + "CIMOperation", "MethodResponse");
     headers.emplace_back(replyPrefix() + "WBEMServerResponseTime", std::to_string(taken.count()));
     return headers;
+}
+
+std::vector<std::pair<std::string, std::string>> trailersOfFailure(CMPIrc code, const std::string& description,
+                                                                   const std::string& prefix) {
+    return {{prefix + "CIMStatusCode", std::to_string(sentCode(code))},
+            {prefix + "CIMStatusCodeDescription", encoded(description)}};
 }
 
 std::vector<std::pair<std::string, std::string>> headersOfFailure(const ProtocolError& error,

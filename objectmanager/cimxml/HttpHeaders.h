@@ -5,6 +5,7 @@
 #include "cimxml/ProtocolError.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/Service.h"
+#include "model/CimError.h"
 
 #include <chrono>
 #include <string>
@@ -57,6 +58,10 @@ private:
     /** For example "73-"; empty where none is declared. */
     std::string _prefix;
 };
+
+/** What is told behind a reply that failed after it had begun. */
+std::vector<std::pair<std::string, std::string>> trailersOfFailure(CMPIrc code, const std::string& description,
+                                                                   const std::string& prefix);
 
 /** Those of a reply to a request that was refused. */
 std::vector<std::pair<std::string, std::string>> headersOfFailure(const ProtocolError& error,

@@ -16,6 +16,8 @@ struct Operation {
     const Message& message;
     const Caller& caller;
     ResponseWriter& writer;
+    /** Where what is written goes. */
+    ReplyStream& stream;
     Enumerations& enumerations;
 };
 

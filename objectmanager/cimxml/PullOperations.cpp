@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <string>
 #include <utility>
+#include <vector>
 
 namespace ObjectManager::CimXml {
 
@@ -55,40 +56,45 @@ void writeState(const Call& call, const std::string& context, bool end) {
     call.writer().parameter({"EndOfSequence", booleanValue(end)});
 }
 
-/** An enumeration that is being opened: the first objects are the answer, the others are kept. */
+/**
+ * An enumeration that is being opened: the first objects are the answer, the others are kept. The answer waits until it
+ * is known that they can be.
+ */
 class Opening {
 public:
     Opening(const Call& call, Pulled kind)
         : _call(call), _kind(kind), _atOnce(call.parameters.optionalNumber("MaxObjectCount").value_or(0)),
-          _time(timeOf(call)) {
+          _time(timeOf(call)), _first(call.writer().another()), _rest(call.writer().another()) {
         if (kind != Pulled::instances) {
             requireUnfiltered(call);
         }
         requireEndAtError(call);
-        call.writer().raw("<IRETURNVALUE>\n");
-        _rest = call.writer().size();
     }
 
-    /** To be called when an object has been written. */
-    void written() {
-        const std::size_t size = _call.writer().size();
+    /** Takes the next object, as the writer's function writes it. */
+    template <typename Object, typename... Given>
+    void add(void (ResponseWriter::*write)(const Object&, const Given&...), const Object& object,
+             const Given&... given) {
         if (_given < _atOnce) {
+            (_first.*write)(object, given...);
             ++_given;
-            _rest = size;
-            return;
+        } else {
+            (_rest.*write)(object, given...);
+            _ends.push_back(_rest.size());
+            _call.operation.enumerations.requireRoom(_rest.size() + _ends.size() * ObjectTexts::bytesOfEnd);
         }
-        _objects.ends.push_back(size - _rest);
-        _call.operation.enumerations.requireRoom(size - _rest + _objects.bytes());
+        _call.operation.stream.holdText(_first.size() + _rest.size());
     }
 
-    /** To be called when all objects have been written. */
+    /** To be called when all objects have been taken. */
     void finish() {
         std::string context;
-        if (!_objects.ends.empty()) {
-            _objects.text = _call.writer().written().substr(_rest);
-            _call.writer().truncate(_rest);
-            context = _call.operation.enumerations.open(ownerOf(_call), _kind, std::move(_objects), _given, _time);
+        if (!_ends.empty()) {
+            context = _call.operation.enumerations.open(ownerOf(_call), _kind, {_rest.take(), std::move(_ends)}, _given,
+                                                        _time);
         }
+        _call.writer().raw("<IRETURNVALUE>\n");
+        _call.writer().objects(_first.take());
         writeState(_call, context, context.empty());
     }
 
@@ -99,9 +105,10 @@ private:
     std::size_t _atOnce;
     std::chrono::milliseconds _time;
     std::size_t _given = 0;
-    /** Where in the answer begins what is kept. */
-    std::size_t _rest = 0;
-    ObjectTexts _objects;
+    ResponseWriter _first;
+    ResponseWriter _rest;
+    /** Where each object of the rest ends. */
+    std::vector<std::size_t> _ends;
 };
 
 ObjectPath sourceOf(const Call& call) {
@@ -112,8 +119,11 @@ void pull(const Call& call, Pulled kind) {
     const std::string context = call.parameters.text("EnumerationContext");
     const std::size_t count = call.parameters.number("MaxObjectCount");
     call.writer().raw("<IRETURNVALUE>\n");
-    const bool end = call.operation.enumerations.pull(ownerOf(call), context, kind, count,
-                                                      [&](std::string_view objects) { call.writer().raw(objects); });
+    const bool end =
+        call.operation.enumerations.pull(ownerOf(call), context, kind, count, [&](std::string_view objects) {
+            call.operation.stream.holdText(objects.size());
+            call.writer().objects(objects);
+        });
     writeState(call, end ? std::string() : context, end);
 }
 
@@ -122,19 +132,14 @@ void pull(const Call& call, Pulled kind) {
 void openEnumerateInstances(const Call& call) {
     const Selection selection = selectionOfEnumeration(call);
     Opening opening(call, Pulled::instancesWithPath);
-    forEachInstance(call, call.parameters.className("ClassName"), selection.properties, [&](Instance&& instance) {
-        call.writer().instanceWithPath(instance, selection);
-        opening.written();
-    });
+    forEachInstance(call, call.parameters.className("ClassName"), selection.properties,
+                    [&](Instance&& instance) { opening.add(&ResponseWriter::instanceWithPath, instance, selection); });
     opening.finish();
 }
 
 void openEnumerateInstancePaths(const Call& call) {
     Opening opening(call, Pulled::instancePaths);
-    forEachInstanceName(call, [&](ObjectPath&& path) {
-        call.writer().instancePath(path);
-        opening.written();
-    });
+    forEachInstanceName(call, [&](ObjectPath&& path) { opening.add(&ResponseWriter::instancePath, path); });
     opening.finish();
 }
 
@@ -144,8 +149,7 @@ void openAssociatorInstances(const Call& call) {
     for (const auto& [associationClass, instances] : call.dispatcher().associators(
              call.invocation(), sourceOf(call), associatorFilter(call), selection.properties)) {
         for (const Instance& instance : instances) {
-            call.writer().instanceWithPath(instance, selection);
-            opening.written();
+            opening.add(&ResponseWriter::instanceWithPath, instance, selection);
         }
     }
     opening.finish();
@@ -156,8 +160,7 @@ void openAssociatorInstancePaths(const Call& call) {
     for (const auto& [associationClass, paths] :
          call.dispatcher().associatorNames(call.invocation(), sourceOf(call), associatorFilter(call))) {
         for (const ObjectPath& path : paths) {
-            call.writer().instancePath(path);
-            opening.written();
+            opening.add(&ResponseWriter::instancePath, path);
         }
     }
     opening.finish();
@@ -167,8 +170,7 @@ void openReferenceInstances(const Call& call) {
     const Selection selection = selectionOfInstances(call);
     Opening opening(call, Pulled::instancesWithPath);
     for (const Instance& instance : referencesOf(call, sourceOf(call))) {
-        call.writer().instanceWithPath(instance, selection);
-        opening.written();
+        opening.add(&ResponseWriter::instanceWithPath, instance, selection);
     }
     opening.finish();
 }
@@ -177,8 +179,7 @@ void openReferenceInstancePaths(const Call& call) {
     Opening opening(call, Pulled::instancePaths);
     for (const ObjectPath& path :
          call.dispatcher().referenceNames(call.invocation(), sourceOf(call), referenceFilter(call))) {
-        call.writer().instancePath(path);
-        opening.written();
+        opening.add(&ResponseWriter::instancePath, path);
     }
     opening.finish();
 }
@@ -193,10 +194,8 @@ void openQueryInstances(const Call& call) {
     Selection selection;
     selection.properties = query.properties;
     Opening opening(call, Pulled::instances);
-    forEachMatch(call, query, [&](Instance&& instance) {
-        call.writer().instance(instance, selection);
-        opening.written();
-    });
+    forEachMatch(call, query,
+                 [&](Instance&& instance) { opening.add(&ResponseWriter::instance, instance, selection); });
     opening.finish();
 }
 

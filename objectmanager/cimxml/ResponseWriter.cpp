@@ -62,6 +62,22 @@ std::string_view valueKind(CMPIType type) {
 
 } // namespace
 
+void ResponseWriter::send() {
+    _stream->send(_text);
+    _text.clear();
+}
+
+void ResponseWriter::objects(std::string_view written) {
+    if (_stream == nullptr || written.size() < Server::Outlet::pieceBytes) {
+        raw(written);
+        return;
+    }
+    send();
+    for (; !written.empty(); written.remove_prefix(std::min(written.size(), Server::Outlet::pieceBytes))) {
+        _stream->send(written.substr(0, Server::Outlet::pieceBytes));
+    }
+}
+
 void ResponseWriter::attribute(std::string_view name, std::string_view value) {
     _text += ' ';
     _text += name;
@@ -71,11 +87,8 @@ void ResponseWriter::attribute(std::string_view name, std::string_view value) {
 }
 
 void ResponseWriter::error(CMPIrc code, std::string_view description) {
-    // What is no code of CIM's is told to the client as a failure.
-    const bool known = (code > CMPI_RC_OK && code <= CMPI_RC_ERR_METHOD_NOT_FOUND) ||
-                       (code >= invalidEnumerationContext && code <= serverLimitsExceeded);
     raw("<ERROR CODE=\"");
-    appendNumber(_text, static_cast<int>(known ? code : CMPI_RC_ERR_FAILED));
+    appendNumber(_text, static_cast<int>(sentCode(code)));
     raw("\"");
     attribute("DESCRIPTION", description);
     raw("/>\n");
@@ -85,6 +98,7 @@ void ResponseWriter::className(std::string_view name) {
     raw("<CLASSNAME");
     attribute("NAME", name);
     raw("/>\n");
+    pass();
 }
 
 void ResponseWriter::localNameSpacePath(const std::string& nameSpace) {
@@ -125,6 +139,7 @@ void ResponseWriter::instanceName(const ObjectPath& path) {
         key(binding);
     }
     raw("</INSTANCENAME>\n");
+    pass();
 }
 
 void ResponseWriter::nameSpacePath(const std::string& nameSpace) {
@@ -259,6 +274,7 @@ void ResponseWriter::instance(const Instance& instance, const Selection& selecti
         }
     }
     raw("</INSTANCE>\n");
+    pass();
 }
 
 void ResponseWriter::namedInstance(const Instance& instance, const Selection& selection) {
@@ -345,6 +361,7 @@ void ResponseWriter::qualifierDeclaration(const QualifierType& type) {
     raw("/>\n");
     value(type.defaultValue);
     raw("</QUALIFIER.DECLARATION>\n");
+    pass();
 }
 
 void ResponseWriter::origin(const Element& element, const Class& owner, const Selection& selection) {
@@ -428,6 +445,7 @@ void ResponseWriter::classDeclaration(const Class& declared, const Selection& se
         }
     }
     raw("</CLASS>\n");
+    pass();
 }
 
 } // namespace ObjectManager::CimXml

@@ -1,7 +1,8 @@
-/** CIM objects as CIM-XML writes them, appended to a text. */
+/** CIM objects as CIM-XML writes them, one behind the other. */
 #ifndef CIMXML_RESPONSEWRITER_H
 #define CIMXML_RESPONSEWRITER_H
 
+#include "cimxml/ReplyStream.h"
 #include "classes/Catalogue.h"
 #include "model/Operations.h"
 
@@ -30,19 +31,24 @@ public:
      * @param host what the client calls the host. Every path has it, also where a provider named another, so that the
      *             client can follow the path.
      * @param nameSpace of paths that name none.
+     * @param stream takes what is written whenever there is enough of it; null where all of it is kept.
      */
-    ResponseWriter(const Catalogue& catalogue, std::string host, std::string nameSpace)
-        : _catalogue(catalogue), _host(std::move(host)), _nameSpace(std::move(nameSpace)) {}
+    ResponseWriter(const Catalogue& catalogue, std::string host, std::string nameSpace, ReplyStream* stream = nullptr)
+        : _catalogue(catalogue), _host(std::move(host)), _nameSpace(std::move(nameSpace)), _stream(stream) {}
 
-    /** What was written. */
+    /** One that writes the same, and keeps all of it. */
+    ResponseWriter another() const { return {_catalogue, _host, _nameSpace}; }
+
+    /** What was written, and is not gone already. */
     std::string take() { return std::move(_text); }
     std::size_t size() const { return _text.size(); }
-    std::string_view written() const { return _text; }
-    /** Drops what was written behind the first `size` bytes. */
+    /** Drops what was written behind the first `size` bytes, where nothing is gone. */
     void truncate(std::size_t size) { _text.resize(size); }
 
     /** Appends markup as it is. */
     void raw(std::string_view markup) { _text += markup; }
+    /** The same for what was written before, which may be much. */
+    void objects(std::string_view written);
     /** Appends ` name="value"`. */
     void attribute(std::string_view name, std::string_view value);
 
@@ -83,6 +89,13 @@ public:
     void classWithPath(const Class& declared, const Selection& selection);
 
 private:
+    /** To be called where what can come many times has been written. */
+    void pass() {
+        if (_stream != nullptr && _text.size() >= Server::Outlet::pieceBytes) {
+            send();
+        }
+    }
+    void send();
     void localNameSpacePath(const std::string& nameSpace);
     void nameSpacePath(const std::string& nameSpace);
     void classPath(const std::string& name);
@@ -100,6 +113,7 @@ private:
     const Catalogue& _catalogue;
     std::string _host;
     std::string _nameSpace;
+    ReplyStream* _stream;
     std::string _text;
 };
 

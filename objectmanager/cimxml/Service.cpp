@@ -4,6 +4,7 @@
 #include "cimxml/MethodTable.h"
 #include "cimxml/ProtocolError.h"
 #include "cimxml/Recording.h"
+#include "cimxml/ReplyStream.h"
 #include "cimxml/RequestReader.h"
 #include "cimxml/ResponseWriter.h"
 #include "text/StatusText.h"
@@ -54,7 +55,7 @@ void Service::performRecorded(const Operation& operation) {
     };
     std::string remark;
     try {
-        remark = perform(operation);
+        remark = CimXml::perform(operation);
     } catch (const CimError& error) {
         record(error.code == CMPI_RC_ERR_ACCESS_DENIED ? Audit::Verdict::denied : Audit::Verdict::refused,
                descriptionOf(error));
@@ -66,9 +67,27 @@ void Service::performRecorded(const Operation& operation) {
     record(Audit::Verdict::accepted, remark);
 }
 
-/** The document that answers the message. */
-std::string Service::documentOf(const Message& message, const Caller& caller, const std::string& host) {
-    ResponseWriter writer(_catalogue, host.empty() ? ownHostName() : host, message.nameSpace());
+/**
+ * Does what the message asks for, and answers it. A large answer goes to the outlet while it is made.
+ *
+ * Where the operation fails and nothing has been sent, its answer is an error. Behind the first byte that is too late:
+ * the document ends where it is, without the end of its root, and what DSP0200 has for the trailers of an answer in
+ * chunks, the status code and its description, is given to the server, which sends it to clients that take trailers,
+ * and ends the connection to the others. So nobody takes what came for the answer.
+ */
+HttpReply Service::perform(const Message& message, const Caller& caller, const RequestHeaders& headers,
+                           Server::Outlet* outlet, Enumerations::TimePoint start) {
+    const auto headersOfAnswer = [&] {
+        return headers.ofAnswer(std::chrono::floor<std::chrono::microseconds>(_clock() - start));
+    };
+    const auto brokenOff = [&](CMPIrc code, const std::string& description) {
+        return HttpReply{Http::ok, trailersOfFailure(code, description, headers.replyPrefix()), "", description};
+    };
+    ReplyStream stream(outlet, headersOfAnswer);
+    const std::string host = headers.host();
+    // What became of a method's call is recorded before anybody is told: its answer waits for that as a whole.
+    ResponseWriter writer(_catalogue, host.empty() ? ownHostName() : host, message.nameSpace(),
+                          stream.canSend() && message.isIntrinsic() ? &stream : nullptr);
     const char* const response = message.isIntrinsic() ? "IMETHODRESPONSE" : "METHODRESPONSE";
     writer.raw("<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\">\n<MESSAGE");
     writer.attribute("ID", message.id());
@@ -77,17 +96,26 @@ std::string Service::documentOf(const Message& message, const Caller& caller, co
     writer.raw(response);
     writer.attribute("NAME", message.method());
     writer.raw(">\n");
-    const std::size_t start = writer.size();
+    const std::size_t begin = writer.size();
     try {
-        performRecorded({_dispatcher, _catalogue, message, caller, writer, _enumerations});
+        performRecorded({_dispatcher, _catalogue, message, caller, writer, stream, _enumerations});
     } catch (const CimError& error) {
-        writer.truncate(start);
+        if (stream.hasBegun()) {
+            return brokenOff(error.code, descriptionOf(error));
+        }
+        writer.truncate(begin);
         writer.error(error.code, descriptionOf(error));
+    } catch (const std::exception& error) {
+        if (stream.hasBegun()) {
+            return brokenOff(CMPI_RC_ERR_FAILED, error.what());
+        }
+        throw;
     }
     writer.raw("</");
     writer.raw(response);
     writer.raw(">\n</SIMPLERSP>\n</MESSAGE>\n</CIM>\n");
-    return writer.take();
+    // An answer that has begun has its headers.
+    return {Http::ok, stream.hasBegun() ? Server::HttpHeaders() : headersOfAnswer(), writer.take()};
 }
 
 HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
@@ -100,9 +128,7 @@ HttpReply Service::answer(const HttpRequest& request, const Caller& caller) {
         headers.check();
         const Message message(request.body);
         headers.checkAgainst(message);
-        std::string document = documentOf(message, caller, headers.host());
-        return {Http::ok, headers.ofAnswer(std::chrono::floor<std::chrono::microseconds>(_clock() - start)),
-                std::move(document)};
+        return perform(message, caller, headers, request.outlet, start);
     } catch (const ProtocolError& error) {
         return failure(error.status(), headersOfFailure(error, prefix), error.what(),
                        error.cimError() == nullptr ? error.what() : error.cimError());

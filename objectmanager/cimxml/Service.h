@@ -15,6 +15,7 @@ using Server::HttpReply;
 using Server::HttpRequest;
 
 class Message;
+class RequestHeaders;
 struct Operation;
 
 struct ServiceSettings {
@@ -31,11 +32,12 @@ public:
     /** Dispatcher and catalogue outlive the service. */
     Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings = {});
 
-    /** Used by several threads at once; never throws. */
+    /** Used by several threads at once. Throws nothing but what the request's outlet throws. */
     HttpReply answer(const HttpRequest& request, const Caller& caller);
 
 private:
-    std::string documentOf(const Message& message, const Caller& caller, const std::string& host);
+    HttpReply perform(const Message& message, const Caller& caller, const RequestHeaders& headers,
+                      Server::Outlet* outlet, Enumerations::TimePoint start);
     void performRecorded(const Operation& operation);
 
     Dispatcher& _dispatcher;

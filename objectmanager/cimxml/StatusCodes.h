@@ -1,4 +1,4 @@
-/** The status codes of CIM (DSP0200) that CMPI has no names for, since no provider returns them. */
+/** The status codes of CIM (DSP0200). Those that CMPI has no names for are returned by no provider. */
 #ifndef CIMXML_STATUSCODES_H
 #define CIMXML_STATUSCODES_H
 
@@ -11,6 +11,13 @@ constexpr auto invalidOperationTimeout = static_cast<CMPIrc>(22);
 constexpr auto filteredEnumerationNotSupported = static_cast<CMPIrc>(25);
 constexpr auto continuationOnErrorNotSupported = static_cast<CMPIrc>(26);
 constexpr auto serverLimitsExceeded = static_cast<CMPIrc>(27);
+
+/** A code as clients are told it: what is none of CIM's is a failure. */
+constexpr CMPIrc sentCode(CMPIrc code) {
+    const bool known = (code > CMPI_RC_OK && code <= CMPI_RC_ERR_METHOD_NOT_FOUND) ||
+                       (code >= invalidEnumerationContext && code <= serverLimitsExceeded);
+    return known ? code : CMPI_RC_ERR_FAILED;
+}
 
 } // namespace ObjectManager::CimXml
 

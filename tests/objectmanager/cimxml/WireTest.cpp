@@ -2,6 +2,7 @@
  * Every file in cases/ is a request and the exact reply. With ORV_RECORD_CASES in the environment the replies are
  * written into the files, to be looked at before they are committed.
  */
+#include "RecordingOutlet.h"
 #include "ServiceFixture.h"
 #include "WireCase.h"
 
@@ -49,7 +50,10 @@ TEST_P(WireTest, isAnsweredExactly) {
     for (const WireCase& given : readWireCases(contentOf(GetParam()))) {
         now += given.pause;
         const std::string machine = contentOf(stateFile());
-        const HttpReply reply = service.answer(given.request(), given.caller);
+        RecordingOutlet outlet;
+        HttpRequest request = given.request();
+        request.outlet = &outlet;
+        const HttpReply reply = outlet.joined(service.answer(request, given.caller));
         recorded += (recorded.empty() ? "" : std::string(requestSeparator)) + given.requestText +
                     std::string(replySeparator) + textOf(reply);
         if (std::getenv("ORV_RECORD_CASES") == nullptr) {

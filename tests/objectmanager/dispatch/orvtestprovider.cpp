@@ -217,6 +217,12 @@ CMPIStatus Test_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext* context, c
     return status;
 }
 
+/** Where a test needs a large answer, there are so many disks beside the usual two. */
+int moreDisks() {
+    const char* const count = std::getenv("TEST_MORE_DISKS");
+    return count == nullptr ? 0 : std::atoi(count);
+}
+
 CMPIStatus Test_EnumInstances(CMPIInstanceMI*, const CMPIContext* context, const CMPIResult* result,
                               const CMPIObjectPath* path, const char** properties) {
     const Call call{context, result, path, properties};
@@ -225,7 +231,13 @@ CMPIStatus Test_EnumInstances(CMPIInstanceMI*, const CMPIContext* context, const
         for (const char* name : {"a", "b"}) {
             CMReturnInstance(result, disk(call, name));
         }
+        for (int i = moreDisks(); i > 0; --i) {
+            CMReturnInstance(result, disk(call, std::to_string(i).c_str()));
+        }
         CMReturnDone(result);
+        if (std::getenv("TEST_FAST_DISKS_FAIL") != nullptr && CMClassPathIsA(broker, path, "Test_FastDisk", nullptr)) {
+            status = failed(CMPI_RC_ERR_ACCESS_DENIED, "not for 50%\nof you");
+        }
     }
     return status;
 }

@@ -3,10 +3,13 @@
 #include "cimxml/ServiceFixture.h"
 #include "cimxml/WireCase.h"
 
+#include "broker/Arena.h"
 #include "server/HttpServer.h"
 
 #include <algorithm>
 #include <atomic>
+#include <chrono>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -183,6 +186,54 @@ TEST_F(StressTest, everyClientGetsItsOwnReplies) {
         thread.join();
     }
     EXPECT_EQ(answered, clients * all.size());
+}
+
+/** Many clients ask at once for many instances. Each gets all of them, though there is memory for a few at a time. */
+TEST_F(StressTest, LargeAnswersShareABoundedMemory) {
+    constexpr unsigned int clients = 16;
+    constexpr std::size_t kilobyte = 1024;
+    setenv("TEST_MORE_DISKS", "500", 1);
+    Doorkeeper doorkeeper;
+    Server::Settings settings;
+    settings.hosts = {"server.example"};
+    settings.limits.allAnswersBytes = 1024 * kilobyte;
+    // However long a client waits for a processor here, it is not cut off.
+    settings.hurryTime = std::chrono::minutes{1};
+    settings.limits.requestTime = std::chrono::minutes{1};
+    const Server::HttpServer server(
+        settings,
+        [](const Server::HttpRequest& request, const Server::Caller& caller) {
+            return service().answer(request, caller);
+        },
+        &doorkeeper, [](const std::string&) {});
+    const std::string request = requestOf(
+        "EnumerateInstances", "<IPARAMVALUE NAME=\"ClassName\"><CLASSNAME NAME=\"Test_Disk\"/></IPARAMVALUE>");
+    std::atomic<std::size_t> most = 0;
+    std::atomic<bool> done = false;
+    std::thread watching([&] {
+        for (; !done; std::this_thread::sleep_for(std::chrono::milliseconds{1})) {
+            most = std::max<std::size_t>(most, Arena::usage().chunksInUse * Arena::chunkBytes);
+        }
+    });
+    HttpClient first(server.port());
+    const Reply expected = ask(first, request);
+    EXPECT_GT(expected.chunks, 5U);
+    const std::size_t ofOne = most;
+    std::vector<std::thread> running;
+    for (unsigned int i = 0; i < clients; ++i) {
+        running.emplace_back([&] {
+            HttpClient client(server.port());
+            EXPECT_EQ(ask(client, request).body, expected.body);
+        });
+    }
+    for (std::thread& thread : running) {
+        thread.join();
+    }
+    done = true;
+    watching.join();
+    unsetenv("TEST_MORE_DISKS");
+    // The half of one network, one beyond it, and what is free in each that is being answered.
+    EXPECT_LT(most, 512 * kilobyte + ofOne + settings.threads * 512 * kilobyte);
 }
 
 } // namespace

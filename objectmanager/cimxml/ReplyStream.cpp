@@ -1,0 +1,32 @@
+#include "cimxml/ReplyStream.h"
+
+#include "server/HttpStatus.h"
+
+#include <algorithm>
+#include <string>
+
+namespace ObjectManager::CimXml {
+
+void ReplyStream::send(std::string_view piece) {
+    if (_hasBegun) {
+        _outlet->send(piece);
+        return;
+    }
+    // From the first byte on, whether it arrives or not.
+    _hasBegun = true;
+    _outlet->begin({Server::Status::ok, _headers(), std::string(piece)});
+}
+
+void ReplyStream::holdText(std::size_t bytes) {
+    _text = bytes;
+    grow(_results);
+}
+
+void ReplyStream::grow(std::size_t bytes) {
+    _results = std::max(_results, bytes);
+    if (_outlet != nullptr) {
+        _outlet->hold(_results + _text);
+    }
+}
+
+} // namespace ObjectManager::CimXml

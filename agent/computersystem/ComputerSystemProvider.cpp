@@ -5,13 +5,13 @@
  * An operation either closes its result and reports CMPI_RC_OK, or leaves it open and reports why, to its caller and
  * to the log. No exception leaves it.
  */
-#include "BrokerCalls.h"
 #include "ComputerSystem.h"
+#include "provider/BrokerCalls.h"
+#include "provider/Log.h"
+#include "provider/Outcome.h"
 
 #include "Norv/Common.h"
-#include "OrvLog/OrvLogger.h"
 
-#include <exception>
 #include <string>
 
 #include <strings.h>
@@ -20,58 +20,17 @@ namespace Norv::ComputerSystemProvider {
 
 static const CMPIBroker* broker = nullptr;
 static constexpr const char* category = "Corvane.ComputerSystemProvider";
-static constexpr int failureLevel = 6000;
 
-/** A place in the source that reports something. */
-struct Site {
-    const char* function;
-    const char* file;
-    int line;
-
-    /** The place of the call; as a default argument, the place of the call that leaves it out. */
-    static constexpr Site here(const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
-                               int line = __builtin_LINE()) {
-        return Site{function, file, line};
-    }
-};
-
-/**
- * To be called first where everything is caught. A host that cancels the thread unwinds it without a C++ exception;
- * stopping that would end the process.
- */
-static void letCancellationPass() {
-    if (std::current_exception() == nullptr) {
-        throw;
-    }
-}
-
-/** Logs why an operation failed and makes its status of it. */
-static CMPIStatus failed(CMPIrc code, const char* message, const Site& site) {
-    try {
-        OrvLog::OrvLogger::logLevelMessage(site.function, site.file, site.line, category, failureLevel, nullptr, 0, 0,
-                                           message);
-        return {code, CMNewString(broker, message, nullptr)};
-    } catch (...) {
-        letCancellationPass();
-        // Nothing is left to say it with but the code.
-        return {code, nullptr};
-    }
-}
+using Provider::OperationError;
+using Provider::require;
+using Provider::requireText;
+using Provider::Site;
 
 /** Carries an operation out and makes its status of how that ended. */
 template <typename Operation>
 static CMPIStatus run(Operation operation, const Site& site = Site::here()) {
-    try {
-        operation();
-        return {CMPI_RC_OK, nullptr};
-    } catch (const OperationError& error) {
-        return failed(error.code(), error.what(), site);
-    } catch (const std::exception& error) {
-        return failed(CMPI_RC_ERR_FAILED, error.what(), site);
-    } catch (...) {
-        letCancellationPass();
-        return failed(CMPI_RC_ERR_FAILED, "an exception that is no std::exception was thrown", site);
-    }
+    return Provider::outcomeOf(broker, operation,
+                               [&](const char* message) { Provider::logFailure(site, category, message); });
 }
 
 /** A text key of a path. @throws OperationError where the path has no such key. */

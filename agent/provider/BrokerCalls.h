@@ -1,8 +1,8 @@
 /**
  * Calls on the object manager that end the operation where they fail.
  */
-#ifndef COMPUTERSYSTEM_BROKERCALLS_H
-#define COMPUTERSYSTEM_BROKERCALLS_H
+#ifndef PROVIDER_BROKERCALLS_H
+#define PROVIDER_BROKERCALLS_H
 
 #include "cmpidt.h"
 #include "cmpift.h"
@@ -11,7 +11,7 @@
 #include <stdexcept>
 #include <string>
 
-namespace Norv::ComputerSystemProvider {
+namespace Norv::Provider {
 
 /** Why an operation ends without a result: the code and message that its caller gets. */
 class OperationError : public std::runtime_error {
@@ -74,6 +74,6 @@ std::string requireText(const std::string& call, Make make) {
     return text;
 }
 
-} // namespace Norv::ComputerSystemProvider
+} // namespace Norv::Provider
 
 #endif

@@ -1,0 +1,33 @@
+/**
+ * How the agent's provider libraries log why an operation failed.
+ */
+#ifndef PROVIDER_LOG_H
+#define PROVIDER_LOG_H
+
+#include "OrvLog/OrvLogger.h"
+
+namespace Norv::Provider {
+
+/** A place in the source that reports something. */
+struct Site {
+    const char* function;
+    const char* file;
+    int line;
+
+    /** The place of the call; as a default argument, the place of the call that leaves it out. */
+    static constexpr Site here(const char* function = __builtin_FUNCTION(), const char* file = __builtin_FILE(),
+                               int line = __builtin_LINE()) {
+        return Site{function, file, line};
+    }
+};
+
+/** Writes a failure to the log, under a category of it. */
+inline void logFailure(const Site& site, const char* category, const char* message) {
+    constexpr int failureLevel = 6000;
+    OrvLog::OrvLogger::logLevelMessage(site.function, site.file, site.line, category, failureLevel, nullptr, 0, 0,
+                                       message);
+}
+
+} // namespace Norv::Provider
+
+#endif

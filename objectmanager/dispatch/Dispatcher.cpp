@@ -98,7 +98,7 @@ enum class Dispatcher::Answer { paths, instances, value, nothing };
 
 Dispatcher::Dispatcher(Registry registry, const Settings& settings)
     : _registry(std::move(registry)), _rules(settings.rules), _log(settings.log), _broker(this, settings.classes),
-      _providers(_broker, settings.folders, [log = settings.log](void* library) {
+      _providers(_broker, settings.folders, settings.builtIn, [log = settings.log](void* library) {
           if (log != nullptr) {
               log->attach(library);
           }

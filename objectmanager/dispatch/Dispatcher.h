@@ -35,6 +35,8 @@ public:
         LogTap* log = nullptr;
         /** A call follows the first rule that is about its method. The rules must outlive the dispatcher. */
         std::vector<const MethodRule*> rules{};
+        /** May be null; outlives the dispatcher. */
+        BuiltInProviders* builtIn = nullptr;
     };
 
     Dispatcher(Registry registry, const Settings& settings);

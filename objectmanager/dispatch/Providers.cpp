@@ -9,6 +9,7 @@
 #include <cstring>
 #include <dlfcn.h>
 #include <functional>
+#include <type_traits>
 
 namespace ObjectManager {
 
@@ -79,17 +80,21 @@ std::string joined(const std::vector<std::filesystem::path>& folders) {
 
 } // namespace
 
-/** A loaded library, with the providers that its factory functions made. */
+/** A loaded library, or what is built into the program in its place, with the providers that the factory functions
+ * made. */
 class ProviderLibrary {
 public:
     ProviderLibrary(const Broker& broker, const std::string& location,
                     const std::vector<std::filesystem::path>& folders);
+    ProviderLibrary(const Broker& broker, BuiltInProviders& builtIn)
+        : _broker(broker), _file(std::filesystem::read_symlink("/proc/self/exe")), _builtIn(&builtIn) {}
     ProviderLibrary(const ProviderLibrary&) = delete;
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
     ~ProviderLibrary();
 
     /** The library's file, with every symbolic link resolved. */
     const std::filesystem::path& file() const { return _file; }
+    /** Null where the providers are built in. */
     void* handle() const { return _handle; }
 
     /**
@@ -101,7 +106,12 @@ public:
 
 private:
     template <typename MI>
-    MI* create(FactoryReport& report);
+    using Factory = std::function<MI*(const CMPIContext*, CMPIStatus*)>;
+
+    template <typename MI>
+    Factory<MI> factoryOf(const std::string& name);
+    template <typename MI>
+    MI* create(const std::string& name, FactoryReport& report);
     void complain(const std::string& factory, const std::string& problem) const {
         _broker.message({BrokerMessage::Kind::log, CMPI_SEV_ERROR, factory, problem});
     }
@@ -116,6 +126,7 @@ private:
     const Broker& _broker;
     std::filesystem::path _file;
     void* _handle = nullptr;
+    BuiltInProviders* _builtIn = nullptr;
     std::map<std::string, Loaded> _providers;
 };
 
@@ -146,7 +157,7 @@ ProviderLibrary::~ProviderLibrary() {
     for (const auto& [factory, loaded] : _providers) {
         unload = loaded.cleanup() && unload;
     }
-    if (unload) {
+    if (unload && _handle != nullptr) {
         dlclose(_handle);
     }
 }
@@ -158,7 +169,7 @@ MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
         report = known->second.report;
         return static_cast<MI*>(known->second.mi);
     }
-    MI* mi = create<MI>(report);
+    MI* mi = create<MI>(name, report);
     if (!report.problem.empty()) {
         return nullptr;
     }
@@ -177,19 +188,36 @@ MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
     return mi;
 }
 
+/** The factory of a provider; an empty function where there is none. */
 template <typename MI>
-MI* ProviderLibrary::create(FactoryReport& report) {
-    using Factory = MI*(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
-    auto* factory = reinterpret_cast<Factory*>(dlsym(_handle, report.factory.c_str()));
-    if (factory == nullptr) {
+ProviderLibrary::Factory<MI> ProviderLibrary::factoryOf(const std::string& name) {
+    if (_builtIn != nullptr) {
+        MI* mi = nullptr;
+        if constexpr (std::is_same_v<MI, CMPIInstanceMI>) {
+            mi = _builtIn->instanceProvider(name, _broker.handle());
+        } else if constexpr (std::is_same_v<MI, CMPIAssociationMI>) {
+            mi = _builtIn->associationProvider(name, _broker.handle());
+        }
+        return mi == nullptr ? Factory<MI>() : [mi](const CMPIContext*, CMPIStatus*) { return mi; };
+    }
+    using Exported = MI*(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
+    auto* const factory = reinterpret_cast<Exported*>(dlsym(_handle, (name + MIKind<MI>::suffix).c_str()));
+    return factory == nullptr ? Factory<MI>() : [this, factory](const CMPIContext* context, CMPIStatus* status) {
+        return factory(_broker.handle(), context, status);
+    };
+}
+
+template <typename MI>
+MI* ProviderLibrary::create(const std::string& name, FactoryReport& report) {
+    const Factory<MI> factory = factoryOf<MI>(name);
+    if (!factory) {
         report.problem = _file.string() + " has no factory " + report.factory;
         return nullptr;
     }
     Request request(_broker);
     CMPIStatus status{CMPI_RC_OK, nullptr};
     MI* mi = nullptr;
-    std::optional<std::string> thrown =
-        callProvider([&] { mi = factory(_broker.handle(), request.context({}), &status); });
+    std::optional<std::string> thrown = callProvider([&] { mi = factory(request.context({}), &status); });
     std::string problem;
     if (thrown) {
         problem = *thrown;
@@ -215,14 +243,17 @@ bool ProviderReport::usable() const {
                                           [](const FactoryReport& factory) { return factory.problem.empty(); });
 }
 
-Providers::Providers(const Broker& broker, std::vector<std::filesystem::path> folders, Loaded loaded)
-    : _broker(broker), _folders(std::move(folders)), _loaded(std::move(loaded)) {}
+Providers::Providers(const Broker& broker, std::vector<std::filesystem::path> folders, BuiltInProviders* builtIn,
+                     Loaded loaded)
+    : _broker(broker), _folders(std::move(folders)), _builtIn(builtIn), _loaded(std::move(loaded)) {}
 
 Providers::~Providers() = default;
 
 ProviderLibrary& Providers::library(const std::string& location) {
     std::unique_ptr<ProviderLibrary>& library = _libraries[location];
-    if (library == nullptr) {
+    if (library == nullptr && _builtIn != nullptr && location == _builtIn->location()) {
+        library = std::make_unique<ProviderLibrary>(_broker, *_builtIn);
+    } else if (library == nullptr) {
         library = std::make_unique<ProviderLibrary>(_broker, location, _folders);
         _loaded(library->handle());
     }

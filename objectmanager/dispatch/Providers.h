@@ -12,6 +12,7 @@
 #include <mutex>
 #include <set>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace ObjectManager {
@@ -30,7 +31,8 @@ struct FactoryReport {
 
 /** What was found when a registered provider was loaded. */
 struct ProviderReport {
-    /** The library's file with every symbolic link resolved; empty if it was not found or does not load. */
+    /** The library's file with every symbolic link resolved, or the program's for a provider that is built in; empty if
+     * it was not found or does not load. */
     std::filesystem::path library;
     /** Why the library or the registration cannot be used, in one line; empty if it can. */
     std::string problem;
@@ -38,6 +40,25 @@ struct ProviderReport {
     std::vector<FactoryReport> factories;
 
     bool usable() const;
+};
+
+/**
+ * Providers that are part of the program. In registrations they have a location of their own, which no library has;
+ * they are called as those of a library are. Used by several threads at once.
+ */
+class BuiltInProviders {
+public:
+    BuiltInProviders() = default;
+    BuiltInProviders(const BuiltInProviders&) = delete;
+    BuiltInProviders& operator=(const BuiltInProviders&) = delete;
+    virtual ~BuiltInProviders() = default;
+
+    virtual std::string_view location() const = 0;
+
+    /* What a provider's factory gives; null where it has none of that kind. */
+
+    virtual CMPIInstanceMI* instanceProvider(std::string_view provider, const CMPIBroker* broker) = 0;
+    virtual CMPIAssociationMI* associationProvider(std::string_view provider, const CMPIBroker* broker) = 0;
 };
 
 class ProviderLibrary;
@@ -53,9 +74,14 @@ public:
     /** Called with each library's handle from dlopen, before any function of the library is called. */
     using Loaded = std::function<void(void* library)>;
 
-    /** Searches `folders` in their order for lib<location>.so.1, then for lib<location>.so. */
+    /**
+     * Searches `folders` in their order for lib<location>.so.1, then for lib<location>.so.
+     *
+     * @param builtIn may be null; outlives this object.
+     */
     Providers(
-        const Broker& broker, std::vector<std::filesystem::path> folders, Loaded loaded = [](void* /*library*/) {});
+        const Broker& broker, std::vector<std::filesystem::path> folders, BuiltInProviders* builtIn = nullptr,
+        Loaded loaded = [](void* /*library*/) {});
     Providers(const Providers&) = delete;
     Providers& operator=(const Providers&) = delete;
     ~Providers();
@@ -78,6 +104,7 @@ private:
 
     const Broker& _broker;
     std::vector<std::filesystem::path> _folders;
+    BuiltInProviders* _builtIn;
     Loaded _loaded;
     /** Recursive, since a factory may call the object manager in its turn. */
     std::recursive_mutex _mutex;

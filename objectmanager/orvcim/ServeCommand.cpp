@@ -196,8 +196,10 @@ void serve(Session& session) {
         return reply;
     };
     Server::HttpServer server(settings, answer, authenticator ? &*authenticator : nullptr, log);
-    const std::string listening = fmt::format("Listening on {}://{}\n", settings.tls ? "https" : "http",
-                                              Server::hostAndPort(settings.address, server.port()));
+    const std::string url =
+        fmt::format("{}://{}", settings.tls ? "https" : "http", Server::hostAndPort(settings.address, server.port()));
+    session.ownProviders().answerOn({url, options.authenticate});
+    const std::string listening = fmt::format("Listening on {}\n", url);
     session.out() << listening << std::flush;
     manager.tell("READY=1\nSTATUS=" + listening);
 

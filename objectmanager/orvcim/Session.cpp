@@ -46,8 +46,9 @@ std::vector<std::filesystem::path> libraryFoldersOf(const Options& options) {
 
 Session::Session(const Options& options, std::ostream& out)
     : _options(options), _schemaFolder(schemaFolderOf(options)), _catalogue(readCatalogue(_schemaFolder)),
-      _powerRequests(_catalogue, _log), _dispatcher(Registry(readRegistrations(_schemaFolder)),
-                                                    {libraryFoldersOf(options), &_catalogue, &_log, {&_powerRequests}}),
+      _powerRequests(_catalogue, _log), _registry(readRegistrations(_schemaFolder)),
+      _ownProviders({ORVCIM_VERSION, _registry.nameSpaces()}),
+      _dispatcher(_registry, {libraryFoldersOf(options), &_catalogue, &_log, {&_powerRequests}, &_ownProviders}),
       _out(out), _writer(makeWriter(options.format, out, _catalogue)) {}
 
 ObjectPath Session::classPath(std::string_view text) const {

@@ -7,6 +7,7 @@
 #include "agentlog/LogTap.h"
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
+#include "interop/OwnProviders.h"
 #include "orvcim/ServeOptions.h"
 #include "power/PowerRequests.h"
 #include "text/Writer.h"
@@ -78,6 +79,7 @@ public:
     const Catalogue& catalogue() const { return _catalogue; }
     Dispatcher& dispatcher() { return _dispatcher; }
     LogTap& log() { return _log; }
+    Interop::OwnProviders& ownProviders() { return _ownProviders; }
     Writer& writer() { return *_writer; }
     std::ostream& out() { return _out; }
 
@@ -120,6 +122,8 @@ private:
     Catalogue _catalogue;
     LogTap _log;
     PowerRequestRule _powerRequests;
+    Registry _registry;
+    Interop::OwnProviders _ownProviders;
     Dispatcher _dispatcher;
     std::ostream& _out;
     std::unique_ptr<Writer> _writer;

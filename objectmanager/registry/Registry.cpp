@@ -3,6 +3,10 @@
 #include "model/Model.h"
 
 #include <algorithm>
+#include <array>
+#include <functional>
+#include <iterator>
+#include <set>
 
 namespace ObjectManager {
 
@@ -33,6 +37,24 @@ bool Registration::isIn(std::string_view nameSpace) const {
 bool Registration::mayImplement(std::string_view methodName) const {
     return methods.empty() || std::any_of(methods.begin(), methods.end(),
                                           [&](const std::string& name) { return equalNames(name, methodName); });
+}
+
+Registry::Registry(std::vector<Registration> registrations) : _registrations(std::move(registrations)) {
+    constexpr std::array<const char*, 2> interop = {"root/interop", "interop"};
+    for (Registration& registration : _registrations) {
+        const auto isServed = [&](const char* name) { return registration.isIn(name); };
+        if (std::ranges::any_of(interop, isServed)) {
+            std::ranges::copy_if(interop, std::back_inserter(registration.nameSpaces), std::not_fn(isServed));
+        }
+    }
+}
+
+std::vector<std::string> Registry::nameSpaces() const {
+    std::set<std::string, NameLess> names;
+    for (const Registration& registration : _registrations) {
+        names.insert(registration.nameSpaces.begin(), registration.nameSpaces.end());
+    }
+    return {names.begin(), names.end()};
 }
 
 void Registry::requireNameSpace(std::string_view nameSpace) const {

@@ -38,9 +38,13 @@ enum class ProviderKind { instance, method, association };
 /** All registrations. The registry does not change, so several threads may use it at once. */
 class Registry {
 public:
-    explicit Registry(std::vector<Registration> registrations) : _registrations(std::move(registrations)) {}
+    /** What is registered in one of the namespaces of discovery, root/interop and interop, is in the other one too. */
+    explicit Registry(std::vector<Registration> registrations);
 
     const std::vector<Registration>& registrations() const { return _registrations; }
+
+    /** All namespaces, each once, in the order of their names. */
+    std::vector<std::string> nameSpaces() const;
 
     /** @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace. */
     void requireNameSpace(std::string_view nameSpace) const;

@@ -1,5 +1,6 @@
 #include "ServiceFixture.h"
 
+#include "interop/OwnProviders.h"
 #include "power/PowerRequests.h"
 #include "registry/RegistrationReader.h"
 
@@ -51,8 +52,11 @@ struct World {
     Catalogue catalogue = readCatalogue(TEST_SCHEMA);
     LogTap log;
     PowerRequestRule powerRequests{catalogue, log};
-    Dispatcher dispatcher{Registry(readRegistrations(std::filesystem::path(TEST_SCHEMA))),
-                          {{TEST_LIBRARIES, TEST_PROVIDERS}, &catalogue, &log, {&powerRequests}}};
+    Registry registry{readRegistrations(std::filesystem::path(TEST_SCHEMA))};
+    Interop::OwnProviders ownProviders{
+        {"1.0.0", registry.nameSpaces(), Interop::Communication{"https://server.example:5989", true}}};
+    Dispatcher dispatcher{registry,
+                          {{TEST_LIBRARIES, TEST_PROVIDERS}, &catalogue, &log, {&powerRequests}, &ownProviders}};
     Service service{dispatcher, catalogue};
 
     World() {

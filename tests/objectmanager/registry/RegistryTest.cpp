@@ -33,6 +33,17 @@ TEST_F(RegistryTest, FindsTheProviderOfEachKind) {
     EXPECT_EQ("Holds", registry.find("root/interop", "Test_Holds", ProviderKind::association).provider);
 }
 
+TEST_F(RegistryTest, HasWhatIsInOneNamespaceOfDiscoveryInTheOtherOneToo) {
+    EXPECT_EQ("Holds", registry.find("interop", "Test_Holds", ProviderKind::association).provider);
+    EXPECT_THAT(registry.nameSpaces(), testing::ElementsAre("interop", "root/cimv2", "root/interop"));
+
+    Registration registration = registrationOf("Test_Disk", "DiskInstances", &Registration::instance);
+    registration.nameSpaces = {"Interop"};
+    EXPECT_THAT(Registry({registration}).nameSpaces(), testing::ElementsAre("Interop", "root/interop"));
+    registration.nameSpaces = {"root/cimv2"};
+    EXPECT_THAT(Registry({registration}).nameSpaces(), testing::ElementsAre("root/cimv2"));
+}
+
 TEST(Registration, TellsWhichMethodsTheProviderMayImplement) {
     Registration registration;
     EXPECT_TRUE(registration.mayImplement("Any"));

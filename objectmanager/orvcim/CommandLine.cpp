@@ -127,6 +127,7 @@ private:
         addReferences(add(_app, "reference-names", "List the paths of the associations that refer to an instance",
                           listReferenceNames));
         add(_app, "graph", "Write all instances with their associations as a graph in DOT", writeGraph);
+        add(_app, "profiles", "List the profiles, and what they lead to", listProfiles);
     }
 
     void powerCommands() {

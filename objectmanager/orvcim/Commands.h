@@ -32,6 +32,9 @@ void listReferenceNames(Session& session);
 /** Writes all instances with their associations as a graph in the DOT language of Graphviz. */
 void writeGraph(Session& session);
 
+/** Shows the namespaces, the registered profiles, and what each profile leads to. Throws Failure if there is none. */
+void listProfiles(Session& session);
+
 /** Shows the power states of the machine; if no provider serves them, the states that its services can be asked for.
  * Throws Failure after the answer if a state is not known. */
 void powerStatus(Session& session);

@@ -133,6 +133,50 @@ TEST_F(NoComputerSystemTest, TellsWhatTheProviderLoggedBesideAnAnswerThatIsMerel
     EXPECT_EQ(outcome.status, 0);
 }
 
+TEST_F(ProvidedTest, WalksFromTheProfilesToTheMachine) {
+    const std::string profile = "root/interop:TALVO_RegisteredProfile.InstanceID=";
+    const std::string service =
+        "root/cimv2:TALVO_PowerManagementService.Name=\"PowerStateManagement_chassis/blade1\",SystemCreationClassName="
+        "\"TALVO_ComputerSystem\",SystemName=\"machine.example\",CreationClassName=\"TALVO_PowerManagementService\"";
+    EXPECT_EQ(answerOf({"profiles"}), "Namespaces: interop, root/cimv2, root/interop\n"
+                                      "\n"
+                                      "Power State Management 1.0.2\n"
+                                      "  profile           " +
+                                          profile +
+                                          "\"TALVO:DSP1027-1.0.2\"\n"
+                                          "  organization      2 (DMTF)\n"
+                                          "  refers to         Profile Registration 1.0.0\n"
+                                          "  central instance  " +
+                                          service +
+                                          "\n"
+                                          "  hosted by         " +
+                                          _system +
+                                          "\n"
+                                          "  manages           " +
+                                          _system +
+                                          "\n"
+                                          "  capabilities      " +
+                                          _capabilities +
+                                          "\n"
+                                          "  power states      2 (On), 5 (Power Cycle (Off - Soft)), 8 (Off - Soft)\n"
+                                          "\n"
+                                          "Profile Registration 1.0.0\n"
+                                          "  profile       " +
+                                          profile +
+                                          "\"TALVO:DSP1033-1.0.0\"\n"
+                                          "  organization  2 (DMTF)\n");
+}
+
+TEST_F(ProvidedTest, FindsNoProfilesInASchemaThatHasNone) {
+    std::filesystem::copy(ORV_SCHEMA_FOLDER, _folder / "schema");
+    std::filesystem::remove(_folder / "schema" / "orv-profile.reg");
+    const Outcome outcome = orvcim({"profiles", "--schema", (_folder / "schema").string()});
+    EXPECT_EQ(outcome.err,
+              "orvcim: found no registered profile in root/interop, expected that of power state management\n");
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 1);
+}
+
 using GraphTest = ProvidedTest;
 
 TEST_F(GraphTest, HasEveryInstanceWithItsAssociations) {

@@ -123,7 +123,7 @@ TEST_P(MistakeTest, GetsOneClearLineAndItsStatus) {
 
 const std::string noCommand =
     "found no command, expected one of classes, names, instances, get, invoke, associators, associator-names, "
-    "references, reference-names, graph, power status, power reboot, power shutdown, power cancel, serve, check";
+    "references, reference-names, graph, profiles, power status, power reboot, power shutdown, power cancel, serve, check";
 
 std::string withoutCommand(const std::string& word) {
     return "found no command " + word + noCommand.substr(std::string("found no command").size());
@@ -131,21 +131,23 @@ std::string withoutCommand(const std::string& word) {
 
 INSTANTIATE_TEST_SUITE_P(
     ofTheCommandLine, MistakeTest,
-    testing::Values(Mistake{{}, 2, noCommand}, Mistake{{"power"}, 2, noCommand},
-                    Mistake{{"names"}, 2, "CLASS is required ('orvcim --help' lists the commands)"},
-                    Mistake{{"nonsense"}, 2, withoutCommand("nonsense")},
-                    Mistake{{"power", "off"},
-                            2,
-                            "found no command power off, expected one of power status, power reboot, power shutdown, "
-                            "power cancel"},
-                    Mistake{{"names", "Test_Thing", "more"},
-                            2,
-                            "The following argument was not expected: more ('orvcim --help' lists the commands)"},
-                    Mistake{{"classes", "--format", "xml"},
-                            2,
-                            "--format: xml not in {json,mof,table} ('orvcim --help' lists the commands)"},
-                    Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
-                    Mistake{{"graph", "--format", "json"}, 2, "found --format, expected none: graph writes DOT"}));
+    testing::Values(
+        Mistake{{}, 2, noCommand}, Mistake{{"power"}, 2, noCommand},
+        Mistake{{"names"}, 2, "CLASS is required ('orvcim --help' lists the commands)"},
+        Mistake{{"nonsense"}, 2, withoutCommand("nonsense")},
+        Mistake{{"power", "off"},
+                2,
+                "found no command power off, expected one of power status, power reboot, power shutdown, "
+                "power cancel"},
+        Mistake{{"names", "Test_Thing", "more"},
+                2,
+                "The following argument was not expected: more ('orvcim --help' lists the commands)"},
+        Mistake{{"classes", "--format", "xml"},
+                2,
+                "--format: xml not in {json,mof,table} ('orvcim --help' lists the commands)"},
+        Mistake{{"check", "--format", "mof"}, 2, "found --format mof, expected table or json for check"},
+        Mistake{{"graph", "--format", "json"}, 2, "found --format, expected none: graph writes DOT"},
+        Mistake{{"profiles", "--format", "json"}, 2, "found --format, expected none: profiles writes for people"}));
 
 INSTANTIATE_TEST_SUITE_P(
     ofNames, MistakeTest,

@@ -1,9 +1,9 @@
 /**
- * TALVO_ComputerSystem: one instance, the machine that the object manager runs on (CIM_ComputerSystem, DMTF DSP1052).
- * For machines where no other provider serves that class.
+ * TALVO_ComputerSystem: one instance, which represents the machine that the object manager runs on (CIM_ComputerSystem,
+ * DMTF DSP1052). This provider is for machines where no other one serves the class.
  *
- * An operation either closes its result and reports CMPI_RC_OK, or leaves it open and reports why, to its caller and
- * to the log. No exception leaves it.
+ * An operation either closes its result and returns CMPI_RC_OK, or leaves its result open, returns an error with a
+ * message, and logs that message. No exception leaves an operation.
  */
 #include "ComputerSystem.h"
 #include "provider/BrokerCalls.h"

@@ -1,5 +1,5 @@
 /**
- * Calls on the object manager that end the operation where they fail.
+ * Calls of the object manager; a call that fails ends the provider's operation with an exception.
  */
 #ifndef PROVIDER_BROKERCALLS_H
 #define PROVIDER_BROKERCALLS_H
@@ -13,7 +13,7 @@
 
 namespace Norv::Provider {
 
-/** Why an operation ends without a result: the code and message that its caller gets. */
+/** Ends an operation without a result. It has the code and message that the operation returns to its caller. */
 class OperationError : public std::runtime_error {
 public:
     OperationError(CMPIrc code, const std::string& message) : std::runtime_error(message), _code(code) {}
@@ -24,15 +24,15 @@ private:
     CMPIrc _code;
 };
 
-/** Whether there is no object or one that holds nothing; CMIsNullObject of some headers looks at the pointer only. */
+/** Whether the pointer is null or its object holds nothing. CMIsNullObject of some headers checks only the pointer. */
 template <typename Object>
 bool isNull(const Object* object) {
     return object == nullptr || object->hdl == nullptr;
 }
 
 /**
- * @param call what was called, for the message.
- * @throws OperationError where the call reported a failure, with its code.
+ * Checks the status of a call. @param call the name of what was called, for the message.
+ * @throws OperationError with the status's code if the call failed.
  */
 inline void require(const std::string& call, const CMPIStatus& status) {
     if (status.rc == CMPI_RC_OK) {
@@ -44,11 +44,11 @@ inline void require(const std::string& call, const CMPIStatus& status) {
 }
 
 /**
- * The object that a call gives.
+ * Makes a call that returns an object.
  *
- * @param call what is called, for the message.
- * @param make calls it: takes the status pointer, returns a pointer to the object.
- * @throws OperationError where the call reports a failure, or gives no object or one that holds nothing.
+ * @param call the name of what is called, for the message.
+ * @param make makes the call: takes the status pointer and returns a pointer to the object.
+ * @throws OperationError if the call fails, or returns null or an object that holds nothing.
  */
 template <typename Make>
 auto requireObject(const std::string& call, Make make) {
@@ -56,12 +56,12 @@ auto requireObject(const std::string& call, Make make) {
     auto* const object = make(&status);
     require(call, status);
     if (isNull(object)) {
-        throw OperationError(CMPI_RC_ERR_FAILED, call + " gave no object and reported no failure");
+        throw OperationError(CMPI_RC_ERR_FAILED, call + " returned no object and reported no failure");
     }
     return object;
 }
 
-/** The text that a call gives as a string object; throws as `requireObject` does. */
+/** Makes a call that returns a string object. @return its text. Throws as `requireObject` does. */
 template <typename Make>
 std::string requireText(const std::string& call, Make make) {
     const CMPIString* const string = requireObject(call, make);
@@ -69,7 +69,7 @@ std::string requireText(const std::string& call, Make make) {
     const char* const text = CMGetCharsPtr(string, &status);
     require("getCharPtr of " + call, status);
     if (text == nullptr) {
-        throw OperationError(CMPI_RC_ERR_FAILED, "getCharPtr of " + call + " gave no text and reported no failure");
+        throw OperationError(CMPI_RC_ERR_FAILED, "getCharPtr of " + call + " returned no text and reported no failure");
     }
     return text;
 }

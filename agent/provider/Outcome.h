@@ -46,7 +46,7 @@ CMPIStatus outcomeOf(const CMPIBroker* broker, Operation operation, Report repor
         return failed(CMPI_RC_ERR_FAILED, error.what());
     } catch (...) {
         letCancellationPass();
-        return failed(CMPI_RC_ERR_FAILED, "an exception that is no std::exception was thrown");
+        return failed(CMPI_RC_ERR_FAILED, "an exception of unknown type was thrown");
     }
 }
 

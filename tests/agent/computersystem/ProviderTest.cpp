@@ -42,7 +42,7 @@ public:
     }
     ~Provider() override { Agent::instance().reset(); }
 
-    /** A new request on the same broker. */
+    /** Begins a new request with the same broker. */
     void startOver() {
         Transcript::instance().clear();
         broker.faults.clear();
@@ -62,13 +62,13 @@ public:
         return status.msg == nullptr ? "" : CMGetCharPtr(status.msg);
     }
 
-    /** The operation left its result open, and reported the reason. */
+    /** Expects that the operation left its result open and reported the reason. */
     void expectFailure(const CMPIStatus& status, CMPIrc code, const std::string& message) {
         EXPECT_EQ(returned().closed, 0U);
         expectReport(status, code, message);
     }
 
-    /** The operation reported the reason once to its caller and once to the log. */
+    /** Expects that the operation reported the reason once to its caller and once to the log. */
     void expectReport(const CMPIStatus& status, CMPIrc code, const std::string& message) {
         EXPECT_EQ(status.rc, code);
         EXPECT_THAT(messageOf(status), HasSubstr(message));
@@ -318,8 +318,8 @@ public:
     }
 
     /**
-     * Makes each call of a slot fail, a request for each, and expects what `expect` does. The slot must be called at
-     * least once.
+     * Makes each call of a slot fail, each in a request of its own, and has `expect` check the outcome. The slot must
+     * be called at least once.
      */
     void failEachCall(const std::string& slot, const OrvTest::Fault& fault,
                       const std::function<void(const CMPIStatus&)>& expect) {
@@ -381,7 +381,7 @@ TEST_P(Operations, LetNoExceptionOut) {
             expectReport(status, CMPI_RC_ERR_FAILED, "thrown by the broker");
         });
         failEachCall(slot, OrvTest::throws(7), [&](const CMPIStatus& status) {
-            expectReport(status, CMPI_RC_ERR_FAILED, "an exception that is no std::exception was thrown");
+            expectReport(status, CMPI_RC_ERR_FAILED, "an exception of unknown type was thrown");
         });
     }
 }
@@ -409,7 +409,7 @@ TEST_P(Operations, SurviveALogThatThrows) {
     EXPECT_EQ(run().rc, CMPI_RC_ERR_ACCESS_DENIED);
 }
 
-/** The thread of a host that cancels it inside of a call must end, and the host with it must not. */
+/** If a host cancels its thread inside a call, the thread must end, but not the host. */
 TEST_P(Operations, LetACancelledThreadGo) {
     broker.faults.at("newObjectPath", 1, {.action = [] {
                          pthread_cancel(pthread_self());

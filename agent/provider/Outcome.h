@@ -1,5 +1,5 @@
 /**
- * From what an operation of a provider throws to the status that its caller gets.
+ * Turns what an operation of a provider throws into the status that its caller gets.
  */
 #ifndef PROVIDER_OUTCOME_H
 #define PROVIDER_OUTCOME_H
@@ -11,8 +11,8 @@
 namespace Norv::Provider {
 
 /**
- * To be called first where everything is caught. A host that cancels the thread unwinds it without a C++ exception;
- * stopping that would end the process.
+ * To be called first in each catch (...). When a host cancels the thread, the thread is unwound without a C++
+ * exception; to catch that would end the process.
  */
 inline void letCancellationPass() {
     if (std::current_exception() == nullptr) {
@@ -21,9 +21,9 @@ inline void letCancellationPass() {
 }
 
 /**
- * Carries an operation out and makes its status of how that ended. Nothing but a cancellation leaves it.
+ * Carries out an operation. @return its status. No exception leaves this function; only a cancellation does.
  *
- * @param report is told why the operation failed. What it throws is ignored, and the status has no message then.
+ * @param report is called with the reason of a failure. If it throws, that is ignored, and the status has no message.
  */
 template <typename Operation, typename Report>
 CMPIStatus outcomeOf(const CMPIBroker* broker, Operation operation, Report report) {
@@ -33,7 +33,7 @@ CMPIStatus outcomeOf(const CMPIBroker* broker, Operation operation, Report repor
             return {code, CMNewString(broker, message, nullptr)};
         } catch (...) {
             letCancellationPass();
-            // Nothing is left to say it with but the code.
+            // Memory is too short for a message: only the code is left.
             return {code, nullptr};
         }
     };

@@ -16,7 +16,7 @@ bool isAskedClass(const Catalogue& catalogue, std::string_view name, std::string
 }
 
 /** Calls for each association class and each of its references that the source can stand at. */
-template <class Do>
+template <typename Do>
 void forEachNearEnd(const Catalogue& catalogue, const Class& source, const AssociationFilter& filter, Do doWith) {
     // A class with fewer references links nothing.
     constexpr std::size_t fewestReferences = 2;

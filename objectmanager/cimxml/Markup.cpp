@@ -94,7 +94,7 @@ private:
      * Does what a handler has to do. No exception may go through expat: it is kept until the parser has stopped, which
      * may call some handlers before it does.
      */
-    template <class Do>
+    template <typename Do>
     static void handle(void* self, Do doWith) {
         auto& builder = *static_cast<Builder*>(self);
         if (builder._failure) {

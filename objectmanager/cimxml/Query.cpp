@@ -307,7 +307,7 @@ private:
     std::vector<std::string> _classes;
 };
 
-template <class Do>
+template <typename Do>
 void forEachComparison(const Condition& condition, const Do& doWith) {
     if (condition.kind == Condition::Kind::comparison) {
         doWith(condition.comparison);

@@ -14,7 +14,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-template <class Number>
+template <typename Number>
 void appendNumber(std::string& text, Number number) {
     std::array<char, 32> digits{};
     const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number).ptr;
@@ -22,7 +22,7 @@ void appendNumber(std::string& text, Number number) {
 }
 
 /** A real always has a point, and digits on both sides of it. */
-template <class Real>
+template <typename Real>
 void appendReal(std::string& text, Real real) {
     if (!std::isfinite(real)) {
         text += std::isnan(real) ? "NaN" : real < 0 ? "-INF" : "INF";

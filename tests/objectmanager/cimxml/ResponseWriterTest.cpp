@@ -16,7 +16,7 @@ using testing::HasSubstr;
 class ResponseWriterTest : public testing::Test {
 protected:
     /** What a writer writes that `write` uses. */
-    template <class Write>
+    template <typename Write>
     std::string written(Write write) {
         ResponseWriter writer(_catalogue, "host.example", "root/cimv2");
         write(writer);

@@ -77,15 +77,15 @@ std::string Request::text(std::string_view headers) const {
            "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
 }
 
-void Request::check(const std::string& reply, std::size_t nodes) const {
+void Request::check(const std::string& replyBody, std::size_t nodes) const {
     std::size_t found = 0;
-    for (std::size_t at = 0; (at = reply.find(objectBegin, at)) != std::string::npos; ++at) {
+    for (std::size_t at = 0; (at = replyBody.find(objectBegin, at)) != std::string::npos; ++at) {
         ++found;
     }
     const std::size_t expected = objectsPerNode * nodes + objects;
     if (found != expected) {
         throw std::runtime_error(name + ": found " + std::to_string(found) + " of " + std::string(objectBegin) +
-                                 ", expected " + std::to_string(expected) + ": " + reply);
+                                 ", expected " + std::to_string(expected) + ": " + replyBody);
     }
 }
 

@@ -24,8 +24,8 @@ struct Request {
     /** What is sent for it. @param headers besides, each with its line end. */
     std::string text(std::string_view headers = "") const;
 
-    /** @throws std::runtime_error where the reply has another number of objects than a machine of so many nodes. */
-    void check(const std::string& reply, std::size_t nodes) const;
+    /** @throws std::runtime_error where a reply has another number of objects than a machine of so many nodes. */
+    void check(const std::string& replyBody, std::size_t nodes) const;
 };
 
 /** The six kinds that clients ask most, of the first node's service or of its class. The method call is refused. */

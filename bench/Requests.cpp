@@ -96,8 +96,8 @@ const std::vector<Request>& requests() {
         intrinsic("GetInstance", "InstanceName", service, instanceElement, 0, 1),
         ofClass("EnumerateInstances", instanceElement),
         ofClass("EnumerateInstanceNames", instanceNameElement),
-        intrinsic("Associators", "ObjectName", service, instanceElement, 1, 2),
-        intrinsic("References", "ObjectName", service, instanceElement, 1, 2),
+        intrinsic("Associators", "ObjectName", service, instanceElement, 1, 3),
+        intrinsic("References", "ObjectName", service, instanceElement, 1, 3),
         refusedMethodCall(),
     };
     return all;

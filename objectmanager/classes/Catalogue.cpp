@@ -42,8 +42,8 @@ void addElements(std::vector<T>& elements, const std::vector<T>& own, const Clas
         }
         if (inherited->type != element.type) {
             throw SchemaError(owner.place,
-                              fmt::format("found {} {}, expected the type {} that it is inherited with",
-                                          typeName(element.type), element.name, typeName(inherited->type)));
+                              fmt::format("found {} {}, expected the inherited type {}", typeName(element.type),
+                                          element.name, typeName(inherited->type)));
         }
         inheritQualifiers(element, *inherited, types);
         element.origin = inherited->origin;
@@ -61,7 +61,7 @@ public:
             const auto [known, added] = _declared.try_emplace(declared.name, declared);
             if (!added) {
                 throw SchemaError(declared.place,
-                                  fmt::format("found a second declaration of {}, expected none beside {}",
+                                  fmt::format("found a second declaration of {}, expected only the one at {}",
                                               declared.name, known->second.place));
             }
         }
@@ -112,10 +112,10 @@ private:
     const Class& superClassOf(const Class& declared, std::size_t descendants) const {
         const auto ancestor = _declared.find(declared.superClass);
         if (ancestor == _declared.end() || descendants > _declared.size()) {
-            throw SchemaError(declared.place,
-                              fmt::format("found {} as superclass of {}, expected {}", declared.superClass,
-                                          declared.name,
-                                          ancestor == _declared.end() ? "a declared class" : "no descendant of it"));
+            throw SchemaError(
+                declared.place,
+                fmt::format("found {} as superclass of {}, expected {}", declared.superClass, declared.name,
+                            ancestor == _declared.end() ? "a declared class" : "a class that is not its descendant"));
         }
         return ancestor->second;
     }

@@ -84,7 +84,7 @@ private:
             return quotedToken(first == '"' ? Token::Kind::string : Token::Kind::character);
         }
         if (std::string_view("{}[]()<>,;:=$@").find(first) == std::string_view::npos) {
-            fail(std::string("found '") + first + "', expected no such character");
+            fail(std::string("found '") + first + "', expected a token of MOF");
         }
         Token token{Token::Kind::punctuation, std::string(1, first), _line};
         advance(1);

@@ -157,9 +157,11 @@ QualifierTypes::QualifierTypes(const std::vector<QualifierType>& declared) {
     for (const QualifierType& type : declared) {
         QualifierType& known = _types.try_emplace(type.name, type).first->second;
         if (!known.place.empty() && !isSame(known, type)) {
-            throw SchemaError(type.place,
-                              fmt::format("found another declaration of the qualifier type {}, expected it as in {}",
-                                          type.name, known.place));
+            throw SchemaError(
+                type.place,
+                fmt::format(
+                    "found another declaration of the qualifier type {}, expected one that is equal to that at {}",
+                    type.name, known.place));
         }
         known = type;
     }

@@ -113,12 +113,14 @@ TEST_P(MisfitTest, IsReportedByFileAndLine) {
 INSTANTIATE_TEST_SUITE_P(
     declarations, MisfitTest,
     testing::Values(
-        Misfit{"class A {};\nclass a {};", "x.mof:2: found a second declaration of a, expected none beside x.mof:1"},
+        Misfit{"class A {};\nclass a {};",
+               "x.mof:2: found a second declaration of a, expected only the one at x.mof:1"},
         Misfit{"class A : B {};", "x.mof:1: found B as superclass of A, expected a declared class"},
-        Misfit{"class A : A {};", "x.mof:1: found A as superclass of A, expected no descendant of it"},
-        Misfit{"class A : B {};\nclass B : A {};", "x.mof:2: found A as superclass of B, expected no descendant of it"},
+        Misfit{"class A : A {};", "x.mof:1: found A as superclass of A, expected a class that is not its descendant"},
+        Misfit{"class A : B {};\nclass B : A {};",
+               "x.mof:2: found A as superclass of B, expected a class that is not its descendant"},
         Misfit{"class A { uint8 N; };\nclass B : A { string N; };",
-               "x.mof:2: found string N, expected the type uint8 that it is inherited with"},
+               "x.mof:2: found string N, expected the inherited type uint8"},
         Misfit{"class A { B REF R; };", "x.mof:1: found B REF R in A, expected a declared class"},
         Misfit{"class A { uint32 M(B REF R); };", "x.mof:1: found B REF R in A, expected a declared class"},
         Misfit{"class A { [MaxLen(\"5\")] string T; };",
@@ -127,8 +129,9 @@ INSTANTIATE_TEST_SUITE_P(
                "x.mof:1: found sint64 as value of the qualifier MaxLen, expected uint32"},
         Misfit{"class A { uint32 M([Values(\"one\")] uint8 N); };",
                "x.mof:1: found string as value of the qualifier Values, expected string[]"},
-        Misfit{"Qualifier Q : string;\nQualifier q : string[];",
-               "x.mof:2: found another declaration of the qualifier type q, expected it as in x.mof:1"}));
+        Misfit{
+            "Qualifier Q : string;\nQualifier q : string[];",
+            "x.mof:2: found another declaration of the qualifier type q, expected one that is equal to that at x.mof:1"}));
 
 TEST(ReadCatalogue, ReportsAFolderThatIsNotThere) {
     try {

@@ -199,7 +199,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadMof{"class A { /* \n };", "x.mof:1: found no end of the comment that begins here, expected */"},
         BadMof{"#include \"x\"", "x.mof:1: found '#', expected #pragma name(...)"},
         BadMof{"class A { string T = \"a\n\n; };", "x.mof:1: found no closing \", expected one for the \" here"},
-        BadMof{"class A { ? };", "x.mof:1: found '?', expected no such character"}));
+        BadMof{"class A { ? };", "x.mof:1: found '?', expected a token of MOF"}));
 
 } // namespace
 } // namespace ObjectManager

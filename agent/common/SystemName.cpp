@@ -4,6 +4,7 @@
 
 #include <array>
 #include <memory>
+#include <new>
 #include <optional>
 
 #include <netdb.h>
@@ -14,13 +15,21 @@ namespace Norv {
 
 namespace {
 
-/** The fully qualified name of the host in the hosts file or the name service; no value if they have none. */
+/**
+ * The fully qualified name of the host in the hosts file or the name service; no value if they have none.
+ *
+ * @throws std::bad_alloc
+ */
 std::optional<std::string> canonicalName(const std::string& hostName) {
     addrinfo hints{};
     hints.ai_flags = AI_CANONNAME;
     hints.ai_socktype = SOCK_STREAM;
     addrinfo* found = nullptr;
-    if (::getaddrinfo(hostName.c_str(), nullptr, &hints, &found) != 0) {
+    const int result = ::getaddrinfo(hostName.c_str(), nullptr, &hints, &found);
+    if (result == EAI_MEMORY) {
+        throw std::bad_alloc();
+    }
+    if (result != 0) {
         return std::nullopt;
     }
     const std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> addresses(found, ::freeaddrinfo);

@@ -2,15 +2,14 @@
 
 #include "PowerStates.h"
 #include "TableReader.h"
+#include "base/RegularFile.h"
 
 #include <unistd.h>
 
 #include <array>
 #include <cerrno>
 #include <cstdlib>
-#include <fstream>
 #include <limits>
-#include <sstream>
 #include <system_error>
 #include <unordered_set>
 
@@ -118,37 +117,41 @@ void readConfiguration(TableReader& file, Configuration& configuration) {
     file.finish();
 }
 
-[[noreturn]] void rejectFile(const std::string& file, const std::string& reason) {
-    throw ConfigurationError(file + ": " + reason + ": expected a file that can be read");
+[[noreturn]] void rejectFile(const std::string& file, const std::string& reason, const std::string& expected) {
+    throw ConfigurationError(file + ": " + reason + ": expected " + expected);
 }
 
 std::string contentOf(const std::string& file) {
-    std::error_code error;
-    const auto status = std::filesystem::status(file, error);
-    if (std::filesystem::exists(status) && !std::filesystem::is_regular_file(status)) {
-        rejectFile(file, "not a regular file");
+    constexpr const char* readable = "a file that can be read";
+    std::optional<FileContent> content;
+    try {
+        content = readRegularFile(file);
+    } catch (const std::system_error& error) {
+        if (error.code() == std::errc::invalid_argument) {
+            rejectFile(file, "not a regular file", readable);
+        }
+        if (error.code() == std::errc::file_too_large) {
+            rejectFile(file, error.code().message(), "a file of " + std::to_string(largestFile) + " bytes at most");
+        }
+        rejectFile(file, error.code().message(), readable);
     }
-    errno = 0;
-    std::ifstream stream(file, std::ios::binary);
-    std::ostringstream content;
-    // Inserting an empty file fails without errno: that is not a failure to read it.
-    if (!stream || (!(content << stream.rdbuf()) && errno != 0)) {
-        rejectFile(file, std::generic_category().message(errno));
+    if (!content) {
+        rejectFile(file, std::generic_category().message(ENOENT), readable);
     }
-    return std::move(content).str();
+    return std::move(content->text);
 }
 
 Configuration configurationFrom(const std::string& file) {
     Configuration configuration;
     configuration.source = file;
-    try {
-        const toml::table table = toml::parse(contentOf(file), file);
-        TableReader reader(table, file);
-        readConfiguration(reader, configuration);
-    } catch (const toml::parse_error& error) {
-        throw ConfigurationError(file + ':' + std::to_string(error.source().begin.line) +
-                                 ": not TOML: " + std::string(error.description()));
+    const std::string content = contentOf(file);
+    const toml::parse_result parsed = toml::parse(std::string_view(content), std::string_view());
+    if (!parsed) {
+        throw ConfigurationError(file + ':' + std::to_string(parsed.error().source().begin.line) +
+                                 ": not TOML: " + std::string(parsed.error().description()));
     }
+    TableReader reader(parsed.table(), file);
+    readConfiguration(reader, configuration);
     return configuration;
 }
 

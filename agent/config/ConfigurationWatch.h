@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace Norv::Agent {
 
@@ -22,7 +23,8 @@ public:
     /**
      * Calls `action` if the file has changed since the last look, and once more at the next look if the change was so
      * recent that a further change could have the same time stamp. Only one thread at a time looks and calls `action`;
-     * other threads return at once, and so does a call from within `action`.
+     * other threads return at once, and so does a call from within `action`. If `action` throws, the exception passes,
+     * and the next look calls it again.
      */
     void onChange(const auto& action) {
         if (!isDue() || _looking.test_and_set(std::memory_order_acquire)) {
@@ -30,7 +32,9 @@ public:
         }
         const Looking untilTheEnd(_looking);
         if (look()) {
+            const bool wasRecent = std::exchange(_recent, true);
             action();
+            _recent = wasRecent;
         }
     }
 
@@ -59,6 +63,7 @@ private:
     std::atomic_flag _looking;
     // Only the thread that looks uses these.
     std::optional<FileSignature> _known;
+    /** Whether the next look has to be taken for a change. */
     bool _recent;
 };
 

@@ -4,7 +4,7 @@
 #ifndef AGENT_TABLEREADER_H
 #define AGENT_TABLEREADER_H
 
-#include <toml++/toml.h>
+#include "Toml.h"
 
 #include <chrono>
 #include <concepts>

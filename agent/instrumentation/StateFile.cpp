@@ -4,6 +4,7 @@
 #include "base/Descriptor.h"
 #include "base/Folders.h"
 #include "base/LockFile.h"
+#include "base/RegularFile.h"
 
 #include <nlohmann/json.hpp>
 
@@ -34,8 +35,6 @@ constexpr const char* afterKey = "after";
 
 /** How long to wait while another process holds the lock. */
 constexpr std::chrono::seconds patience{5};
-/** A larger file is not a state file. */
-constexpr off_t largestSize = off_t{16} * 1024 * 1024;
 
 /** @throws std::system_error with the number in errno. */
 [[noreturn]] void fail(const std::filesystem::path& path, const std::string& problem) {
@@ -44,29 +43,6 @@ constexpr off_t largestSize = off_t{16} * 1024 * 1024;
 
 std::filesystem::path withSuffix(std::filesystem::path path, const std::string& suffix) {
     return path += suffix;
-}
-
-[[noreturn]] void failOnSize(const std::filesystem::path& path) {
-    errno = EFBIG;
-    fail(path, "is not a state file, which has " + std::to_string(largestSize) + " bytes at most");
-}
-
-std::string readAll(const Descriptor& file, const std::filesystem::path& path) {
-    std::string text;
-    std::array<char, 65536> block;
-    for (;;) {
-        const ssize_t size = ::read(file.number(), block.data(), block.size());
-        if (size > 0) {
-            text.append(block.data(), static_cast<std::size_t>(size));
-            if (std::cmp_greater(text.size(), largestSize)) {
-                failOnSize(path);
-            }
-        } else if (size == 0) {
-            return text;
-        } else if (errno != EINTR) {
-            fail(path, "cannot be read");
-        }
-    }
 }
 
 void writeAll(const Descriptor& file, const std::filesystem::path& path, std::string_view text) {
@@ -294,29 +270,14 @@ std::optional<FileSignature> StateFile::currentSignature() const {
 }
 
 StateFile::Content StateFile::load() const {
-    // O_NONBLOCK: opening a named pipe must not wait for a writer.
-    const Descriptor file(::open(_file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
-    if (!file.isOpen()) {
-        if (errno == ENOENT) {
-            return {};
-        }
-        fail(_file, "cannot be read");
-    }
-    struct stat status {};
-    if (::fstat(file.number(), &status) != 0) {
-        fail(_file, "cannot be read");
-    }
-    if (!S_ISREG(status.st_mode)) {
-        throw std::system_error(EINVAL, std::system_category(), _file.string() + ": is not a regular file");
-    }
-    if (status.st_size > largestSize) {
-        failOnSize(_file);
+    const std::optional<FileContent> file = readRegularFile(_file);
+    if (!file) {
+        return {};
     }
     Content content;
-    content.signature = FileSignature(status);
-    const std::string text = readAll(file, _file);
+    content.signature = file->signature;
     try {
-        content.requests = std::make_shared<PowerRequests>(Reader::read(text));
+        content.requests = std::make_shared<PowerRequests>(Reader::read(file->text));
     } catch (const std::invalid_argument& error) {
         content.damage = error.what();
     }
@@ -341,6 +302,7 @@ StateFile::Content StateFile::loadOrSetAside(const LockFile& /*held*/) const {
 void StateFile::store(const PowerRequests& requests, const std::optional<FileSignature>& replaced,
                       const LockFile& /*held*/) const {
     const std::filesystem::path replacement = withSuffix(_file, ".new");
+    const std::filesystem::path parent = _file.parent_path();
     // A process that was killed while it wrote has left this file behind.
     if (::unlink(replacement.c_str()) != 0 && errno != ENOENT) {
         fail(replacement, "cannot be removed");
@@ -371,8 +333,8 @@ void StateFile::store(const PowerRequests& requests, const std::optional<FileSig
         throw;
     }
     // The new file is complete and in place. If this synchronization fails, a power failure can bring the former file
-    // back; that is no reason to report the request as refused.
-    const Descriptor folder(::open(_file.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    // back; that is no reason to report the request as refused. Nothing from here on may throw.
+    const Descriptor folder(::open(parent.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (folder.isOpen()) {
         ::fsync(folder.number());
     }

@@ -18,6 +18,7 @@
 #include <exception>
 #include <forward_list>
 #include <memory>
+#include <new>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -33,9 +34,19 @@ public:
         : _watch(std::move(watch)), _generations{Thresholds(settings)}, _thresholds(&_generations.front()),
           _destination(destinationFor(settings)) {}
 
+    /** Writes a record of the log's own, which the observer has not seen yet. */
     void report(const Record& record) {
-        _watch->onChange([this] { renewThresholds(); });
         showToObserver(record);
+        note(record);
+    }
+
+    /** Writes a record where it passes the thresholds. */
+    void note(const Record& record) {
+        try {
+            _watch->onChange([this] { renewThresholds(); });
+        } catch (const std::bad_alloc&) {
+            // The former thresholds go on to hold until the next look.
+        }
         if (_thresholds.load(std::memory_order_acquire)->passes(record.kind, record.category, record.level)) {
             if (LastOperation::isNeededFor(record)) {
                 writeLastOperation(record.category);
@@ -56,12 +67,15 @@ private:
             if (thresholds == _generations.front()) {
                 return;
             }
+            const std::string news =
+                Norv::Agent::configurationFile() + " has changed: its thresholds apply from now on";
             _generations.push_front(thresholds);
             _thresholds.store(&_generations.front(), std::memory_order_release);
-            report(ownRecord(Norv::Agent::configurationFile() + " has changed: its thresholds apply from now on"));
+            report(ownRecord(news));
         } catch (const Norv::Agent::ConfigurationError& error) {
-            if (std::exchange(_mistake, error.what()) != error.what()) {
-                report(ownRecord(_mistake + ": the former thresholds still apply"));
+            if (_mistake != error.what()) {
+                report(ownRecord(error.what() + std::string(": the former thresholds still apply")));
+                _mistake = error.what();
             }
         }
     }
@@ -139,10 +153,13 @@ void report(Kind kind, const char* function, const char* file, int line, const s
             int toldKind, const std::string& text) {
     constexpr auto textOf = [](const char* nullable) { return std::string_view(nullable == nullptr ? "" : nullable); };
     const int error = errno;
+    const Record record{kind, level, category, textOf(function), textOf(file), line, text, toldKind};
+    // This needs no memory, and no log that has to be made first.
+    showToObserver(record);
     try {
         // Never destroyed: see -z nodelete in CMakeLists.txt.
         static Log& log = *makeLog().release();
-        log.report({kind, level, category, textOf(function), textOf(file), line, text, toldKind});
+        log.note(record);
     } catch (const std::exception&) {
         // Only memory can be short here, and there is no place left to report that.
     }

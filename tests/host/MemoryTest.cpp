@@ -2,12 +2,12 @@
  * Tests operations while memory is short: each allocation of an operation fails in turn, once alone and once with all
  * later ones. The operation must end as expected, and the host must go on.
  *
- * The host's own allocations never fail. Nor do those that happen once in a process or a thread, since each operation
- * has run before: the loader allocates a library's thread-local variables when a thread uses them first, and ends the
- * process if it cannot; the library that parses the configuration does the same.
+ * The host's own allocations never fail, nor do the loader's, which allocates a library's thread-local variables when a
+ * thread uses them first, and ends the process where it cannot.
  */
 #include "broker.h"
 
+#include "agent/PassingTime.h"
 #include "agent/TestSupport.h"
 
 #include "cmpimacs.h"
@@ -25,7 +25,9 @@
 
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <sys/auxv.h>
 #include <sys/mman.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -52,12 +54,17 @@ struct Shortage {
 
 constinit thread_local Shortage shortage;
 
-/** Whether an allocation for the caller at this address must fail. */
+bool isLoaders(const void* caller) {
+    Dl_info found{};
+    return dladdr(caller, &found) != 0 && reinterpret_cast<std::uintptr_t>(found.dli_fbase) == getauxval(AT_BASE);
+}
+
+/** Whether an allocation that is asked for at an address is to fail. */
 bool fails(const void* caller) {
     const auto address = reinterpret_cast<std::uintptr_t>(caller);
     const bool isHost = address >= reinterpret_cast<std::uintptr_t>(&__executable_start) &&
                         address < reinterpret_cast<std::uintptr_t>(&etext);
-    if (!shortage.counting || isHost) {
+    if (!shortage.counting || isHost || isLoaders(caller)) {
         return false;
     }
     const unsigned int number = ++shortage.allocations;
@@ -158,20 +165,34 @@ struct Operation {
     Request request;
     /** Whether the operation closes its result when it succeeds. */
     bool closes = true;
+    /** Whether the host's name is in what it returns. */
+    bool namesTheHost = false;
 };
 
 /** The outcome of a request. */
 struct Outcome {
     bool threw = false;
+    /** Whether the machine was switched. */
+    bool moved = false;
     CMPIrc code = CMPI_RC_OK;
     bool closed = false;
     std::string text;
     unsigned int allocations = 0;
 };
 
+const char* stateFile = nullptr;
+
+/** When the machine was last switched, in nanoseconds; 0 where it never was. */
+std::int64_t lastMove() {
+    struct stat status {};
+    return stat(stateFile, &status) != 0 ? 0
+                                         : std::int64_t{status.st_mtim.tv_sec} * 1'000'000'000 + status.st_mtim.tv_nsec;
+}
+
 Outcome run(const Operation& operation, unsigned int failing, bool allThatFollow) {
     beginRequest();
     Outcome outcome;
+    const std::int64_t before = lastMove();
     CMPIResult* const result = newResult(Host::instance().broker);
     const Call call = operation.request(result);
     shortage = {.counting = true, .first = failing, .allThatFollow = allThatFollow};
@@ -182,6 +203,7 @@ Outcome run(const Operation& operation, unsigned int failing, bool allThatFollow
     }
     shortage.counting = false;
     outcome.allocations = shortage.allocations;
+    outcome.moved = lastMove() != before;
     outcome.closed = isClosed(result) != 0;
     outcome.text = returnedText(result);
     endRequest();
@@ -195,6 +217,7 @@ class StandardError {
 public:
     explicit StandardError(const std::string& file) : _file(open(file.c_str(), O_RDWR | O_CREAT | O_APPEND, 0600)) {
         dup2(_file, STDERR_FILENO);
+        _read = lseek(_file, 0, SEEK_END);
     }
 
     std::string text() {
@@ -225,7 +248,30 @@ void complain(Progress& progress, const std::string& text) {
     _exit(EXIT_FAILURE);
 }
 
-/** Makes each allocation of an operation fail; ends the process at the first unexpected outcome. */
+/** Ends the process where an operation, of which `reported` was said, has another outcome than it should. */
+void requireOutcome(const Outcome& outcome, const Outcome& usual, const std::string& reported, Progress& progress) {
+    const bool failed = outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed;
+    // What nobody needs for the answer, such as a record of the log, may be lacking; and where the provider has to
+    // leave out what it could not read, it has to say so.
+    if (!failed && outcome.text != usual.text && reported.find("bad_alloc") == std::string::npos &&
+        reported.find(" log 6000 ") == std::string::npos) {
+        complain(progress, "the operation succeeded and returned\n" + outcome.text + "instead of\n" + usual.text +
+                               "and reported only: " + reported);
+    }
+    if (outcome.moved != (reported.find("Power request accepted") != std::string::npos)) {
+        complain(progress, (outcome.moved ? "the machine was switched" : "the machine was not switched") +
+                               std::string(", and this was reported: ") + reported);
+    }
+}
+
+/** The same for one that has all the memory that it needs. */
+void requireUsualOutcome(const Outcome& outcome, const Outcome& usual, Progress& progress) {
+    if (outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed || outcome.text != usual.text) {
+        complain(progress, "the next operation returned\n" + outcome.text + "instead of\n" + usual.text);
+    }
+}
+
+/** Lets each allocation of an operation fail; ends the process at the first that has another outcome than it should. */
 void failEachAllocation(const Operation& operation, Progress& progress, const std::string& errors) {
     const Outcome usual = (run(operation, 0, false), run(operation, 0, false));
     if (usual.threw || usual.code != CMPI_RC_OK || usual.text.empty() || usual.closed != operation.closes) {
@@ -235,25 +281,14 @@ void failEachAllocation(const Operation& operation, Progress& progress, const st
     for (const bool allThatFollow : {false, true}) {
         progress.allThatFollow = allThatFollow;
         for (progress.failing = 1;; ++progress.failing) {
+            standardError.text();
             const Outcome outcome = run(operation, progress.failing, allThatFollow);
             if (outcome.allocations < progress.failing) {
                 break;
             }
             progress.allocations = progress.failing;
-            const std::string reported = standardError.text();
-            const bool failed = outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed;
-            // Something that the answer does not need, such as a log record, may be missing. If the provider leaves out
-            // an object that it could not read, it must report that.
-            if (!failed && outcome.text != usual.text && reported.find("bad_alloc") == std::string::npos &&
-                reported.find(" log 6000 ") == std::string::npos) {
-                complain(progress, "the operation succeeded and returned\n" + outcome.text + "instead of\n" +
-                                       usual.text + "and reported only: " + reported);
-            }
-            const Outcome next = run(operation, 0, false);
-            if (next.threw || next.code != CMPI_RC_OK || next.closed != usual.closed || next.text != usual.text) {
-                complain(progress, "the next operation returned\n" + next.text + "instead of\n" + usual.text);
-            }
-            standardError.text();
+            requireOutcome(outcome, usual, standardError.text(), progress);
+            requireUsualOutcome(run(operation, 0, false), usual, progress);
         }
     }
     _exit(EXIT_SUCCESS);
@@ -262,11 +297,17 @@ void failEachAllocation(const Operation& operation, Progress& progress, const st
 class MemoryShortage : public testing::TestWithParam<Operation> {
 protected:
     MemoryShortage() {
-        AgentTest::writeFile(folder / "agent.toml", "[system]\nname = \"host.example\"\n"
-                                                    "[instrumentation.simulated]\nstate-file = \"" +
-                                                        (folder / "machine.json").string() +
-                                                        "\"\nreboot-time = 0\nshutdown-time = 0\n");
+        stateFile = machine.c_str();
+        configure(6000);
         setenv("ORV_AGENT_CONFIG", (folder / "agent.toml").c_str(), 1);
+    }
+
+    /** @param level below which records are not logged. */
+    void configure(int level) const {
+        AgentTest::writeFile(folder / "agent.toml",
+                             "[system]\nname = \"host.example\"\n[log]\nlevel = " + std::to_string(level) +
+                                 "\n[instrumentation.simulated]\nstate-file = \"" + machine +
+                                 "\"\nreboot-time = 0.0\nshutdown-time = 0\n");
     }
 
     /** Runs a function that does not return in a process of its own. */
@@ -286,6 +327,7 @@ protected:
     }
 
     AgentTest::TemporaryFolder folder;
+    const std::string machine = (folder / "machine.json").string();
     const std::string errors = (folder / "errors").string();
     Progress& progress = *static_cast<Progress*>(
         mmap(nullptr, sizeof(Progress), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0));
@@ -294,6 +336,67 @@ protected:
 TEST_P(MemoryShortage, EndsTheOperationAndNotTheHost) {
     inHost([this] { failEachAllocation(GetParam(), progress, errors); });
     EXPECT_GT(progress.allocations, 0U);
+}
+
+/** The operations of which one is the first in its process, or notices that the configuration has changed. */
+class ConfigurationInMemoryShortage : public MemoryShortage {};
+
+TEST_P(ConfigurationInMemoryShortage, EndsTheFirstOperationAndNotTheHost) {
+    for (const bool allThatFollow : {false, true}) {
+        progress.allThatFollow = allThatFollow;
+        progress.allocations = 1;
+        for (progress.failing = 1; progress.failing <= progress.allocations; ++progress.failing) {
+            ASSERT_NO_FATAL_FAILURE(inHost([&] {
+                StandardError standardError(errors);
+                const Outcome first = run(GetParam(), progress.failing, allThatFollow);
+                progress.allocations = first.allocations;
+                const std::string reported = standardError.text();
+                const Outcome usual = run(GetParam(), 0, false);
+                requireOutcome(first, usual, reported, progress);
+                const bool isWhole = usual.code == CMPI_RC_OK && usual.closed == GetParam().closes &&
+                                     usual.text.find("host.example") != std::string::npos;
+                if (GetParam().namesTheHost && !isWhole) {
+                    complain(progress, "the next operation returned\n" + usual.text);
+                }
+                _exit(EXIT_SUCCESS);
+            }));
+            if (HasFailure()) {
+                return;
+            }
+        }
+        EXPECT_GT(progress.failing, 50U);
+    }
+}
+
+TEST_P(ConfigurationInMemoryShortage, IsLookedAtAgainWhereAChangeCouldNotBeRead) {
+    inHost([&] {
+        const Outcome usual = (run(GetParam(), 0, false), run(GetParam(), 0, false));
+        StandardError standardError(errors);
+        int level = 6000;
+        for (const bool allThatFollow : {false, true}) {
+            progress.allThatFollow = allThatFollow;
+            for (progress.failing = 1;; ++progress.failing) {
+                level = level == 6000 ? 6500 : 6000;
+                configure(level);
+                AgentTest::passTime(std::chrono::seconds(2));
+                const Outcome outcome = run(GetParam(), progress.failing, allThatFollow);
+                std::string reported = standardError.text();
+                requireOutcome(outcome, usual, reported, progress);
+                AgentTest::passTime(std::chrono::seconds(2));
+                requireUsualOutcome(run(GetParam(), 0, false), usual, progress);
+                reported += standardError.text();
+                if (reported.find("its thresholds apply from now on") == std::string::npos) {
+                    complain(progress, "the change was not noticed: " + reported);
+                }
+                if (outcome.allocations < progress.failing) {
+                    break;
+                }
+                progress.allocations = progress.failing;
+            }
+        }
+        _exit(EXIT_SUCCESS);
+    });
+    EXPECT_GT(progress.allocations, 50U);
 }
 
 /* The operations */
@@ -407,6 +510,18 @@ std::vector<Operation> operations() {
 }
 
 INSTANTIATE_TEST_SUITE_P(Of, MemoryShortage, testing::ValuesIn(operations()),
+                         [](const auto& test) { return test.param.name; });
+
+std::vector<Operation> operationsThatReadTheConfiguration() {
+    std::vector<Operation> chosen;
+    addInstanceOperations(chosen, "PowerManagementService");
+    chosen.resize(1);
+    chosen.front().namesTheHost = true;
+    chosen.push_back(powerRequest("Reboot", 5));
+    return chosen;
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, ConfigurationInMemoryShortage, testing::ValuesIn(operationsThatReadTheConfiguration()),
                          [](const auto& test) { return test.param.name; });
 
 } // namespace

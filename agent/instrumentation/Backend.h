@@ -54,7 +54,7 @@ public:
 
     /**
      * Requests another power state. If the request is accepted, `powerState` of this selection shows it at once. It is
-     * refused if another request is under way.
+     * refused if another request is under way, and if memory is short: once it is carried out, no more is needed.
      */
     virtual PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) = 0;
 

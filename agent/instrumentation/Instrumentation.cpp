@@ -8,7 +8,10 @@
 #include <cerrno>
 #include <cstddef>
 #include <memory>
+#include <optional>
 #include <string>
+#include <string_view>
+#include <utility>
 
 #include <unistd.h>
 
@@ -60,14 +63,46 @@ std::string requester() {
            (principal == nullptr ? "" : std::string(", on behalf of ") + principal) + ']';
 }
 
-/** Logs the outcome, whatever the log's thresholds. @return whether the request was accepted. */
-bool reported(const PowerRequestOutcome& outcome) {
-    report(alwaysWrittenLevel,
-           (outcome.accepted ? "Power request accepted: " : "Power request refused: ") + outcome.description +
-               requester(),
-           outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD);
-    return outcome.accepted;
-}
+/**
+ * The log's record of the outcome of a power request, which is written whatever the log's thresholds. All memory for it
+ * is allocated before the request is carried out, so that an accepted request is recorded even if memory ends
+ * meanwhile.
+ */
+class RequestRecord {
+public:
+    RequestRecord() { _text.reserve(longestPrefix + longestDescription + _requester.size()); }
+
+    /** Writes the record, and returns whether the request was accepted. */
+    bool reported(const PowerRequestOutcome& outcome) {
+        _text = outcome.accepted ? "Power request accepted: " : "Power request refused: ";
+        _text.append(beginningOf(outcome.description)).append(_requester);
+        OrvLog::OrvLogger::logLevelMessage(
+            static_cast<const char*>(__func__), __FILE__, __LINE__, _category, alwaysWrittenLevel, nullptr,
+            outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD, 0, _text);
+        return outcome.accepted;
+    }
+
+private:
+    static constexpr std::size_t longestPrefix = 32;
+    /** In bytes; a line of the log has no room for more. */
+    static constexpr std::size_t longestDescription = 3072;
+
+    /** As much of the text as there is room for, in whole UTF-8 characters. */
+    static std::string_view beginningOf(std::string_view text) {
+        if (text.size() <= longestDescription) {
+            return text;
+        }
+        std::size_t size = longestDescription;
+        while (size > 0 && (static_cast<unsigned char>(text[size]) & 0xc0) == 0x80) {
+            --size;
+        }
+        return text.substr(0, size);
+    }
+
+    const std::string _category = instrumentationCategory;
+    const std::string _requester = requester();
+    std::string _text;
+};
 
 } // namespace
 
@@ -148,7 +183,8 @@ bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int
 }
 
 bool Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
-    return reported(_implementation->write(property, value));
+    RequestRecord record;
+    return record.reported(_implementation->write(property, value));
 }
 
 } // namespace Norv
@@ -165,21 +201,36 @@ void orvInstrumentationOnBehalfOf1(const char* whom) {
     Norv::principal = whom;
 }
 
+namespace {
+
+/** The nodes of this process as they are now; null where the first, to which power requests go, is missing. */
+std::unique_ptr<Norv::NodeSelection> nodesNow() {
+    Norv::Backend* const backend = Norv::processBackend();
+    auto nodes = backend == nullptr ? nullptr : backend->selectPowerManagementNodes();
+    return nodes == nullptr || nodes->size() == 0 ? nullptr : std::move(nodes);
+}
+
+} // namespace
+
 const char* orvInstrumentationPowerNode1() {
     static const std::string node = [] {
-        Norv::Backend* const backend = Norv::processBackend();
-        const auto nodes = backend == nullptr ? nullptr : backend->selectPowerManagementNodes();
-        return nodes == nullptr || nodes->size() == 0 ? std::string() : nodes->path(0);
+        const auto nodes = nodesNow();
+        return nodes == nullptr ? std::string() : nodes->path(0);
     }();
     return node.c_str();
 }
 
+int orvInstrumentationPowerState1() {
+    const auto nodes = nodesNow();
+    const auto state = nodes == nullptr ? std::nullopt : nodes->powerState(0);
+    return state ? static_cast<int>(*state) : -1;
+}
+
 int orvInstrumentationCancelRequest1() {
-    Norv::Backend* const backend = Norv::processBackend();
-    const auto nodes = backend == nullptr ? nullptr : backend->selectPowerManagementNodes();
-    const bool hasNode = nodes != nullptr && nodes->size() > 0;
-    return Norv::reported(hasNode ? nodes->cancelRequest(0)
-                                  : Norv::PowerRequestOutcome{false, "cancellation: no node is offered"})
+    const auto nodes = nodesNow();
+    Norv::RequestRecord record;
+    return record.reported(nodes == nullptr ? Norv::PowerRequestOutcome{false, "cancellation: no node is offered"}
+                                            : nodes->cancelRequest(0))
                ? 1
                : 0;
 }

@@ -144,15 +144,15 @@ void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
     }
 }
 
-/** Makes the request of systemd-logind. @return when the machine goes down. */
-WallTime carryOut(Logind& logind, const Transition& transition, std::chrono::milliseconds delay) {
-    const WallTime time = std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
-    if (delay.count() == 0) {
+/** Makes the request of systemd-logind: for a time, or at once. */
+void carryOut(Logind& logind, const Transition& transition, WallTime time, bool atOnce) {
+    if (atOnce) {
         logind.shutDown(transition.method);
-        return time;
+        return;
     }
+    const ScheduledShutdown shutdown{transition.scheduledType, time};
     try {
-        logind.scheduleShutdown({transition.scheduledType, time});
+        logind.scheduleShutdown(shutdown);
     } catch (const LogindError& error) {
         if (error.kind() == LogindError::Kind::unanswered) {
             // systemd-logind may still receive the call later. The request counts as refused here, so it must have no
@@ -161,7 +161,6 @@ WallTime carryOut(Logind& logind, const Transition& transition, std::chrono::mil
         }
         throw;
     }
-    return time;
 }
 
 std::string adviceFor(LogindError::Kind kind) {
@@ -237,27 +236,35 @@ public:
         return attempt(what, [&](Logind& logind) {
             requireThatItCanBeDone(logind, *transition);
             const std::chrono::milliseconds delay = _backend._settings.delay;
-            const WallTime time = carryOut(logind, *transition, delay);
-            _state = state;
-            _backend._end.note(time, delay.count() == 0, {state, _states});
-            return delay.count() == 0
-                       ? std::string(", at once")
+            const bool atOnce = delay.count() == 0;
+            const WallTime time =
+                std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
+            std::string description = what;
+            description +=
+                atOnce ? ", at once"
                        : ", at " + inUtc(std::chrono::floor<std::chrono::seconds>(time)) + ", in " + inSeconds(delay);
+            EndOfTheMachine::Node ending{state, _states};
+            carryOut(logind, *transition, time, atOnce);
+            _state = state;
+            _backend._end.note(time, atOnce, std::move(ending));
+            return description;
         });
     }
 
     PowerRequestOutcome cancelRequest(std::size_t node) override {
-        return attempt("cancellation of the request of this machine, node " + path(node), [&](Logind& logind) {
+        const std::string what = "cancellation of the request of this machine, node " + path(node);
+        return attempt(what, [&](Logind& logind) {
             const auto pending = pendingOn(logind);
             if (!pending) {
                 throw Refusal("no request is in progress");
             }
+            std::string description = what + " (" + pending->description + ')';
             if (pending->begun || !logind.cancelScheduledShutdown()) {
                 throw Refusal("it is too late: " + pending->description);
             }
             _state = running;
             _backend._end.forget();
-            return " (" + pending->description + ')';
+            return description;
         });
     }
 
@@ -301,9 +308,7 @@ private:
         }
     }
 
-    /**
-     * @param action makes the request of systemd-logind; returns the end of the description, or throws the reason of a
-     * refusal.
+    /** @param action makes the request of systemd-logind; returns the description, or throws the reason of a refusal.
      */
     PowerRequestOutcome attempt(const std::string& what, const std::function<std::string(Logind&)>& action) {
         const Patience patience(_backend._settings.timeout);
@@ -311,7 +316,7 @@ private:
             createMissingFolders(_backend._settings.lockFile.parent_path());
             const LockFile lock(_backend._settings.lockFile, patience.deadline());
             Logind logind(patience.deadline());
-            return {true, what + action(logind)};
+            return {true, action(logind)};
         } catch (const LogindError& error) {
             return {false, what + ": " + reasonOf(error)};
         } catch (const std::exception& error) {

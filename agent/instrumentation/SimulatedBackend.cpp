@@ -96,9 +96,9 @@ private:
      */
     PowerRequestOutcome change(const std::string& what, const std::function<std::string(PowerRequests&)>& action) {
         try {
-            std::string end;
-            _requests = _backend._stateFile.update([&](PowerRequests& requests) { end = action(requests); });
-            return {true, what + end};
+            std::string description = what;
+            _requests = _backend._stateFile.update([&](PowerRequests& requests) { description += action(requests); });
+            return {true, std::move(description)};
         } catch (const std::exception& error) {
             return {false, what + ": " + error.what()};
         }

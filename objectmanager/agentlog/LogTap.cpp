@@ -18,6 +18,9 @@ struct ThreadRecords {
     std::uint64_t tap = 0;
     std::uint64_t newest = 0;
     std::deque<LogRecord> records;
+    /** The kind and number of the last record of a power request that there was no memory for; 0 if there is none. */
+    int unkeptKind = OrvLog::ORDINARY_RECORD;
+    std::uint64_t unkept = 0;
 };
 
 /** Set when the ending thread has destroyed its records: its other destructors may still log. */
@@ -34,7 +37,9 @@ struct EndingThreadRecords : ThreadRecords {
 ThreadRecords& recordsOf(std::uint64_t tap) {
     thread_local EndingThreadRecords own;
     if (own.tap != tap) {
-        static_cast<ThreadRecords&>(own) = {.tap = tap, .newest = 0, .records = {}};
+        ThreadRecords none;
+        none.tap = tap;
+        static_cast<ThreadRecords&>(own) = std::move(none);
     }
     return own;
 }
@@ -79,6 +84,9 @@ void LogTap::attach(void* library) {
     if (auto* const node = functionOf<Norv::PowerNode1>(library, Norv::powerNode1Name)) {
         _powerNode = node;
     }
+    if (auto* const state = functionOf<Norv::PowerState1>(library, Norv::powerState1Name)) {
+        _powerState = state;
+    }
     if (auto* const cancelRequest = functionOf<Norv::CancelRequest1>(library, Norv::cancelRequest1Name)) {
         _cancelRequest = cancelRequest;
     }
@@ -119,6 +127,12 @@ std::string LogTap::powerNode() const {
     return node == nullptr ? "" : node();
 }
 
+std::optional<unsigned int> LogTap::powerState() const {
+    Norv::PowerState1* const tell = _powerState;
+    const int state = tell == nullptr ? -1 : tell();
+    return state < 0 ? std::nullopt : std::optional(static_cast<unsigned int>(state));
+}
+
 void LogTap::cancelPowerRequest() const {
     if (Norv::CancelRequest1* const cancel = _cancelRequest) {
         cancel();
@@ -136,10 +150,19 @@ std::uint64_t LogTap::newest() const {
 }
 
 std::vector<LogRecord> LogTap::since(std::uint64_t sequence) const {
-    const std::deque<LogRecord>& records = recordsOf(_number).records;
+    const ThreadRecords& own = recordsOf(_number);
     const auto first =
-        std::ranges::find_if(records, [sequence](const LogRecord& record) { return record.sequence > sequence; });
-    return {first, records.end()};
+        std::ranges::find_if(own.records, [sequence](const LogRecord& record) { return record.sequence > sequence; });
+    std::vector<LogRecord> records(first, own.records.end());
+    if (own.unkept > sequence) {
+        const bool accepted = own.unkeptKind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD;
+        LogRecord& unkept = records.emplace_back();
+        unkept.kind = own.unkeptKind;
+        unkept.text =
+            std::string("Power request ") + (accepted ? "accepted" : "refused") + ": memory was too short for more";
+        unkept.sequence = own.unkept;
+    }
+    return records;
 }
 
 std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
@@ -162,33 +185,43 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
 }
 
 std::vector<LogRecord> LogTap::take() {
-    std::deque<LogRecord> taken = std::exchange(recordsOf(_number).records, {});
+    ThreadRecords& own = recordsOf(_number);
+    own.unkept = 0;
+    std::deque<LogRecord> taken = std::exchange(own.records, {});
     return {std::make_move_iterator(taken.begin()), std::make_move_iterator(taken.end())};
 }
 
 void LogTap::forget() {
-    recordsOf(_number).records.clear();
+    ThreadRecords& own = recordsOf(_number);
+    own.unkept = 0;
+    own.records.clear();
 }
 
 void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept {
     if (isEnding) {
         return;
     }
+    ThreadRecords* own = nullptr;
     try {
-        ThreadRecords& own = recordsOf(static_cast<const LogTap*>(context)->_number);
-        if (own.records.size() >= recordsPerThread) {
-            if (const auto oldest = std::ranges::find_if(own.records, isOrdinary); oldest != own.records.end()) {
-                own.records.erase(oldest);
+        own = &recordsOf(static_cast<const LogTap*>(context)->_number);
+        ++own->newest;
+        if (own->records.size() >= recordsPerThread) {
+            if (const auto oldest = std::ranges::find_if(own->records, isOrdinary); oldest != own->records.end()) {
+                own->records.erase(oldest);
             }
         }
-        own.records.push_back({record->kind,
-                               {record->category, record->categorySize},
-                               record->level,
-                               {record->text, record->textSize},
-                               own.newest + 1});
-        ++own.newest;
+        own->records.push_back({record->kind,
+                                {record->category, record->categorySize},
+                                record->level,
+                                {record->text, record->textSize},
+                                own->newest});
     } catch (const std::bad_alloc&) {
-        // The record is lost. A power request without a record that says "accepted" counts as refused.
+        // An ordinary record is lost. So is every record of a thread that did not ask for its newest one before.
+        if (own != nullptr && (record->kind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD ||
+                               record->kind == OrvLog::POWER_REQUEST_REFUSED_RECORD)) {
+            own->unkeptKind = record->kind;
+            own->unkept = own->newest;
+        }
     }
 }
 

@@ -8,6 +8,7 @@
 #include <atomic>
 #include <cstdint>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -60,6 +61,10 @@ public:
      * The path of the node that gets every power request, whichever service the client names; empty if it is not known.
      */
     std::string powerNode() const;
+    /** The current state of that node, as property 123 counts it; no value if it cannot be told. */
+    std::optional<unsigned int> powerState() const;
+    /** Whether the agent offers to tell that state. */
+    bool tellsPowerState() const { return _powerState != nullptr; }
     /** Has the agent cancel the power request that is under way; the agent reports the outcome in a record. Does
      * nothing if the agent does not offer it. */
     void cancelPowerRequest() const;
@@ -71,7 +76,10 @@ public:
 
     /** The sequence number of the calling thread's newest record; 0 before the first. */
     std::uint64_t newest() const;
-    /** Copies of the calling thread's records after the one numbered `sequence`. */
+    /**
+     * Copies of the calling thread's records after the one numbered `sequence`. The outcome of a power request is among
+     * them even if there was no memory for the agent's text.
+     */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
     /** The messages of those of them that are failures; only the first if the agent's configuration cannot be used. */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
@@ -98,6 +106,7 @@ private:
     std::atomic<Norv::Machine1*> _machine = nullptr;
     std::atomic<Norv::CancelRequest1*> _cancelRequest = nullptr;
     std::atomic<Norv::PowerNode1*> _powerNode = nullptr;
+    std::atomic<Norv::PowerState1*> _powerState = nullptr;
     std::atomic<Norv::OnBehalfOf1*> _onBehalfOf = nullptr;
 };
 

@@ -44,6 +44,14 @@ using OnBehalfOf1 = void(const char* whom);
 using PowerNode1 = const char*();
 
 /**
+ * Tells the state of the node to which power requests go. May be called from any thread; waits for the machine as long
+ * as a read of the property does.
+ *
+ * @return the current value of property 123; -1 if there is no node, or if its state cannot be told.
+ */
+using PowerState1 = int();
+
+/**
  * Cancels the power request that is under way, whoever made it. The outcome is logged like that of a power request. May
  * be called from any thread; waits for the machine as long as a power request does.
  *
@@ -54,6 +62,7 @@ using CancelRequest1 = int();
 /** The functions' names for dlsym(3). */
 inline constexpr const char* machine1Name = "orvInstrumentationMachine1";
 inline constexpr const char* powerNode1Name = "orvInstrumentationPowerNode1";
+inline constexpr const char* powerState1Name = "orvInstrumentationPowerState1";
 inline constexpr const char* cancelRequest1Name = "orvInstrumentationCancelRequest1";
 inline constexpr const char* onBehalfOf1Name = "orvInstrumentationOnBehalfOf1";
 
@@ -67,6 +76,9 @@ extern "C" void orvInstrumentationOnBehalfOf1(const char* whom);
 
 /** The embedded agent's function of type Norv::PowerNode1. */
 extern "C" const char* orvInstrumentationPowerNode1();
+
+/** The embedded agent's function of type Norv::PowerState1. */
+extern "C" int orvInstrumentationPowerState1();
 
 /** The embedded agent's function of type Norv::CancelRequest1. */
 extern "C" int orvInstrumentationCancelRequest1();

@@ -41,8 +41,8 @@ TEST(InstrumentationLibrary, ExportsItsMembersTheOptionalFunctionsAndNothingElse
         AgentTest::exportedSymbols(ORV_INSTRUMENTATION_LIBRARY),
         UnorderedElementsAre(
             "orvInstrumentationMachine1", "orvInstrumentationOnBehalfOf1", "orvInstrumentationPowerNode1",
-            "orvInstrumentationCancelRequest1", "_ZN4Norv15InstrumentationC1Ev", "_ZN4Norv15InstrumentationC2Ev",
-            "_ZN4Norv15InstrumentationD1Ev", "_ZN4Norv15InstrumentationD2Ev",
+            "orvInstrumentationPowerState1", "orvInstrumentationCancelRequest1", "_ZN4Norv15InstrumentationC1Ev",
+            "_ZN4Norv15InstrumentationC2Ev", "_ZN4Norv15InstrumentationD1Ev", "_ZN4Norv15InstrumentationD2Ev",
             "_ZN4Norv15Instrumentation10selectNodeENS_11NodeLexicon8NodeTypeE", "_ZN4Norv15InstrumentationcvbEv",
             "_ZN4Norv15InstrumentationppEv", "_ZN4Norv15Instrumentation13getPathToNodeB5cxx11Ev",
             "_ZN4Norv15Instrumentation19convertPathToStringERKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE",
@@ -55,6 +55,7 @@ TEST(InstrumentationLibrary, HasTheOptionalFunctionsUnderTheNamesThatTheHeaderGi
     EXPECT_EQ(dlsym(RTLD_DEFAULT, machine1Name), reinterpret_cast<void*>(&orvInstrumentationMachine1));
     EXPECT_EQ(dlsym(RTLD_DEFAULT, onBehalfOf1Name), reinterpret_cast<void*>(&orvInstrumentationOnBehalfOf1));
     EXPECT_EQ(dlsym(RTLD_DEFAULT, powerNode1Name), reinterpret_cast<void*>(&orvInstrumentationPowerNode1));
+    EXPECT_EQ(dlsym(RTLD_DEFAULT, powerState1Name), reinterpret_cast<void*>(&orvInstrumentationPowerState1));
     EXPECT_EQ(dlsym(RTLD_DEFAULT, cancelRequest1Name), reinterpret_cast<void*>(&orvInstrumentationCancelRequest1));
 }
 
@@ -196,6 +197,7 @@ TEST_F(Cursor, WritesThePowerStateAndReadsItBack) {
     EXPECT_EQ(state, 9);
     EXPECT_TRUE(cursor.getProperty(powerState, state));
     EXPECT_EQ(state, 9);
+    EXPECT_EQ(orvInstrumentationPowerState1(), 9);
     EXPECT_THAT(takeLog(), ElementsAre("log 10000 Corvane.Instrumentation Power request accepted: reboot of simulated "
                                        "node system, over in 3600 s" +
                                        askedByThis));

@@ -14,8 +14,10 @@
 #include <limits>
 #include <thread>
 
+#include <sys/ptrace.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 namespace {
 
@@ -419,6 +421,55 @@ INSTANTIATE_TEST_SUITE_P(
                     FailingCall{"futimens", EPERM, ".new: cannot be put in place: Operation not permitted"},
                     FailingCall{"fsync", EIO, ".new: cannot be put in place: Input/output error"},
                     FailingCall{"rename", EACCES, ".new: cannot be put in place: Permission denied"}));
+
+/**
+ * Stores a request in a process of its own, which is killed after so many entries into system calls and returns from
+ * them. @return whether it was killed; false if it ended before.
+ */
+bool killWhileStoring(const std::filesystem::path& file, const PowerRequest& request, int stops) {
+    const pid_t child = fork();
+    if (child == 0) {
+        ptrace(PTRACE_TRACEME, 0, nullptr, nullptr);
+        raise(SIGSTOP);
+        StateFile(file).update([&](PowerRequests& requests) { requests.insert_or_assign("system", request); });
+        _exit(0);
+    }
+    int status = 0;
+    for (waitpid(child, &status, 0); WIFSTOPPED(status) && stops > 0; --stops) {
+        ptrace(PTRACE_SYSCALL, child, nullptr, nullptr);
+        waitpid(child, &status, 0);
+    }
+    if (!WIFSTOPPED(status)) {
+        EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+        return false;
+    }
+    kill(child, SIGKILL);
+    waitpid(child, &status, 0);
+    return true;
+}
+
+TEST_F(Simulated, IsWholeWheneverAProcessIsKilledWhileItStoresARequest) {
+    const auto requestOver = [](int time) {
+        return PowerRequest{powerTransitions.begin(), TimePoint(std::chrono::milliseconds(time))};
+    };
+    const auto over = [&] { return StateFile(stateFile).read()->at("system").over; };
+    int stops = 0;
+    bool killed = true;
+    bool wasStored = false;
+    while (killed) {
+        const PowerRequest before = requestOver(2 * stops);
+        const PowerRequest after = requestOver(2 * stops + 1);
+        StateFile(stateFile).update([&](PowerRequests& requests) { requests.insert_or_assign("system", before); });
+        killed = killWhileStoring(stateFile, after, stops);
+        ASSERT_THAT(over(), testing::AnyOf(before.over, after.over)) << "killed after " << stops << " stops";
+        ASSERT_THAT(folder.filesThatBegin("state.json.damaged"), IsEmpty()) << "killed after " << stops << " stops";
+        wasStored = wasStored || (killed && over() == after.over);
+        ++stops;
+    }
+    EXPECT_EQ(over(), requestOver(2 * (stops - 1) + 1).over);
+    EXPECT_GT(stops, 20);
+    EXPECT_TRUE(wasStored) << "by a process that was killed before its end";
+}
 
 TEST_F(Simulated, IsWrittenOnWhereASignalInterrupts) {
     AgentTest::failNext("write", EINTR);

@@ -4,6 +4,7 @@
 #ifndef CONFIG_POWERSTATES_H
 #define CONFIG_POWERSTATES_H
 
+#include <algorithm>
 #include <array>
 #include <string>
 #include <string_view>
@@ -45,22 +46,28 @@ inline constexpr std::array<std::pair<std::string_view, unsigned int>, 15> suppo
     {"power-cycle-off-hard-graceful", 16},
 }};
 
-/** The value of CIM_AssociatedPowerManagementService.PowerState (DMTF) that clients see for a value of property 123,
- * with its meaning. */
+/**
+ * The values of property 123 in which a machine stays, each with the value of
+ * CIM_AssociatedPowerManagementService.PowerState (DMTF) that clients see for it, and its meaning. A machine with any
+ * other value is on its way from one of these states to another.
+ */
+inline constexpr std::array<std::pair<unsigned int, std::string_view>, 3> lastingPowerStates{{
+    {1, "2 (On)"},
+    {8, "7 (Hibernate (Off - Soft))"},
+    {10, "12 (Off - Soft Graceful)"},
+}};
+
+inline bool isLasting(unsigned int state) {
+    return std::ranges::find(lastingPowerStates, state, &std::pair<unsigned int, std::string_view>::first) !=
+           lastingPowerStates.end();
+}
+
+/** What clients see for a value of property 123. */
 inline std::string shownPowerState(unsigned int state) {
-    constexpr unsigned int running = 1;
-    constexpr unsigned int hibernating = 8;
-    constexpr unsigned int off = 10;
-    switch (state) {
-    case running:
-        return "2 (On)";
-    case hibernating:
-        return "7 (Hibernate (Off - Soft))";
-    case off:
-        return "12 (Off - Soft Graceful)";
-    default:
-        return "1 (Other), as while it reboots or shuts down";
-    }
+    const auto* const lasting =
+        std::ranges::find(lastingPowerStates, state, &std::pair<unsigned int, std::string_view>::first);
+    return std::string(lasting == lastingPowerStates.end() ? "1 (Other), as while it reboots or shuts down"
+                                                           : lasting->second);
 }
 
 } // namespace Norv::Agent

@@ -201,18 +201,24 @@ private:
         subcommand.add_option("--service", _options.service, "Path of the service, if there are several")
             ->type_name("PATH");
         subcommand
-            .add_flag("--wait{300}", _waitSeconds,
-                      "Wait until the request is done, for at most SECONDS (--wait=SECONDS; --wait alone: 300)")
-            ->check(CLI::Range(0.0, longestWait))
-            ->each([this](const std::string& seconds) { _options.waitSeconds = std::stod(seconds); });
+            .add_option_function<std::string>(
+                "--wait",
+                [this](const std::string& seconds) {
+                    _options.waitSeconds = seconds.empty() ? usualWait : std::stod(seconds);
+                },
+                "Wait until the request is done, for at most SECONDS (default: 300)")
+            ->expected(0, 1)
+            ->check(CLI::Range(0.0, longestWait).description(""))
+            ->type_name("[SECONDS]");
         subcommand.add_flag("--yes", _options.yes, "Do not ask for confirmation, even if the machine is not simulated");
     }
 
+    /* In seconds. */
+    static constexpr double usualWait = 300;
     static constexpr double longestWait = 86400;
 
     CLI::App _app;
     Options _options;
-    std::string _waitSeconds;
     /** The names of all commands. */
     std::vector<std::string> _names;
     /** The name of the command to run. */

@@ -1,3 +1,4 @@
+#include "config/PowerStates.h"
 #include "orvcim/Commands.h"
 #include "text/ObjectPathText.h"
 #include "text/StatusText.h"
@@ -89,13 +90,16 @@ Rows rowsOf(const Session& session, const std::vector<Instance>& states) {
     return rows;
 }
 
+[[noreturn]] void failAsUnknown(Session& session) {
+    const std::string reasons = reasonsText(session.log().failuresSince(0), ": ");
+    throw Failure("the power state is unknown" + (reasons.empty() ? ": 'orvcim check' says what is wrong" : reasons));
+}
+
 /** Throws if there is no state, or if one of them is not known. */
 void requireKnown(Session& session, const std::vector<Instance>& states) {
     if (states.empty() ||
         !std::ranges::all_of(states, [](const Instance& each) { return stateOf(each).has_value(); })) {
-        const std::string reasons = reasonsText(session.log().failuresSince(0), ": ");
-        throw Failure("the power state is unknown" +
-                      (reasons.empty() ? ": 'orvcim check' says what is wrong" : reasons));
+        failAsUnknown(session);
     }
 }
 
@@ -171,21 +175,40 @@ std::string nameOf(const ObjectPath& system) {
     return name == nullptr ? formatLocalPath(system) : plainText(name->value, nullptr);
 }
 
-/** Waits until the service's system has completed the request, and shows its power state. */
-void waitForEnd(Session& session, const ObjectPath& service) {
+/** The machine that a service switches. */
+struct Switched {
+    ObjectPath service;
+    std::string system;
+};
+
+/** The machine's power state, for people; no value while it is on its way from one state to another. */
+std::optional<std::string> lastingState(Session& session, const Switched& machine) {
+    // Of several nodes, clients see the state of the first by name, and requests go to the first in the tree.
+    if (session.log().tellsPowerState()) {
+        const std::optional<unsigned int> state = session.log().powerState();
+        if (!state) {
+            failAsUnknown(session);
+        }
+        return Norv::Agent::isLasting(*state) ? std::optional(Norv::Agent::shownPowerState(*state)) : std::nullopt;
+    }
+    std::vector<Instance> states = instancesOf(session, associationClass);
+    std::erase_if(states, [&](const Instance& state) {
+        const NamedValue* const end = find(state.properties, "ServiceProvided");
+        return end == nullptr || !(end->value == referenceValue(machine.service));
+    });
+    requireKnown(session, states);
+    return stateOf(states.front()) == otherPowerState ? std::nullopt
+                                                      : std::optional(stateText(session, states.front()));
+}
+
+/** Waits until the machine has completed the request, and shows its power state. */
+void waitForEnd(Session& session, const Switched& machine) {
     using Clock = std::chrono::steady_clock;
     const std::chrono::duration<double> longest(*session.options().waitSeconds);
     const Clock::time_point start = Clock::now();
     for (;; std::this_thread::sleep_for(lookAgain)) {
-        std::vector<Instance> states = instancesOf(session, associationClass);
-        std::erase_if(states, [&](const Instance& state) {
-            const NamedValue* const end = find(state.properties, "ServiceProvided");
-            return end == nullptr || !(end->value == referenceValue(service));
-        });
-        requireKnown(session, states);
-        if (stateOf(states.front()) != otherPowerState) {
-            session.out() << nameBehind(session, states.front(), "UserOfService") << ": "
-                          << stateText(session, states.front()) << '\n';
+        if (const std::optional<std::string> state = lastingState(session, machine)) {
+            session.out() << machine.system << ": " << *state << '\n';
             return;
         }
         if (Clock::now() - start >= longest) {
@@ -220,7 +243,7 @@ void requestPowerState(Session& session, const PowerRequest& request) {
         session.out() << outcome.remark << '\n' << std::flush;
     }
     if (session.options().waitSeconds) {
-        waitForEnd(session, service);
+        waitForEnd(session, {service, nameOf(system)});
     }
 }
 

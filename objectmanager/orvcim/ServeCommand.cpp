@@ -1,5 +1,6 @@
 #include "audit/CallRecord.h"
 #include "cimxml/Service.h"
+#include "orvcim/AgentExamination.h"
 #include "orvcim/Commands.h"
 #include "orvcim/ServeLog.h"
 #include "orvcim/ServiceManager.h"
@@ -46,6 +47,12 @@ Server::Settings settingsOf(const ServeOptions& options) {
     return settings;
 }
 
+/** What is wrong with the agent's configuration, and which command says more, in one line; empty if nothing is. */
+std::string configurationProblem() {
+    const std::string problem = problemOfConfiguration();
+    return problem.empty() ? problem : problem + " ('orvcim check' says more)";
+}
+
 /**
  * Refuses settings that would let others in unprotected: another address than loopback needs TLS and log-ins, and a
  * machine that is not simulated needs log-ins.
@@ -59,6 +66,10 @@ void requireProtection(Session& session, const Server::Settings& settings) {
     }
     if (authenticated) {
         return;
+    }
+    // Providers would say the same in many words each.
+    if (const std::string problem = configurationProblem(); !problem.empty()) {
+        throw Failure("the machine is not known: " + problem);
     }
     const std::string problem = session.loadAgent();
     if (!session.log().isSimulated()) {
@@ -179,6 +190,10 @@ void serve(Session& session) {
     const Signals signals;
     ServeLog serveLog(options.syslog);
     const Server::Log log = [&serveLog](const std::string& line) { serveLog.write(line); };
+
+    if (const std::string problem = configurationProblem(); !problem.empty()) {
+        log("no power-management node is offered: " + problem);
+    }
 
     std::optional<Server::PamAuthenticator> authenticator;
     if (options.authenticate) {

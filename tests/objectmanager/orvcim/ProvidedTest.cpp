@@ -1,5 +1,7 @@
 #include "Provided.h"
 
+#include <chrono>
+
 #include <gmock/gmock.h>
 
 #include <unistd.h>
@@ -182,6 +184,18 @@ TEST_F(ProvidedTest, TakesBackWhatIsUnderWay) {
 TEST_F(ProvidedTest, WaitsForARebootUntilTheMachineIsOnAgain) {
     configure("reboot-time = 1\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n");
     EXPECT_THAT(answerOf({"power", "reboot", "--wait"}), HasSubstr("\nmachine.example: 2 (On)\n"));
+}
+
+TEST_F(ProvidedTest, WaitsForTheNodeThatWasSwitchedAndForNoOther) {
+    configure("reboot-time = 2\n[[instrumentation.simulated.node]]\npath = \"z\"\n"
+              "[[instrumentation.simulated.node]]\npath = \"a\"\npower-state = \"off\"\n");
+    const std::string service = "TALVO_PowerManagementService.CreationClassName=\"TALVO_PowerManagementService\","
+                                "Name=\"PowerStateManagement_z\",SystemCreationClassName=\"TALVO_ComputerSystem\","
+                                "SystemName=\"machine.example\"";
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_THAT(answerOf({"power", "reboot", "--wait", "--service", service}),
+                HasSubstr("\nmachine.example: 2 (On)\n"));
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
 }
 
 TEST_F(ProvidedTest, ShowsTheStateWheneverItChanges) {

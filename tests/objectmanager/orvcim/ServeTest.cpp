@@ -162,12 +162,17 @@ TEST_F(ServeTest, DoesNotServeAMachineThatMayBeRealWithoutLogIns) {
     EXPECT_THAT(server.firstLine(), StartsWith("Listening on http://127.0.0.1:"));
 }
 
-TEST_F(ServeTest, TellsWhyTheMachineIsNotKnown) {
+TEST_F(ServeTest, SaysOfABrokenConfigurationInOneLineWhatToMend) {
     std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
+    const std::string problem = (_folder / "agent.toml").string() +
+                                ":2: instrumentation.backend: \"guess\": expected \"simulated\" or \"logind\" "
+                                "('orvcim check' says more)\n";
     const Outcome outcome = refused({});
-    EXPECT_THAT(outcome.err, HasSubstr("orvcim: the machine is not known to be a simulated one; the agent logged: " +
-                                       (_folder / "agent.toml").string() + ":2: "));
+    EXPECT_EQ(outcome.err, "orvcim: the machine is not known: " + problem);
+    EXPECT_EQ(outcome.out, "");
     EXPECT_EQ(outcome.status, 1);
+    serve({"--authenticate", "--power-group=daemon"});
+    EXPECT_EQ(_server->errWith("\n"), "orvcim: no power-management node is offered: " + problem);
 }
 
 struct Usage {

@@ -105,7 +105,7 @@ thread_local Arena::Meter* Arena::Meter::_ofThread = nullptr;
 
 Arena::~Arena() {
     if (_meter != nullptr) {
-        _meter->_bytes -= _bytes;
+        _meter->_bytes -= _held;
     }
     if (_chunks != nullptr) {
         Pool::instance().release(_chunks);
@@ -137,7 +137,7 @@ void* Arena::do_allocate(std::size_t bytes, std::size_t alignment) {
         return block;
     }
     if (static_cast<std::size_t>(_end - _next) < size) {
-        count(chunkBytes);
+        take(chunkBytes);
         Chunk* chunk = Pool::instance().acquire();
         chunk->next = _chunks;
         _chunks = chunk;
@@ -161,11 +161,8 @@ void Arena::do_deallocate(void* block, std::size_t bytes, std::size_t /*alignmen
             large->next->previous = large->previous;
         }
         ::operator delete(large);
+        give(roundUp(sizeof(LargeBlock), granule) + bytes);
         largeBlocks.fetch_sub(1, std::memory_order_relaxed);
-        if (_meter != nullptr) {
-            _bytes -= roundUp(sizeof(LargeBlock), granule) + bytes;
-            _meter->_bytes -= roundUp(sizeof(LargeBlock), granule) + bytes;
-        }
         return;
     }
     const std::size_t size = roundUp(bytes, granule);
@@ -174,13 +171,32 @@ void Arena::do_deallocate(void* block, std::size_t bytes, std::size_t /*alignmen
     ASAN_POISON_MEMORY_REGION(block, size);
 }
 
+void Arena::take(std::size_t bytes) {
+    if (bytes > _limit - _held) {
+        _exhausted = true;
+        throw std::bad_alloc();
+    }
+    _held += bytes;
+    if (_meter != nullptr) {
+        _meter->_bytes += bytes;
+        _meter->grow(_meter->_bytes);
+    }
+}
+
+void Arena::give(std::size_t bytes) {
+    _held -= bytes;
+    if (_meter != nullptr) {
+        _meter->_bytes -= bytes;
+    }
+}
+
 void* Arena::allocateLarge(std::size_t bytes) {
     constexpr std::size_t head = roundUp(sizeof(LargeBlock), granule);
     // No object is larger, and sums with such sizes do not overflow.
     if (bytes > PTRDIFF_MAX - head) {
         throw std::bad_alloc();
     }
-    count(head + bytes);
+    take(head + bytes);
     auto* block = new (::operator new(head + bytes)) LargeBlock{_large, nullptr};
     if (_large != nullptr) {
         _large->previous = block;
@@ -188,14 +204,6 @@ void* Arena::allocateLarge(std::size_t bytes) {
     _large = block;
     largeBlocks.fetch_add(1, std::memory_order_relaxed);
     return reinterpret_cast<std::byte*>(block) + head;
-}
-
-void Arena::count(std::size_t bytes) {
-    if (_meter != nullptr) {
-        _bytes += bytes;
-        _meter->_bytes += bytes;
-        _meter->grow(_meter->_bytes);
-    }
 }
 
 } // namespace ObjectManager

@@ -4,6 +4,7 @@
 
 #include <array>
 #include <cstddef>
+#include <limits>
 #include <memory_resource>
 
 namespace ObjectManager {
@@ -42,10 +43,15 @@ public:
         std::size_t _bytes = 0;
     };
 
-    Arena() : _meter(Meter::_ofThread) {}
+    /** @param limit how many bytes the arena holds at most; an allocation that needs more fails with std::bad_alloc. */
+    explicit Arena(std::size_t limit = std::numeric_limits<std::size_t>::max())
+        : _limit(limit), _meter(Meter::_ofThread) {}
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
     ~Arena() override;
+
+    /** Whether an allocation has failed because of the limit. */
+    bool isExhausted() const { return _exhausted; }
 
     /** What all arenas of the process hold now. */
     struct Usage {
@@ -69,18 +75,23 @@ private:
     bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override { return this == &other; }
 
     void* allocateLarge(std::size_t bytes);
-    /** Counts bytes that are about to be taken. */
-    void count(std::size_t bytes);
+    /** Counts what the arena is about to take. @throws std::bad_alloc if that is more than the limit. */
+    void take(std::size_t bytes);
+    /** Counts what the arena has given back. */
+    void give(std::size_t bytes);
 
-    /** Null where nobody wants to know. */
-    Meter* const _meter;
-    std::size_t _bytes = 0;
     Chunk* _chunks = nullptr;
     std::byte* _next = nullptr;
     std::byte* _end = nullptr;
     /** Blocks to use again, by size in granules. */
     std::array<FreeBlock*, smallBytes / granule + 1> _free{};
     LargeBlock* _large = nullptr;
+    const std::size_t _limit;
+    /** Null where nobody wants to know. */
+    Meter* const _meter;
+    /** In bytes, of chunks and large blocks. */
+    std::size_t _held = 0;
+    bool _exhausted = false;
 };
 
 } // namespace ObjectManager

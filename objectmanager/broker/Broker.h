@@ -12,6 +12,7 @@
 
 #include "cmpift.h"
 
+#include <cstddef>
 #include <functional>
 #include <string>
 #include <string_view>
@@ -28,6 +29,14 @@ struct BrokerMessage {
     /** The identifier of a log message, the component of a trace. */
     std::string source;
     std::string text;
+};
+
+/** How much one request to a provider may take. */
+struct RequestLimits {
+    /** Instances, object paths and values that the provider returns. */
+    std::size_t objects = 100'000;
+    /** Memory of all CMPI objects of the request, those that are returned among them. */
+    std::size_t bytes = std::size_t{192} * 1024 * 1024;
 };
 
 /** Called from any thread; must not throw. */
@@ -55,12 +64,18 @@ public:
 
     Operations* upCalls() const { return _upCalls; }
     const ClassInformation* classes() const { return _classes; }
+
+    /** Holds for the requests that begin from now on. Not to be called while there are any. */
+    void setLimits(const RequestLimits& limits) { _limits = limits; }
+    const RequestLimits& limits() const { return _limits; }
+
     void message(const BrokerMessage& message) const { _sink(message); }
 
 private:
     CMPIBroker _handle;
     Operations* _upCalls;
     const ClassInformation* _classes;
+    RequestLimits _limits;
     MessageSink _sink;
 };
 

@@ -9,7 +9,8 @@ thread_local Request* currentRequest = nullptr;
 } // namespace
 
 Request::Request(const Broker& broker)
-    : _broker(broker), _outer(currentRequest), _depth(_outer != nullptr ? _outer->_depth + 1 : 1) {
+    : _broker(broker), _outer(currentRequest), _depth(_outer != nullptr ? _outer->_depth + 1 : 1),
+      _arena(broker.limits().bytes) {
     currentRequest = this;
 }
 
@@ -52,6 +53,25 @@ const char** Request::propertyList(const PropertyList& properties) {
                                        [this](const std::string& name) { return copyText(_arena, name); });
     *last = nullptr;
     return names;
+}
+
+std::string Request::excess() const {
+    const RequestLimits& limits = _broker.limits();
+    if (_objects > limits.objects) {
+        return "returned more than " + std::to_string(limits.objects) + " objects, which one request may have at most";
+    }
+    if (_arena.isExhausted()) {
+        return "needed more than " + std::to_string(limits.bytes) + " bytes, which one request may have at most";
+    }
+    return "";
+}
+
+bool Request::countObject() {
+    // One more than there may be stands for any number of them.
+    if (_objects <= _broker.limits().objects) {
+        ++_objects;
+    }
+    return _objects <= _broker.limits().objects;
 }
 
 void Request::reportMisuse(std::string_view what) {

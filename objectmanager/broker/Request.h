@@ -5,6 +5,7 @@
 #include "broker/Arena.h"
 #include "broker/Broker.h"
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -42,6 +43,14 @@ public:
     const char** propertyList(const PropertyList& properties);
 
     /**
+     * Which limit the request has exceeded, as the end of a sentence that begins with the provider's name; empty if it
+     * has exceeded none.
+     */
+    std::string excess() const;
+    /** Counts an object that the provider returns. @return whether there may be one more. */
+    bool countObject();
+
+    /**
      * What the provider first did against the rules of the interface, as the end of a sentence that begins with its
      * name ("released a CMPIString twice"); empty as long as it did nothing.
      */
@@ -66,6 +75,7 @@ private:
     ObjectHeader* _newest = nullptr;
     ObjectHeader* _buried = nullptr;
     std::string _misuse;
+    std::size_t _objects = 0;
 };
 
 /** The arguments that a CMPI object holds, as values; none where it holds nothing. */

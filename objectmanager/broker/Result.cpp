@@ -67,6 +67,10 @@ bool Result::open(const char* attempt) {
     return !_closed;
 }
 
+bool Result::mayTake(const char* attempt) {
+    return open(attempt) && _request.countObject();
+}
+
 /**
  * The content as it is now. An object of this request is marked, so that it copies its content before it is changed;
  * the content of any other object is copied here.
@@ -90,7 +94,7 @@ Instance Result::instance(std::size_t index) const {
 
 CMPIStatus Result::returnPath(const CMPIObjectPath* path) {
     CMPIStatus status = statusOf(CMPI_RC_ERR_FAILED);
-    PathContent* content = open("an object path") ? returned(_request, path, status) : nullptr;
+    PathContent* content = mayTake("an object path") ? returned(_request, path, status) : nullptr;
     if (content != nullptr) {
         _paths.push_back(keep(path, *content));
     }
@@ -99,7 +103,7 @@ CMPIStatus Result::returnPath(const CMPIObjectPath* path) {
 
 CMPIStatus Result::returnInstance(const CMPIInstance* instance) {
     CMPIStatus status = statusOf(CMPI_RC_ERR_FAILED);
-    InstanceContent* content = open("an instance") ? returned(_request, instance, status) : nullptr;
+    InstanceContent* content = mayTake("an instance") ? returned(_request, instance, status) : nullptr;
     if (content != nullptr) {
         _instances.push_back(keep(instance, *content));
     }
@@ -107,7 +111,7 @@ CMPIStatus Result::returnInstance(const CMPIInstance* instance) {
 }
 
 CMPIStatus Result::returnData(const CMPIValue* value, CMPIType type) {
-    if (!open("a value")) {
+    if (!mayTake("a value")) {
         return statusOf(CMPI_RC_ERR_FAILED);
     }
     Item item;

@@ -50,6 +50,8 @@ public:
 
 private:
     bool open(const char* attempt);
+    /** Whether the result is open, and the request may have one more object. */
+    bool mayTake(const char* attempt);
     template <typename Handle, typename Content>
     const Content* keep(const Handle* object, Content& content);
 

@@ -2,7 +2,7 @@
 #ifndef CIMXML_STATUSCODES_H
 #define CIMXML_STATUSCODES_H
 
-#include "cmpidt.h"
+#include "model/CimError.h"
 
 namespace ObjectManager::CimXml {
 
@@ -10,7 +10,6 @@ constexpr auto invalidEnumerationContext = static_cast<CMPIrc>(21);
 constexpr auto invalidOperationTimeout = static_cast<CMPIrc>(22);
 constexpr auto filteredEnumerationNotSupported = static_cast<CMPIrc>(25);
 constexpr auto continuationOnErrorNotSupported = static_cast<CMPIrc>(26);
-constexpr auto serverLimitsExceeded = static_cast<CMPIrc>(27);
 
 /** A code as clients are told it: what is none of CIM's is a failure. */
 constexpr CMPIrc sentCode(CMPIrc code) {

@@ -127,8 +127,13 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
             {CMPIPrincipal, stringValue(invocation.principal)},
         });
         CMPIStatus status{CMPI_RC_OK, nullptr};
-        if (std::optional<std::string> thrown =
-                callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); })) {
+        const std::optional<std::string> thrown =
+            callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); });
+        // What the provider makes of an exceeded limit is of no interest.
+        if (const std::string excess = request.excess(); !excess.empty()) {
+            throw CimError(serverLimitsExceeded, registration.provider + ' ' + excess);
+        }
+        if (thrown) {
             throw CimError(CMPI_RC_ERR_FAILED, registration.provider + ' ' + *thrown);
         }
         requireSuccess(registration, operation, status, request, result);

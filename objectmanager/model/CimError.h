@@ -10,6 +10,9 @@
 
 namespace ObjectManager {
 
+/** The status code CIM_ERR_SERVER_LIMITS_EXCEEDED (DSP0200), which CMPI has no name for. */
+constexpr auto serverLimitsExceeded = static_cast<CMPIrc>(27);
+
 /** An operation that failed; what() is one line for the person who asked. */
 struct CimError : std::runtime_error {
     CimError(CMPIrc failure, const std::string& message) : std::runtime_error(message), code(failure) {}

@@ -110,6 +110,8 @@ void addServeOptions(CLI::App& command, ServeOptions& options) {
              "Connections that may be open from one network at the same time");
     addTime(command, "--request-time", limits.requestTime, "Seconds within which a request must arrive");
     addTime(command, "--idle-time", limits.idleTime, "Seconds after which an idle connection is closed");
+    addCount(command, "--max-objects", options.request.objects, "Objects that a provider returns for one request");
+    addCount(command, "--max-memory", options.request.bytes, "Bytes of all objects of one request");
     addCount(command, "--max-enumerations", options.enumerations.count,
              "Enumerations that may be open at the same time; one user may have half of them");
     addCount(command, "--max-enumeration-bytes", options.enumerations.bytes,

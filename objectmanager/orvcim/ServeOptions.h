@@ -4,6 +4,7 @@
 #ifndef ORVCIM_SERVEOPTIONS_H
 #define ORVCIM_SERVEOPTIONS_H
 
+#include "broker/Broker.h"
 #include "cimxml/Enumerations.h"
 #include "server/Settings.h"
 
@@ -22,6 +23,7 @@ struct ServeOptions {
     /** The server's settings. Its port and TLS files are not set by the options, but by the members below. */
     Server::Settings server;
     CimXml::EnumerationLimits enumerations;
+    RequestLimits request;
     /** No value for the protocol's own port: 5988, with TLS 5989. */
     std::optional<std::uint16_t> port;
     /** The files of the certificate and its key; empty without TLS. */

@@ -1,5 +1,7 @@
 #include "text/StatusText.h"
 
+#include "model/CimError.h"
+
 #include <algorithm>
 #include <array>
 #include <string_view>
@@ -13,7 +15,7 @@ struct CodeName {
     std::string_view name;
 };
 
-constexpr std::array<CodeName, 24> codeNames{
+constexpr std::array<CodeName, 25> codeNames{
     {{CMPI_RC_OK, "CIM_OK"},
      {CMPI_RC_ERR_FAILED, "CIM_ERR_FAILED"},
      {CMPI_RC_ERR_ACCESS_DENIED, "CIM_ERR_ACCESS_DENIED"},
@@ -32,6 +34,7 @@ constexpr std::array<CodeName, 24> codeNames{
      {CMPI_RC_ERR_INVALID_QUERY, "CIM_ERR_INVALID_QUERY"},
      {CMPI_RC_ERR_METHOD_NOT_AVAILABLE, "CIM_ERR_METHOD_NOT_AVAILABLE"},
      {CMPI_RC_ERR_METHOD_NOT_FOUND, "CIM_ERR_METHOD_NOT_FOUND"},
+     {serverLimitsExceeded, "CIM_ERR_SERVER_LIMITS_EXCEEDED"},
      {CMPI_RC_DO_NOT_UNLOAD, "CMPI_RC_DO_NOT_UNLOAD"},
      {CMPI_RC_NEVER_UNLOAD, "CMPI_RC_NEVER_UNLOAD"},
      {CMPI_RC_ERR_INVALID_HANDLE, "CMPI_RC_ERR_INVALID_HANDLE"},

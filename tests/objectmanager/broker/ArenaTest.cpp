@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <cstring>
+#include <new>
 #include <set>
 #include <vector>
 
@@ -33,6 +34,23 @@ TEST(ArenaTest, ReleasedBlocksAreUsedAgain) {
     }
     EXPECT_EQ(before.chunksInUse + 1, Arena::usage().chunksInUse);
     EXPECT_EQ(before.largeBlocks, Arena::usage().largeBlocks);
+}
+
+TEST(ArenaTest, HoldsNoMoreThanItsLimit) {
+    Arena arena(2 * Arena::chunkBytes);
+    constexpr std::size_t large = Arena::chunkBytes / 2;
+    for (int count = 0; count < 100; ++count) {
+        arena.deallocate(arena.allocate(large), large);
+    }
+    EXPECT_FALSE(arena.isExhausted());
+    EXPECT_THROW(static_cast<void>(arena.allocate(2 * Arena::chunkBytes)), std::bad_alloc);
+    EXPECT_TRUE(arena.isExhausted());
+    const auto fill = [&arena] {
+        for (std::size_t size = 0; size <= 2 * Arena::chunkBytes; size += 100) {
+            static_cast<void>(arena.allocate(100));
+        }
+    };
+    EXPECT_THROW(fill(), std::bad_alloc);
 }
 
 TEST(ArenaTest, LargeBlocksAreReleasedInAnyOrderAndWithTheArena) {

@@ -30,6 +30,7 @@ protected:
                                       "Test_ReturnsOneAndLeavesOpen",
                                       "Test_ClosesEmpty",
                                       "Test_ReturnsTwo",
+                                      "Test_ReturnsMany",
                                       "Test_ReturnsNull",
                                       "Test_ReturnsReleased",
                                       "Test_ReleasesTwice",
@@ -246,6 +247,20 @@ TEST_F(DispatcherTest, GettingAnInstanceThatIsNotReturnedIsNotFound) {
     EXPECT_THAT(getFailure("Test_ClosesEmpty"), isError(CMPI_RC_ERR_NOT_FOUND, "there is no such instance"));
     EXPECT_THAT(getFailure("Test_ReturnsTwo"),
                 isError(CMPI_RC_ERR_FAILED, "TestProvider returned 2 instances, expected one"));
+}
+
+TEST_F(DispatcherTest, ARequestHasSoManyObjectsAndBytesAtMost) {
+    const auto getMany = [&] { dispatcher.enumerateInstances(invocation, path("Test_ReturnsMany"), std::nullopt); };
+    dispatcher.broker().setLimits({.objects = 10'000});
+    getMany();
+    dispatcher.broker().setLimits({.objects = 9'999});
+    EXPECT_THAT(failureOf(getMany),
+                isError(serverLimitsExceeded,
+                        "TestProvider returned more than 9999 objects, which one request may have at most"));
+    dispatcher.broker().setLimits({.bytes = 1'000'000});
+    EXPECT_THAT(failureOf(getMany),
+                isError(serverLimitsExceeded,
+                        "TestProvider needed more than 1000000 bytes, which one request may have at most"));
 }
 
 TEST_F(DispatcherTest, TheOtherInstanceOperationsHaveToCloseTheirResult) {

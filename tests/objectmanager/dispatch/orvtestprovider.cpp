@@ -124,6 +124,14 @@ const std::map<std::string, Behaviour> behaviours = {
          CMReturnDone(call.result);
          return ok;
      }},
+    {"Test_ReturnsMany",
+     [](const Call& call) {
+         for (int count = 0; count < 10'000; ++count) {
+             CMReturnInstance(call.result, disk(call, "a"));
+         }
+         CMReturnDone(call.result);
+         return ok;
+     }},
     {"Test_ReturnsNull",
      [](const Call& call) {
          CMReturnInstance(call.result, nullptr);

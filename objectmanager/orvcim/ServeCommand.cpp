@@ -201,9 +201,12 @@ void serve(Session& session) {
         reportMissingGroups(options.pam, log);
     }
 
+    session.dispatcher().broker().setLimits(options.request);
     const ServiceManager manager;
-    CimXml::Service service(session.dispatcher(), session.catalogue(),
-                            {.enumerations = options.enumerations, .recorder = Audit::makeRecorder(log)});
+    CimXml::Service service(
+        session.dispatcher(), session.catalogue(),
+        {.enumerations = options.enumerations,
+         .recorder = Audit::makeRecorder([&serveLog](const std::string& line) { serveLog.keep(line); })});
     const auto answer = [&](const Server::HttpRequest& request, const Server::Caller& caller) {
         Server::HttpReply reply = service.answer(request, caller);
         // The records of the agent's log concern this request only.

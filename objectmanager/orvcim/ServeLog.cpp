@@ -46,11 +46,21 @@ ServeLog::~ServeLog() {
 void ServeLog::write(const std::string& line) {
     {
         const std::lock_guard lock(_queue->mutex);
-        if (_queue->lines.size() >= room) {
+        if (_queue->lines.size() - _queue->aboutSwitch >= room) {
             ++_queue->leftOut;
             return;
         }
-        _queue->lines.push_back(line);
+        _queue->lines.push_back({line, false});
+    }
+    _queue->changed.notify_all();
+}
+
+void ServeLog::keep(const std::string& line) {
+    {
+        std::unique_lock lock(_queue->mutex);
+        _queue->changed.wait(lock, [this] { return _queue->ending || _queue->aboutSwitch < roomForSwitch; });
+        _queue->lines.push_back({line, true});
+        ++_queue->aboutSwitch;
     }
     _queue->changed.notify_all();
 }
@@ -67,15 +77,17 @@ void ServeLog::Queue::run() {
         if (ending) {
             break;
         }
-        std::string line = std::move(lines.front());
+        const Line line = std::move(lines.front());
         lines.pop_front();
+        aboutSwitch -= line.isAboutSwitch ? 1 : 0;
         if (lines.empty() && leftOut > 0) {
-            lines.push_back(fmt::format("{} more lines are left out: the reader of the log is too slow",
-                                        std::exchange(leftOut, 0)));
+            lines.push_back({fmt::format("{} more lines are left out: the reader of the log is too slow",
+                                         std::exchange(leftOut, 0)),
+                             false});
         }
         writing = true;
         lock.unlock();
-        put(line);
+        put(line.text);
         lock.lock();
         writing = false;
         changed.notify_all();

@@ -15,13 +15,15 @@ namespace ObjectManager::Orvcim {
 
 /**
  * Writes lines to standard error or to the system's log, in a thread of its own, so that callers never wait for a slow
- * reader. Lines that the full queue has no room for are dropped and counted; the count is logged later. Used by several
- * threads at once.
+ * reader. Lines that the full queue has no room for are dropped and counted; the count is logged later. Lines about the
+ * power switch are never dropped. Used by several threads at once.
  */
 class ServeLog {
 public:
-    /** How many lines the queue holds. */
+    /** How many lines the queue holds, those about the power switch apart. */
     static constexpr std::size_t room = 4000;
+    /** How many lines about the power switch it holds. */
+    static constexpr std::size_t roomForSwitch = 20'000;
 
     /** @param syslog whether lines go to the system's log, syslog(3), and not to standard error. */
     explicit ServeLog(bool syslog);
@@ -31,6 +33,11 @@ public:
     ~ServeLog();
 
     void write(const std::string& line);
+    /**
+     * Writes a line about the power switch. If there is no room for it, since nobody has read the log for long, the
+     * caller waits until there is: better than a switch without a record, or a server without memory.
+     */
+    void keep(const std::string& line);
     /** Waits until all lines are written. @return false if the time was over before. */
     bool flush(std::chrono::milliseconds time);
 
@@ -39,6 +46,11 @@ private:
     struct Queue {
         explicit Queue(bool toSyslog) : syslog(toSyslog) {}
 
+        struct Line {
+            std::string text;
+            bool isAboutSwitch;
+        };
+
         void run();
         void put(const std::string& line);
         bool isEnding();
@@ -46,7 +58,9 @@ private:
         const bool syslog;
         std::mutex mutex;
         std::condition_variable changed;
-        std::deque<std::string> lines;
+        std::deque<Line> lines;
+        /** How many of the lines are about the power switch. */
+        std::size_t aboutSwitch = 0;
         std::size_t leftOut = 0;
         bool writing = false;
         bool ending = false;

@@ -4,7 +4,10 @@
 
 #include <gmock/gmock.h>
 
+#include <fcntl.h>
+#include <poll.h>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/time.h>
 #include <sys/un.h>
 #include <unistd.h>
@@ -42,6 +45,15 @@ protected:
         std::ofstream(file) << std::ifstream(file + ".certificate").rdbuf() << std::ifstream(file + ".key").rdbuf();
         std::filesystem::permissions(file, std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
         return file;
+    }
+
+    /** Of the certificate that the server shows to a new client. */
+    std::string fingerprint() const {
+        return runProcess({"sh", "-c",
+                           "openssl s_client -connect localhost:" + _port +
+                               " </dev/null 2>/dev/null | openssl x509 -noout -fingerprint -sha256"},
+                          {})
+            .out;
     }
 
     std::string ask(const std::string& options) const {
@@ -294,6 +306,110 @@ TEST_F(ServeTest, ServesWithTls) {
     const std::string system = url("root/cimv2:TALVO_ComputerSystem", "nobody:small", "https");
     EXPECT_THAT(wbemcli({"ein", "-cacert", certificate, system}).out, HasSubstr("machine.example"));
     EXPECT_NE(wbemcli({"ein", system}).status, 0);
+}
+
+TEST_F(ServeTest, takesANewCertificateOnASignalAndKeepsTheOldOneIfTheNewOneIsWrong) {
+    const std::string file = makeCertificate();
+    serve({"--tls-cert", file, "--tls-key", file});
+    const std::string first = fingerprint();
+    EXPECT_THAT(first, HasSubstr("Fingerprint="));
+    makeCertificate();
+    _server->send(SIGHUP);
+    const std::string renewed = "orvcim: read the certificate and its key again\n";
+    EXPECT_THAT(_server->errWith(renewed), HasSubstr(renewed));
+    const std::string second = fingerprint();
+    EXPECT_NE(second, first);
+    std::ofstream(file) << "no certificate\n";
+    _server->send(SIGHUP);
+    EXPECT_THAT(_server->errWith("stay as they were: "),
+                HasSubstr("orvcim: the certificate and its key stay as they were: "));
+    EXPECT_EQ(fingerprint(), second);
+}
+
+TEST_F(ServeTest, refusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCanRead) {
+    const std::string file = makeCertificate();
+    std::filesystem::permissions(file, std::filesystem::perms::others_read, std::filesystem::perm_options::add);
+    serve({"--tls-cert", file, "--tls-key", file});
+    EXPECT_EQ(_server->err(), "orvcim: " + file +
+                                  ": everybody on this machine can read the key (mode 0604), expected mode 0600 or "
+                                  "0640\n");
+
+    const std::string made = (_folder / "made").string();
+    const auto errorWith = [&](const std::string& commands) {
+        const Outcome making =
+            runProcess({"sh", "-ec", "umask 77; mkdir " + made + "; cd " + made + "; " + commands}, {});
+        EXPECT_EQ(making.status, 0) << making.err;
+        const Outcome outcome = refused({"--tls-cert", made + "/certificate", "--tls-key", made + "/key"});
+        EXPECT_EQ(outcome.status, 1);
+        std::filesystem::remove_all(made);
+        return outcome.err;
+    };
+    EXPECT_EQ(errorWith("openssl req -x509 -newkey rsa:1024 -noenc -days 2 -subj /CN=localhost -keyout key -out "
+                        "certificate"),
+              "orvcim: " + made + "/certificate: the key has 1024 bits, expected 2048 or more\n");
+    EXPECT_EQ(
+        errorWith("printf '%s\\n' '[ca]' default_ca=c '[c]' database=index new_certs_dir=. serial=serial policy=p "
+                  "default_md=sha256 '[p]' commonName=supplied >configuration; : >index; echo 01 >serial; "
+                  "openssl req -new -newkey ec -pkeyopt ec_paramgen_curve:P-256 -noenc -subj /CN=localhost -keyout "
+                  "key -out request; openssl ca -batch -notext -config configuration -selfsign -keyfile key -in "
+                  "request -startdate 20200101000000Z -enddate 20210101000000Z -out certificate"),
+        "orvcim: " + made + "/certificate: the certificate was valid until 2021-01-01, expected one that still is\n");
+}
+
+TEST_F(ServeTest, tellsOnASignalHowItIs) {
+    serve();
+    ask(url("[1-3]"));
+    _server->send(SIGUSR1);
+    EXPECT_THAT(
+        _server->errWith(" of memory\n"),
+        MatchesRegex("(orvcim: 127.0.0.1: answered 405.*\n)*orvcim: [0-9]+ connections idle, 0 sending requests, "
+                     "0 logging in, 0 answered, 0 taking answers; since the start 3 requests, 0 connections "
+                     "refused, 0 log-ins good, 0 wrong, [0-9]+ kB of memory\n"));
+}
+
+TEST_F(ServeTest, logsEachRequestIfItIsToldTo) {
+    serve({"--access-log"});
+    ask(url("path"));
+    EXPECT_THAT(_server->errWith(" ms\n"), MatchesRegex("(orvcim: .*\n)?orvcim: 127.0.0.1: - \"GET /path\" 405 [0-9]+ "
+                                                        "[0-9]+\\.[0-9] ms\n(orvcim: .*\n)?"));
+}
+
+TEST_F(ServeTest, boundsWhatOneRequestMayHave) {
+    configure("[[instrumentation.simulated.node]]\npath = \"a\"\n[[instrumentation.simulated.node]]\npath = \"b\"\n");
+    serve({"--max-objects=1"});
+    const Outcome outcome = wbemcli({"ein", url("root/cimv2:TALVO_PowerManagementService")});
+    EXPECT_THAT(outcome.err + outcome.out,
+                HasSubstr("returned more than 1 objects, which one request may have at most"));
+    EXPECT_EQ(wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem")}).status, 0);
+}
+
+TEST_F(ServeTest, losesNoLineAboutTheSwitchIfNobodyReadsTheLog) {
+    const std::string pipe = (_folder / "log-pipe").string();
+    ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+    const int reader = open(pipe.c_str(), O_RDWR | O_NONBLOCK | O_CLOEXEC);
+    ASSERT_GE(reader, 0);
+    RunningProcess server({"sh", "-c", "exec \"$0\" serve --port=0 --access-log 2>" + pipe, ORVCIM_PROGRAM},
+                          environment());
+    const std::string line = server.firstLine();
+    _port = line.substr(line.rfind(':') + 1);
+    // More lines than the pipe and the queue hold.
+    ask("--output /dev/null " + url("[1-5500]"));
+    const Outcome denied =
+        wbemcli({"cm", url(_service), "RequestPowerStateChange.PowerState=2,ManagedElement=" + _system});
+    EXPECT_NE(denied.status, 0);
+    EXPECT_EQ(wbemcli({"cm", url(_service), "RequestPowerStateChange.PowerState=5,ManagedElement=" + _system}).status,
+              0);
+    std::string log;
+    pollfd waiting{reader, POLLIN, 0};
+    while (log.find("the reader of the log is too slow") == std::string::npos && poll(&waiting, 1, 60'000) > 0) {
+        std::array<char, 65536> part{};
+        const ssize_t size = read(reader, part.data(), part.size());
+        log.append(part.data(), size > 0 ? static_cast<std::size_t>(size) : 0);
+    }
+    close(reader);
+    EXPECT_THAT(log, HasSubstr("more lines are left out"));
+    EXPECT_THAT(log, HasSubstr(": refused: "));
+    EXPECT_THAT(log, HasSubstr(": accepted"));
 }
 
 } // namespace

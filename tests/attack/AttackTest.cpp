@@ -8,13 +8,38 @@
 
 #include <gnutls/gnutls.h>
 
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <algorithm>
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
+#include <ctime>
 #include <deque>
 #include <fstream>
 #include <functional>
 #include <sstream>
+
+namespace {
+
+/** By how many seconds the wall clock of this process is wrong. */
+std::atomic<std::time_t> clockIsOffBy = 0;
+
+void setClockOff(std::chrono::seconds by) {
+    clockIsOffBy = static_cast<std::time_t>(by.count());
+}
+
+} // namespace
+
+// Libraries take their clock_gettime from the program.
+extern "C" int clock_gettime(clockid_t clock, timespec* time) noexcept {
+    const int status = static_cast<int>(syscall(SYS_clock_gettime, clock, time));
+    if (status == 0 && clock == CLOCK_REALTIME) {
+        time->tv_sec += clockIsOffBy;
+    }
+    return status;
+}
 
 namespace ServerTest {
 namespace {
@@ -27,6 +52,8 @@ std::chrono::milliseconds attackTime() {
 
 /** The longest wait that a test lets pass, on a machine that has much else to do. */
 constexpr auto patience = 10s;
+/** Half of the waits must be shorter: what is promised to users, and what a busy machine does not easily exceed. */
+constexpr auto usualPatience = 1s;
 
 /** Takes its time for a password, as PAM does, and lets in who has the right one. */
 class SlowDoorkeeper : public Server::Authenticator {
@@ -53,7 +80,15 @@ public:
 
     std::atomic<int> answers = 0;
     std::vector<std::string> errors;
-    std::chrono::steady_clock::duration longest{};
+    /** Of each answer, or failure. */
+    std::vector<std::chrono::steady_clock::duration> waits;
+
+    /** The wait that half of all waits exceed. */
+    std::chrono::steady_clock::duration usualWait() {
+        const auto middle = waits.begin() + static_cast<std::ptrdiff_t>(waits.size() / 2);
+        std::ranges::nth_element(waits, middle);
+        return *middle;
+    }
 
 private:
     void run() {
@@ -65,7 +100,7 @@ private:
             } catch (const std::exception& error) {
                 errors.emplace_back(error.what());
             }
-            longest = std::max(longest, std::chrono::steady_clock::now() - begin);
+            waits.push_back(std::chrono::steady_clock::now() - begin);
             std::this_thread::sleep_for(10ms);
         }
     }
@@ -107,8 +142,11 @@ protected:
         }
         good.stop();
         EXPECT_THAT(good.errors, testing::IsEmpty());
-        EXPECT_LT(good.longest, patience);
-        RecordProperty("longest_ms", static_cast<int>(good.longest / 1ms));
+        const auto longest = *std::ranges::max_element(good.waits);
+        EXPECT_LT(longest, patience);
+        EXPECT_LT(good.usualWait(), usualPatience);
+        RecordProperty("longest_ms", static_cast<int>(longest / 1ms));
+        RecordProperty("usual_ms", static_cast<int>(good.usualWait() / 1ms));
     }
 
     /** A client of the attacker's, from anywhere in 127.0.0.0/8; nothing where it is not let in. */
@@ -203,6 +241,57 @@ TEST_F(AttackTest, largeAnswersThatAreNeverRead) {
         std::this_thread::sleep_for(1ms);
     });
     _server.reset();
+}
+
+TEST_F(AttackTest, answersThatAreDripped) {
+    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
+        return request.body == "much" ? Server::HttpReply{200, {}, std::string(1'000'000, 'x')} : echo(request, caller);
+    });
+    attack([this] {
+        hold(post("much"));
+        const std::size_t several = std::min<std::size_t>(_held.size(), 50);
+        for (std::size_t number = 0; number < several; ++number) {
+            try {
+                _held[number].receiveSome(1);
+            } catch (const std::exception&) {
+                // The server has closed the connection for another one.
+            }
+        }
+    });
+}
+
+TEST_F(AttackTest, slowConnections) {
+    serveWithLogIns();
+    std::size_t next = 0;
+    attack([&] {
+        hold("POST / HTTP/1.1\r\nHost: localhost\r\nX: ");
+        for (int count = 0; count < 20 && !_held.empty(); ++count) {
+            _held[next++ % _held.size()].send("x");
+        }
+    });
+}
+
+TEST_F(AttackTest, stormsOfConnects) {
+    serveWithLogIns();
+    attack([this] {
+        std::deque<HttpClient> storm;
+        for (int count = 0; count < 100; ++count) {
+            if (auto one = attacker()) {
+                storm.push_back(std::move(*one));
+            }
+        }
+    });
+    EXPECT_GT(_attackers, 100U);
+}
+
+TEST_F(AttackTest, clocksThatJumpByYears) {
+    serveWithLogIns();
+    attack([this] {
+        using std::chrono::years;
+        setClockOff(std::chrono::seconds(_attackers % 2 == 0 ? years(10) : -years(10)));
+        hold("POST / HTTP/1.1\r\nHost: localhost\r\nX:");
+    });
+    setClockOff({});
 }
 
 TEST_F(AttackTest, handlersThatHang) {

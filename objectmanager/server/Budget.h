@@ -49,12 +49,13 @@ public:
 private:
     bool take(const std::string& network, std::size_t size) {
         const std::lock_guard lock(_mutex);
-        std::size_t& ofNetwork = _networks[network];
-        if (_taken + size > _bytes || ofNetwork + size > _bytes / 2) {
+        const auto found = _networks.find(network);
+        const std::size_t ofNetwork = found == _networks.end() ? 0 : found->second;
+        if (size > _bytes - _taken || ofNetwork + size > _bytes / 2) {
             return false;
         }
         _taken += size;
-        ofNetwork += size;
+        _networks[network] += size;
         return true;
     }
 

@@ -308,7 +308,7 @@ TEST_F(ServeTest, ServesWithTls) {
     EXPECT_NE(wbemcli({"ein", system}).status, 0);
 }
 
-TEST_F(ServeTest, takesANewCertificateOnASignalAndKeepsTheOldOneIfTheNewOneIsWrong) {
+TEST_F(ServeTest, TakesANewCertificateOnASignalAndKeepsTheOldOneIfTheNewOneIsWrong) {
     const std::string file = makeCertificate();
     serve({"--tls-cert", file, "--tls-key", file});
     const std::string first = fingerprint();
@@ -326,7 +326,7 @@ TEST_F(ServeTest, takesANewCertificateOnASignalAndKeepsTheOldOneIfTheNewOneIsWro
     EXPECT_EQ(fingerprint(), second);
 }
 
-TEST_F(ServeTest, refusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCanRead) {
+TEST_F(ServeTest, RefusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCanRead) {
     const std::string file = makeCertificate();
     std::filesystem::permissions(file, std::filesystem::perms::others_read, std::filesystem::perm_options::add);
     serve({"--tls-cert", file, "--tls-key", file});
@@ -356,7 +356,7 @@ TEST_F(ServeTest, refusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCa
         "orvcim: " + made + "/certificate: the certificate was valid until 2021-01-01, expected one that still is\n");
 }
 
-TEST_F(ServeTest, tellsOnASignalHowItIs) {
+TEST_F(ServeTest, TellsOnASignalHowItIs) {
     serve();
     ask(url("[1-3]"));
     _server->send(SIGUSR1);
@@ -367,14 +367,14 @@ TEST_F(ServeTest, tellsOnASignalHowItIs) {
                      "refused, 0 log-ins good, 0 wrong, [0-9]+ kB of memory\n"));
 }
 
-TEST_F(ServeTest, logsEachRequestIfItIsToldTo) {
+TEST_F(ServeTest, LogsEachRequestIfItIsToldTo) {
     serve({"--access-log"});
     ask(url("path"));
     EXPECT_THAT(_server->errWith(" ms\n"), MatchesRegex("(orvcim: .*\n)?orvcim: 127.0.0.1: - \"GET /path\" 405 [0-9]+ "
                                                         "[0-9]+\\.[0-9] ms\n(orvcim: .*\n)?"));
 }
 
-TEST_F(ServeTest, boundsWhatOneRequestMayHave) {
+TEST_F(ServeTest, BoundsWhatOneRequestMayHave) {
     configure("[[instrumentation.simulated.node]]\npath = \"a\"\n[[instrumentation.simulated.node]]\npath = \"b\"\n");
     serve({"--max-objects=1"});
     const Outcome outcome = wbemcli({"ein", url("root/cimv2:TALVO_PowerManagementService")});
@@ -383,7 +383,7 @@ TEST_F(ServeTest, boundsWhatOneRequestMayHave) {
     EXPECT_EQ(wbemcli({"ein", url("root/cimv2:TALVO_ComputerSystem")}).status, 0);
 }
 
-TEST_F(ServeTest, losesNoLineAboutTheSwitchIfNobodyReadsTheLog) {
+TEST_F(ServeTest, LosesNoLineAboutTheSwitchIfNobodyReadsTheLog) {
     const std::string pipe = (_folder / "log-pipe").string();
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     const int reader = open(pipe.c_str(), O_RDWR | O_NONBLOCK | O_CLOEXEC);

@@ -295,6 +295,25 @@ TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
     EXPECT_EQ(logged().size(), lines);
 }
 
+TEST_F(HttpServerTest, refusesPagesInBrowsersAndNamesThatAreNotItsOwn) {
+    _settings.hosts = {"switch.example"};
+    serve();
+    const auto statusFor = [this](const std::string& host, const std::string& headers = "") {
+        return ask("POST / HTTP/1.1\r\nHost: " + host + "\r\n" + headers + "Content-Length: 0\r\n\r\n").status;
+    };
+    const std::string port = ":" + std::to_string(_server->port());
+    for (const std::string& host :
+         std::vector<std::string>{"localhost", "127.0.0.1", "[::1]", "switch.example", "SWITCH.example"}) {
+        EXPECT_EQ(statusFor(host + port), 200) << host;
+    }
+    for (const std::string& host : std::vector<std::string>{"attacker.example", "localhost.attacker.example",
+                                                            "switch.example.attacker.example"}) {
+        EXPECT_EQ(statusFor(host + port), 400) << host;
+    }
+    EXPECT_EQ(statusFor("localhost", "Origin: http://localhost\r\n"), 403);
+    EXPECT_EQ(statusFor("localhost", "origin: null\r\n"), 403);
+}
+
 TEST_F(HttpServerTest, takesALengthThatIsToldTwice) {
     serve();
     EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 4\r\nContent-Length: 4\r\n\r\ntwin").body,

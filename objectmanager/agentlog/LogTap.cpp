@@ -178,8 +178,12 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     }
     Norv::Machine1* const machine = _machine;
     if (!failures.empty() && machine != nullptr && machine() == Norv::NO_MACHINE) {
-        // The first failure says what is wrong with the configuration; the others follow from it.
-        return {failures.front() + " ('orvcim check' says more)"};
+        // Of a process's failures, the first says what is wrong with the configuration.
+        const std::lock_guard guard(_mutex);
+        if (_mistake.empty()) {
+            _mistake = failures.front() + " ('orvcim check' says more)";
+        }
+        return {_mistake};
     }
     return failures;
 }

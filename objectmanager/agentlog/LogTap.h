@@ -81,7 +81,10 @@ public:
      * them even if there was no memory for the agent's text.
      */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
-    /** The messages of those of them that are failures; only the first if the agent's configuration cannot be used. */
+    /**
+     * The messages of those of them that are failures. If the agent's configuration cannot be used, they follow from
+     * that: only the mistake in it is given, which the agent reports once in a process.
+     */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
     /** Moves the calling thread's records out of here. */
     std::vector<LogRecord> take();
@@ -108,6 +111,8 @@ private:
     std::atomic<Norv::PowerNode1*> _powerNode = nullptr;
     std::atomic<Norv::PowerState1*> _powerState = nullptr;
     std::atomic<Norv::OnBehalfOf1*> _onBehalfOf = nullptr;
+    /** The mistake in the agent's configuration; empty until it was reported. Guarded by `_mutex`. */
+    mutable std::string _mistake;
 };
 
 } // namespace ObjectManager

@@ -80,7 +80,8 @@ TEST_F(WrongRequestTest, NamesAnotherClass) {
 
 TEST_F(WrongRequestTest, NamesNoInstance) {
     serveUsers();
-    expectRefused(reboot("root/cimv2:TALVO_ComputerSystem"), "ManagedElement: found ");
+    expectRefused(reboot("root/cimv2:TALVO_ComputerSystem"),
+                  "ManagedElement: found no key Name, expected every key of TALVO_ComputerSystem");
 }
 
 TEST_F(WrongRequestTest, HasAnotherType) {
@@ -94,9 +95,12 @@ TEST_F(WrongRequestTest, ComesFromAUserWithoutRights) {
 }
 
 TEST_F(WrongRequestTest, FindsNoAgent) {
-    std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n";
+    std::ofstream(_folder / "agent.toml") << "[instrumentation]\nbackend = \"guess\"\n[instrumentation.simulated]\n"
+                                          << "state-file = \"" << (_folder / "state.json").string() << "\"\n";
     serveUsers();
     expectRefused(reboot(_system), "expected \"simulated\"");
+    const Outcome again = reboot(_system);
+    EXPECT_THAT(again.out + again.err, HasSubstr("expected \"simulated\"")) << "as often as it is asked";
 }
 
 TEST_F(WrongRequestTest, FindsAFullDisk) {

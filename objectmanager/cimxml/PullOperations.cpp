@@ -21,7 +21,7 @@ void requireUnfiltered(const Call& call) {
     if (!call.parameters.optionalText("FilterQueryLanguage").empty() ||
         !call.parameters.optionalText("FilterQuery").empty()) {
         throw CimError(filteredEnumerationNotSupported,
-                       "found a FilterQuery, expected none: enumerations are not filtered");
+                       "found FilterQueryLanguage or FilterQuery, expected neither: enumerations are not filtered");
     }
 }
 

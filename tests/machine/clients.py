@@ -75,10 +75,12 @@ class Client:
         return self._paths("ain", service, "-arr", "Capabilities")[0]
 
     def power_state(self):
-        """As the association of the machine with its service shows it; None where no answer comes."""
+        """As the association of the machine with its service shows it; another answer's text, None where none comes."""
         answer = self.wbemcli("ei", f"{NAMESPACE}:TALVO_AssociatedPowerManagementService", "PowerState")
         found = re.search(r" PowerState=(\d+)$", answer.text)
-        return int(found.group(1)) if answer.status == 0 and found else None
+        if answer.status == 0 and found:
+            return int(found.group(1))
+        return answer.text if "Cim: (" in answer.text or answer.status == 0 else None
 
     def request(self, service, system, state):
         return self.wbemcli("cm", service, f"RequestPowerStateChange.PowerState={state},ManagedElement={system}")

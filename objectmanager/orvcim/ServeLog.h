@@ -1,4 +1,4 @@
-/** Writes the server's log without making any caller wait. */
+/** Writes the server's log in a thread of its own. */
 #ifndef ORVCIM_SERVELOG_H
 #define ORVCIM_SERVELOG_H
 
@@ -14,9 +14,9 @@
 namespace ObjectManager::Orvcim {
 
 /**
- * Writes lines to standard error or to the system's log, in a thread of its own, so that callers never wait for a slow
+ * Writes lines to standard error or to the system's log, in a thread of its own, so that callers do not wait for a slow
  * reader. Lines that the full queue has no room for are dropped and counted; the count is logged later. Lines about the
- * power switch are never dropped. Used by several threads at once.
+ * power switch are never dropped: their callers wait if there are too many of them. Used by several threads at once.
  */
 class ServeLog {
 public:

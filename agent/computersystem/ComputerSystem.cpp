@@ -32,6 +32,7 @@ Path pathOf(const CMPIObjectPath* reference, const std::string& name) {
 /** One text of each fact. */
 Property textsOf(const char* property, const std::vector<IdentifyingFact>& facts, std::string IdentifyingFact::*text) {
     std::vector<std::string> texts;
+    texts.reserve(facts.size());
     for (const IdentifyingFact& fact : facts) {
         texts.push_back(fact.*text);
     }

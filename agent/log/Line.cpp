@@ -95,7 +95,7 @@ void Line::appendEscaped(std::string_view text) {
         return code < 0x20 || code == 0x7f;
     };
     for (;;) {
-        const auto control = std::ranges::find_if(text, isControl);
+        const auto* const control = std::ranges::find_if(text, isControl);
         const auto plain = static_cast<std::size_t>(control - text.begin());
         appendText(text.substr(0, plain));
         if (control == text.end()) {

@@ -188,14 +188,14 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     return failures;
 }
 
-std::vector<LogRecord> LogTap::take() {
+std::vector<LogRecord> LogTap::take() const {
     ThreadRecords& own = recordsOf(_number);
     own.unkept = 0;
     std::deque<LogRecord> taken = std::exchange(own.records, {});
     return {std::make_move_iterator(taken.begin()), std::make_move_iterator(taken.end())};
 }
 
-void LogTap::forget() {
+void LogTap::forget() const {
     ThreadRecords& own = recordsOf(_number);
     own.unkept = 0;
     own.records.clear();

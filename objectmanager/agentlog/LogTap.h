@@ -87,9 +87,9 @@ public:
      */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
     /** Moves the calling thread's records out of here. */
-    std::vector<LogRecord> take();
+    std::vector<LogRecord> take() const;
     /** Drops the calling thread's records. */
-    void forget();
+    void forget() const;
 
 private:
     /** A log library that is listened to. */

@@ -28,9 +28,6 @@ class WrongRequestTest : public ServingTest {
 protected:
     using Environment = std::map<std::string, std::string>;
 
-    /** For programs with AddressSanitizer, which otherwise refuses to run if another library is loaded before it. */
-    inline static const Environment::value_type sanitizersGoSecond{"ASAN_OPTIONS", "verify_asan_link_order=0"};
-
     /** Serves root, who may do everything, and nobody, who may read. */
     void serveUsers(const Environment& environment = {}, std::vector<std::string> options = {}) {
         std::vector<std::string> arguments = {ORVCIM_PROGRAM,         "serve",        "--port=0",
@@ -105,7 +102,7 @@ TEST_F(WrongRequestTest, FindsNoAgent) {
 
 TEST_F(WrongRequestTest, FindsAFullDisk) {
     // The agent cannot write its log either.
-    serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, sanitizersGoSecond, {"TEST_FULL_FOLDER", _folder.string()}});
+    serveUsers({{"LD_PRELOAD", TEST_FULL_DISK}, {"TEST_FULL_FOLDER", _folder.string()}});
     expectRefused(reboot(_system), "No space left on device");
 }
 
@@ -193,7 +190,6 @@ TEST_F(WrongRequestTest, IsAnEntryOfTheJournalWithFieldsUnderSystemd) {
         std::make_unique<RunningProcess>(command, Environment{{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
                                                               {"LC_ALL", "C"},
                                                               {"LD_PRELOAD", TEST_JOURNAL_REDIRECT},
-                                                              sanitizersGoSecond,
                                                               {"TEST_JOURNAL_SOCKET", (_folder / "journal").string()}});
     const std::string line = _server->firstLine();
     ASSERT_NE(line, "") << _server->err();

@@ -74,7 +74,7 @@ public:
 
     /** Writes the record, and returns whether the request was accepted. */
     bool reported(const PowerRequestOutcome& outcome) {
-        _text = outcome.accepted ? "Power request accepted: " : "Power request refused: ";
+        _text = outcome.accepted ? Norv::acceptedRequestText : Norv::refusedRequestText;
         _text.append(beginningOf(outcome.description)).append(_requester);
         OrvLog::OrvLogger::logLevelMessage(
             static_cast<const char*>(__func__), __FILE__, __LINE__, _category, alwaysWrittenLevel, nullptr,

@@ -18,7 +18,8 @@ struct ThreadRecords {
     std::uint64_t tap = 0;
     std::uint64_t newest = 0;
     std::deque<LogRecord> records;
-    /** The kind and number of the last record of a power request that there was no memory for; 0 if there is none. */
+    /** The kind and number of the newest record, not an ordinary one, that there was no memory for; 0 if there is none.
+     */
     int unkeptKind = OrvLog::ORDINARY_RECORD;
     std::uint64_t unkept = 0;
 };
@@ -53,9 +54,11 @@ bool isOrdinary(const LogRecord& record) {
     return record.kind == OrvLog::ORDINARY_RECORD;
 }
 
-template <typename Function>
-Function* functionOf(void* library, const char* name) {
-    return reinterpret_cast<Function*>(dlsym(library, name));
+/** A new handle of the loaded library that has a function; null if there is none. */
+void* libraryOf(void* function) {
+    Dl_info found{};
+    return function == nullptr || dladdr(function, &found) == 0 ? nullptr
+                                                                : dlopen(found.dli_fname, RTLD_NOW | RTLD_NOLOAD);
 }
 
 } // namespace
@@ -75,35 +78,24 @@ LogTap::~LogTap() {
         heard.observe(nullptr);
         dlclose(heard.library);
     }
+    if (_instrumentation != nullptr) {
+        dlclose(_instrumentation);
+    }
 }
 
 void LogTap::attach(void* library) {
-    if (auto* const machine = functionOf<Norv::Machine1>(library, Norv::machine1Name)) {
-        _machine = machine;
-    }
-    if (auto* const node = functionOf<Norv::PowerNode1>(library, Norv::powerNode1Name)) {
-        _powerNode = node;
-    }
-    if (auto* const state = functionOf<Norv::PowerState1>(library, Norv::powerState1Name)) {
-        _powerState = state;
-    }
-    if (auto* const cancelRequest = functionOf<Norv::CancelRequest1>(library, Norv::cancelRequest1Name)) {
-        _cancelRequest = cancelRequest;
-    }
-    if (auto* const onBehalfOf = functionOf<Norv::OnBehalfOf1>(library, Norv::onBehalfOf1Name)) {
-        _onBehalfOf = onBehalfOf;
-    }
-    auto* const observe = functionOf<OrvLog::Observe1>(library, OrvLog::observe1Name);
     const std::lock_guard lock(_mutex);
-    if (observe == nullptr || std::ranges::find(_heard, observe, &Heard::observe) != _heard.end()) {
+    if (_instrumentation == nullptr) {
+        _instrumentation = libraryOf(dlsym(library, Norv::machine1Name));
+    }
+    void* const function = dlsym(library, OrvLog::observe1Name);
+    auto* const observe = reinterpret_cast<OrvLog::Observe1*>(function);
+    if (std::ranges::find(_heard, observe, &Heard::observe) != _heard.end()) {
         return;
     }
-    Dl_info found{};
-    if (dladdr(reinterpret_cast<void*>(observe), &found) != 0) {
-        if (void* const own = dlopen(found.dli_fname, RTLD_NOW | RTLD_NOLOAD)) {
-            _heard.push_back({observe, own});
-            observe(&_observer);
-        }
+    if (void* const own = libraryOf(function)) {
+        _heard.push_back({observe, own});
+        observe(&_observer);
     }
 }
 
@@ -112,37 +104,14 @@ bool LogTap::isAttached() const {
     return !_heard.empty();
 }
 
-bool LogTap::hearsPowerRequests() const {
-    // An instrumentation without Norv::Machine1 does not number its records of power requests either.
-    return isAttached() && _machine != nullptr;
+void* LogTap::agentSymbol(const char* name) const {
+    void* const instrumentation = _instrumentation;
+    return instrumentation == nullptr ? nullptr : dlsym(instrumentation, name);
 }
 
 bool LogTap::isSimulated() const {
-    Norv::Machine1* const machine = _machine;
+    auto* const machine = agentFunction<Norv::Machine1>(Norv::machine1Name);
     return machine != nullptr && machine() == Norv::SIMULATED_MACHINE;
-}
-
-std::string LogTap::powerNode() const {
-    Norv::PowerNode1* const node = _powerNode;
-    return node == nullptr ? "" : node();
-}
-
-std::optional<unsigned int> LogTap::powerState() const {
-    Norv::PowerState1* const tell = _powerState;
-    const int state = tell == nullptr ? -1 : tell();
-    return state < 0 ? std::nullopt : std::optional(static_cast<unsigned int>(state));
-}
-
-void LogTap::cancelPowerRequest() const {
-    if (Norv::CancelRequest1* const cancel = _cancelRequest) {
-        cancel();
-    }
-}
-
-void LogTap::actFor(const char* whom) const {
-    if (Norv::OnBehalfOf1* const onBehalfOf = _onBehalfOf) {
-        onBehalfOf(whom);
-    }
 }
 
 std::uint64_t LogTap::newest() const {
@@ -155,11 +124,8 @@ std::vector<LogRecord> LogTap::since(std::uint64_t sequence) const {
         std::ranges::find_if(own.records, [sequence](const LogRecord& record) { return record.sequence > sequence; });
     std::vector<LogRecord> records(first, own.records.end());
     if (own.unkept > sequence) {
-        const bool accepted = own.unkeptKind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD;
         LogRecord& unkept = records.emplace_back();
         unkept.kind = own.unkeptKind;
-        unkept.text =
-            std::string("Power request ") + (accepted ? "accepted" : "refused") + ": memory was too short for more";
         unkept.sequence = own.unkept;
     }
     return records;
@@ -176,8 +142,8 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
             failures.emplace_back(messageOf(record.text));
         }
     }
-    Norv::Machine1* const machine = _machine;
-    if (!failures.empty() && machine != nullptr && machine() == Norv::NO_MACHINE) {
+    auto* const machine = failures.empty() ? nullptr : agentFunction<Norv::Machine1>(Norv::machine1Name);
+    if (machine != nullptr && machine() == Norv::NO_MACHINE) {
         // Of a process's failures, the first says what is wrong with the configuration.
         const std::lock_guard guard(_mutex);
         if (_mistake.empty()) {
@@ -221,8 +187,7 @@ void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept
                                 own->newest});
     } catch (const std::bad_alloc&) {
         // An ordinary record is lost. So is every record of a thread that did not ask for its newest one before.
-        if (own != nullptr && (record->kind == OrvLog::POWER_REQUEST_ACCEPTED_RECORD ||
-                               record->kind == OrvLog::POWER_REQUEST_REFUSED_RECORD)) {
+        if (own != nullptr && record->kind != OrvLog::ORDINARY_RECORD) {
             own->unkeptKind = record->kind;
             own->unkept = own->newest;
         }

@@ -8,7 +8,6 @@
 #include <atomic>
 #include <cstdint>
 #include <mutex>
-#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -20,6 +19,7 @@ struct LogRecord {
     int kind = OrvLog::ORDINARY_RECORD;
     std::string category;
     int level = 0;
+    /** Empty if there was no memory for it. */
     std::string text;
     /** Increases with each record of a thread. */
     std::uint64_t sequence = 0;
@@ -53,32 +53,25 @@ public:
 
     /** Whether any log library of an agent is listened to. */
     bool isAttached() const;
-    /** Whether the agent reports the outcome of every power request in a record here. */
-    bool hearsPowerRequests() const;
     /** Whether the agent says that its machine is a simulated one. */
     bool isSimulated() const;
     /**
-     * The path of the node that gets every power request, whichever service the client names; empty if it is not known.
+     * An optional function of the agent's instrumentation.
+     *
+     * @tparam Function its type, of those in Norv/Machine.h.
+     * @param name its name, from there.
+     * @return null if no agent is listened to that offers the function.
      */
-    std::string powerNode() const;
-    /** The current state of that node, as property 123 counts it; no value if it cannot be told. */
-    std::optional<unsigned int> powerState() const;
-    /** Whether the agent offers to tell that state. */
-    bool tellsPowerState() const { return _powerState != nullptr; }
-    /** Has the agent cancel the power request that is under way; the agent reports the outcome in a record. Does
-     * nothing if the agent does not offer it. */
-    void cancelPowerRequest() const;
-    /**
-     * Tells the agent for whom the calling thread acts from now on; null for nobody. `whom` must stay valid until the
-     * next call.
-     */
-    void actFor(const char* whom) const;
+    template <typename Function>
+    Function* agentFunction(const char* name) const {
+        return reinterpret_cast<Function*>(agentSymbol(name));
+    }
 
     /** The sequence number of the calling thread's newest record; 0 before the first. */
     std::uint64_t newest() const;
     /**
-     * Copies of the calling thread's records after the one numbered `sequence`. The outcome of a power request is among
-     * them even if there was no memory for the agent's text.
+     * Copies of the calling thread's records after the one numbered `sequence`. The newest record that is not an
+     * ordinary one is among them even if there was no memory for its text.
      */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
     /**
@@ -100,17 +93,15 @@ private:
     };
 
     static void keep(void* context, const OrvLog::ObservedRecord1* record) noexcept;
+    void* agentSymbol(const char* name) const;
 
     const OrvLog::Observer1 _observer;
     /** Tells this tap's records from those that an earlier tap left in a thread. */
     const std::uint64_t _number;
     mutable std::mutex _mutex;
     std::vector<Heard> _heard;
-    std::atomic<Norv::Machine1*> _machine = nullptr;
-    std::atomic<Norv::CancelRequest1*> _cancelRequest = nullptr;
-    std::atomic<Norv::PowerNode1*> _powerNode = nullptr;
-    std::atomic<Norv::PowerState1*> _powerState = nullptr;
-    std::atomic<Norv::OnBehalfOf1*> _onBehalfOf = nullptr;
+    /** Our own handle of the agent's instrumentation; null until one is known. Does not change afterwards. */
+    std::atomic<void*> _instrumentation = nullptr;
     /** The mistake in the agent's configuration; empty until it was reported. Guarded by `_mutex`. */
     mutable std::string _mistake;
 };

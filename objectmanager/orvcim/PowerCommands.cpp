@@ -184,8 +184,8 @@ struct Switched {
 /** The machine's power state, for people; no value while it is on its way from one state to another. */
 std::optional<std::string> lastingState(Session& session, const Switched& machine) {
     // Of several nodes, clients see the state of the first by name, and requests go to the first in the tree.
-    if (session.log().tellsPowerState()) {
-        const std::optional<unsigned int> state = session.log().powerState();
+    if (tellsPowerState(session.log())) {
+        const std::optional<unsigned int> state = powerState(session.log());
         if (!state) {
             failAsUnknown(session);
         }

@@ -56,18 +56,24 @@ std::string textOf(const std::vector<ObjectPath>& paths) {
 class OnBehalfOf {
 public:
     OnBehalfOf(const LogTap& log, const Invocation& invocation)
-        : _log(log),
+        : _tell(log.agentFunction<Norv::OnBehalfOf1>(Norv::onBehalfOf1Name)),
           _whom(invocation.address.empty()     ? ""
                 : invocation.principal.empty() ? invocation.address
                                                : fmt::format("{} from {}", invocation.principal, invocation.address)) {
-        _log.actFor(_whom.empty() ? nullptr : _whom.c_str());
+        tell(_whom.empty() ? nullptr : _whom.c_str());
     }
     OnBehalfOf(const OnBehalfOf&) = delete;
     OnBehalfOf& operator=(const OnBehalfOf&) = delete;
-    ~OnBehalfOf() { _log.actFor(nullptr); }
+    ~OnBehalfOf() { tell(nullptr); }
 
 private:
-    const LogTap& _log;
+    void tell(const char* whom) const {
+        if (_tell != nullptr) {
+            _tell(whom);
+        }
+    }
+
+    Norv::OnBehalfOf1* const _tell;
     const std::string _whom;
 };
 
@@ -77,10 +83,43 @@ CimError refusal(const std::string& message) {
     return error;
 }
 
-/** The first record of a kind; null if there is none. */
-const LogRecord* find(const std::vector<LogRecord>& records, OrvLog::RecordKind kind) {
+/** What the agent has reported on a power request. */
+struct Report {
+    /** The agent's text; no value if it has not accepted a request. */
+    std::optional<std::string> accepted;
+    /** The agent's text; no value if it has not refused a request. */
+    std::optional<std::string> refused;
+};
+
+/** The text of the first record of a kind, which begins with `beginning`; no value if there is no such record. */
+std::optional<std::string> reported(const std::vector<LogRecord>& records, OrvLog::RecordKind kind,
+                                    const char* beginning) {
     const auto found = std::ranges::find(records, static_cast<int>(kind), &LogRecord::kind);
-    return found == records.end() ? nullptr : &*found;
+    if (found == records.end()) {
+        return std::nullopt;
+    }
+    return found->text.empty() ? std::string(beginning) + "memory was too short for more" : found->text;
+}
+
+/** The agent's report in the calling thread's records after the one numbered `sequence`. */
+Report reportSince(const LogTap& log, std::uint64_t sequence) {
+    const std::vector<LogRecord> records = log.since(sequence);
+    return {reported(records, OrvLog::POWER_REQUEST_ACCEPTED_RECORD, Norv::acceptedRequestText),
+            reported(records, OrvLog::POWER_REQUEST_REFUSED_RECORD, Norv::refusedRequestText)};
+}
+
+/**
+ * The path of the node that gets every power request, whichever service the client names; empty if it is not known.
+ */
+std::string powerNode(const LogTap& log) {
+    auto* const node = log.agentFunction<Norv::PowerNode1>(Norv::powerNode1Name);
+    return node == nullptr ? "" : node();
+}
+
+/** Whether the agent reports the outcome of every power request in a log record of its own kind. */
+bool reportsOutcomes(const LogTap& log) {
+    // An instrumentation without Norv::Machine1 does not number its records of power requests either.
+    return log.isAttached() && log.agentFunction<Norv::Machine1>(Norv::machine1Name) != nullptr;
 }
 
 /**
@@ -91,12 +130,11 @@ MethodResult answerOf(const std::function<MethodResult()>& provider, const LogTa
     try {
         return provider();
     } catch (const CimError& error) {
-        const std::vector<LogRecord> records = log.since(before);
-        const LogRecord* const accepted = find(records, OrvLog::POWER_REQUEST_ACCEPTED_RECORD);
-        if (accepted == nullptr) {
+        const Report report = reportSince(log, before);
+        if (!report.accepted) {
             throw;
         }
-        CimError failure(error.code, fmt::format("{}; but before: {}", error.what(), accepted->text));
+        CimError failure(error.code, fmt::format("{}; but before: {}", error.what(), *report.accepted));
         failure.reasons = error.reasons;
         throw failure;
     }
@@ -113,15 +151,27 @@ std::vector<ObjectPath> systemsOf(const ObjectPath& service, const Invocation& i
     return systems;
 }
 
+bool tellsPowerState(const LogTap& log) {
+    return log.agentFunction<Norv::PowerState1>(Norv::powerState1Name) != nullptr;
+}
+
+std::optional<unsigned int> powerState(const LogTap& log) {
+    auto* const tell = log.agentFunction<Norv::PowerState1>(Norv::powerState1Name);
+    const int state = tell == nullptr ? -1 : tell();
+    return state < 0 ? std::nullopt : std::optional(static_cast<unsigned int>(state));
+}
+
 std::string cancelPowerRequest(const LogTap& log) {
     const std::uint64_t before = log.newest();
-    log.cancelPowerRequest();
-    const std::vector<LogRecord> records = log.since(before);
-    if (const LogRecord* const refused = find(records, OrvLog::POWER_REQUEST_REFUSED_RECORD)) {
-        throw refusal(refused->text);
+    if (auto* const cancel = log.agentFunction<Norv::CancelRequest1>(Norv::cancelRequest1Name)) {
+        cancel();
     }
-    if (const LogRecord* const accepted = find(records, OrvLog::POWER_REQUEST_ACCEPTED_RECORD)) {
-        return accepted->text;
+    const Report report = reportSince(log, before);
+    if (report.refused) {
+        throw refusal(*report.refused);
+    }
+    if (report.accepted) {
+        return *report.accepted;
     }
     throw CimError(CMPI_RC_ERR_NOT_SUPPORTED, "the agent cannot be asked to take back a power request");
 }
@@ -141,22 +191,22 @@ MethodOutcome PowerRequestRule::call(const MethodCall& call, Operations& operati
                                    formatLocalPath(element), textOf(systems)));
     }
 
-    requireActing(call.target, _log.powerNode());
+    requireActing(call.target, powerNode(_log));
 
     const std::uint64_t before = _log.newest();
     const OnBehalfOf behalf(_log, call.invocation);
     MethodResult result = answerOf(provider, _log, before);
-    const std::vector<LogRecord> records = _log.since(before);
-    if (const LogRecord* const refused = find(records, OrvLog::POWER_REQUEST_REFUSED_RECORD)) {
-        throw refusal(refused->text);
+    const Report report = reportSince(_log, before);
+    if (report.refused) {
+        throw refusal(*report.refused);
     }
-    if (const LogRecord* const accepted = find(records, OrvLog::POWER_REQUEST_ACCEPTED_RECORD)) {
-        return {std::move(result), accepted->text};
+    if (report.accepted) {
+        return {std::move(result), *report.accepted};
     }
     if (result.returnValue != unsignedValue(CMPI_uint32, 0)) {
         return {std::move(result)};
     }
-    if (_log.hearsPowerRequests()) {
+    if (reportsOutcomes(_log)) {
         throw refusal(fmt::format("{} ended without a failure, but the agent accepted no power request", call.method));
     }
     return {std::move(result), "the outcome is not known beyond the return value: the agent cannot be observed", false};

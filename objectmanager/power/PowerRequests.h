@@ -6,6 +6,8 @@
 #include "dispatch/MethodRule.h"
 #include "model/ClassInformation.h"
 
+#include <optional>
+
 namespace ObjectManager {
 
 /** The class of the method RequestPowerStateChange. The rules also hold for its descendants. */
@@ -20,6 +22,12 @@ inline constexpr const char* requestPowerStateChangeMethod = "RequestPowerStateC
  * @throws CimError
  */
 std::vector<ObjectPath> systemsOf(const ObjectPath& service, const Invocation& invocation, Operations& operations);
+
+/** Whether the agent offers to tell the state of the machine to which power requests go. */
+bool tellsPowerState(const LogTap& log);
+
+/** That state, as property 123 of the agent counts it; no value if it cannot be told. */
+std::optional<unsigned int> powerState(const LogTap& log);
 
 /**
  * Has the agent cancel the power request that is under way.

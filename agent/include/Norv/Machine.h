@@ -59,6 +59,10 @@ using PowerState1 = int();
  */
 using CancelRequest1 = int();
 
+/** How the log records begin that tell the outcome of a power request. */
+inline constexpr const char* acceptedRequestText = "Power request accepted: ";
+inline constexpr const char* refusedRequestText = "Power request refused: ";
+
 /** The functions' names for dlsym(3). */
 inline constexpr const char* machine1Name = "orvInstrumentationMachine1";
 inline constexpr const char* powerNode1Name = "orvInstrumentationPowerNode1";

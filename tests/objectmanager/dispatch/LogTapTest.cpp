@@ -51,8 +51,7 @@ TEST_F(LogTapTest, IsNotAttachedByALibraryWhoseAgentCannotBeListenedTo) {
     tap.attach(other);
     EXPECT_FALSE(tap.isAttached());
     EXPECT_FALSE(tap.isSimulated());
-    EXPECT_FALSE(tap.hearsPowerRequests());
-    EXPECT_EQ("", tap.powerNode());
+    EXPECT_EQ(nullptr, tap.agentFunction<Norv::Machine1>(Norv::machine1Name));
     dlclose(other);
 }
 

@@ -243,10 +243,28 @@ TEST_F(ProvidedTest, SwitchesNoOtherNodeThanTheOneThatIsNamed) {
     EXPECT_THAT(answerOf({"power", "reboot", "--service", service("z")}), HasSubstr("node z"));
 }
 
-TEST_F(ProvidedTest, FailsWhereNoStateCanBeRead) {
+/** What is said of a configuration with the key "backend" of the simulated machine. */
+class WrongConfigurationTest : public ProvidedTest {
+protected:
+    std::string mistake() const {
+        return (_folder / "agent.toml").string() +
+               ":8: instrumentation.simulated.backend: unknown key: expected one of state-file, reboot-time, "
+               "shutdown-time, node ('orvcim check' says more)";
+    }
+};
+
+TEST_F(WrongConfigurationTest, LeavesTheStateUnknown) {
     configure("backend = 5\n");
     const Outcome outcome = orvcim({"power", "status"});
-    EXPECT_THAT(outcome.err, HasSubstr("unknown"));
+    EXPECT_EQ(outcome.err, "orvcim: the power state is unknown: " + mistake() + '\n');
+    EXPECT_EQ(outcome.out, "");
+    EXPECT_EQ(outcome.status, 1);
+}
+
+TEST_F(WrongConfigurationTest, OffersNoService) {
+    configure("backend = 5\n");
+    const Outcome outcome = orvcim({"power", "reboot", "--yes"});
+    EXPECT_EQ(outcome.err, "orvcim: " + mistake() + '\n');
     EXPECT_EQ(outcome.out, "");
     EXPECT_EQ(outcome.status, 1);
 }
@@ -260,8 +278,8 @@ TEST_F(ProvidedTest, MakesNoRequestForAnotherElementThanTheMachine) {
         {"ManagedElement=root/cimv2:TALVO_ComputerSystem", "expected the path of an instance, with its keys"},
         {"ManagedElement=No_Such.Name=\"machine.example\"", "which is not declared, expected the path of an instance"},
         {"ManagedElement=machine.example, please", "object path machine.example, please"},
-        {"ManagedElement=", "ManagedElement: "},
-        {"ManagedElement=5", "ManagedElement: "},
+        {"ManagedElement=", "ManagedElement: object path , position 1: found the end, expected the name of a class"},
+        {"ManagedElement=5", "ManagedElement: object path 5, position 1: found '5', expected the name of a class"},
         {"ManagedElement=root/interop" + _system.substr(_system.find(':')), "whose power the service manages"},
         {"ManagedElement=root/nowhere" + _system.substr(_system.find(':')), "there is no instance root/nowhere:"},
         {"ManagedElement=" + other, "there is no instance root/cimv2:TALVO_ComputerSystem"},
@@ -290,14 +308,6 @@ TEST_F(ProvidedTest, FollowsAssociationsOfInstancesOnlyThatAreThere) {
                   "orvcim: " + other + ": CIM_ERR_NOT_FOUND (6): there is no such instance\n");
         EXPECT_THAT(orvcim({command, "No_Such.Name=\"x\""}).err, HasSubstr("CIM_ERR_INVALID_PARAMETER (4)"));
     }
-}
-
-TEST_F(ProvidedTest, OffersNoServiceWhereTheConfigurationIsWrong) {
-    configure("backend = 5\n");
-    const Outcome outcome = orvcim({"power", "reboot", "--yes"});
-    EXPECT_THAT(outcome.err, HasSubstr("orvcim: "));
-    EXPECT_EQ(outcome.out, "");
-    EXPECT_EQ(outcome.status, 1);
 }
 
 } // namespace

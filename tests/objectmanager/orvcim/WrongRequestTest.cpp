@@ -83,7 +83,9 @@ TEST_F(WrongRequestTest, NamesNoInstance) {
 
 TEST_F(WrongRequestTest, HasAnotherType) {
     serveUsers();
-    expectRefused(reboot("5"), "ManagedElement: ");
+    expectRefused(reboot("5"),
+                  "ManagedElement: found a path of the class 5, which is not declared, expected the path of an "
+                  "instance");
 }
 
 TEST_F(WrongRequestTest, ComesFromAUserWithoutRights) {

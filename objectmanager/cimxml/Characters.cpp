@@ -10,8 +10,7 @@ namespace {
 
 constexpr std::string_view replacement = "\xEF\xBF\xBD";
 
-/** Whether a byte does not stand for itself wherever it is, as most characters do, or belongs to no character of ASCII.
- */
+/** Whether a byte cannot always be copied as it is: it has to be escaped somewhere, or is not a character of ASCII. */
 constexpr std::array<bool, 256> special = [] {
     std::array<bool, 256> bytes{};
     for (unsigned int byte = 0; byte < bytes.size(); ++byte) {
@@ -24,7 +23,7 @@ unsigned char byteAt(std::string_view text, std::size_t position) {
     return static_cast<unsigned char>(text[position]);
 }
 
-/** The position of the first special byte at or behind `position`, or the end of the text. */
+/** The position of the first special byte from `position` on, or the size of the text. */
 std::size_t nextSpecial(std::string_view text, std::size_t position) {
     while (position < text.size() && !special[byteAt(text, position)]) {
         ++position;
@@ -32,11 +31,11 @@ std::size_t nextSpecial(std::string_view text, std::size_t position) {
     return position;
 }
 
-/** The first byte of a character of several. */
+/** A kind of UTF-8 sequence, by the bits of its first byte. */
 struct Lead {
     std::size_t length;
     std::uint32_t bits;
-    /** Lower codes have a shorter form. */
+    /** The lowest character of this length; a lower one has a shorter sequence. */
     std::uint32_t least;
 };
 
@@ -60,8 +59,8 @@ bool isXmlCharacter(std::uint32_t code) {
 }
 
 /**
- * How many bytes the character of several bytes at `position` has; 0 where there is none in UTF-8, or one that XML does
- * not allow.
+ * The length of the UTF-8 sequence at `position`, in bytes; 0 if it is not valid, or if XML does not allow its
+ * character.
  */
 std::size_t characterLength(std::string_view text, std::size_t position) {
     const Lead lead = leadOf(byteAt(text, position));
@@ -79,7 +78,7 @@ std::size_t characterLength(std::string_view text, std::size_t position) {
     return code >= lead.least && isXmlCharacter(code) ? lead.length : 0;
 }
 
-/** How the character of one byte is written; empty where it stands for itself. */
+/** The escaped form of a character of ASCII; empty if the character stands for itself. */
 std::string_view escapeOf(unsigned char byte, bool inAttribute) {
     switch (byte) {
     case '<':

@@ -6,7 +6,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/** Whether a name is what the filter asks for, which is empty where it asks for nothing. */
+/** Whether the filter lets a name pass. An empty filter lets every name pass. */
 bool isAsked(std::string_view name, std::string_view asked) {
     return asked.empty() || equalNames(name, asked);
 }
@@ -15,10 +15,10 @@ bool isAskedClass(const Catalogue& catalogue, std::string_view name, std::string
     return asked.empty() || catalogue.isA(name, asked);
 }
 
-/** Calls for each association class and each of its references that the source can stand at. */
+/** Calls for each association class, and each of its references that can refer to the source. */
 template <typename Do>
 void forEachNearEnd(const Catalogue& catalogue, const Class& source, const AssociationFilter& filter, Do doWith) {
-    // A class with fewer references links nothing.
+    // A class with fewer than two references associates nothing.
     constexpr std::size_t fewestReferences = 2;
     for (const Class* association : catalogue.all()) {
         const auto ends = catalogue.references(association->name);

@@ -16,7 +16,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/** Half of a limit, and never nothing. */
+/** Half of a limit, rounded up. */
 std::size_t shareOfOneUser(std::size_t limit) {
     return limit / 2 + limit % 2;
 }
@@ -28,7 +28,7 @@ const char* nameOf(Pulled kind) {
     case Pulled::instancePaths:
         return "paths";
     default:
-        return "what a query finds";
+        return "instances that a query selects";
     }
 }
 
@@ -104,7 +104,7 @@ bool Enumerations::pull(const EnumerationOwner& owner, const std::string& contex
         enumeration.expires = _clock() + enumeration.time;
     }
     lock.unlock();
-    // Others do not wait until the client has taken them.
+    // The lock is released first, so that other clients need not wait until this one has taken its objects.
     take(std::string_view(objects->text).substr(offset(next), offset(end) - offset(next)));
     return isLast;
 }
@@ -138,8 +138,8 @@ Enumerations::Map::iterator Enumerations::find(const EnumerationOwner& owner, co
     if (found == _open.end() || found->second.owner.user != owner.user ||
         !equalNames(found->second.owner.nameSpace, owner.nameSpace)) {
         throw CimError(invalidEnumerationContext, "found no open enumeration \"" + context +
-                                                      "\" of this user in this namespace: it was never opened, is over "
-                                                      "or closed, or its time ran out");
+                                                      "\" of this user in this namespace: it was never opened, was "
+                                                      "pulled to its end or closed, or its time is over");
     }
     return found;
 }

@@ -1,4 +1,4 @@
-/** Enumerations that clients have opened and pull from, a part at a time (the pull operations of DSP0200). */
+/** Enumerations that clients have opened, and whose objects they pull part by part (pull operations of DSP0200). */
 #ifndef CIMXML_ENUMERATIONS_H
 #define CIMXML_ENUMERATIONS_H
 
@@ -15,48 +15,50 @@
 
 namespace ObjectManager::CimXml {
 
-/** What clients may leave with the server. One user may have half of the enumerations and half of the bytes. */
+/** Limits for all open enumerations together. One user may have half of the enumerations and half of the bytes. */
 struct EnumerationLimits {
-    /** Enumerations that are open at a time. */
+    /** How many enumerations may be open at a time. */
     std::size_t count = 200;
-    /** Bytes of what all of them hold. */
+    /** How many bytes the objects that are still to be pulled may have. */
     std::size_t bytes = std::size_t{64} * 1024 * 1024;
-    /** After which an enumeration that nobody pulls from is closed. Clients may ask for less. */
+    /** The time after which an enumeration that nobody pulls from is closed. Clients may ask for a shorter one. */
     std::chrono::milliseconds time = std::chrono::seconds{60};
 };
 
-/** What an enumeration gives; each has a pull operation of its own. */
+/** The kind of objects in an enumeration. Each kind has its own pull operation. */
 enum class Pulled { instancesWithPath, instancePaths, instances };
 
-/** Who opened an enumeration, and where. Nobody else can pull from it or close it. */
+/** The user who opened an enumeration, and its namespace. Nobody else can pull from the enumeration or close it. */
 struct EnumerationOwner {
     std::string user;
     std::string nameSpace;
 };
 
-/** Objects in the form in which they are sent, one behind the other. */
+/** Objects in the form in which they are sent, one after the other. */
 struct ObjectTexts {
     std::string text;
-    /** Where each object ends. */
+    /** The position in the text at which each object ends. */
     std::vector<std::size_t> ends;
 
-    /** How much of an enumeration's limit the end of an object takes: the same on all machines. */
+    /** How many bytes the end of one object counts against the limits: the same number on all machines. */
     static constexpr std::size_t bytesOfEnd = 8;
 
-    /** How much of an enumeration's limit they take. */
+    /** How many bytes all objects count against the limits. */
     std::size_t bytes() const { return text.size() + ends.size() * bytesOfEnd; }
 };
 
 /**
- * The open enumerations of a server. All functions may be called by several threads at once, and those that name a
- * context throw CimError with the code CIM_ERR_INVALID_ENUMERATION_CONTEXT where the owner has no such enumeration
- * open: it was never opened, belongs to somebody else, was closed or pulled to its end, or its time ran out.
+ * The open enumerations of a server. Used by several threads at once.
+ *
+ * A function that takes a context throws CimError with the code CIM_ERR_INVALID_ENUMERATION_CONTEXT if the owner has no
+ * open enumeration of that context: it was never opened, belongs to somebody else, was closed or pulled to its end, or
+ * its time is over.
  */
 class Enumerations {
 public:
     using TimePoint = std::chrono::steady_clock::time_point;
     using Clock = std::function<TimePoint()>;
-    /** Makes the names of enumerations, which clients get as EnumerationContext. */
+    /** Makes the context of an enumeration: a name, which the client gets as EnumerationContext. */
     using NewContext = std::function<std::string()>;
 
     Enumerations(const EnumerationLimits& limits, Clock clock, NewContext newContext)
@@ -65,38 +67,38 @@ public:
     const EnumerationLimits& limits() const { return _limits; }
 
     /**
-     * Throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED where so many bytes are more than one user may leave
-     * with the server.
+     * Throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED if the enumerations of one user may not have so many
+     * bytes.
      */
     void requireRoom(std::size_t bytes) const;
 
     /**
-     * Keeps what is left of an enumeration.
+     * Keeps the objects of an enumeration that the client has still to pull.
      *
-     * @param given how many objects the client got already.
-     * @param time after which it is closed unless the client pulls before.
-     * @return its context.
-     * @throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED where there is no room for it.
+     * @param given how many objects the client got when it opened the enumeration.
+     * @param time after which the enumeration is closed unless the client pulls from it.
+     * @return the enumeration's context.
+     * @throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED if the limits leave no room for the enumeration.
      */
     std::string open(const EnumerationOwner& owner, Pulled kind, ObjectTexts rest, std::size_t given,
                      std::chrono::milliseconds time);
 
     /**
-     * Calls `take` with the next objects, as many as `count` at most, when it has closed the enumeration if there are
-     * no more. What `take` throws changes nothing in that.
+     * Takes the next objects out of the enumeration, at most `count`, and then calls `take` with them. If these are the
+     * last objects, the enumeration is closed before `take` is called. An exception of `take` undoes none of that.
      *
-     * @param kind an enumeration that gives something else is not found.
-     * @return whether there are no more.
+     * @param kind the kind of objects that the client asks for; throws if the enumeration has another kind.
+     * @return whether these were the last objects.
      */
     bool pull(const EnumerationOwner& owner, const std::string& context, Pulled kind, std::size_t count,
               const std::function<void(std::string_view objects)>& take);
 
     void close(const EnumerationOwner& owner, const std::string& context);
 
-    /** How many objects the enumeration gives altogether, pulled or not. */
+    /** How many objects the enumeration has altogether, pulled or not. */
     std::uint64_t count(const EnumerationOwner& owner, const std::string& context);
 
-    /** Closes those whose time has run out. Every other function does so, too. */
+    /** Closes the enumerations whose time is over. Every other function does so, too. */
     void closeExpired();
 
 private:
@@ -112,7 +114,7 @@ private:
     };
     using Map = std::map<std::string, Enumeration>;
 
-    /* With the lock held. */
+    /* Called with the lock held. */
     void dropExpired();
     Map::iterator find(const EnumerationOwner& owner, const std::string& context);
 
@@ -123,7 +125,7 @@ private:
     Map _open;
 };
 
-/** A name that nobody guesses. */
+/** Makes a context that nobody can guess. */
 std::string randomContext();
 
 } // namespace ObjectManager::CimXml

@@ -34,7 +34,10 @@ std::string_view unquoted(std::string_view text) {
     return text.size() >= 2 && text.front() == '"' && text.back() == '"' ? text.substr(1, text.size() - 2) : text;
 }
 
-/** The value of a parameter of a header value such as 'text/xml; charset="utf-8"'; nothing where it is not there. */
+/**
+ * The value of a parameter of a header value such as 'text/xml; charset="utf-8"'; no value if the
+ * parameter is missing.
+ */
 std::optional<std::string_view> parameterOf(std::string_view value, std::string_view name) {
     const std::vector<std::string_view> pieces = split(value, ';');
     for (auto piece = pieces.begin() + 1; piece != pieces.end(); ++piece) {
@@ -46,7 +49,7 @@ std::optional<std::string_view> parameterOf(std::string_view value, std::string_
     return std::nullopt;
 }
 
-/** Whether a list such as 'text/xml, application/xml;q=0.5' takes one of the names, and does not rule it out. */
+/** Whether a list such as 'text/xml, application/xml;q=0.5' accepts one of the names. The weight 0 excludes a name. */
 bool accepts(std::string_view list, std::initializer_list<std::string_view> names) {
     for (const std::string_view entry : split(list, ',')) {
         const std::string_view name = split(entry, ';').front();
@@ -64,12 +67,12 @@ bool takesApplicationXml(std::string_view accept) {
     return accepts(accept, {"application/xml", "application/*", "*/*"});
 }
 
-/** The extension that a declaration such as '"URI" ; ns=73' is about. */
+/** The extension that a declaration such as '"URI" ; ns=73' names. */
 std::string_view extensionOf(std::string_view declaration) {
     return unquoted(split(declaration, ';').front());
 }
 
-/** The two digits that a declaration gives to CIM's headers; nothing where it is about another extension. */
+/** The two digits that a declaration gives to CIM's headers; no value if it declares another extension. */
 std::optional<std::string> numberOf(std::string_view declaration) {
     const std::string_view number = parameterOf(declaration, "ns").value_or("");
     const bool digits = number.size() == 2 && number.find_first_not_of("0123456789") == std::string_view::npos;
@@ -77,7 +80,7 @@ std::optional<std::string> numberOf(std::string_view declaration) {
                                                                      : std::nullopt;
 }
 
-/** Resolves the "%41" in a header value. A '%' without two hexadecimal digits stands for itself. */
+/** Replaces each "%41" in a header value by its byte. A '%' without two hexadecimal digits stands for itself. */
 std::string decoded(std::string_view value) {
     std::string text;
     for (std::size_t i = 0; i < value.size(); ++i) {
@@ -94,7 +97,7 @@ std::string decoded(std::string_view value) {
     return text;
 }
 
-/** As `decoded` takes it, in one line of ASCII. */
+/** The reverse of `decoded`: the text as one line of ASCII. */
 std::string encoded(std::string_view text) {
     constexpr std::string_view digits = "0123456789ABCDEF";
     std::string value;
@@ -109,7 +112,7 @@ std::string encoded(std::string_view text) {
     return value;
 }
 
-/** A request must not be answered without an extension that it calls mandatory. */
+/** Refuses a request with another mandatory extension: RFC 2774 forbids to answer it without that extension. */
 void requireOwnOnly(const std::vector<std::string_view>& mandatory) {
     const auto foreign = std::find_if(mandatory.begin(), mandatory.end(), [](std::string_view declaration) {
         return !extensionOf(declaration).starts_with(extension);
@@ -121,7 +124,7 @@ void requireOwnOnly(const std::vector<std::string_view>& mandatory) {
     }
 }
 
-/** What a reply to M-POST declares. */
+/** The headers in which a reply to M-POST declares the extension. */
 std::vector<std::pair<std::string, std::string>> extensionHeaders(const std::string& prefix) {
     if (prefix.empty()) {
         return {};
@@ -148,7 +151,7 @@ RequestHeaders::RequestHeaders(const HttpRequest& request) : _request(request), 
     }
     if (_extended && _prefix.empty()) {
         throw ProtocolError(Http::notExtended, nullptr,
-                            "found no header Man with " + std::string(extension) + "0, expected it with M-POST");
+                            "found no header Man with " + std::string(extension) + "0, which M-POST requires");
     }
     if (_extended) {
         requireOwnOnly(listOf("Man"));
@@ -190,7 +193,7 @@ void RequestHeaders::check() const {
     const std::string* operation = findOwn("CIMOperation");
     if (operation == nullptr) {
         throw ProtocolError(Http::badRequest, nullptr,
-                            "found no header " + prefixed("CIMOperation") + ", expected it of a CIM operation");
+                            "found no header " + prefixed("CIMOperation") + ", which a CIM operation requires");
     }
     if (!equalNames(trimmed(*operation), "MethodCall")) {
         throw ProtocolError(Http::badRequest, "unsupported-operation",
@@ -226,12 +229,12 @@ void RequestHeaders::checkTypes() const {
     const std::string* accept = _request.header("Accept");
     if (accept != nullptr && !takesApplicationXml(*accept) && !accepts(*accept, {"text/xml", "text/*"})) {
         throw ProtocolError(Http::notAcceptable, nullptr,
-                            "found the Accept \"" + *accept + "\", expected application/xml or text/xml in it");
+                            "found the Accept \"" + *accept + "\", expected a list with application/xml or text/xml");
     }
     const std::string* charsets = _request.header("Accept-Charset");
     if (charsets != nullptr && !accepts(*charsets, {"utf-8", "*"})) {
         throw ProtocolError(Http::notAcceptable, nullptr,
-                            "found the Accept-Charset \"" + *charsets + "\", expected utf-8 in it");
+                            "found the Accept-Charset \"" + *charsets + "\", expected a list with utf-8");
     }
 }
 
@@ -250,7 +253,7 @@ void RequestHeaders::checkAgainst(const Message& message) const {
     checkObject(message);
 }
 
-/** The namespace must be the same and, where a class's method is called, the class. */
+/** The header must name the namespace of the body and, if the body calls a method of a class, also the class. */
 void RequestHeaders::checkObject(const Message& message) const {
     const std::string* object = findOwn("CIMObject");
     const std::string path = object == nullptr ? std::string() : decoded(*object);

@@ -8,7 +8,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/** The failure of one class's provider in an enumeration of an ancestor, named by the class. */
+/** The error of one class's provider in an enumeration of an ancestor; its message begins with the class. */
 CimError failureOf(const std::string& className, const CimError& error) {
     CimError failure(error.code, className + ": " + error.what());
     failure.reasons = error.reasons;
@@ -57,7 +57,7 @@ void forEachServed(const Call& call, const ObjectPath& classPath,
             try {
                 doWith(path);
             } catch (const CimError& error) {
-                // What the server itself refuses is no failure of a provider.
+                // An exceeded limit of the server is not the failure of this class's provider.
                 if (equalNames(path.className, classPath.className) || error.code == serverLimitsExceeded) {
                     throw;
                 }
@@ -65,7 +65,7 @@ void forEachServed(const Call& call, const ObjectPath& classPath,
             }
         }
     }
-    // Nobody having to serve it, a class that is declared has no instances.
+    // A class that is declared, but not registered, has no instances; for any other class, `find` throws the reason.
     if (!served &&
         (isRegistered(call.operation, classPath.className) || call.catalogue().find(classPath.className) == nullptr)) {
         call.dispatcher().registry().find(classPath.nameSpace, classPath.className, ProviderKind::instance);

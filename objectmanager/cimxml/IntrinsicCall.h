@@ -1,4 +1,4 @@
-/** An intrinsic method that is being answered, and what several of them have in common. */
+/** The call of an intrinsic method, and functions that several intrinsic methods use. */
 #ifndef CIMXML_INTRINSICCALL_H
 #define CIMXML_INTRINSICCALL_H
 
@@ -20,58 +20,58 @@ struct Call {
     const Catalogue& catalogue() const { return operation.catalogue; }
     const std::string& nameSpace() const { return operation.message.nameSpace(); }
     ResponseWriter& writer() const { return operation.writer; }
-    /** On whose behalf providers are called, and how. */
+    /** The user for whom providers are called, and the flags of the call. */
     Invocation invocation() const;
 };
 
-/* What classes there are. */
+/* Classes. */
 
 /** Whether a provider is registered for the class itself. */
 bool isRegistered(const Operation& operation, std::string_view className);
 
 CimError unknownClass(const std::string& className, CMPIrc code = CMPI_RC_ERR_INVALID_CLASS);
 
-/** Throws where nobody serves instances of the class itself, so that there is none. */
+/** Throws if no provider serves instances of the class itself, so that it has none. */
 void requireServed(const Operation& operation, const std::string& className);
 
-/** Throws `unknown` where there is no such class: where the class itself is asked for, DSP0200 has another code. */
+/** Throws with the code `unknown` if the class does not exist: DSP0200's code depends on the operation. */
 const Class& declaredClass(const Call& call, const std::string& className, CMPIrc unknown = CMPI_RC_ERR_INVALID_CLASS);
 
-/** Calls for each class that is the one named or descends from it, and has a provider of instances. */
+/** Calls `doWith` for the named class and each of its descendants, if the class has an instance provider. */
 void forEachServed(const Call& call, const ObjectPath& classPath,
                    const std::function<void(const ObjectPath& classPath)>& doWith);
 
-/* What is asked for. */
+/* Parameters that select objects. */
 
 /**
- * What a provider is asked for: the properties as the class spells them, without those that it does not have, and with
- * its keys, lest instances lose their paths.
+ * The properties to ask a provider for: those of the list that the class has, in the class's spelling, and its keys,
+ * since the paths of instances are made of them.
  */
 PropertyList askedOfProvider(const Call& call, const PropertyList& properties, const std::string& className);
 
-/** Of instances. LocalOnly and IncludeQualifiers, which are deprecated for them, are always taken as false. */
+/** For instances. LocalOnly and IncludeQualifiers are deprecated for instances, and always taken as false. */
 Selection selectionOfInstances(const Call& call);
 
-/** Of the instances of the class ClassName; without DeepInheritance, the properties of that class only. */
+/** For the instances of the class ClassName. Without DeepInheritance, only that class's properties are selected. */
 Selection selectionOfEnumeration(const Call& call);
 
-/** Of the classes that a method gives; `qualifiers` and `localOnly` hold where the client does not say. */
+/** For classes. `qualifiers` and `localOnly` are the method's defaults of IncludeQualifiers and LocalOnly. */
 Selection selectionOfClasses(const Call& call, bool qualifiers, bool localOnly);
 
 AssociationFilter associatorFilter(const Call& call);
 AssociationFilter referenceFilter(const Call& call);
 
-/* What is given. */
+/* Objects. */
 
-/** Calls for each instance of the class and of its descendants, with these properties at least. */
+/** Calls `sink` for each instance of the class and of its descendants. Each has the given properties at least. */
 void forEachInstance(const Call& call, const ObjectPath& classPath, const PropertyList& properties,
                      const InstanceSink& sink);
-/** Calls for each instance of the query's class and of its descendants that meets its condition. */
+/** Calls `sink` for each instance of the query's class and its descendants that meets the query's condition. */
 void forEachMatch(const Call& call, const Query& query, const InstanceSink& sink);
-/** Calls for the path of each instance of the class ClassName and of its descendants. */
+/** Calls `sink` for the path of each instance of the class ClassName and of its descendants. */
 void forEachInstanceName(const Call& call, const PathSink& sink);
 
-/** The associations of an instance, with all properties, since the paths of associations are made of some. */
+/** The associations of an instance, with all properties, since their references are needed for their paths. */
 std::vector<Instance> referencesOf(const Call& call, const ObjectPath& source);
 
 } // namespace ObjectManager::CimXml

@@ -19,7 +19,7 @@ namespace {
 constexpr std::array<std::string_view, 5> entities{"lt", "gt", "amp", "quot", "apos"};
 constexpr const char* knownReference = "one of the five entities of XML or a reference to a character that it allows";
 
-/** What would have been right where expat gives up with an error. */
+/** What is expected where expat reports an error. */
 struct Expectation {
     XML_Error error;
     const char* expected;
@@ -31,7 +31,7 @@ constexpr Expectation expectations[] = {
     {XML_ERROR_UNCLOSED_TOKEN, "the end of what begins there"},
     {XML_ERROR_PARTIAL_CHAR, "a whole character of UTF-8"},
     {XML_ERROR_DUPLICATE_ATTRIBUTE, "every attribute of an element once"},
-    {XML_ERROR_JUNK_AFTER_DOC_ELEMENT, "nothing behind the root"},
+    {XML_ERROR_JUNK_AFTER_DOC_ELEMENT, "nothing after the root"},
     {XML_ERROR_UNDEFINED_ENTITY, knownReference},
     {XML_ERROR_BAD_CHAR_REF, knownReference},
     {XML_ERROR_UNCLOSED_CDATA_SECTION, "the end of a CDATA section"},
@@ -39,7 +39,7 @@ constexpr Expectation expectations[] = {
     {XML_ERROR_XML_DECL, "an XML declaration with a version"},
 };
 
-/** What stands at a position of a text, cut short, as a message can quote it. */
+/** The text at a position, cut short, in the form in which messages quote it. */
 std::string quoted(std::string_view text, std::size_t position) {
     if (position >= text.size()) {
         return "the end of the document";
@@ -55,7 +55,7 @@ std::string quoted(std::string_view text, std::size_t position) {
     return std::string("the byte 0x") + digits[byte >> 4U] + digits[byte & 0xFU];
 }
 
-/** Makes the elements of one document from what expat finds in it. */
+/** Builds the elements of a document out of expat's events. */
 class Builder {
 public:
     explicit Builder(std::string_view text) : _text(text), _parser(XML_ParserCreate("UTF-8"), XML_ParserFree) {
@@ -72,9 +72,10 @@ public:
 
     XmlElement build() {
         if (_text.size() > static_cast<std::size_t>(std::numeric_limits<int>::max())) {
-            throw notWellFormed("the body is no XML: found " + std::to_string(_text.size()) + " bytes, expected less");
+            throw notWellFormed("the body is not XML: found " + std::to_string(_text.size()) + " bytes, expected less");
         }
-        // Expat recognises UTF-16 whatever it is told. A document in it has zeros, which UTF-8 has for no character.
+        // Expat recognises UTF-16 even if it was told UTF-8. XML in UTF-16 contains zero bytes, XML in UTF-8 never
+        // does.
         if (const std::size_t zero = _text.find('\0'); zero != std::string_view::npos) {
             throw malformed(zero, "found " + quoted(_text, zero) + ", expected a character of UTF-8 that XML allows");
         }
@@ -91,8 +92,8 @@ public:
 
 private:
     /**
-     * Does what a handler has to do. No exception may go through expat: it is kept until the parser has stopped, which
-     * may call some handlers before it does.
+     * Runs the body of a handler. No exception may pass through expat, which is written in C: an exception is kept,
+     * and thrown when the parser has stopped. Until it stops, expat may call more handlers.
      */
     template <typename Do>
     static void handle(void* self, Do doWith) {
@@ -126,7 +127,7 @@ private:
         });
     }
 
-    /** Expat passes over an entity that could be declared in a document type that it does not read. */
+    /** Expat skips an entity that may be declared in an external document type; expat does not read these. */
     static void onSkippedEntity(void* self, const XML_Char* entity, int) {
         handle(self, [&](Builder& builder) { throw builder.unknownEntity(entity); });
     }
@@ -146,7 +147,7 @@ private:
 
     void start(const char* name, const char** attributes) {
         if (_open.size() == maximumDepth) {
-            throw malformed("found more than " + std::to_string(maximumDepth) + " elements within each other");
+            throw malformed("found more than " + std::to_string(maximumDepth) + " nested elements");
         }
         if (_count == maximumElements) {
             throw malformed("found more than " + std::to_string(maximumElements) + " elements");
@@ -155,7 +156,7 @@ private:
         if (_documentTypeSeen) {
             checkEntitiesOfTag();
         }
-        // An element that is open stays where it is: its parent gets no other child meanwhile.
+        // The address of an open element does not change: its parent gets no other child while the element is open.
         XmlElement& element = _open.empty() ? _root : _open.back()->children.emplace_back();
         element.name = name;
         for (; *attributes != nullptr; attributes += 2) {
@@ -167,7 +168,7 @@ private:
         _open.push_back(&element);
     }
 
-    /** Of entities that expat passes over, it tells of none where they stand in an attribute's value. */
+    /** Finds unknown entities in the values of attributes: expat skips these without telling. */
     void checkEntitiesOfTag() const {
         const std::string_view tag =
             _text.substr(position(), static_cast<std::size_t>(XML_GetCurrentByteCount(_parser.get())));
@@ -179,7 +180,7 @@ private:
         }
     }
 
-    /** Of what the parser is at. */
+    /** The parser's position in the text, in bytes. */
     std::size_t position() const {
         const XML_Index index = XML_GetCurrentByteIndex(_parser.get());
         return index < 0 ? 0 : static_cast<std::size_t>(index);
@@ -188,14 +189,14 @@ private:
     ProtocolError malformed(const std::string& message) const { return malformed(position(), message); }
 
     static ProtocolError malformed(std::size_t position, const std::string& message) {
-        return notWellFormed("the body is no XML: at byte " + std::to_string(position + 1) + ", " + message);
+        return notWellFormed("the body is not XML: at byte " + std::to_string(position + 1) + ", " + message);
     }
 
     ProtocolError unknownEntity(std::string_view entity) const {
         return malformed("found '&" + std::string(entity) + ";', expected " + knownReference);
     }
 
-    /** What expat did not take, and why. */
+    /** The error that describes where and why expat stopped. */
     ProtocolError error() const {
         const XML_Error code = XML_GetErrorCode(_parser.get());
         if (code == XML_ERROR_NO_MEMORY) {
@@ -217,11 +218,11 @@ private:
     std::string_view _text;
     std::unique_ptr<XML_ParserStruct, decltype(&XML_ParserFree)> _parser;
     XmlElement _root;
-    /** The elements that have begun and not ended. */
+    /** The elements that are open, outermost first. */
     std::vector<XmlElement*> _open;
     std::size_t _count = 0;
     bool _documentTypeSeen = false;
-    /** What a handler threw. */
+    /** The exception that a handler threw. */
     std::exception_ptr _failure;
 };
 

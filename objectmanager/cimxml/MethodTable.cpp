@@ -11,7 +11,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/* The methods, in the order of their table. */
+/* The intrinsic methods, in the order of the table. */
 
 void getInstance(const Call& call) {
     const ObjectPath path = call.parameters.instanceName("InstanceName");
@@ -38,9 +38,9 @@ void enumerateInstanceNames(const Call& call) {
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
-/* Associations between classes are those that their declarations allow. */
+/* For classes, associators and references are those that the declarations allow. */
 
-/** The class that ObjectName names, and the filter's classes are declared. */
+/** The class that ObjectName names. Throws if it or a class of the filter is not declared. */
 const Class& sourceClass(const Call& call, const AssociationFilter& filter) {
     for (const std::string& className : {filter.associationClass, filter.resultClass}) {
         if (!className.empty()) {
@@ -128,7 +128,7 @@ void referenceNames(const Call& call) {
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
-/** The property of the class that PropertyName names. */
+/** The property that PropertyName names, as the class declares it. */
 const Property& namedProperty(const Call& call, const ObjectPath& path) {
     const std::string name = call.parameters.text("PropertyName");
     requireServed(call.operation, path.className);
@@ -185,7 +185,7 @@ void deleteInstance(const Call& call) {
     call.dispatcher().deleteInstance(call.invocation(), path);
 }
 
-/** Answered from an enumeration: providers are not asked for queries, which few of them know. */
+/** The server enumerates the class and selects itself: few providers can execute queries. */
 void execQuery(const Call& call) {
     const Query query = parseQuery(call.parameters.text("Query"), call.parameters.text("QueryLanguage"));
     Selection selection;
@@ -208,7 +208,10 @@ void getClass(const Call& call) {
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
-/** The classes that an enumeration finds: the descendants of one class, or the children only; else of none. */
+/**
+ * The classes to enumerate: the children of the class ClassName, or all of its descendants if DeepInheritance is true.
+ * Without ClassName, these are the classes without a superclass, or all classes.
+ */
 std::vector<const Class*> classesBelow(const Call& call) {
     const std::string ancestor = call.parameters.optionalClassName("ClassName");
     const bool deep = call.parameters.flag("DeepInheritance", false);
@@ -355,7 +358,7 @@ constexpr IntrinsicMethod intrinsicMethods[] = {
     {"EnumerateQualifiers", Access::read, {}, enumerateQualifiers},
 };
 
-/** The arguments, in the order of the method's parameters. What is null is left out, as if it had not been given. */
+/** The arguments in the order of the method's parameters. A null argument is left out, as if it were not given. */
 std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& method) {
     const std::vector<Argument>& given = operation.message.arguments();
     for (const Argument& argument : given) {
@@ -385,7 +388,7 @@ std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& me
     return arguments;
 }
 
-/** Calls a class's own method. @return what is known of its outcome beyond the return value. */
+/** Calls a method of a class. @return a text on the outcome beyond the return value. */
 std::string callMethod(const Operation& operation) {
     const Message& message = operation.message;
     const ValueReader reader(operation.catalogue, message.nameSpace());
@@ -431,7 +434,7 @@ void requireAccess(const Caller& caller, Access access) {
     if (access == Access::read ? !caller.mayRead : !caller.mayRead || !caller.mayChangePower) {
         throw CimError(CMPI_RC_ERR_ACCESS_DENIED,
                        (caller.user.empty() ? "this user" : caller.user) +
-                           (caller.mayRead ? " may read, but not change anything" : " may do nothing here"));
+                           (caller.mayRead ? " may read, but not change anything" : " has no rights on this server"));
     }
 }
 

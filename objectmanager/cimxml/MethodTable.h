@@ -9,24 +9,25 @@
 
 namespace ObjectManager::CimXml {
 
-/** One operation, and where its answer goes. */
+/** One operation, and all that is needed to answer it. */
 struct Operation {
     Dispatcher& dispatcher;
     const Catalogue& catalogue;
     const Message& message;
     const Caller& caller;
     ResponseWriter& writer;
-    /** Where what is written goes. */
+    /** Takes the text that the writer has written. */
     ReplyStream& stream;
     Enumerations& enumerations;
 };
 
 /**
- * Does what the message asks for, if the caller may, and writes what stands in the IMETHODRESPONSE or METHODRESPONSE.
+ * Carries out the operation that the message asks for, if the caller has the right to, and writes the content of the
+ * element IMETHODRESPONSE or METHODRESPONSE.
  *
- * @return what is known of a method's outcome beyond its return value; mostly nothing.
- * @throws CimError where it fails, ProtocolError where an element lacks what the document type demands. What was
- * written by then is of no use.
+ * @return a text on the outcome of a method beyond its return value; mostly empty.
+ * @throws CimError if the operation fails, ProtocolError if an element lacks something that the document type requires.
+ *         What has been written by then must be dropped.
  */
 std::string perform(const Operation& operation);
 

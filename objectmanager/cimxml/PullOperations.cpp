@@ -16,7 +16,7 @@ EnumerationOwner ownerOf(const Call& call) {
     return {call.operation.caller.user, call.nameSpace()};
 }
 
-/** Throws where the client asks for what DSP0200 lets a server refuse. */
+/** Throws if the client asks for a filter, which DSP0200 lets a server refuse. */
 void requireUnfiltered(const Call& call) {
     if (!call.parameters.optionalText("FilterQueryLanguage").empty() ||
         !call.parameters.optionalText("FilterQuery").empty()) {
@@ -25,15 +25,15 @@ void requireUnfiltered(const Call& call) {
     }
 }
 
-/** Throws where the client wants an enumeration to go on behind a failure. */
+/** Throws if the client wants the enumeration to go on after an error. */
 void requireEndAtError(const Call& call) {
     if (call.parameters.flag("ContinueOnError", false)) {
         throw CimError(continuationOnErrorNotSupported,
-                       "found ContinueOnError, expected FALSE: an enumeration ends where it fails");
+                       "found ContinueOnError, expected FALSE: an enumeration ends with the first error");
     }
 }
 
-/** After which the enumeration is closed unless the client pulls: what it asks for, within the server's limit. */
+/** The time after which the enumeration is closed unless the client pulls: the one it asks for, or the server's. */
 std::chrono::milliseconds timeOf(const Call& call) {
     const std::chrono::milliseconds longest = call.operation.enumerations.limits().time;
     const auto asked = call.parameters.optionalNumber("OperationTimeout");
@@ -49,7 +49,7 @@ std::chrono::milliseconds timeOf(const Call& call) {
     return time;
 }
 
-/** Writes what stands behind the objects in the answers to Open and Pull. */
+/** Writes what follows the objects in the replies of open and pull operations. */
 void writeState(const Call& call, const std::string& context, bool end) {
     call.writer().raw("</IRETURNVALUE>\n");
     call.writer().parameter({"EnumerationContext", stringValue(context)});
@@ -57,8 +57,8 @@ void writeState(const Call& call, const std::string& context, bool end) {
 }
 
 /**
- * An enumeration that is being opened: the first objects are the answer, the others are kept. The answer waits until it
- * is known that they can be.
+ * An enumeration that is being opened: the reply has its first objects, the others are kept. The reply is not begun
+ * before it is certain that the limits allow to keep them: otherwise the reply is an error.
  */
 class Opening {
 public:
@@ -71,7 +71,7 @@ public:
         requireEndAtError(call);
     }
 
-    /** Takes the next object, as the writer's function writes it. */
+    /** Adds an object. @param write the writer's function for it. */
     template <typename Object, typename... Given>
     void add(void (ResponseWriter::*write)(const Object&, const Given&...), const Object& object,
              const Given&... given) {
@@ -86,7 +86,7 @@ public:
         _call.operation.stream.holdText(_first.size() + _rest.size());
     }
 
-    /** To be called when all objects have been taken. */
+    /** Opens the enumeration, and writes the reply. Called after the last object was added. */
     void finish() {
         std::string context;
         if (!_ends.empty()) {
@@ -101,13 +101,13 @@ public:
 private:
     const Call& _call;
     Pulled _kind;
-    /** How many objects the answer may have. */
+    /** How many objects the reply may have. */
     std::size_t _atOnce;
     std::chrono::milliseconds _time;
     std::size_t _given = 0;
     ResponseWriter _first;
     ResponseWriter _rest;
-    /** Where each object of the rest ends. */
+    /** The position in `_rest` at which each of its objects ends. */
     std::vector<std::size_t> _ends;
 };
 
@@ -187,9 +187,10 @@ void openReferenceInstancePaths(const Call& call) {
 void openQueryInstances(const Call& call) {
     const Query query = parseQuery(call.parameters.text("FilterQuery"), call.parameters.text("FilterQueryLanguage"));
     if (call.parameters.flag("ReturnQueryResultClass", false)) {
-        throw CimError(CMPI_RC_ERR_NOT_SUPPORTED, "found ReturnQueryResultClass, expected FALSE: the class of what is "
-                                                  "found is " +
-                                                      query.className);
+        throw CimError(CMPI_RC_ERR_NOT_SUPPORTED,
+                       "found ReturnQueryResultClass, expected FALSE: the result has instances "
+                       "of the class " +
+                           query.className);
     }
     Selection selection;
     selection.properties = query.properties;

@@ -17,7 +17,7 @@ namespace {
 
 constexpr std::array<std::string_view, 4> languages{"WQL", "CIM:WQL", "DMTF:CQL", "CIM:CQL"};
 
-/** Words of the languages that begin what is not done here. */
+/** Words that begin a feature of the languages that the server does not have. */
 constexpr std::array<std::string_view, 15> otherFeatures{"LIKE",   "ISA",   "JOIN",  "ORDER",   "GROUP",
                                                          "HAVING", "FIRST", "COUNT", "WITHIN",  "EVERY",
                                                          "ANY",    "IN",    "AS",    "BETWEEN", "DISTINCT"};
@@ -35,7 +35,7 @@ constexpr std::array<OperatorName, 7> operators{{{"=", Comparison::Operator::equ
                                                  {"<", Comparison::Operator::less},
                                                  {">", Comparison::Operator::greater}}};
 
-/* What a query may have: conditions within each other, and comparisons altogether. */
+/* Limits for a query: nested conditions, and comparisons altogether. */
 constexpr std::size_t maximumDepth = 50;
 constexpr std::size_t maximumComparisons = 1000;
 
@@ -85,7 +85,7 @@ public:
     }
 
 private:
-    /** A quote is part of the text where a backslash or another quote is before it. */
+    /** Reads a text in quotes. A quote after a backslash, or a doubled quote, is part of the text. */
     Token quoted(char quote) {
         std::string text;
         for (++_position; _position < _text.size(); ++_position) {
@@ -101,7 +101,7 @@ private:
             }
             text += _text[_position];
         }
-        throw invalid("the end", std::string(1, quote) + " behind the text");
+        throw invalid("the end", std::string(1, quote) + " after the text");
     }
 
     Token number() {
@@ -162,7 +162,7 @@ public:
 private:
     Condition anyOf(std::size_t depth) { return list(depth, "OR", Condition::Kind::any); }
 
-    /** Operands with one word between them; a single operand stands for itself. */
+    /** Reads operands that are joined by a word, AND or OR. A single operand is returned as it is. */
     Condition list(std::size_t depth, std::string_view word, Condition::Kind kind) {
         Condition whole{kind};
         do {
@@ -178,7 +178,7 @@ private:
 
     Condition negatable(std::size_t depth) {
         if (depth == maximumDepth) {
-            fail("at most " + std::to_string(maximumDepth) + " conditions within each other");
+            fail("at most " + std::to_string(maximumDepth) + " nested conditions");
         }
         if (acceptWord("NOT")) {
             Condition negated{Condition::Kind::none};
@@ -239,7 +239,7 @@ private:
         return *value;
     }
 
-    /** A property's name, with or without its class. */
+    /** Reads the name of a property, with or without the class in front of it. */
     std::string property() {
         std::string found = name("a property");
         if (acceptSign(".")) {
@@ -303,7 +303,7 @@ private:
     Lexer _lexer;
     Token _token;
     std::size_t _comparisons = 0;
-    /** Those that stand before properties. */
+    /** The class names that stand before names of properties. */
     std::vector<std::string> _classes;
 };
 
@@ -325,7 +325,7 @@ bool isText(CMPIType type) {
     return type == CMPI_string || type == CMPI_char16;
 }
 
-/** Whether a property can be compared with the literal; truth values only for being the same. */
+/** Whether a property can be compared with the literal. Booleans can only be equal or not. */
 bool isComparable(CMPIType type, const Comparison& comparison) {
     const CMPIType literal = comparison.literal.type;
     if (type == CMPI_boolean && literal == CMPI_boolean) {
@@ -348,7 +348,7 @@ double realOf(const Value& value) {
     return std::get<double>(value.content);
 }
 
-/** Integers are compared exactly, whatever their signs. */
+/** Compares integers exactly, also a signed with an unsigned one. */
 std::partial_ordering compareNumbers(const Value& left, const Value& right) {
     const auto sign = [](const Value& value) {
         const auto* integer = std::get_if<std::int64_t>(&value.content);
@@ -364,11 +364,11 @@ std::partial_ordering compareNumbers(const Value& left, const Value& right) {
     if (sign(left) != sign(right)) {
         return sign(left) ? std::partial_ordering::less : std::partial_ordering::greater;
     }
-    // Negative numbers have the order of their bits taken as natural ones.
+    // As unsigned numbers, negative numbers keep their order.
     return magnitude(left) <=> magnitude(right);
 }
 
-/** Points in time and intervals have no order between each other. */
+/** A point in time and an interval cannot be compared. */
 std::partial_ordering compareTimes(const std::string& left, const std::string& right) {
     const auto leftTime = parseDateTime(left);
     const auto rightTime = parseDateTime(right);
@@ -409,7 +409,7 @@ bool holds(std::partial_ordering order, Comparison::Operator comparedBy) {
     }
 }
 
-/** Nothing where it is neither true nor false. */
+/** No value if the condition is neither true nor false. */
 std::optional<bool> evaluate(const Condition& condition, const Instance& instance) {
     if (condition.kind == Condition::Kind::comparison) {
         const Comparison& comparison = condition.comparison;
@@ -418,7 +418,7 @@ std::optional<bool> evaluate(const Condition& condition, const Instance& instanc
         if (comparison.comparedBy == Comparison::Operator::isNull) {
             return isNull;
         }
-        // A provider may give another type than the class declares.
+        // A provider may return another type than the class declares.
         if (isNull || !isComparable(property->value.type, comparison)) {
             return std::nullopt;
         }
@@ -428,7 +428,8 @@ std::optional<bool> evaluate(const Condition& condition, const Instance& instanc
         const std::optional<bool> operand = evaluate(condition.operands.front(), instance);
         return operand ? std::optional(!*operand) : std::nullopt;
     }
-    // One operand that is true decides OR, one that is false AND; else what is unknown keeps the whole unknown.
+    // One true operand makes OR true, and one false operand makes AND false; otherwise an unknown operand leaves the
+    // result unknown.
     const bool deciding = condition.kind == Condition::Kind::any;
     std::optional<bool> whole = !deciding;
     for (const Condition& operand : condition.operands) {

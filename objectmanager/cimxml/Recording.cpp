@@ -14,11 +14,11 @@ namespace {
 
 using Audit::inOneLine;
 
-/* In bytes, so that a line of the log, which is cut at 1000, has room for what became of the call. */
+/* Limits in bytes: a line of the log is cut at 1000, and the outcome of the call, at its end, must not be cut off. */
 constexpr std::size_t longestText = 300;
 constexpr std::size_t longestName = 80;
 
-/** Without quotes where nobody can take it for more than one word. */
+/** Puts a text in quotes, unless it is one word. */
 std::string valueText(const std::string& text) {
     constexpr std::string_view wordCharacters = "+-.0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
     return !text.empty() && text.find_first_not_of(wordCharacters) == std::string::npos ? text
@@ -30,7 +30,7 @@ std::string attributeOf(const XmlElement& element, std::string_view name) {
     return value == nullptr ? std::string() : *value;
 }
 
-/** The path that `read` gives; `otherwise` where there is none to be read. */
+/** The text of the path that `read` returns; `otherwise` if it cannot be read. */
 std::string pathText(const std::function<ObjectPath()>& read, const std::string& otherwise) {
     try {
         return formatObjectPath(read());

@@ -12,7 +12,7 @@ void ReplyStream::send(std::string_view piece) {
         _outlet->send(piece);
         return;
     }
-    // From the first byte on, whether it arrives or not.
+    // Set before the piece is sent: after a failure, nobody knows how much of it the client got.
     _hasBegun = true;
     _outlet->begin({Server::Status::ok, _headers(), std::string(piece)});
 }

@@ -1,4 +1,4 @@
-/** The way that the document of an answer goes. */
+/** Sends the document of a reply while it is being made. */
 #ifndef CIMXML_REPLYSTREAM_H
 #define CIMXML_REPLYSTREAM_H
 
@@ -12,26 +12,26 @@
 namespace ObjectManager::CimXml {
 
 /**
- * Sends a document while it is made, and has room kept for what it is made of: what providers returned, and text that
- * cannot be sent yet. Without an outlet it does nothing. It throws what the outlet throws.
+ * Sends a document piece by piece, and reserves the memory that the document needs: for the objects that providers
+ * returned, and for text that cannot be sent yet. Without an outlet it does nothing. Exceptions of the outlet pass.
  */
 class ReplyStream final : private Arena::Meter {
 public:
     /**
-     * @param outlet null where the document has to be returned.
-     * @param headers gives the reply's headers, when it begins.
+     * @param outlet null if the document has to be returned as a whole.
+     * @param headers makes the reply's headers, when the first piece is sent.
      */
     ReplyStream(Server::Outlet* outlet, std::function<Server::HttpHeaders()> headers)
         : _outlet(outlet), _headers(std::move(headers)) {}
 
     bool canSend() const { return _outlet != nullptr; }
-    /** Whether the client has got something. */
+    /** Whether a piece has been sent. */
     bool hasBegun() const { return _hasBegun; }
 
-    /** Sends a piece of the document, and with the first one that the request was answered. */
+    /** Sends a piece of the document. The reply's status and headers go with the first piece. */
     void send(std::string_view piece);
 
-    /** Waits until there is room for so many bytes of text, beside what providers returned. */
+    /** Waits until so many bytes of text can be held in memory, beside the objects that providers returned. */
     void holdText(std::size_t bytes);
 
 private:

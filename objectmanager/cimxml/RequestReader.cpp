@@ -9,7 +9,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/** Throws where the attribute names a version whose part before the point is another. */
+/** Throws if the version in an attribute does not begin with the expected major version. */
 void requireVersion(const std::string& version, std::string_view major, const char* what, const char* cimError) {
     if (!version.starts_with(major)) {
         throw ProtocolError(Http::notImplemented, cimError,

@@ -21,7 +21,7 @@ void appendNumber(std::string& text, Number number) {
     text.append(digits.data(), end);
 }
 
-/** A real always has a point, and digits on both sides of it. */
+/** Writes a real with a point, and with digits on both sides of it. */
 template <typename Real>
 void appendReal(std::string& text, Real real) {
     if (!std::isfinite(real)) {
@@ -44,7 +44,7 @@ bool isWanted(const Selection& selection, std::string_view property) {
            (selection.within == nullptr || selection.within->property(property) != nullptr);
 }
 
-/** Whether the value is an instance, which is written as a text. */
+/** Whether values of the type are embedded instances, which CIM-XML writes as text. */
 bool isEmbedded(CMPIType type) {
     return (type & ~CMPI_ARRAY) == CMPI_instance;
 }
@@ -176,7 +176,7 @@ void ResponseWriter::classObjectPath(const std::string& name) {
     raw("</OBJECTPATH>\n");
 }
 
-/** A path without keys is a class's. */
+/** A path without keys is the path of a class. */
 void ResponseWriter::reference(const ObjectPath& path) {
     const bool isClass = path.keys.empty();
     raw("<VALUE.REFERENCE>\n");
@@ -187,7 +187,7 @@ void ResponseWriter::reference(const ObjectPath& path) {
     raw("</VALUE.REFERENCE>\n");
 }
 
-/** The text of a value that is neither array nor reference nor null. */
+/** Writes the text of a value that is no array, no reference and not null. */
 void ResponseWriter::scalar(const Value& value) {
     if (const auto* truth = std::get_if<bool>(&value.content)) {
         raw(*truth ? "TRUE" : "FALSE");

@@ -1,4 +1,4 @@
-/** CIM objects as CIM-XML writes them, one behind the other. */
+/** Writes CIM objects as elements of CIM-XML (DSP0201). */
 #ifndef CIMXML_RESPONSEWRITER_H
 #define CIMXML_RESPONSEWRITER_H
 
@@ -11,14 +11,14 @@
 
 namespace ObjectManager::CimXml {
 
-/** What is written of an instance or class. */
+/** The parts of an instance or class that are written. */
 struct Selection {
-    /** The properties wanted; nothing means all. */
+    /** The names of the properties; no value for all. */
     PropertyList properties;
-    /** The class whose properties are wanted, its ancestors' included; null means all. */
+    /** If not null, only properties that this class has, declared or inherited, are written. */
     const Class* within = nullptr;
     bool classOrigin = false;
-    /* Of classes only. */
+    /* For classes only. */
     bool localOnly = false;
     bool qualifiers = false;
 };
@@ -26,28 +26,28 @@ struct Selection {
 class ResponseWriter {
 public:
     /**
-     * The catalogue outlives the writer.
+     * The catalogue and the stream must outlive the writer.
      *
-     * @param host what the client calls the host. Every path has it, also where a provider named another, so that the
-     *             client can follow the path.
-     * @param nameSpace of paths that name none.
-     * @param stream takes what is written whenever there is enough of it; null where all of it is kept.
+     * @param host the name that the client uses for the host. It is written in every path, even if a provider named
+     *             another host, so that the client can follow the path.
+     * @param nameSpace is written in paths that have no namespace.
+     * @param stream gets the text, a piece at a time; if it is null, the writer keeps all text.
      */
     ResponseWriter(const Catalogue& catalogue, std::string host, std::string nameSpace, ReplyStream* stream = nullptr)
         : _catalogue(catalogue), _host(std::move(host)), _nameSpace(std::move(nameSpace)), _stream(stream) {}
 
-    /** One that writes the same, and keeps all of it. */
+    /** A writer with the same catalogue, host and namespace, which keeps all text. */
     ResponseWriter another() const { return {_catalogue, _host, _nameSpace}; }
 
-    /** What was written, and is not gone already. */
+    /** The text that was written and not passed to the stream. */
     std::string take() { return std::move(_text); }
     std::size_t size() const { return _text.size(); }
-    /** Drops what was written behind the first `size` bytes, where nothing is gone. */
+    /** Drops all text after the first `size` bytes. Not allowed if the stream has already got a piece. */
     void truncate(std::size_t size) { _text.resize(size); }
 
     /** Appends markup as it is. */
     void raw(std::string_view markup) { _text += markup; }
-    /** The same for what was written before, which may be much. */
+    /** Appends objects that another writer has written. */
     void objects(std::string_view written);
     /** Appends ` name="value"`. */
     void attribute(std::string_view name, std::string_view value);
@@ -65,7 +65,7 @@ public:
     /** The OBJECTPATH of a class. */
     void classObjectPath(const std::string& name);
 
-    /** An INSTANCE. Properties that its class declares and it has no value of are there without one. */
+    /** An INSTANCE. A property of its class for which it has no value is written without a value. */
     void instance(const Instance& instance, const Selection& selection);
     /** A VALUE.NAMEDINSTANCE. */
     void namedInstance(const Instance& instance, const Selection& selection);
@@ -74,7 +74,7 @@ public:
     /** A VALUE.INSTANCEWITHPATH. */
     void instanceWithPath(const Instance& instance, const Selection& selection);
 
-    /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; nothing where the value is null. */
+    /** A VALUE, VALUE.ARRAY, VALUE.REFERENCE or VALUE.REFARRAY; writes nothing for null. */
     void value(const Value& value);
     /** A RETURNVALUE. */
     void returnValue(const Value& returned);
@@ -89,7 +89,7 @@ public:
     void classWithPath(const Class& declared, const Selection& selection);
 
 private:
-    /** To be called where what can come many times has been written. */
+    /** Sends the text if it is large enough. Called after each element that a reply can contain many times. */
     void pass() {
         if (_stream != nullptr && _text.size() >= Server::Outlet::pieceBytes) {
             send();

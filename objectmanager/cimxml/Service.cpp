@@ -18,22 +18,22 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-/** @param problem what the log says of it. */
+/** @param message for the client. @param problem the line for the log. */
 HttpReply failure(unsigned int status, std::vector<std::pair<std::string, std::string>> headers,
                   const std::string& message, const std::string& problem) {
     headers.emplace_back("Content-Type", "text/plain; charset=\"utf-8\"");
     return {status, std::move(headers), message + '\n', problem};
 }
 
-/** The host's name for those who were asked by none. */
+/** The machine's host name, for a request that names no host. */
 std::string ownHostName() {
     std::array<char, 256> name{};
     return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "localhost";
 }
 
-/** What the client is told of an operation that failed. */
+/** The description of an operation's failure, for the client. */
 std::string descriptionOf(const CimError& error) {
-    // That there is no such instance is all there is to say.
+    // That an object does not exist is a complete answer; the reasons that were logged would only confuse.
     return error.code == CMPI_RC_ERR_NOT_FOUND
                ? error.what()
                : error.what() + reasonsText(error.reasons, error.refused ? ": " : "; the provider logged: ");
@@ -45,7 +45,7 @@ Service::Service(Dispatcher& dispatcher, const Catalogue& catalogue, const Servi
     : _dispatcher(dispatcher), _catalogue(catalogue), _clock(settings.clock),
       _enumerations(settings.enumerations, settings.clock, settings.newContext), _recorder(settings.recorder) {}
 
-/** Does what the message asks for, and records what has to be. */
+/** Carries out the operation, and records it if it has to be recorded. */
 void Service::performRecorded(const Operation& operation) {
     const Message& message = operation.message;
     const auto record = [&](Audit::Verdict verdict, const std::string& reason) {
@@ -68,12 +68,12 @@ void Service::performRecorded(const Operation& operation) {
 }
 
 /**
- * Does what the message asks for, and answers it. A large answer goes to the outlet while it is made.
+ * Carries out the operation, and makes its reply. A large reply is sent to the outlet while it is being made.
  *
- * Where the operation fails and nothing has been sent, its answer is an error. Behind the first byte that is too late:
- * the document ends where it is, without the end of its root, and what DSP0200 has for the trailers of an answer in
- * chunks, the status code and its description, is given to the server, which sends it to clients that take trailers,
- * and ends the connection to the others. So nobody takes what came for the answer.
+ * If the operation fails before anything has been sent, the reply is an error. Afterwards that is impossible: the
+ * document then breaks off without the end tag of its root, so that no client takes it for a complete reply. The reply
+ * returned has the trailers that DSP0200 defines for this case, the status code and its description; the server sends
+ * them to a client that accepts trailers, and closes the connection of any other client.
  */
 HttpReply Service::perform(const Message& message, const Caller& caller, const RequestHeaders& headers,
                            Server::Outlet* outlet, Enumerations::TimePoint start) {
@@ -85,7 +85,7 @@ HttpReply Service::perform(const Message& message, const Caller& caller, const R
     };
     ReplyStream stream(outlet, headersOfAnswer);
     const std::string host = headers.host();
-    // What became of a method's call is recorded before anybody is told: its answer waits for that as a whole.
+    // The outcome of a method call is recorded before the client learns of it, so nothing is sent before the record.
     ResponseWriter writer(_catalogue, host.empty() ? ownHostName() : host, message.nameSpace(),
                           stream.canSend() && message.isIntrinsic() ? &stream : nullptr);
     const char* const response = message.isIntrinsic() ? "IMETHODRESPONSE" : "METHODRESPONSE";
@@ -114,7 +114,7 @@ HttpReply Service::perform(const Message& message, const Caller& caller, const R
     writer.raw("</");
     writer.raw(response);
     writer.raw(">\n</SIMPLERSP>\n</MESSAGE>\n</CIM>\n");
-    // An answer that has begun has its headers.
+    // The headers of a reply that has begun have already been sent.
     return {Http::ok, stream.hasBegun() ? Server::HttpHeaders() : headersOfAnswer(), writer.take()};
 }
 

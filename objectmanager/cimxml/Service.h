@@ -1,4 +1,4 @@
-/** CIM-XML (DSP0200 and DSP0201): from an HTTP request to the operation that it asks for, and back. */
+/** Answers HTTP requests that ask for CIM operations in CIM-XML (DSP0200 and DSP0201). */
 #ifndef CIMXML_SERVICE_H
 #define CIMXML_SERVICE_H
 
@@ -20,19 +20,19 @@ struct Operation;
 
 struct ServiceSettings {
     EnumerationLimits enumerations;
-    /** What the time of answers and of open enumerations is taken from. */
+    /** Measures how long answers take and how long enumerations stay open. */
     Enumerations::Clock clock = std::chrono::steady_clock::now;
     Enumerations::NewContext newContext = randomContext;
-    /** Takes every call of a method, whatever became of it, and every other request that its client has no right to. */
+    /** Called for every method call, whatever its outcome, and for every other request that its user may not make. */
     Audit::Recorder recorder = [](const Audit::CallRecord&) {};
 };
 
 class Service {
 public:
-    /** Dispatcher and catalogue outlive the service. */
+    /** Dispatcher and catalogue must outlive the service. */
     Service(Dispatcher& dispatcher, const Catalogue& catalogue, const ServiceSettings& settings = {});
 
-    /** Used by several threads at once. Throws nothing but what the request's outlet throws. */
+    /** Used by several threads at once. Only exceptions of the request's outlet pass. */
     HttpReply answer(const HttpRequest& request, const Caller& caller);
 
 private:

@@ -1,4 +1,4 @@
-/** The status codes of CIM (DSP0200). Those that CMPI has no names for are returned by no provider. */
+/** The status codes of CIM (DSP0200) for which CMPI has no names. No provider returns them. */
 #ifndef CIMXML_STATUSCODES_H
 #define CIMXML_STATUSCODES_H
 
@@ -11,7 +11,7 @@ constexpr auto invalidOperationTimeout = static_cast<CMPIrc>(22);
 constexpr auto filteredEnumerationNotSupported = static_cast<CMPIrc>(25);
 constexpr auto continuationOnErrorNotSupported = static_cast<CMPIrc>(26);
 
-/** A code as clients are told it: what is none of CIM's is a failure. */
+/** The status code that a client gets: a code that DSP0200 does not define becomes CIM_ERR_FAILED. */
 constexpr CMPIrc sentCode(CMPIrc code) {
     const bool known = (code > CMPI_RC_OK && code <= CMPI_RC_ERR_METHOD_NOT_FOUND) ||
                        (code >= invalidEnumerationContext && code <= serverLimitsExceeded);

@@ -18,14 +18,14 @@ namespace {
     throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, message);
 }
 
-/** Throws where one more is too many: they are looked through for each. */
+/** Throws if there are too many names: each name is compared with all others. */
 void requireRoom(std::size_t count, const std::string& what) {
     if (count == maximumNames) {
         invalid("found more than " + std::to_string(maximumNames) + ' ' + what);
     }
 }
 
-/** An integer in a form that may be sent, decimal or hexadecimal, as a literal: without leading zeros. */
+/** An integer of CIM-XML, decimal or hexadecimal, in the form of a literal, which has no leading zeros. */
 std::optional<std::string> integerLiteral(std::string_view text) {
     const bool isSigned = text.starts_with('-') || text.starts_with('+');
     const std::string_view digits = text.substr(isSigned ? 1 : 0);
@@ -39,7 +39,7 @@ std::optional<std::string> integerLiteral(std::string_view text) {
     return std::string(text.substr(0, isSigned ? 1 : 0)) + std::string(digits.substr(significant));
 }
 
-/** The type that an attribute names; nothing where it is not there. */
+/** The type that an attribute names; no value if the attribute is missing. */
 std::optional<CMPIType> typeOfAttribute(const XmlElement& element, std::string_view attribute) {
     const std::string* const name = element.attribute(attribute);
     if (name == nullptr) {
@@ -47,12 +47,12 @@ std::optional<CMPIType> typeOfAttribute(const XmlElement& element, std::string_v
     }
     const auto type = typeByName(*name);
     if (!name->empty() && !type && !equalNames(*name, "reference")) {
-        invalid("found the type \"" + *name + "\", expected one of CIM's");
+        invalid("found the type \"" + *name + "\", expected a type of CIM");
     }
     return type;
 }
 
-/** The value of a key that no class declares. */
+/** The value of a key whose class is unknown. */
 Value untypedKey(const XmlElement& keyValue, const std::string& text) {
     if (const auto type = typeOfAttribute(keyValue, "TYPE")) {
         return valueOfWireText(text, *type);
@@ -123,7 +123,7 @@ ObjectPath ValueReader::instanceName(const XmlElement& element, const std::strin
         name = key == nullptr ? name : key->name;
         path.keys.push_back({name, keyValue(requiredChild(binding, {"KEYVALUE", "VALUE.REFERENCE"}), key, name)});
     }
-    // The key of a class that has one only needs no name.
+    // If a class has only one key, its name may be left out.
     const XmlElement* const single = optionalChild(element, {"KEYVALUE", "VALUE.REFERENCE"});
     if (single != nullptr && path.keys.empty()) {
         const auto names = _catalogue.keyNames(path.className);

@@ -17,14 +17,14 @@ std::string inAttribute(std::string_view text) {
     return document;
 }
 
-TEST(Characters, areWrittenSoThatTheyAreReadBack) {
+TEST(Characters, AreWrittenSoThatTheyAreReadBack) {
     EXPECT_EQ(inText(""), "|");
     EXPECT_EQ(inText("plain \xC3\xA4 \xE2\x82\xAC \xF0\x9F\x94\x8C"), "|plain \xC3\xA4 \xE2\x82\xAC \xF0\x9F\x94\x8C");
     EXPECT_EQ(inText("<a> & \"b\"\tc\r\n"), "|&lt;a&gt; &amp; \"b\"\tc&#13;\n");
     EXPECT_EQ(inAttribute("<a> & \"b\"\tc\r\n"), "|&lt;a&gt; &amp; &quot;b&quot;&#9;c&#13;&#10;");
 }
 
-TEST(Characters, thatXmlCannotSayAreReplaced) {
+TEST(Characters, ThatXmlCannotSayAreReplaced) {
     const std::string replacement = "\xEF\xBF\xBD";
     EXPECT_EQ(inText(std::string("a\0b", 3)), "|a" + replacement + "b");
     EXPECT_EQ(inText("a\x1B"), "|a" + replacement);
@@ -33,7 +33,7 @@ TEST(Characters, thatXmlCannotSayAreReplaced) {
     EXPECT_EQ(inText("\xE2\x82"), "|" + replacement + replacement);
 }
 
-TEST(Characters, areThoseOfUtf8AndXml) {
+TEST(Characters, AreThoseOfUtf8AndXml) {
     for (const std::string_view character :
          {"a", "\n", "\xC2\x80", "\xEF\xBF\xBD", "\xF0\x90\x80\x80", "\xF4\x8F\xBF\xBF"}) {
         EXPECT_EQ(inText(character), "|" + std::string(character)) << testing::PrintToString(character);

@@ -43,7 +43,7 @@ protected:
         return "<IPARAMVALUE NAME=\"" + parameter + "\"><VALUE>" + value + "</VALUE></IPARAMVALUE>";
     }
 
-    /** What stands behind the name of a parameter in the answer to a pull operation. */
+    /** The text after the name of an output parameter in the reply to a pull operation. */
     static std::string contextOf(const HttpReply& reply) {
         const std::string before = "NAME=\"EnumerationContext\" PARAMTYPE=\"string\"><VALUE>";
         const std::size_t start = reply.body.find(before);
@@ -54,7 +54,7 @@ protected:
     RecordingOutlet _outlet;
 };
 
-/** Of each operation that can find much: the pieces are the document, and none is much larger than it has to be. */
+/** For each operation that can have a large reply: the pieces make up the document, and no piece is much too large. */
 TEST_F(LargeAnswerTest, GoInPiecesThatMakeUpTheWhole) {
     const std::pair<std::string, std::string> requests[] = {
         {"EnumerateInstances", className("Test_Disk")},
@@ -111,7 +111,7 @@ TEST_F(LargeAnswerTest, OfPullOperationsGoInPieces) {
     EXPECT_EQ(objectsOf(_outlet.joined(pulled).body), objectsOf(atOnce.body));
 }
 
-/** Not even the first objects are sent before it is known that there is room for the others. */
+/** Not even the first objects are sent before it is certain that the others can be kept. */
 TEST_F(LargeAnswerTest, OfOpenOperationsAreErrorsWhereThereIsNoRoomForTheRest) {
     Service small = serviceWith({.enumerations = {.count = 4, .bytes = 100'000, .time = std::chrono::seconds(60)}});
     const auto headers = requestHeaders("OpenEnumerateInstances");
@@ -122,7 +122,7 @@ TEST_F(LargeAnswerTest, OfOpenOperationsAreErrorsWhereThereIsNoRoomForTheRest) {
     EXPECT_THAT(reply.body, HasSubstr("<ERROR CODE=\"27\""));
 }
 
-/** The provider of a descendant fails when the instances of its ancestor are on their way. */
+/** The provider of a descendant fails after the instances of its ancestor have been sent. */
 TEST_F(LargeAnswerTest, AreBrokenOffWhereTheOperationFailsBehindTheFirstByte) {
     setenv("TEST_FAST_DISKS_FAIL", "1", 1);
     EXPECT_THAT(ask("EnumerateInstances", className("Test_Disk"), nullptr).body,

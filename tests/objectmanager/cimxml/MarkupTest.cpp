@@ -7,7 +7,7 @@
 namespace ObjectManager::CimXml {
 namespace {
 
-/** The text of the root; what is wrong where it is not read. */
+/** The text of the root; the error message if the document is refused. */
 std::string read(const std::string& text) {
     try {
         return parseMarkup(text).text;
@@ -25,7 +25,7 @@ std::string repeated(const std::string& text, std::size_t times) {
     return all;
 }
 
-TEST(Markup, givesTheTextOfAnElement) {
+TEST(Markup, GivesTheTextOfAnElement) {
     EXPECT_EQ(read("<A>x</A>"), "x");
     EXPECT_EQ(read("\xEF\xBB\xBF<?xml version='1.0' encoding='UTF-8'?>\n<!-- c --><A >x</A >\n<!-- d -->\n"), "x");
     EXPECT_EQ(read("<!DOCTYPE CIM SYSTEM \"http://example.com/[x].dtd\">\n<A>x</A>"), "x");
@@ -43,8 +43,8 @@ struct Malformed {
 
 class MalformedMarkup : public testing::TestWithParam<Malformed> {};
 
-TEST_P(MalformedMarkup, isRefused) {
-    EXPECT_EQ(read(GetParam().text), "400 the body is no XML: at byte " + GetParam().complaint);
+TEST_P(MalformedMarkup, IsRefused) {
+    EXPECT_EQ(read(GetParam().text), "400 the body is not XML: at byte " + GetParam().complaint);
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -53,10 +53,10 @@ INSTANTIATE_TEST_SUITE_P(
         Malformed{"", "1, found the end of the document, expected an element"},
         Malformed{"<!-- c -->", "11, found the end of the document, expected an element"},
         Malformed{"text", "1, found 'text', expected the root, and at most one document type before it"},
-        Malformed{"<A/>x", "5, found 'x', expected nothing behind the root"},
+        Malformed{"<A/>x", "5, found 'x', expected nothing after the root"},
         Malformed{"<A/>&amp;", "5, found '&amp;', expected what XML allows there"},
-        Malformed{"<A/><![CDATA[x]]>", "5, found '<![CDATA[x]]>', expected nothing behind the root"},
-        Malformed{"<A/><B/>", "5, found '<B/>', expected nothing behind the root"},
+        Malformed{"<A/><![CDATA[x]]>", "5, found '<![CDATA[x]]>', expected nothing after the root"},
+        Malformed{"<A/><B/>", "5, found '<B/>', expected nothing after the root"},
         Malformed{"<A>", "4, found the end of the document, expected the end of the element A"},
         Malformed{"<A></B>", "6, found 'B>', expected the end of the element A"},
         Malformed{"</A>", "2, found '/A>', expected what XML allows there"},
@@ -92,7 +92,7 @@ INSTANTIATE_TEST_SUITE_P(
         Malformed{"<!DOCTYPE A", "12, found the end of the document, expected an element"},
         Malformed{"<!DOCTYPE A><!DOCTYPE A><A/>",
                   "13, found '<!DOCTYPE A><A/>', expected the root, and at most one document type before it"},
-        Malformed{"<A/><!DOCTYPE A>", "5, found '<!DOCTYPE A>', expected nothing behind the root"},
+        Malformed{"<A/><!DOCTYPE A>", "5, found '<!DOCTYPE A>', expected nothing after the root"},
         Malformed{"<A><!ENTITY e \"x\"></A>", "6, found 'ENTITY e \"x\"></A>', expected what XML allows there"},
         Malformed{
             "<!DOCTYPE A SYSTEM \"x\"><A>&e;</A>",
@@ -118,21 +118,21 @@ INSTANTIATE_TEST_SUITE_P(
         Malformed{std::string("\xFF\xFE<\0A\0/\0>\0", 10),
                   "4, found the byte 0x00, expected a character of UTF-8 that XML allows"}));
 
-TEST(Markup, inAnotherEncodingIsRefused) {
+TEST(Markup, InAnotherEncodingIsRefused) {
     EXPECT_EQ(read("<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?><A/>"),
               "415 found the encoding \"ISO-8859-1\", expected utf-8");
 }
 
-/** Of a document type with an external part, expat takes every entity as declared there. */
-TEST(Markup, hasNoOtherEntitiesUnderADocumentTypeThatIsNotRead) {
+/** If the document type has an external part, expat assumes that every unknown entity is declared there. */
+TEST(Markup, HasNoOtherEntitiesUnderADocumentTypeThatIsNotRead) {
     EXPECT_EQ(read("<!DOCTYPE A SYSTEM \"x\"><A b=\"&lt;&#65;\">&lt;</A>"), "<");
 }
 
-TEST(Markup, inUtf8IsReadWhenItSaysAscii) {
+TEST(Markup, InUtf8IsReadWhenItSaysAscii) {
     EXPECT_EQ(read("<?xml version='1.0' encoding='US-ASCII'?><A>\xC3\xA4</A>"), "\xC3\xA4");
 }
 
-TEST(Markup, givesAttributesAndChildrenInTheirOrder) {
+TEST(Markup, GivesAttributesAndChildrenInTheirOrder) {
     const XmlElement root = parseMarkup("<A b='1' c='&quot;'><B/>x<C>y</C></A>");
     EXPECT_EQ(root.name, "A");
     ASSERT_NE(root.attribute("c"), nullptr);
@@ -144,11 +144,11 @@ TEST(Markup, givesAttributesAndChildrenInTheirOrder) {
     EXPECT_EQ(root.text, "x");
 }
 
-TEST(Markup, isBoundedInDepthAttributesAndElements) {
+TEST(Markup, IsBoundedInDepthAttributesAndElements) {
     EXPECT_EQ(read(repeated("<A>", maximumDepth) + repeated("</A>", maximumDepth)), "");
-    EXPECT_EQ(read(repeated("<A>", 1'000'000)), "400 the body is no XML: at byte " +
+    EXPECT_EQ(read(repeated("<A>", 1'000'000)), "400 the body is not XML: at byte " +
                                                     std::to_string(maximumDepth * 3 + 1) +
-                                                    ", found more than 100 elements within each other");
+                                                    ", found more than 100 nested elements");
     std::string attributes = "<A";
     for (std::size_t i = 0; i <= maximumAttributes; ++i) {
         attributes += " a" + std::to_string(i) + "=''";

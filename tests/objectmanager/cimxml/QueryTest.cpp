@@ -11,7 +11,7 @@ namespace {
 
 class QueryTest : public testing::Test {
 protected:
-    /** "yes" or "no"; where the query is refused, its code and why. */
+    /** "yes" or "no"; if the query is refused, the status code and the reason. */
     std::string answer(const std::string& condition) const { return answerTo("SELECT * FROM C WHERE " + condition); }
 
     std::string answerTo(const std::string& text, const std::string& language = "WQL") const {
@@ -46,7 +46,7 @@ struct Asked {
 
 class ConditionTest : public QueryTest, public testing::WithParamInterface<Asked> {};
 
-TEST_P(ConditionTest, isAnswered) {
+TEST_P(ConditionTest, IsAnswered) {
     EXPECT_EQ(answer(GetParam().condition), GetParam().answer) << GetParam().condition;
 }
 
@@ -71,7 +71,7 @@ INSTANTIATE_TEST_SUITE_P(
         Asked{"", "15 found the end in the query, expected a property"},
         Asked{"Name", "15 found the end in the query, expected =, <>, <, <=, >, >= or IS"},
         Asked{"Name = ", "15 found the end in the query, expected a text in quotes, a number, TRUE or FALSE"},
-        Asked{"Name = 'x", "15 found the end in the query, expected ' behind the text"},
+        Asked{"Name = 'x", "15 found the end in the query, expected ' after the text"},
         Asked{"Name = x", "15 found 'x' in the query, expected a text in quotes, a number, TRUE or FALSE"},
         Asked{"(Name = 'x'", "15 found the end in the query, expected AND, OR or ')'"},
         Asked{"Name = 'x' 'y'", "15 found 'y' in the query, expected AND, OR or the end"},
@@ -95,7 +95,7 @@ INSTANTIATE_TEST_SUITE_P(
               "14 found 'upper(' in the query, expected no more than SELECT properties FROM one class "
               "WHERE comparisons"}));
 
-TEST_F(QueryTest, selectsPropertiesOfOneClass) {
+TEST_F(QueryTest, SelectsPropertiesOfOneClass) {
     EXPECT_EQ(answerTo("select name, c.on from c"), "yes");
     EXPECT_EQ(answerTo("SELECT Name FROM C", "DMTF:CQL"), "yes");
     EXPECT_EQ(answerTo("SELECT Name FROM C", "SQL"), "14 found the query language \"SQL\", expected WQL or DMTF:CQL");
@@ -112,9 +112,8 @@ TEST_F(QueryTest, selectsPropertiesOfOneClass) {
 }
 
 /** A query cannot be made so deep or so long that it keeps a thread busy or exhausts its stack. */
-TEST_F(QueryTest, isBoundedInDepthAndLength) {
-    EXPECT_EQ(answer(std::string(100'000, '(')),
-              "15 found '(' in the query, expected at most 50 conditions within each other");
+TEST_F(QueryTest, IsBoundedInDepthAndLength) {
+    EXPECT_EQ(answer(std::string(100'000, '(')), "15 found '(' in the query, expected at most 50 nested conditions");
     std::string text = "On = FALSE";
     for (int i = 0; i < 999; ++i) {
         text += " OR On = FALSE";

@@ -1,4 +1,4 @@
-/** Takes an answer in pieces, as the server does. */
+/** An outlet that records the pieces of a reply, in place of the server's. */
 #ifndef TESTS_OBJECTMANAGER_CIMXML_RECORDINGOUTLET_H
 #define TESTS_OBJECTMANAGER_CIMXML_RECORDINGOUTLET_H
 
@@ -13,7 +13,7 @@ namespace ObjectManager::CimXml {
 
 class RecordingOutlet : public Server::Outlet {
 public:
-    /** Thrown where the client has gone. */
+    /** Thrown like the server's exception for a client that has gone. */
     struct Gone {};
 
     void hold(std::size_t bytes) override { held = std::max(held, bytes); }
@@ -30,7 +30,7 @@ public:
         pieces.emplace_back(piece);
     }
 
-    /** What the client has got when the rest was returned. */
+    /** The whole reply that the client gets: the pieces, and the rest that the handler returned. */
     HttpReply joined(const HttpReply& rest) const {
         if (!begun) {
             return rest;

@@ -15,7 +15,7 @@ using testing::HasSubstr;
 
 class ResponseWriterTest : public testing::Test {
 protected:
-    /** What a writer writes that `write` uses. */
+    /** The text that a writer writes when `write` uses it. */
     template <typename Write>
     std::string written(Write write) {
         ResponseWriter writer(_catalogue, "host.example", "root/cimv2");
@@ -36,7 +36,7 @@ protected:
     const Catalogue _catalogue{readMof("class Test_Any { [Key] string Name; uint16 P[]; };", "any.mof")};
 };
 
-TEST_F(ResponseWriterTest, writesScalars) {
+TEST_F(ResponseWriterTest, WritesScalars) {
     EXPECT_EQ(written(booleanValue(false)), "<VALUE>FALSE</VALUE>");
     EXPECT_EQ(written(signedValue(CMPI_sint64, std::numeric_limits<std::int64_t>::min())),
               "<VALUE>-9223372036854775808</VALUE>");
@@ -45,7 +45,7 @@ TEST_F(ResponseWriterTest, writesScalars) {
     EXPECT_EQ(written(nullValue(CMPI_string)), "");
 }
 
-TEST_F(ResponseWriterTest, writesRealsWithAPointAndAsShortAsTheirTypeAllows) {
+TEST_F(ResponseWriterTest, WritesRealsWithAPointAndAsShortAsTheirTypeAllows) {
     EXPECT_EQ(written(realValue(CMPI_real64, 5)), "<VALUE>5.0</VALUE>");
     EXPECT_EQ(written(realValue(CMPI_real64, -0.25)), "<VALUE>-0.25</VALUE>");
     EXPECT_EQ(written(realValue(CMPI_real64, 1e100)), "<VALUE>1.0e+100</VALUE>");
@@ -56,13 +56,13 @@ TEST_F(ResponseWriterTest, writesRealsWithAPointAndAsShortAsTheirTypeAllows) {
     EXPECT_EQ(written(realValue(CMPI_real64, std::numeric_limits<double>::quiet_NaN())), "<VALUE>NaN</VALUE>");
 }
 
-TEST_F(ResponseWriterTest, writesArrays) {
+TEST_F(ResponseWriterTest, WritesArrays) {
     EXPECT_EQ(written(arrayValue(CMPI_uint16, {})), "<VALUE.ARRAY></VALUE.ARRAY>");
     EXPECT_EQ(written(arrayValue(CMPI_uint16, {unsignedValue(CMPI_uint16, 1), nullValue(CMPI_uint16)})),
               "<VALUE.ARRAY><VALUE>1</VALUE><VALUE.NULL/></VALUE.ARRAY>");
 }
 
-TEST_F(ResponseWriterTest, writesReferencesInTheNamespaceOfTheRequestWhereTheyNameNone) {
+TEST_F(ResponseWriterTest, WritesReferencesInTheNamespaceOfTheRequestWhereTheyNameNone) {
     EXPECT_EQ(written(referenceValue({"far.example", "root/a/b", "Test_Any", {{"Name", stringValue("<")}}})),
               "<VALUE.REFERENCE>\n<LOCALINSTANCEPATH>\n"
               "<LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"a\"/><NAMESPACE NAME=\"b\"/>"
@@ -76,7 +76,7 @@ TEST_F(ResponseWriterTest, writesReferencesInTheNamespaceOfTheRequestWhereTheyNa
               "<CLASSNAME NAME=\"Test_Any\"/>\n</LOCALCLASSPATH>\n</VALUE.REFERENCE>\n");
 }
 
-TEST_F(ResponseWriterTest, namesTheKindOfKeys) {
+TEST_F(ResponseWriterTest, NamesTheKindOfKeys) {
     const std::string name = written([](ResponseWriter& writer) {
         writer.instanceName({"",
                              "",
@@ -91,7 +91,7 @@ TEST_F(ResponseWriterTest, namesTheKindOfKeys) {
                 HasSubstr("<KEYVALUE VALUETYPE=\"string\" TYPE=\"datetime\">20260101000000.000000+000</KEYVALUE>"));
 }
 
-TEST_F(ResponseWriterTest, writesPropertiesWithTheTypeOfTheirValueElseOfTheirDeclaration) {
+TEST_F(ResponseWriterTest, WritesPropertiesWithTheTypeOfTheirValueElseOfTheirDeclaration) {
     EXPECT_THAT(property(unsignedValue(CMPI_uint8, 1)),
                 HasSubstr("<PROPERTY NAME=\"P\" TYPE=\"uint8\"><VALUE>1</VALUE></PROPERTY>"));
     EXPECT_THAT(property(nullValue(CMPI_null)),
@@ -99,7 +99,7 @@ TEST_F(ResponseWriterTest, writesPropertiesWithTheTypeOfTheirValueElseOfTheirDec
     EXPECT_THAT(property(nullValue(CMPI_ref)), HasSubstr("<PROPERTY.REFERENCE NAME=\"P\"></PROPERTY.REFERENCE>"));
 }
 
-TEST_F(ResponseWriterTest, writesAnEmbeddedInstanceAsText) {
+TEST_F(ResponseWriterTest, WritesAnEmbeddedInstanceAsText) {
     const Value embedded{CMPI_instance, std::make_shared<const Instance>(
                                             Instance{{"", "", "Inner", {}}, {{"T", stringValue("a & b")}}})};
     EXPECT_THAT(property(embedded),
@@ -109,7 +109,7 @@ TEST_F(ResponseWriterTest, writesAnEmbeddedInstanceAsText) {
                           "&lt;/PROPERTY&gt;\n&lt;/INSTANCE&gt;\n</VALUE></PROPERTY>"));
 }
 
-TEST_F(ResponseWriterTest, tellsOfCodesThatAreNoneOfCimAsFailures) {
+TEST_F(ResponseWriterTest, TellsOfCodesThatAreNoneOfCimAsFailures) {
     const auto error = [&](CMPIrc code) {
         return written([&](ResponseWriter& writer) { writer.error(code, "\"why\""); });
     };

@@ -24,7 +24,7 @@ public:
         }
         _folder = name;
         const std::string configuration = name + "/agent.toml";
-        // A reboot is over at once, so that it leaves nothing behind for the next case.
+        // A reboot is over at once, so that the next case finds the machine on again.
         std::ofstream(configuration) << "[system]\nname = \"machine.example\"\n"
                                      << "[log]\ndestination = \"file\"\nfile = \"" << name << "/log\"\n"
                                      << "[instrumentation.simulated]\nstate-file = \"" << stateFile().string() << "\"\n"
@@ -46,7 +46,7 @@ private:
     std::filesystem::path _folder;
 };
 
-/** Everything behind a service, in the order in which it is needed. */
+/** The objects that a service needs, in the order in which they are made. */
 struct World {
     AgentFolder agent;
     Catalogue catalogue = readCatalogue(TEST_SCHEMA);

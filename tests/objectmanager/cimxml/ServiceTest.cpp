@@ -25,8 +25,8 @@ protected:
     }
 };
 
-/** Every request is cut off at every byte: what remains is refused, and never taken for something else. */
-TEST_F(ServiceTest, refusesEveryRequestThatIsCutOff) {
+/** Cuts each request off at each of its bytes: the rest is refused, and never taken for another request. */
+TEST_F(ServiceTest, RefusesEveryRequestThatIsCutOff) {
     const std::string whole =
         requestBody("GetInstance", "<IPARAMVALUE NAME=\"InstanceName\"><INSTANCENAME CLASSNAME=\"Test_Disk\">"
                                    "<KEYBINDING NAME=\"Name\"><KEYVALUE>a&amp;<![CDATA[b]]></KEYVALUE></KEYBINDING>"
@@ -39,8 +39,8 @@ TEST_F(ServiceTest, refusesEveryRequestThatIsCutOff) {
     EXPECT_EQ(answer("POST", requestHeaders("GetInstance"), whole).status, 200U);
 }
 
-/** What is looked through for each name cannot be made long enough to keep a thread busy. */
-TEST_F(ServiceTest, boundsHowManyNamesARequestLists) {
+/** Lists that are searched for each name have a limit, so that no request keeps a thread busy for long. */
+TEST_F(ServiceTest, BoundsHowManyNamesARequestLists) {
     std::string keys;
     std::string names;
     std::string properties;
@@ -62,7 +62,7 @@ TEST_F(ServiceTest, boundsHowManyNamesARequestLists) {
     }
 }
 
-TEST_F(ServiceTest, namesTheHostItselfWhereTheClientDoesNot) {
+TEST_F(ServiceTest, NamesTheHostItselfWhereTheClientDoesNot) {
     auto headers = requestHeaders("AssociatorNames", "root/cimv2");
     headers.erase(headers.begin());
     const HttpReply reply = answer(
@@ -76,7 +76,7 @@ TEST_F(ServiceTest, namesTheHostItselfWhereTheClientDoesNot) {
 }
 
 /** The provider returns 0 whether or not the machine accepted the request. */
-TEST_F(ServiceTest, tellsThatTheMachineRefused) {
+TEST_F(ServiceTest, TellsThatTheMachineRefused) {
     std::ifstream file(std::filesystem::path(TEST_CASES) / "invoke.wire", std::ios::binary);
     const WireCase reboot = readWireCase({std::istreambuf_iterator<char>(file), {}});
     const auto status = [&] {
@@ -91,7 +91,7 @@ TEST_F(ServiceTest, tellsThatTheMachineRefused) {
     EXPECT_THAT(status(), Not(HasSubstr("<ERROR")));
 }
 
-TEST_F(ServiceTest, answersSeveralThreadsAtOnce) {
+TEST_F(ServiceTest, AnswersSeveralThreadsAtOnce) {
     const std::string disks = enumerate("Test_Disk").body;
     const std::string failure = enumerate("Test_Fails").body;
     ASSERT_THAT(disks, HasSubstr("<INSTANCE "));

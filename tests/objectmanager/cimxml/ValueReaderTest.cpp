@@ -7,7 +7,7 @@
 namespace ObjectManager::CimXml {
 namespace {
 
-/** The value; nothing where the text is refused. */
+/** The value; no value if the text is refused. */
 std::optional<Value> read(const std::string& text, CMPIType type) {
     try {
         return valueOfWireText(text, type);
@@ -24,7 +24,7 @@ struct Read {
 
 class WireText : public testing::TestWithParam<Read> {};
 
-TEST_P(WireText, isReadAsItsType) {
+TEST_P(WireText, IsReadAsItsType) {
     const auto value = read(GetParam().text, GetParam().value.type);
     ASSERT_TRUE(value.has_value()) << GetParam().text;
     EXPECT_TRUE(*value == GetParam().value) << GetParam().text;
@@ -48,7 +48,7 @@ struct Refused {
 
 class RefusedWireText : public testing::TestWithParam<Refused> {};
 
-TEST_P(RefusedWireText, isNoValueOfTheType) {
+TEST_P(RefusedWireText, IsNoValueOfTheType) {
     EXPECT_FALSE(read(GetParam().text, GetParam().type).has_value());
 }
 

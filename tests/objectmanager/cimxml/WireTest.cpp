@@ -1,6 +1,6 @@
 /*
- * Every file in cases/ is a request and the exact reply. With ORV_RECORD_CASES in the environment the replies are
- * written into the files, to be looked at before they are committed.
+ * Every file in cases/ has requests with their exact replies. If the environment variable ORV_RECORD_CASES is set, the
+ * replies are written into the files; look at the difference before you commit it.
  */
 #include "RecordingOutlet.h"
 #include "ServiceFixture.h"
@@ -22,7 +22,7 @@ std::string contentOf(const std::filesystem::path& file) {
     return {std::istreambuf_iterator<char>(stream), {}};
 }
 
-/** Whether the document is what the document type of replies allows. xmllint says on standard error why it is not. */
+/** Whether the document is valid by the document type of replies. If not, xmllint says why on standard error. */
 bool isValid(const std::string& document) {
     std::FILE* lint = popen("xmllint --noout --nonet --dtdvalid " TEST_DOCUMENT_TYPE " -", "w");
     if (lint == nullptr) {
@@ -40,7 +40,7 @@ std::vector<std::filesystem::path> cases() {
 
 class WireTest : public ServiceFixture, public testing::WithParamInterface<std::filesystem::path> {};
 
-TEST_P(WireTest, isAnsweredExactly) {
+TEST_P(WireTest, IsAnsweredExactly) {
     Enumerations::TimePoint now;
     int contexts = 0;
     Service service = serviceWith({.enumerations = {.count = 4, .bytes = 14'000, .time = std::chrono::seconds(60)},

@@ -1,4 +1,4 @@
-/** Memory of what large answers are made of. */
+/** The limit for the memory of large answers. */
 #ifndef SERVER_ANSWERMEMORY_H
 #define SERVER_ANSWERMEMORY_H
 
@@ -13,24 +13,24 @@
 namespace ObjectManager::Server {
 
 /**
- * A number of bytes, of which one network may have half. Nobody knows beforehand how much an answer needs, so whoever
- * makes one asks for more as it grows, and waits, in order, where there is no more. So that those who have some and
- * want more do not all wait for each other, the one that has waited longest gets whatever it wants, beyond the number
- * if need be; it is the only one until it has given everything back.
+ * A limit in bytes for the memory of all answers together; the answers of one network may have half of it. Nobody knows
+ * beforehand how much memory an answer needs, so an answer asks for more while it grows. If too little is left, it
+ * waits in a queue. Answers that already have memory could all wait for each other; therefore the answer that has
+ * waited longest gets what it wants even beyond the limit. It is the only one to do so until it gives its memory back.
  *
  * Used by several threads at once.
  */
 class AnswerMemory {
     struct Network {
         std::size_t bytes = 0;
-        /** How many have some of it, or want some. */
+        /** How many answers of the network have memory, or want some. */
         unsigned int shares = 0;
     };
 
 public:
     explicit AnswerMemory(std::size_t bytes) : _bytes(bytes) {}
 
-    /** What one answer has of it, given back with its end. */
+    /** The memory of one answer. It is given back when the object is destroyed. */
     class Share {
     public:
         Share(AnswerMemory& memory, std::string network) : _memory(memory), _name(std::move(network)) {}
@@ -38,7 +38,8 @@ public:
         Share& operator=(const Share&) = delete;
         ~Share() { _memory.giveBack(*this); }
 
-        /** Waits until it has so many bytes. Has them at once where it had as many before. @throws std::bad_alloc */
+        /** Waits until the answer has `size` bytes; returns at once if it has so many already. @throws std::bad_alloc
+         */
         void grow(std::size_t size);
 
     private:
@@ -46,22 +47,22 @@ public:
 
         AnswerMemory& _memory;
         const std::string _name;
-        /** Null as long as it has nothing and wants nothing. */
+        /** Null until the answer asks for memory. */
         Network* _network = nullptr;
         std::size_t _size = 0;
         std::size_t _wanted = 0;
         std::condition_variable _granted;
     };
 
-    /** Whether anybody waits for others to give back what they have. */
+    /** Whether an answer waits for others to give memory back. */
     bool isAwaited();
 
-    /** Nobody waits any more: everybody gets what he wants. */
+    /** Ends all waiting: from here on, every answer gets what it asks for. */
     void close();
 
 private:
     bool fits(const Share& share) const;
-    /** Gives what there is to those who wait. */
+    /** Gives memory to the answers that wait, in their order. */
     void grant();
     void giveBack(const Share& share) noexcept;
 
@@ -70,7 +71,7 @@ private:
     std::size_t _taken = 0;
     std::map<std::string, Network> _networks;
     std::list<Share*> _waiting;
-    /** Who may go beyond the number; null where nobody needs to. */
+    /** The answer that may go beyond the limit; null if none does. */
     const Share* _beyond = nullptr;
     bool _closed = false;
 };

@@ -10,9 +10,9 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** Connections beyond the limit, so that their clients can be told. */
+/** How many connections beyond the limit are accepted, to answer that the server is busy. */
 constexpr std::size_t surplusConnections = 64;
-/** Connections that leave and are not closed yet: of all networks and of one. */
+/** How many connections may be shut down and not yet closed: of all networks, and of one network. */
 constexpr std::size_t leavingConnections = 500;
 constexpr std::size_t leavingConnectionsOfNetwork = 100;
 
@@ -92,8 +92,8 @@ Connections::Counts Connections::counts() {
 }
 
 void Connections::move(Connection& connection, State state) {
-    // A connection keeps its place in the state that it is in: of two new ones, the one that was accepted first is the
-    // older, whichever thread begins first.
+    // A connection that enters its own state again keeps its place: of two new connections, the one accepted first is
+    // the older one, whichever thread runs first.
     if (connection.state == State::leaving || connection.state == state) {
         return;
     }
@@ -112,7 +112,7 @@ void Connections::move(Connection& connection, State state) {
 }
 
 void Connections::end(Connection& connection) {
-    // Whoever reads it finds its end, and closes it.
+    // The connection's thread finds the end of the stream, and closes the connection.
     shutdown(connection.socket, SHUT_RDWR);
     move(connection, State::leaving);
 }

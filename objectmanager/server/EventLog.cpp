@@ -18,7 +18,7 @@ void EventLog::report(const std::string& network, const std::string& line, Clock
     settle(now);
     {
         const std::lock_guard lock(_mutex);
-        // Networks may be as many as there are lines.
+        // The table has at most as many networks as lines are allowed in all.
         if (_all.lines >= linesOfAll) {
             ++_all.leftOut;
             return;

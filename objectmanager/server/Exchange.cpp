@@ -19,32 +19,35 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** How many times the limit of a body is read, and thrown away, so that its client is there for the refusal. */
+/**
+ * A body that is too large is read and dropped up to this multiple of the limit: a client that is still sending would
+ * not read the refusal.
+ */
 constexpr std::size_t readBeyondLimit = 4;
 
-/** What each body may have without a share of the memory for all of them, so that small requests are never refused. */
+/** How many bytes of each body do not count against the memory for bodies, so that small requests are never refused. */
 constexpr std::size_t freeBody = std::size_t{16} * 1024;
 
 /** Memory of answers this large is returned to the system; the allocator would keep it. */
 constexpr std::size_t largeAnswer = std::size_t{1024} * 1024;
 
-/** What each answer may be made of without a share of the memory for all of them, and the steps in which it gets it. */
+/** How many bytes of each answer do not count against the memory for answers, and the steps in which answers ask. */
 constexpr std::size_t freeAnswer = std::size_t{256} * 1024;
 
 /** Answers up to this size are sent in one piece with their headers. */
 constexpr std::size_t smallAnswer = std::size_t{16} * 1024;
 
-/** For how long a client is listened to after its last answer, so that it can read it. */
+/** How long the server keeps receiving after its last answer: closing at once could make the client lose the answer. */
 constexpr std::chrono::seconds finishTime{1};
 
-/** How many requests, and steps of TLS's handshakes, of one network may wait for their turn. */
+/** How many requests, and how many steps of TLS handshakes, of one network may wait for their turn. */
 constexpr unsigned int waitingOfNetwork = 1000;
 
-/** Where there is no memory for anything else. */
+/** The answer when there is no memory for any other. */
 constexpr std::string_view noMemory =
     "HTTP/1.1 503 Service Unavailable\r\nConnection: close\r\nContent-Length: 0\r\n\r\n";
 
-/** Half of the processors, so that no storm of them takes all. */
+/** Half of the processors, so that handshakes alone cannot keep all of them busy. */
 unsigned int handshakesAtATime() {
     return std::max(1U, std::thread::hardware_concurrency() / 2);
 }
@@ -55,13 +58,13 @@ HttpReply refusal(unsigned int status, const std::string& problem) {
 
 HttpReply unauthorized(const std::string& text) {
     HttpReply reply = refusal(Status::unauthorized, text);
-    // What is wrong with a log-in has been logged, and a client's first request without one is usual.
+    // A failed log-in has already been logged, and a first request without a log-in is usual.
     reply.problem.clear();
     reply.headers.emplace_back("WWW-Authenticate", R"(Basic realm="orvcim", charset="UTF-8")");
     return reply;
 }
 
-/** Thrown where a log-in is missing or wrong. */
+/** Thrown if the log-in is missing or wrong. */
 struct Unauthorized {
     const char* text;
 };
@@ -78,7 +81,7 @@ void appendHeaders(std::string& text, const HttpHeaders& headers) {
     }
 }
 
-/** What stands before an answer's body. @param framing the header that tells where the body ends, with its line end. */
+/** The status line and headers of an answer. @param framing the header that tells where the body ends, as a line. */
 std::string headOf(const HttpReply& reply, bool keepAlive, std::string_view framing) {
     std::string head = fmt::format("HTTP/1.1 {} {}\r\nDate: {:%a, %d %b %Y %H:%M:%S} GMT\r\nConnection: {}\r\n{}",
                                    reply.status, Status::reasonOf(reply.status), fmt::gmtime(std::time(nullptr)),
@@ -93,7 +96,7 @@ Shared::Shared(Settings given, Handler function, Authenticator* authenticator, L
     : settings(std::move(given)), handler(std::move(function)), events(std::move(log)),
       connections(settings.limits, events), hosts(settings.hosts),
       handshakes(handshakesAtATime(), handshakesAtATime(), waitingOfNetwork),
-      // A quarter is for others than the network that has most.
+      // No network gets the last quarter of the turns.
       answers(settings.threads, (3 * settings.threads + 3) / 4, waitingOfNetwork),
       bodies(settings.limits.allBodiesBytes), answerMemory(settings.limits.allAnswersBytes) {
     if (authenticator != nullptr) {
@@ -122,7 +125,7 @@ void Exchange::run() noexcept {
         enter(State::idle);
         _stream->finish(Clock::now() + finishTime);
     } catch (const Ended&) {
-        // The client knows as much as it can.
+        // The connection is closed without another answer.
     } catch (const std::exception& error) {
         if (_stream && !_begun) {
             _stream->send(noMemory, std::chrono::milliseconds{0});
@@ -132,7 +135,7 @@ void Exchange::run() noexcept {
         try {
             report(fmt::format("{}: {}", _begun ? "broke off the answer" : "answered 503", error.what()));
         } catch (const std::exception&) {
-            // There is no memory for the line either.
+            // There is no memory for the line in the log either.
         }
     }
 }
@@ -196,7 +199,7 @@ bool Exchange::serve() {
 void Exchange::readHead() {
     enter(State::idle);
     _begin = Clock::now();
-    // Empty lines in front of a request are what old clients sent after a body.
+    // Old clients send an empty line after a body; RFC 9112 has servers ignore it (section 2.2).
     const auto dropEmptyLines = [this] { _received.erase(0, _received.find_first_not_of("\r\n")); };
     dropEmptyLines();
     bool begun = false;
@@ -269,7 +272,7 @@ Caller Exchange::logIn() {
     const std::string* const header = headerOf(_head.headers, "Authorization");
     const std::optional<Credentials> given = header == nullptr ? std::nullopt : credentialsOf(*header);
     if (!given) {
-        // How clients learn that they should log in.
+        // The answer asks the client to log in.
         throw Unauthorized{"log in with a user name and password"};
     }
     if (auto caller = _shared.logIns->recent(*given)) {
@@ -360,7 +363,7 @@ void Exchange::skipBody() {
     }
     enter(State::receiving);
     _until = Clock::now() + _limits.requestTime;
-    // It does not wait for leave to send what has been answered.
+    // The request has been answered: the client does not wait for "100 Continue".
     _head.expectsContinue = false;
     try {
         readBody(nullptr);
@@ -423,8 +426,8 @@ void Exchange::hold(std::size_t bytes) {
 }
 
 /**
- * To clients that know no chunks, the end of the connection is the end of the body. What makes the answer waits for its
- * client from now on, and nobody shall wait for both: the turn is for others.
+ * To a client that does not understand chunks, the end of the connection is the end of the body. From here on, the
+ * thread that makes the answer waits for its client. It gives its turn back, so that no other client waits as well.
  */
 void Exchange::begin(const HttpReply& reply) {
     _turn.reset();
@@ -461,8 +464,8 @@ void Exchange::finish(const HttpReply& rest) {
 }
 
 /**
- * A client that has said so takes the reason from headers behind the last chunk (RFC 9110, section 6.5). To all others
- * the answer has no end: the last chunk is missing, or the connection is reset.
+ * A client that has announced it gets the reason in trailers after the last chunk (RFC 9110, section 6.5). For every
+ * other client the answer visibly breaks off: its last chunk is missing, or the connection is reset.
  */
 void Exchange::breakOff(const HttpReply& rest) {
     if (!_head.takesTrailers || rest.headers.empty()) {
@@ -475,7 +478,7 @@ void Exchange::breakOff(const HttpReply& rest) {
     deliver(text += "\r\n");
 }
 
-/** Appends a piece of the body as it is sent. */
+/** Appends a piece of the body in the form in which it is sent, as a chunk or as it is. */
 void Exchange::append(std::string& text, std::string_view piece) {
     _sent += piece.size();
     if (piece.empty() || _head.method == "HEAD") {
@@ -490,14 +493,14 @@ void Exchange::append(std::string& text, std::string_view piece) {
     text.append(piece).append("\r\n");
 }
 
-/** Sends a part of an answer in pieces. */
+/** Sends text of an answer in pieces; gives up if the client takes it too slowly. */
 void Exchange::deliver(std::string_view text) {
     const Clock::time_point start = Clock::now();
     Clock::time_point lastTaken = start;
     while (!text.empty()) {
         const bool isHurried = _memory && _shared.answerMemory.isAwaited();
         const Clock::time_point until = isHurried ? start + _shared.settings.hurryTime : lastTaken + _limits.idleTime;
-        // Somebody may begin to wait for the memory meanwhile.
+        // Waits for hurryTime at most, to notice when another answer begins to wait for this one's memory.
         const Stream::Outcome outcome =
             _stream->sendSome(text, std::min(until, Clock::now() + _shared.settings.hurryTime));
         if (outcome == Stream::Outcome::done) {
@@ -516,7 +519,7 @@ void Exchange::abandon(const std::string& problem) {
         _stream->endWithReset();
     }
     logAccess();
-    // Throws where the server has shut the connection down, which is no news.
+    // If the server has shut the connection down itself, this throws, and nothing is logged.
     enter(State::sending);
     report(problem);
     throw Ended{};
@@ -539,7 +542,7 @@ void Exchange::enter(State state) {
 
 void Exchange::endLate() {
     if (_received.find('\n') == std::string::npos && !_bodyIsMissing) {
-        throw Ended{}; // idle
+        throw Ended{}; // The connection was idle: there is no request to answer.
     }
     throw HttpError(Status::requestTimeout, fmt::format("the request did not arrive within {} s",
                                                         std::chrono::duration<double>(_limits.requestTime).count()));
@@ -547,7 +550,7 @@ void Exchange::endLate() {
 
 void Exchange::endEarly() {
     const bool begun = _bodyIsMissing || _received.find('\n') != std::string::npos;
-    // Throws where the server has shut the connection down, which is no news.
+    // If the server has shut the connection down itself, this throws, and nothing is logged.
     enter(begun ? State::receiving : State::idle);
     if (begun) {
         report("gone before the request was here");

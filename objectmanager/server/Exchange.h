@@ -1,4 +1,4 @@
-/** The requests of one connection and their answers. */
+/** Serves one connection: reads its requests and sends their answers. */
 #ifndef SERVER_EXCHANGE_H
 #define SERVER_EXCHANGE_H
 
@@ -22,7 +22,7 @@
 
 namespace ObjectManager::Server {
 
-/** What the connections share. */
+/** What all connections of a server share. */
 struct Shared {
     Shared(Settings given, Handler function, Authenticator* authenticator, Log log);
 
@@ -31,16 +31,16 @@ struct Shared {
     EventLog events;
     Connections connections;
     const Hosts hosts;
-    /** For the steps of TLS's handshakes, which cost the processor much. */
+    /** Turns for the steps of TLS handshakes, which need much processor time. */
     Turns handshakes;
     Turns answers;
     Budget bodies;
     AnswerMemory answerMemory;
-    /** Nothing where everybody may do everything. */
+    /** No value if nobody has to log in and every client may do everything. */
     std::optional<LogIns> logIns;
     std::atomic<bool> stopping = false;
     std::atomic<std::size_t> requests = 0;
-    /** Readable from when the server stops. */
+    /** A descriptor that becomes readable when the server stops. */
     int stop = -1;
 
     /** The keys for new connections; null without TLS. */
@@ -53,41 +53,41 @@ private:
 };
 
 /**
- * One connection, from its first byte to its last, in the thread that runs it. It waits for its client, for its turn,
- * for the authenticator and for the handler, and holds up nobody meanwhile.
+ * One connection, from its first byte to its last, in the thread that calls `run`. This thread waits for the client,
+ * for turns, for the authenticator and for the handler, without delaying other connections.
  */
 class Exchange final : private Outlet {
 public:
-    /** Both outlive it. */
+    /** Both arguments must outlive this object. */
     Exchange(Shared& shared, Connections::Connection& connection);
 
-    /** Returns when the connection is to be closed. */
+    /** Serves the connection, and returns when it has to be closed. */
     void run() noexcept;
 
 private:
     using Clock = std::chrono::steady_clock;
     using State = Connections::State;
 
-    /** Thrown where the connection is to be closed, and whatever there is to say has been said. */
+    /** Thrown when the connection has to be closed without another answer. */
     struct Ended {};
 
     void shakeHands();
-    /** @return false where the connection is to be closed. */
+    /** Serves one request. @return false if the connection has to be closed. */
     bool serve();
 
     void readHead();
     void check() const;
     Caller logIn();
-    /** @param share of the memory for all bodies; where it is null, the body is thrown away. */
+    /** @param share the request's share of the memory for bodies; if it is null, the body is read and dropped. */
     void readBody(Budget::Share* share);
     void readMore(std::string& to);
-    /** Takes the body of a request that has been answered without it. */
+    /** Reads and drops the body of a request that was answered before its body was read. */
     void skipBody();
     HttpReply answer(const Caller& caller);
     /** Sends an answer as a whole. */
     void sendWhole(HttpReply reply, bool keepAlive);
 
-    /* An answer in pieces. */
+    /* Sending an answer in pieces. */
     void hold(std::size_t bytes) override;
     void begin(const HttpReply& reply) override;
     void send(std::string_view piece) override;
@@ -99,7 +99,7 @@ private:
     [[noreturn]] void abandon(const std::string& problem);
     void logAccess();
 
-    /** @throws Ended where the connection has been shut down. */
+    /** Changes the connection's state. @throws Ended if the server has shut the connection down. */
     void enter(State state);
     [[noreturn]] void endLate();
     [[noreturn]] void endEarly();
@@ -109,30 +109,30 @@ private:
     const Limits& _limits;
     Connections::Connection& _connection;
     std::optional<Stream> _stream;
-    /** What has come and is not taken yet. */
+    /** The bytes that were received and not yet read as part of a request. */
     std::string _received;
-    /** A line of a request has come on this connection. */
+    /** Whether a request has arrived on this connection, at least its first line and headers. */
     bool _asked = false;
 
-    /* Of the request. */
+    /* The request. */
     RequestHead _head;
-    /** When it has to be here. */
+    /** When the request must have arrived as a whole. */
     Clock::time_point _until;
     Clock::time_point _begin;
     std::string _user;
     std::string _body;
-    /** The body, or its rest, has still to be taken from what comes. */
+    /** Whether the body, or a part of it, has still to be read. */
     bool _bodyIsMissing = false;
 
-    /* Of its answer. */
+    /* The answer. */
     std::optional<Turns::Turn> _turn;
     std::optional<AnswerMemory::Share> _memory;
-    /** It goes to the client in pieces, and the first is gone. */
+    /** Whether the answer is sent in pieces, and the first piece was sent. */
     bool _begun = false;
-    /** Whether the connection stays open behind an answer in pieces. */
+    /** Whether the connection stays open after an answer in pieces. */
     bool _keepAlive = false;
     unsigned int _status = 0;
-    /** Bytes of the body. */
+    /** How many bytes of the answer's body were sent. */
     std::size_t _sent = 0;
 };
 

@@ -13,7 +13,7 @@ namespace {
 
 bool isAddress(const std::string& name) {
     in6_addr address{};
-    // A link-local address may be followed by the client's name of the link.
+    // A link-local address may be followed by "%" and the client's name for the network interface.
     return inet_pton(AF_INET, name.c_str(), &address) == 1 ||
            inet_pton(AF_INET6, name.substr(0, name.find('%')).c_str(), &address) == 1;
 }

@@ -1,4 +1,4 @@
-/** What passes between the HTTP server and the function that answers requests. */
+/** Requests and replies, as the HTTP server and the function that answers requests exchange them. */
 #ifndef SERVER_HTTPMESSAGE_H
 #define SERVER_HTTPMESSAGE_H
 
@@ -15,23 +15,23 @@
 
 namespace ObjectManager::Server {
 
-/** Whether two names of HTTP's (headers, schemes, codings) are the same: letter case is ignored (RFC 9110). */
+/** Whether two names in HTTP (of headers, schemes, codings) are equal; letter case is ignored (RFC 9110). */
 inline bool equalTokens(std::string_view left, std::string_view right) {
     return left.size() == right.size() && strncasecmp(left.data(), right.data(), left.size()) == 0;
 }
 
-/** Names and values. A name may come several times. */
+/** The names and values of headers. A name may occur several times. */
 using HttpHeaders = std::vector<std::pair<std::string, std::string>>;
 
-/** A request as it came in. */
+/** A request that a client has sent. */
 struct HttpRequest {
     std::string method;
     HttpHeaders headers;
     std::string_view body;
-    /** For an answer that is too large to be held as a whole; null where every answer has to be returned. */
+    /** Takes an answer that is too large to be returned as a whole; null if every answer has to be returned. */
     Outlet* outlet{};
 
-    /** The value of the first header of that name; null where there is none. */
+    /** The value of the first header with the name; null if there is none. */
     const std::string* header(std::string_view name) const {
         const auto found = std::find_if(headers.begin(), headers.end(),
                                         [&](const auto& header) { return equalTokens(header.first, name); });
@@ -43,24 +43,24 @@ struct HttpReply {
     unsigned int status;
     HttpHeaders headers;
     std::string body;
-    /** Why the request was refused, in a line for the server's log; empty where it was not. */
+    /** Why the request was refused, as a line for the server's log; empty if it was not refused. */
     std::string problem{};
 };
 
-/** Who asks, and what he may do. */
+/** The user who sent a request, and his rights. */
 struct Caller {
     std::string user;
     bool mayRead;
     bool mayChangePower;
-    /** Where the client is, as the log names it. */
+    /** The client's address, as the log shows it. */
     std::string address{};
 };
 
 /**
- * Answers a request. Called by several threads at once; must not throw, but for what the request's outlet throws.
+ * Answers a request. Called by several threads at once. Must not throw; only exceptions of the request's outlet pass.
  *
- * Of an answer that has begun at the outlet, it returns the rest: the last piece of the body. Where the answer cannot
- * be ended, it returns a `problem`, and the headers tell of it to a client that takes trailers.
+ * If the handler has sent a part of the answer to the outlet, it returns the rest: the last piece of the body. If it
+ * cannot complete such an answer, it returns a `problem`, and as headers the trailers that describe the problem.
  */
 using Handler = std::function<HttpReply(const HttpRequest&, const Caller&)>;
 

@@ -19,7 +19,7 @@ constexpr std::string_view lineEnd = "\r\n";
     throw HttpError(Status::badRequest, problem);
 }
 
-/** What names of methods and headers are made of (RFC 9110, section 5.6.2). */
+/** Whether a byte may be in the name of a method or header (RFC 9110, section 5.6.2). */
 bool isTokenCharacter(char character) {
     constexpr std::string_view others = "!#$%&'*+-.^_`|~";
     return std::isalnum(static_cast<unsigned char>(character)) != 0 || others.find(character) != std::string_view::npos;
@@ -29,7 +29,7 @@ bool isToken(std::string_view text) {
     return !text.empty() && std::all_of(text.begin(), text.end(), isTokenCharacter);
 }
 
-/** What values of headers are made of (RFC 9110, section 5.5). */
+/** Whether a byte may be in the value of a header (RFC 9110, section 5.5). */
 bool isValueCharacter(char character) {
     return character == '\t' || (static_cast<unsigned char>(character) >= ' ' && character != '\x7f');
 }
@@ -44,7 +44,7 @@ std::string_view trimmed(std::string_view text) {
     return first == std::string_view::npos ? "" : text.substr(first, text.find_last_not_of(blanks) + 1 - first);
 }
 
-/** Takes the next line off the text, which has its end. */
+/** Removes the first line from the text, and returns it. The text must contain the line's end. */
 std::string_view takeLine(std::string_view& text) {
     const std::size_t end = text.find('\n');
     if (end == 0 || text[end - 1] != '\r') {
@@ -87,7 +87,7 @@ void parseHeader(std::string_view line, HttpHeaders& headers) {
     headers.emplace_back(name, value);
 }
 
-/** All values of a header that may be there once, or be repeated with the same value where it may be repeated. */
+/** The value of a header that may occur once only, or, if it may be repeated, always with the same value. */
 std::optional<std::string_view> onlyValue(const HttpHeaders& headers, std::string_view name, const char* problem,
                                           bool mayBeRepeated) {
     std::optional<std::string_view> found;
@@ -161,7 +161,7 @@ bool mayBeRequestLine(std::string_view text) {
 }
 
 std::optional<std::size_t> sizeOfHead(std::string_view received) {
-    // Ends of lines without carriage returns are found as well, and refused when the head is parsed.
+    // A line that ends without a carriage return counts here, too; parseHead refuses it.
     for (std::size_t end = received.find('\n'); end != std::string_view::npos; end = received.find('\n', end + 1)) {
         const std::string_view rest = received.substr(end + 1);
         if (rest.starts_with('\n')) {

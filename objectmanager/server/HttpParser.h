@@ -1,6 +1,6 @@
 /**
- * HTTP/1.1 as RFC 9112 has it, and nothing that two readers could understand differently: what the RFC lets a server
- * repair is refused.
+ * Parses requests in HTTP/1.1 and HTTP/1.0 (RFC 9112). A request that two parsers could understand differently is
+ * refused, even if the RFC permits servers to repair it.
  */
 #ifndef SERVER_HTTPPARSER_H
 #define SERVER_HTTPPARSER_H
@@ -16,7 +16,7 @@
 
 namespace ObjectManager::Server {
 
-/** A request that is answered with an error. what() says in one line what is wrong with it. */
+/** A request that is refused with an HTTP status. what() is one line that says why. */
 class HttpError : public std::runtime_error {
 public:
     HttpError(unsigned int status, const std::string& problem) : std::runtime_error(problem), _status(status) {}
@@ -27,10 +27,10 @@ private:
     unsigned int _status;
 };
 
-/** How the end of a body is told. */
+/** How a request says where its body ends. */
 struct Framing {
     bool chunked = false;
-    /** Of a body that is not chunked. */
+    /** The size of a body that is not chunked, in bytes. */
     std::uint64_t length = 0;
 };
 
@@ -40,38 +40,39 @@ struct RequestHead {
     std::string target;
     HttpHeaders headers;
     Framing framing;
-    /** Of the header Host; empty where HTTP/1.0 has none. */
+    /** The value of the header Host; empty if a request in HTTP/1.0 has none. */
     std::string host;
-    /** The connection stays open after the answer, if it is up to the client. */
+    /** Whether the client wants the connection to stay open after the answer. */
     bool keepAlive = true;
-    /** The client understands an answer in chunks, as from HTTP/1.1 on, and headers behind its last one. */
+    /** Whether the client understands an answer in chunks, as every client of HTTP/1.1 does. */
     bool takesChunks = true;
+    /** Whether the client accepts trailers, the headers after the last chunk. */
     bool takesTrailers = false;
-    /** The client waits for leave to send its body. */
+    /** Whether the client waits for "100 Continue" before it sends the body. */
     bool expectsContinue = false;
 };
 
-/** Whether the text can be, or begin, the first line of a request. */
+/** Whether the text is the first line of a request, or can become it when more bytes arrive. */
 bool mayBeRequestLine(std::string_view text);
 
-/** How many bytes the head has, its empty line included; nothing where its end is not here. */
+/** The size of the head in bytes, with the empty line at its end; no value if the end has not been received. */
 std::optional<std::size_t> sizeOfHead(std::string_view received);
 
-/** @param head ends with its empty line. @throws HttpError */
+/** @param head with the empty line at its end. @throws HttpError if the request is malformed or not supported. */
 RequestHead parseHead(std::string_view head);
 
 /** The name or address in the value of the header Host, in lower case, without port, brackets and final dot. */
 std::string hostNameOf(std::string_view host);
 
-/** Takes a chunked body apart, however it comes in pieces. */
+/** Decodes a chunked body that arrives in pieces of any size. */
 class ChunkedBody {
 public:
-    /** @param mostTrailers bytes of the trailers, which nobody reads. */
+    /** @param mostTrailers the limit for the trailers in bytes; trailers are ignored. */
     explicit ChunkedBody(std::size_t mostTrailers) : _mostTrailers(mostTrailers) {}
 
     /**
-     * Takes from the received bytes what belongs to the body, and appends the data in it to `data`.
-     * @throws HttpError
+     * Removes the bytes of the body from the front of `received`, and appends the decoded data to `data`.
+     * @throws HttpError if the body is malformed, or its trailers exceed the limit.
      */
     void take(std::string& received, std::string& data);
     bool isComplete() const { return _part == Part::end; }
@@ -79,12 +80,12 @@ public:
 private:
     enum class Part { size, data, dataEnd, trailers, end };
 
-    /** The line that the bytes begin with, without its end; nothing where its end is not here. */
+    /** The first line of the bytes without its end; no value if its end has not been received. */
     std::optional<std::string_view> lineOf(std::string_view received, std::size_t most) const;
 
     const std::size_t _mostTrailers;
     Part _part = Part::size;
-    /** Of the data of the chunk that is not here yet. */
+    /** How many bytes of the present chunk's data have still to be received. */
     std::uint64_t _missing = 0;
     std::size_t _trailers = 0;
 };

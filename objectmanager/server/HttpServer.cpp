@@ -27,16 +27,16 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** For providers and PAM's modules, which run on it. Only what they use of it is memory. */
+/** The stack of each thread, on which providers and PAM modules run. Only the part that they use takes memory. */
 constexpr std::size_t stackSize = std::size_t{1024} * 1024;
 
-/** How often threads that have ended are looked for, and what was left out of the log is counted. */
+/** How often ended threads are joined, and the numbers of lines left out of the log are logged. */
 constexpr int lookInterval = 250;
 
-/** After an error of the system's, such as too many open files. */
+/** The pause after an error in accepting a connection, such as too many open files. */
 constexpr std::chrono::milliseconds errorPause{50};
 
-/** How long connections that are shut down have, beyond stopTime, for noticing it. */
+/** How long, beyond stopTime, stop() waits for the threads of connections that were shut down. */
 constexpr std::chrono::seconds endTime{1};
 
 constexpr std::string_view busy = "HTTP/1.1 503 Service Unavailable\r\nConnection: close\r\nContent-Length: 0\r\n\r\n";
@@ -45,7 +45,7 @@ std::string textOf(int error) {
     return std::generic_category().message(error);
 }
 
-/** A descriptor, which is closed with it. */
+/** A file descriptor, closed when the object is destroyed. */
 class Descriptor {
 public:
     explicit Descriptor(int descriptor) : _descriptor(descriptor) {}

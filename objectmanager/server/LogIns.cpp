@@ -11,7 +11,7 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** Log-ins that are checked at a time, those of one network among them, and those of one network that may wait. */
+/** How many log-ins are checked at a time, how many of them of one network, and how many of one network may wait. */
 constexpr unsigned int checkedAtATime = 4;
 constexpr unsigned int checkedOfNetwork = 2;
 constexpr unsigned int waitingOfNetwork = 32;
@@ -94,7 +94,7 @@ void RecentLogIns::forget(const Credentials& given) {
 }
 
 RecentLogIns::Digest RecentLogIns::digestOf(const Credentials& given) const {
-    // A user's name has no colon here, as it has none in HTTP.
+    // The colon separates the two: HTTP's scheme Basic allows none in a user's name.
     const std::string text = given.user + ':' + given.password;
     Digest digest{};
     require(

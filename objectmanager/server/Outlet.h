@@ -10,15 +10,15 @@ namespace ObjectManager::Server {
 struct HttpReply;
 
 /**
- * Sends an answer while it is made: its status and headers with the first piece of the body, then piece after piece. It
- * waits for the client, so that whoever makes the answer goes no faster than the client takes it.
+ * Sends an answer while it is being made: the status and headers with the first piece of the body, then piece after
+ * piece. Every function waits for the client, so that the answer is made no faster than the client takes it.
  *
- * What it throws tells that nobody takes the answer any more. It is no std::exception and meant for the server: those
- * who make the answer let it pass.
+ * If the client no longer takes the answer, the functions throw an object that is no std::exception. Only the server
+ * catches it: code that makes an answer must let it pass.
  */
 class Outlet {
 public:
-    /** How many bytes of a body are gathered before they are sent. A body with fewer is returned as a whole. */
+    /** The size of a piece in bytes. A smaller body is returned as a whole. */
     static constexpr std::size_t pieceBytes = std::size_t{64} * 1024;
 
     Outlet() = default;
@@ -27,12 +27,12 @@ public:
     virtual ~Outlet() = default;
 
     /**
-     * Says how many bytes the memory has, altogether, that the answer is made of; waits until there is room for them.
-     * All of it counts until the answer has been sent.
+     * Reserves memory: waits until the answer may have `bytes` in all, in objects and text. The largest number counts
+     * until the answer has been sent.
      */
     virtual void hold(std::size_t bytes) = 0;
 
-    /** Sends the first piece, which is the body of `reply`. From here on the answer cannot become another. */
+    /** Sends the status, the headers and, as the first piece, the body of `reply`. The status is then final. */
     virtual void begin(const HttpReply& reply) = 0;
 
     /** Sends another piece. */

@@ -23,8 +23,8 @@ namespace ObjectManager::Server {
 namespace {
 
 /**
- * Answers the question for a password. What PAM only says goes to nobody; modules say it also without room for an
- * answer.
+ * Answers PAM's question for the password. Messages that PAM only wants to show are dropped; for these, a module may
+ * pass no room for answers.
  */
 int converse(int count, const pam_message** messages, pam_response** responses, void* data) {
     const auto isOf = [](int style) {
@@ -49,10 +49,10 @@ int converse(int count, const pam_message** messages, pam_response** responses, 
     return PAM_SUCCESS;
 }
 
-/** PAM would sleep here after a failure. The server does, when others can have the turn. */
+/** Replaces PAM's sleep after a failure: the server waits itself, after it has given its turn to others. */
 void doNotSleep(int /*result*/, unsigned int /*microseconds*/, void* /*data*/) {}
 
-/** A conversation with PAM. Every call but the constructor's gives PAM's code. */
+/** A conversation with PAM. Every function except the constructor returns PAM's code. */
 class Conversation {
 public:
     Conversation(const PamSettings& settings, const std::string& user, std::string password)
@@ -71,7 +71,7 @@ public:
 
     int logIn(const std::string& address) {
         const auto delay = &doNotSleep;
-        // PAM takes this function as if it were an object.
+        // pam_set_item takes a pointer to an object, also for this function.
         const void* item = nullptr;
         std::memcpy(&item, &delay, sizeof item);
         call([&] { return pam_set_item(_handle, PAM_FAIL_DELAY, item); });
@@ -83,7 +83,7 @@ public:
 
     std::string problem() { return pam_strerror(_handle, _result); }
 
-    /** The user as the system knows him, which may be another name than he gave. */
+    /** The user's name after the log-in: a module may have replaced the name that he gave. */
     std::string user() {
         const void* name = nullptr;
         call([&] { return pam_get_item(_handle, PAM_USER, &name); });
@@ -103,7 +103,7 @@ private:
     int _result = PAM_SUCCESS;
 };
 
-/** Calls one of the functions that need room for what they find, with more and more of it. */
+/** Calls one of the system's functions that need a buffer, with a larger one until it suffices. */
 template <typename Entry, typename Call>
 bool look(Entry& entry, std::vector<char>& room, Call call) {
     constexpr std::size_t firstSize = 1024;
@@ -128,7 +128,7 @@ std::optional<gid_t> idOfGroup(const std::string& name) {
     return found ? std::optional(entry.gr_gid) : std::nullopt;
 }
 
-/** Whether shells(5) has the shell, which those of accounts that are no person's are not in. */
+/** Whether shells(5) lists the shell; those of accounts that belong to no person are not listed. */
 bool isLogInShell(const std::string& shell) {
     std::ifstream shells("/etc/shells");
     std::string line;
@@ -140,7 +140,7 @@ bool isLogInShell(const std::string& shell) {
     return false;
 }
 
-/** What the system knows of a user; nobody is in no group. */
+/** What the system knows of a user. An unknown user is in no group. */
 struct User {
     bool root = false;
     bool hasShell = false;

@@ -15,7 +15,7 @@ struct Character {
     std::size_t size;
 };
 
-/** The first character of the text, which is not empty. */
+/** Decodes the first character of a text that is not empty. */
 Character firstOf(std::string_view text) {
     const auto byte = [text](std::size_t at) { return static_cast<unsigned char>(text[at]); };
     const unsigned char first = byte(0);

@@ -1,4 +1,4 @@
-/** What a server can be told. */
+/** The settings of a server. */
 #ifndef SERVER_SETTINGS_H
 #define SERVER_SETTINGS_H
 
@@ -12,25 +12,25 @@
 
 namespace ObjectManager::Server {
 
-/** What clients may take of the server. */
+/** Limits for what clients may use of the server. */
 struct Limits {
-    /** Size of a request's body, and of its first line with its headers. */
+    /** The largest body of a request, and the largest first line with its headers, in bytes. */
     std::size_t bodyBytes = std::size_t{1024} * 1024;
     std::size_t headerBytes = std::size_t{16} * 1024;
-    /** Memory of all bodies beyond the first 16 KiB of each. */
+    /** Memory for all bodies together, in bytes; the first 16 KiB of each body do not count. */
     std::size_t allBodiesBytes = std::size_t{64} * 1024 * 1024;
-    /** Memory of what answers are made of, beyond the first 256 KiB of each. */
+    /** Memory for all answers together, in bytes; the first 256 KiB of each answer do not count. */
     std::size_t allAnswersBytes = std::size_t{64} * 1024 * 1024;
-    /** Connections at a time, altogether and from one network (see networkOf). */
+    /** How many connections may be open, in all and from one network (see networkOf). */
     unsigned int connections = 1000;
     unsigned int connectionsPerAddress = 500;
-    /** In which a request has to arrive as a whole. */
+    /** The time within which a request has to arrive as a whole. */
     std::chrono::milliseconds requestTime = std::chrono::seconds{30};
-    /** After which a connection without a request is closed, and one whose client takes nothing of its answer. */
+    /** The time after which a connection without a request is closed, and one whose client takes none of its answer. */
     std::chrono::milliseconds idleTime = std::chrono::seconds{60};
 };
 
-/** Files in PEM. */
+/** The files of the server's certificate and key, in the format PEM. */
 struct Tls {
     /** The server's certificate, followed by those that lead to its root, if any. */
     std::filesystem::path certificate;
@@ -40,37 +40,37 @@ struct Tls {
 struct Settings {
     /** A numeric IPv4 or IPv6 address. */
     std::string address = "127.0.0.1";
-    /** 0 for any that is free. */
+    /** 0 for any free port. */
     std::uint16_t port = 0;
     std::optional<Tls> tls;
-    /** Requests that are served at a time. */
+    /** How many requests are answered at a time. */
     unsigned int threads = 8;
-    /** Names in the header Host that clients may use beside addresses, the machine's name and its certificate's. */
+    /** Names that clients may use in the header Host, beside addresses, the machine's names and the certificate's. */
     std::vector<std::string> hosts;
-    /** Logs each request. */
+    /** Whether each request is logged. */
     bool accessLog = false;
     Limits limits;
-    /** After which a failed log-in is answered. */
+    /** The time after which a failed log-in is answered. */
     std::chrono::milliseconds failedLogInDelay = std::chrono::seconds{2};
-    /** In which a client has to take 64 KiB of its answer where others wait for the memory that it takes. */
+    /** The time within which a client has to take 64 KiB of its answer while other answers wait for memory. */
     std::chrono::milliseconds hurryTime = std::chrono::seconds{10};
-    /** How long a stopping server waits for the answers under way. */
+    /** How long a server that stops waits for the answers that are being made or sent. */
     std::chrono::milliseconds stopTime = std::chrono::seconds{8};
 };
 
-/** How PAM is asked who a client is, and what his groups let him do. */
+/** How PAM checks log-ins, and which rights users have by their groups. */
 struct PamSettings {
-    /** PAM's service. */
+    /** The name of the PAM service. */
     std::string service = "orvcim";
-    /** Of PAM's service files; empty for the system's. */
+    /** The folder of PAM's service files; empty for the system's. */
     std::filesystem::path folder;
-    /** Whose members may read; empty for every user who can log in. */
+    /** The group whose members may read; empty if every user who can log in may read. */
     std::string readGroup;
-    /** Whose members may read and change the power state. Root may as well, if root may log in. */
+    /** The group whose members may read and change the power state. Root may, too, if root may log in. */
     std::string powerGroup = "orv-power";
-    /** Root may log in. */
+    /** Whether root may log in. */
     bool allowRoot = false;
-    /** Users may log in who have no log-in shell (see shells(5)) or are not known to the system. */
+    /** Whether users may log in who have no log-in shell (see shells(5)) or are unknown to the system. */
     bool allowWithoutShell = false;
 };
 

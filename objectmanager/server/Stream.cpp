@@ -14,7 +14,7 @@ namespace {
 
 constexpr std::size_t pieceSize = std::size_t{16} * 1024;
 
-/** For poll. */
+/** The timeout for poll(): the milliseconds until a time, at least 0. */
 int millisecondsUntil(Stream::Clock::time_point until) {
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(until - Stream::Clock::now()).count();
     constexpr std::chrono::milliseconds::rep most = 1'000'000'000;
@@ -173,7 +173,7 @@ Stream::Outcome Stream::proceed(ssize_t code, Clock::time_point until) const {
     case GNUTLS_E_INTERRUPTED:
         return Clock::now() < until ? Outcome::done : Outcome::late;
     default:
-        // Also the client's wish for new keys, which costs the server more than the client.
+        // This ends connections that ask for new keys, too: a renegotiation costs the server more than the client.
         return Outcome::gone;
     }
 }

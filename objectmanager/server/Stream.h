@@ -1,4 +1,4 @@
-/** A client's connection as a stream of bytes. */
+/** The bytes of a client's connection, in the clear or in TLS. */
 #ifndef SERVER_STREAM_H
 #define SERVER_STREAM_H
 
@@ -14,7 +14,7 @@
 
 namespace ObjectManager::Server {
 
-/** In the clear, or with TLS. Whatever it does ends when its time is over, or when the socket is shut down. */
+/** A stream in the clear or in TLS. Every function returns when its time is over or the socket is shut down. */
 class Stream {
 public:
     using Clock = std::chrono::steady_clock;
@@ -28,7 +28,7 @@ public:
     };
 
     /**
-     * @param socket stays the caller's, and open for longer than this.
+     * @param socket belongs to the caller, and must stay open longer than this object exists.
      * @param keys null for a stream in the clear.
      * @throws std::bad_alloc
      */
@@ -40,41 +40,40 @@ public:
     bool isEncrypted() const { return _session != nullptr; }
 
     /**
-     * Agrees with the client on keys; does nothing in the clear.
-     * @param compute runs a step of it, which takes the processor's time and no other; false where that is not to be.
+     * Carries out the TLS handshake; does nothing in the clear.
+     * @param compute is called with each step, which needs processor time and never waits; it runs the step, or returns
+     *        false to end the handshake.
      */
     Outcome shakeHands(Clock::time_point until, const std::function<bool(const std::function<void()>& step)>& compute);
 
-    /** Why client and server could not agree, in the words of the TLS library; empty where they could, or time ran out.
-     */
+    /** Why the handshake failed, in the words of the TLS library; empty if it succeeded or its time was over. */
     const std::string& handshakeProblem() const { return _handshakeProblem; }
 
-    /** Waits for bytes, and appends them. */
+    /** Waits for bytes, and appends them to `to`. */
     Outcome receive(std::string& to, Clock::time_point until);
 
-    /** @param patience for how long the client may take nothing. */
+    /** Sends the whole text. @param patience how long the client may take nothing of it. */
     Outcome send(std::string_view text, std::chrono::milliseconds patience);
 
-    /** Sends as much of the text as the client takes at once, and removes that from it. Waits where it takes nothing.
-     */
+    /** Waits until the client takes a part of the text, and removes that part from the front of `text`. */
     Outcome sendSome(std::string_view& text, Clock::time_point until);
 
     /**
-     * The end of the connection will be a reset, by which the client sees that it did not get everything. For what has
-     * no other end than the connection's.
+     * Makes the connection end with a reset, which tells the client that the answer is incomplete. Needed for an answer
+     * whose end is the end of the connection.
      */
     void endWithReset();
 
-    /** Waits until the time is over, the connection is broken, or `wake` is readable. */
+    /** Waits until the time is over, the connection is broken, or the descriptor `wake` is readable. */
     void pause(Clock::time_point until, int wake) const;
 
-    /** Whether the connection is broken. A client that only has nothing more to send is there. */
+    /** Whether the connection is broken. It is not if the client has only closed its sending direction. */
     bool isBroken() const;
 
-    /** Says that nothing more comes, and takes what the client still sends, so that it can read what was sent. */
+    /** Ends the sending direction, and drops what the client still sends until it closes or the time is over. */
     void finish(Clock::time_point until);
 
-    /** Whether anything has come, in whatever form. */
+    /** Whether the client has sent any byte during the handshake or later. */
     bool hasReceived() const { return _hasReceived; }
 
 private:
@@ -86,7 +85,7 @@ private:
     static ssize_t push(gnutls_transport_ptr_t self, const void* data, std::size_t size);
     /** Waits until the socket is ready for the events. */
     Outcome wait(short events, Clock::time_point until) const;
-    /** What a code of the TLS library other than a size asks for. */
+    /** Waits as an error code of the TLS library requires; `gone` if the code is final. */
     Outcome proceed(ssize_t code, Clock::time_point until) const;
 
     const int _socket;

@@ -8,7 +8,7 @@ namespace ObjectManager::Server {
 
 namespace {
 
-/** How often a client that waits is looked after. */
+/** How often a waiting request checks whether its client has gone. */
 constexpr std::chrono::milliseconds lookInterval{250};
 
 } // namespace

@@ -19,13 +19,13 @@ protected:
     const EventLog::Clock::time_point _start = EventLog::Clock::now();
 };
 
-TEST_F(EventLogTest, cutsLongLines) {
+TEST_F(EventLogTest, CutsLongLines) {
     _log.report("192.0.2.1", std::string(5000, 'x'));
     ASSERT_EQ(_lines.size(), 1U);
     EXPECT_EQ(_lines.front(), std::string(EventLog::longestLine, 'x') + "... (5000 bytes)");
 }
 
-TEST_F(EventLogTest, countsWhatItLeavesOutOfOneNetwork) {
+TEST_F(EventLogTest, CountsWhatItLeavesOutOfOneNetwork) {
     for (unsigned int i = 0; i < EventLog::linesOfNetwork + 7; ++i) {
         _log.report("192.0.2.1", "bad", _start);
     }
@@ -40,7 +40,7 @@ TEST_F(EventLogTest, countsWhatItLeavesOutOfOneNetwork) {
     EXPECT_EQ(_lines.back(), "later");
 }
 
-TEST_F(EventLogTest, countsWhatItLeavesOutOfAllNetworks) {
+TEST_F(EventLogTest, CountsWhatItLeavesOutOfAllNetworks) {
     for (unsigned int i = 0; i < EventLog::linesOfAll + 5; ++i) {
         _log.report(std::to_string(i), "bad", _start);
     }
@@ -49,7 +49,7 @@ TEST_F(EventLogTest, countsWhatItLeavesOutOfAllNetworks) {
     EXPECT_EQ(_lines.back(), "all clients: 5 more lines in a minute are left out");
 }
 
-TEST(PrintableTest, leavesNothingThatBreaksALogOrATerminal) {
+TEST(PrintableTest, LeavesNothingThatBreaksALogOrATerminal) {
     const std::pair<std::string, const char*> cases[] = {
         {"name \xc3\xa4\xe2\x82\xac\xf0\x9f\x98\x80", "name \xc3\xa4\xe2\x82\xac\xf0\x9f\x98\x80"},
         {"a\nb\x1b[31m\x7f", "a\\x0ab\\x1b[31m\\x7f"},

@@ -18,7 +18,7 @@ std::string problemOf(const std::string& head) {
     return "";
 }
 
-TEST(HttpParserTest, readsAHead) {
+TEST(HttpParserTest, ReadsAHead) {
     const std::string text = "POST /cimom HTTP/1.1\r\nHost:server.example:5988\r\nX:  two words \t\r\nEmpty:\r\n"
                              "Content-Length: 12\r\nExpect: 100-Continue\r\n\r\n";
     ASSERT_EQ(Server::sizeOfHead(text + "body"), text.size());
@@ -33,13 +33,13 @@ TEST(HttpParserTest, readsAHead) {
     EXPECT_TRUE(head.keepAlive);
 }
 
-TEST(HttpParserTest, keepsAConnectionAsTheVersionHasIt) {
+TEST(HttpParserTest, KeepsAConnectionAsTheVersionHasIt) {
     EXPECT_FALSE(Server::parseHead("GET / HTTP/1.0\r\n\r\n").keepAlive);
     EXPECT_TRUE(Server::parseHead("GET / HTTP/1.0\r\nConnection: Keep-Alive\r\n\r\n").keepAlive);
     EXPECT_FALSE(Server::parseHead("GET / HTTP/1.1\r\nHost: x\r\nConnection: TE, Close\r\n\r\n").keepAlive);
 }
 
-TEST(HttpParserTest, refusesWhatIsAmbiguous) {
+TEST(HttpParserTest, RefusesWhatIsAmbiguous) {
     const std::string line = "POST / HTTP/1.1\r\n";
     const std::string begin = line + "Host: x\r\n";
     const std::pair<std::string, const char*> cases[] = {
@@ -74,7 +74,7 @@ TEST(HttpParserTest, refusesWhatIsAmbiguous) {
     }
 }
 
-TEST(HttpParserTest, tellsWhatCanBeARequestLine) {
+TEST(HttpParserTest, TellsWhatCanBeARequestLine) {
     for (const char* text : {"", "P", "POST /", "POST / HTTP/1.1\r\n", "POST / HTTP/7.0\r\nHost"}) {
         EXPECT_TRUE(Server::mayBeRequestLine(text)) << text;
     }
@@ -83,7 +83,7 @@ TEST(HttpParserTest, tellsWhatCanBeARequestLine) {
     }
 }
 
-TEST(HttpParserTest, takesTheNameOffAHost) {
+TEST(HttpParserTest, TakesTheNameOffAHost) {
     const std::pair<const char*, const char*> cases[] = {
         {"Server.Example:5988", "server.example"},
         {"server.example.", "server.example"},
@@ -119,7 +119,7 @@ Chunked take(const std::string& text, std::size_t piece) {
     return result;
 }
 
-TEST(ChunkedBodyTest, isTheSameHoweverItComes) {
+TEST(ChunkedBodyTest, IsTheSameHoweverItComes) {
     const std::string text = "3\r\nfir\r\nA;name=value\r\nst, second\r\n0\r\nTrailer: x\r\n\r\nPOST";
     for (std::size_t piece = 1; piece <= text.size(); ++piece) {
         const Chunked taken = take(text, piece);
@@ -129,11 +129,11 @@ TEST(ChunkedBodyTest, isTheSameHoweverItComes) {
     }
 }
 
-TEST(ChunkedBodyTest, isNotCompleteBeforeItsEnd) {
+TEST(ChunkedBodyTest, IsNotCompleteBeforeItsEnd) {
     EXPECT_FALSE(take("3\r\nfir\r\n0\r\n", 4).complete);
 }
 
-TEST(ChunkedBodyTest, refusesWhatIsAmbiguous) {
+TEST(ChunkedBodyTest, RefusesWhatIsAmbiguous) {
     for (const std::string text :
          {"\r\n", "x\r\n", "-1\r\n", "0x3\r\n", "3\nabc", "3\r\nabcd\r\n", "3\r\nabc\n", "fffffffffffffffff\r\n"}) {
         EXPECT_THROW(take(text, text.size()), Server::HttpError) << text;

@@ -14,7 +14,7 @@ using testing::StartsWith;
 
 using HttpServerTest = Served;
 
-TEST_F(HttpServerTest, handsTheWholeRequestToTheHandler) {
+TEST_F(HttpServerTest, HandsTheWholeRequestToTheHandler) {
     std::vector<std::pair<std::string, std::string>> headers;
     std::string method;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -35,7 +35,7 @@ TEST_F(HttpServerTest, handsTheWholeRequestToTheHandler) {
                             Pair("73-CIMOperation", "MethodCall"), Pair("Content-Length", "5")));
 }
 
-TEST_F(HttpServerTest, sendsWhatTheHandlerGives) {
+TEST_F(HttpServerTest, SendsWhatTheHandlerGives) {
     serve([](const Server::HttpRequest&, const Server::Caller&) {
         return Server::HttpReply{501, {{"CIMError", "unsupported-operation"}, {"Ext", ""}}, "no", "not supported"};
     });
@@ -47,7 +47,7 @@ TEST_F(HttpServerTest, sendsWhatTheHandlerGives) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 501: not supported"));
 }
 
-TEST_F(HttpServerTest, keepsAConnectionForTheNextRequest) {
+TEST_F(HttpServerTest, KeepsAConnectionForTheNextRequest) {
     serve();
     HttpClient asking = client();
     for (const char* text : {"one", "two", ""}) {
@@ -60,7 +60,7 @@ TEST_F(HttpServerTest, keepsAConnectionForTheNextRequest) {
     EXPECT_THAT(logged(), IsEmpty());
 }
 
-TEST_F(HttpServerTest, takesABodyInChunks) {
+TEST_F(HttpServerTest, TakesABodyInChunks) {
     serve();
     EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n"
                   "3\r\nfir\r\n4\r\nst, \r\n6\r\nsecond\r\n0\r\n\r\n")
@@ -68,7 +68,7 @@ TEST_F(HttpServerTest, takesABodyInChunks) {
               "first, second");
 }
 
-TEST_F(HttpServerTest, servesOthersWhileAHandlerTakesItsTime) {
+TEST_F(HttpServerTest, ServesOthersWhileAHandlerTakesItsTime) {
     Gate gate;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
         if (request.body == "slow") {
@@ -85,7 +85,7 @@ TEST_F(HttpServerTest, servesOthersWhileAHandlerTakesItsTime) {
     EXPECT_EQ(slow.receive().body, "slow");
 }
 
-TEST_F(HttpServerTest, runsNoMoreHandlersAtATimeThanItHasThreads) {
+TEST_F(HttpServerTest, RunsNoMoreHandlersAtATimeThanItHasThreads) {
     _settings.threads = 3;
     std::atomic<int> running = 0;
     std::atomic<int> most = 0;
@@ -120,11 +120,11 @@ protected:
     }
 };
 
-TEST_F(SizeTest, takesABodyOfTheLargestSize) {
+TEST_F(SizeTest, TakesABodyOfTheLargestSize) {
     EXPECT_EQ(ask(post(std::string(1000, 'x'))).body, std::string(1000, 'x'));
 }
 
-TEST_F(SizeTest, refusesABodyThatIsLarger) {
+TEST_F(SizeTest, RefusesABodyThatIsLarger) {
     const Reply reply = ask(post(std::string(1001, 'x')));
     EXPECT_EQ(reply.status, 413);
     EXPECT_EQ(reply.body, "the body has 1001 bytes, expected 1000 at most\n");
@@ -132,13 +132,13 @@ TEST_F(SizeTest, refusesABodyThatIsLarger) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 413: the body has 1001 bytes, expected 1000 at most"));
 }
 
-TEST_F(SizeTest, refusesAHugeBodyBeforeItComes) {
+TEST_F(SizeTest, RefusesAHugeBodyBeforeItComes) {
     const Reply reply = ask("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 1000000000000\r\n\r\n");
     EXPECT_EQ(reply.status, 413);
     EXPECT_EQ(reply.body, "the body has 1000000000000 bytes, expected 1000 at most\n");
 }
 
-TEST_F(SizeTest, refusesABodyInChunksThatIsLarger) {
+TEST_F(SizeTest, RefusesABodyInChunksThatIsLarger) {
     std::string request = "POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n";
     for (int i = 0; i < 20; ++i) {
         request += "64\r\n" + std::string(100, 'x') + "\r\n";
@@ -148,7 +148,7 @@ TEST_F(SizeTest, refusesABodyInChunksThatIsLarger) {
     EXPECT_EQ(reply.body, "the body has 2000 bytes, expected 1000 at most\n");
 }
 
-TEST_F(SizeTest, cutsOffAClientThatDoesNotStopSending) {
+TEST_F(SizeTest, CutsOffAClientThatDoesNotStopSending) {
     HttpClient endless = client();
     endless.send("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\n");
     const std::string chunk = "64\r\n" + std::string(100, 'x') + "\r\n";
@@ -158,7 +158,7 @@ TEST_F(SizeTest, cutsOffAClientThatDoesNotStopSending) {
     EXPECT_EQ(ask(post("next")).body, "next");
 }
 
-TEST_F(SizeTest, takesHeadersOfTheLargestSizeAndRefusesLarger) {
+TEST_F(SizeTest, TakesHeadersOfTheLargestSizeAndRefusesLarger) {
     const auto statusOf = [this](std::size_t headers) {
         const std::string without = post("", "X: \r\n");
         return ask(post("", "X: " + std::string(headers - without.size(), 'x') + "\r\n")).status;
@@ -172,7 +172,7 @@ TEST_F(SizeTest, takesHeadersOfTheLargestSizeAndRefusesLarger) {
 
 /* Clients that are slow, gone, wrong or many. */
 
-TEST_F(HttpServerTest, refusesARequestThatDoesNotArriveInTime) {
+TEST_F(HttpServerTest, RefusesARequestThatDoesNotArriveInTime) {
     _settings.limits.requestTime = 500ms;
     serve();
     for (const char* begun :
@@ -187,7 +187,7 @@ TEST_F(HttpServerTest, refusesARequestThatDoesNotArriveInTime) {
                                        "127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
 }
 
-TEST_F(HttpServerTest, doesNotCountTheTimeOfTheAnswerAsTheRequests) {
+TEST_F(HttpServerTest, DoesNotCountTheTimeOfTheAnswerAsTheRequests) {
     _settings.limits.requestTime = 100ms;
     _settings.limits.idleTime = 100ms;
     serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -197,7 +197,7 @@ TEST_F(HttpServerTest, doesNotCountTheTimeOfTheAnswerAsTheRequests) {
     EXPECT_EQ(ask(post("patience")).body, "patience");
 }
 
-TEST_F(HttpServerTest, closesAnIdleConnection) {
+TEST_F(HttpServerTest, ClosesAnIdleConnection) {
     _settings.limits.idleTime = 500ms;
     serve();
     HttpClient idle = client();
@@ -209,7 +209,7 @@ TEST_F(HttpServerTest, closesAnIdleConnection) {
     EXPECT_THAT(logged(), IsEmpty());
 }
 
-TEST_F(HttpServerTest, isNotKeptWaitingByARequestLineThatComesInDrops) {
+TEST_F(HttpServerTest, IsNotKeptWaitingByARequestLineThatComesInDrops) {
     _settings.limits.idleTime = 500ms;
     serve();
     const HttpClient slow = client();
@@ -220,7 +220,7 @@ TEST_F(HttpServerTest, isNotKeptWaitingByARequestLineThatComesInDrops) {
     }
 }
 
-TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidAnswer) {
+TEST_F(HttpServerTest, SurvivesAClientThatGoesAwayMidAnswer) {
     serve([](const Server::HttpRequest& request, const Server::Caller& /*caller*/) {
         return Server::HttpReply{200, {}, std::string(request.body == "large" ? 50'000'000 : 5, 'x')};
     });
@@ -232,7 +232,7 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidAnswer) {
     EXPECT_EQ(ask(post("")).body, "xxxxx");
 }
 
-TEST_F(HttpServerTest, survivesAClientThatGoesAwayWhileTheHandlerRuns) {
+TEST_F(HttpServerTest, SurvivesAClientThatGoesAwayWhileTheHandlerRuns) {
     Gate entered;
     Gate gate;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -251,7 +251,7 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayWhileTheHandlerRuns) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the answer was sent"));
 }
 
-TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidRequest) {
+TEST_F(HttpServerTest, SurvivesAClientThatGoesAwayMidRequest) {
     serve();
     HttpClient gone = client();
     gone.send("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 100\r\n\r\nhalf of it");
@@ -260,7 +260,7 @@ TEST_F(HttpServerTest, survivesAClientThatGoesAwayMidRequest) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: gone before the request was here"));
 }
 
-TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
+TEST_F(HttpServerTest, RefusesWhatIsNotHttpAndLogsItOnce) {
     const std::string host = "POST / HTTP/1.1\r\nHost: localhost\r\n";
     const std::string several = "400: found several lengths of the body, expected one";
     const std::pair<std::string, std::string> requests[] = {
@@ -295,7 +295,7 @@ TEST_F(HttpServerTest, refusesWhatIsNotHttpAndLogsItOnce) {
     EXPECT_EQ(logged().size(), lines);
 }
 
-TEST_F(HttpServerTest, refusesPagesInBrowsersAndNamesThatAreNotItsOwn) {
+TEST_F(HttpServerTest, RefusesPagesInBrowsersAndNamesThatAreNotItsOwn) {
     _settings.hosts = {"switch.example"};
     serve();
     const auto statusFor = [this](const std::string& host, const std::string& headers = "") {
@@ -314,13 +314,13 @@ TEST_F(HttpServerTest, refusesPagesInBrowsersAndNamesThatAreNotItsOwn) {
     EXPECT_EQ(statusFor("localhost", "origin: null\r\n"), 403);
 }
 
-TEST_F(HttpServerTest, takesALengthThatIsToldTwice) {
+TEST_F(HttpServerTest, TakesALengthThatIsToldTwice) {
     serve();
     EXPECT_EQ(ask("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 4\r\nContent-Length: 4\r\n\r\ntwin").body,
               "twin");
 }
 
-TEST_F(HttpServerTest, closesTheOldestIdleConnectionForANewOne) {
+TEST_F(HttpServerTest, ClosesTheOldestIdleConnectionForANewOne) {
     _settings.limits.connections = 10;
     serve();
     std::vector<HttpClient> clients;
@@ -339,7 +339,7 @@ TEST_F(HttpServerTest, closesTheOldestIdleConnectionForANewOne) {
     EXPECT_THAT(logged(), ElementsAre("more than 10 connections: idle ones are closed, others are refused"));
 }
 
-TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
+TEST_F(HttpServerTest, RefusesANewConnectionWhereNoneIsIdle) {
     _settings.limits.connections = 3;
     Gate gate;
     std::atomic<int> entered = 0;
@@ -368,7 +368,7 @@ TEST_F(HttpServerTest, refusesANewConnectionWhereNoneIsIdle) {
     }
 }
 
-TEST_F(HttpServerTest, boundsTheConnectionsOfOneClient) {
+TEST_F(HttpServerTest, BoundsTheConnectionsOfOneClient) {
     _settings.limits.connectionsPerAddress = 2;
     _settings.address = "::";
     serve();
@@ -385,7 +385,7 @@ TEST_F(HttpServerTest, boundsTheConnectionsOfOneClient) {
                 ElementsAre("127.0.0.0/8: more than 2 connections: idle ones are closed, others are refused"));
 }
 
-TEST_F(HttpServerTest, isAsQuickBesideThousandsOfIdleConnections) {
+TEST_F(HttpServerTest, IsAsQuickBesideThousandsOfIdleConnections) {
     constexpr unsigned int many = 2000;
     _settings.limits.connections = many + 100;
     _settings.limits.connectionsPerAddress = many + 100;
@@ -406,7 +406,7 @@ TEST_F(HttpServerTest, isAsQuickBesideThousandsOfIdleConnections) {
 
 /* Where it listens, and how it ends. */
 
-TEST_F(HttpServerTest, listensOnIpv6) {
+TEST_F(HttpServerTest, ListensOnIpv6) {
     _settings.address = "::1";
     serve();
     HttpClient asking(_server->port(), "::1");
@@ -426,7 +426,7 @@ std::string problemOf(const Server::Settings& settings) {
     return "";
 }
 
-TEST_F(HttpServerTest, saysWhereItCannotListen) {
+TEST_F(HttpServerTest, SaysWhereItCannotListen) {
     serve();
     const std::string port = std::to_string(_server->port());
     Server::Settings taken;
@@ -440,7 +440,7 @@ TEST_F(HttpServerTest, saysWhereItCannotListen) {
     EXPECT_EQ(problemOf(name), "found the address \"localhost\", expected an IPv4 or IPv6 address in numbers");
 }
 
-TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
+TEST_F(HttpServerTest, SendsTheAnswersThatAreUnderWayBeforeItEnds) {
     Gate entered;
     Gate gate;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -469,7 +469,7 @@ TEST_F(HttpServerTest, sendsTheAnswersThatAreUnderWayBeforeItEnds) {
     EXPECT_THAT(logged(), IsEmpty());
 }
 
-TEST_F(HttpServerTest, endsThoughAClientDoesNotTakeItsAnswer) {
+TEST_F(HttpServerTest, EndsThoughAClientDoesNotTakeItsAnswer) {
     _settings.stopTime = 100ms;
     serve([](const Server::HttpRequest&, const Server::Caller&) {
         return Server::HttpReply{200, {}, std::string(50'000'000, 'x')};

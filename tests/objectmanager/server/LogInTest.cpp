@@ -57,7 +57,7 @@ protected:
     Server::Caller _caller{"", false, false};
 };
 
-TEST_F(LogInTest, isAskedOfAClientThatDoesNotTry) {
+TEST_F(LogInTest, IsAskedOfAClientThatDoesNotTry) {
     for (const char* header : {"", "Authorization: Negotiate abc\r\n", "Authorization: Basic ?!\r\n"}) {
         const Reply reply = ask(post("x", header));
         EXPECT_EQ(reply.status, 401) << header;
@@ -67,7 +67,7 @@ TEST_F(LogInTest, isAskedOfAClientThatDoesNotTry) {
     EXPECT_THAT(logged(), IsEmpty());
 }
 
-TEST_F(LogInTest, tellsTheHandlerWhoAsks) {
+TEST_F(LogInTest, TellsTheHandlerWhoAsks) {
     EXPECT_EQ(ask(post("x", logInAs("admin", "right"))).status, 200);
     EXPECT_EQ(_caller.user, "admin");
     EXPECT_TRUE(_caller.mayChangePower);
@@ -76,13 +76,13 @@ TEST_F(LogInTest, tellsTheHandlerWhoAsks) {
     EXPECT_FALSE(_caller.mayChangePower);
 }
 
-TEST_F(LogInTest, failsInOneLineThatNobodyCanForge) {
+TEST_F(LogInTest, FailsInOneLineThatNobodyCanForge) {
     EXPECT_EQ(ask(post("x", logInAs("eve\norvcim all is well", "wrong"))).status, 401);
     EXPECT_THAT(logged(), ElementsAre("127.0.0.1: log-in as \"eve\\x0aorvcim all is well\" failed: no such luck"));
     EXPECT_EQ(_caller.user, "");
 }
 
-TEST_F(LogInTest, isNotCheckedAgainForTheSamePassword) {
+TEST_F(LogInTest, IsNotCheckedAgainForTheSamePassword) {
     HttpClient asking = client();
     for (int i = 0; i < 3; ++i) {
         asking.send(post("x", logInAs("admin", "right")));
@@ -95,13 +95,13 @@ TEST_F(LogInTest, isNotCheckedAgainForTheSamePassword) {
     EXPECT_EQ(_doorkeeper.asked, 3);
 }
 
-TEST_F(LogInTest, isCheckedAgainAfterItFailed) {
+TEST_F(LogInTest, IsCheckedAgainAfterItFailed) {
     EXPECT_EQ(ask(post("x", logInAs("admin", "wrong"))).status, 401);
     EXPECT_EQ(ask(post("x", logInAs("admin", "wrong"))).status, 401);
     EXPECT_EQ(_doorkeeper.asked, 2);
 }
 
-TEST_F(LogInTest, comesBeforeTheBody) {
+TEST_F(LogInTest, ComesBeforeTheBody) {
     HttpClient asking = client();
     asking.send("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 1000\r\n" + logInAs("admin", "wrong") + "\r\n");
     EXPECT_EQ(asking.receive().status, 401);
@@ -112,7 +112,7 @@ TEST_F(LogInTest, comesBeforeTheBody) {
     EXPECT_EQ(right.receive().body, "body");
 }
 
-TEST_F(LogInTest, isAnsweredLateWhereItFailedAndHoldsNobodyUp) {
+TEST_F(LogInTest, IsAnsweredLateWhereItFailedAndHoldsNobodyUp) {
     serveWithDelay(1h);
     std::vector<HttpClient> failing;
     for (int i = 0; i < 40; ++i) {
@@ -124,7 +124,7 @@ TEST_F(LogInTest, isAnsweredLateWhereItFailedAndHoldsNobodyUp) {
     EXPECT_EQ(ask(post("x", logInAs("admin", "right"))).status, 200);
 }
 
-TEST_F(LogInTest, takesAsLongForAUserWhoDoesNotExistAsForAWrongPassword) {
+TEST_F(LogInTest, TakesAsLongForAUserWhoDoesNotExistAsForAWrongPassword) {
     serveWithDelay(500ms);
     _doorkeeper.before = [](const std::string& user) { std::this_thread::sleep_for(user == "exists" ? 300ms : 0ms); };
     for (const char* user : {"exists", "does-not"}) {
@@ -134,7 +134,7 @@ TEST_F(LogInTest, takesAsLongForAUserWhoDoesNotExistAsForAWrongPassword) {
     }
 }
 
-TEST_F(LogInTest, isCheckedForOtherNetworksWhileOneHasManyWaiting) {
+TEST_F(LogInTest, IsCheckedForOtherNetworksWhileOneHasManyWaiting) {
     _settings.address = "::";
     _doorkeeper.addresses = {"127.0.0.1", "::1"};
     serveWithDelay(1ms);
@@ -174,7 +174,7 @@ TEST_F(LogInTest, isCheckedForOtherNetworksWhileOneHasManyWaiting) {
     EXPECT_EQ(refusals, 1);
 }
 
-TEST_F(LogInTest, costsOneRequestWhereTheAuthenticatorFails) {
+TEST_F(LogInTest, CostsOneRequestWhereTheAuthenticatorFails) {
     _doorkeeper.before = [](const std::string& user) {
         if (user == "unlucky") {
             throw std::bad_alloc();
@@ -187,7 +187,7 @@ TEST_F(LogInTest, costsOneRequestWhereTheAuthenticatorFails) {
     EXPECT_EQ(ask(post("x", logInAs("admin", "right"))).status, 200);
 }
 
-TEST_F(LogInTest, isAnsweredAtOnceWhereTheServerEnds) {
+TEST_F(LogInTest, IsAnsweredAtOnceWhereTheServerEnds) {
     serveWithDelay(1h);
     HttpClient failing = client();
     failing.send(post("x", logInAs("eve", "wrong")));
@@ -203,7 +203,7 @@ struct Sent {
     std::optional<Server::Credentials> credentials;
 };
 
-TEST(CredentialsTest, areReadAsHttpSaysThem) {
+TEST(CredentialsTest, AreReadAsHttpSaysThem) {
     // "dXNlcjpwYXNz" is "user:pass".
     const Sent cases[] = {
         {"Basic dXNlcjpwYXNz", Server::Credentials{"user", "pass"}},
@@ -235,7 +235,7 @@ using Clock = Server::RecentLogIns::Clock;
 
 const Server::Credentials right{"admin", "right"};
 
-TEST(RecentLogInsTest, areGoodForTheirTimeAfterEachUse) {
+TEST(RecentLogInsTest, AreGoodForTheirTimeAfterEachUse) {
     Server::RecentLogIns recent;
     const Clock::time_point start = Clock::now();
     constexpr auto lifetime = Server::RecentLogIns::lifetime;
@@ -251,7 +251,7 @@ TEST(RecentLogInsTest, areGoodForTheirTimeAfterEachUse) {
     EXPECT_FALSE(recent.find(right, now + lifetime));
 }
 
-TEST(RecentLogInsTest, areCheckedAgainHoweverOftenTheyAreUsed) {
+TEST(RecentLogInsTest, AreCheckedAgainHoweverOftenTheyAreUsed) {
     Server::RecentLogIns recent;
     const Clock::time_point start = Clock::now();
     recent.remember(right, {"admin", true, true}, start);
@@ -265,7 +265,7 @@ TEST(RecentLogInsTest, areCheckedAgainHoweverOftenTheyAreUsed) {
     EXPECT_FALSE(recent.isKnown(right, start + Server::RecentLogIns::memory));
 }
 
-TEST(RecentLogInsTest, areForgottenWhereTheyTurnOutWrong) {
+TEST(RecentLogInsTest, AreForgottenWhereTheyTurnOutWrong) {
     Server::RecentLogIns recent;
     recent.remember(right, {"admin", true, true});
     recent.forget(right);
@@ -273,7 +273,7 @@ TEST(RecentLogInsTest, areForgottenWhereTheyTurnOutWrong) {
     EXPECT_FALSE(recent.isKnown(right));
 }
 
-TEST(RecentLogInsTest, knowTheWholePassword) {
+TEST(RecentLogInsTest, KnowTheWholePassword) {
     Server::RecentLogIns recent;
     recent.remember(right, {"admin", true, true});
     for (const char* password : {"", "righ", "right ", "Right"}) {
@@ -284,7 +284,7 @@ TEST(RecentLogInsTest, knowTheWholePassword) {
     EXPECT_FALSE(recent.find({"adminright", ""}));
 }
 
-TEST(RecentLogInsTest, areBounded) {
+TEST(RecentLogInsTest, AreBounded) {
     Server::RecentLogIns recent;
     const Clock::time_point start = Clock::now();
     const auto user = [](std::size_t i) { return Server::Credentials{"user" + std::to_string(i), "x"}; };

@@ -46,13 +46,13 @@ protected:
     Server::PamSettings _settings;
 };
 
-TEST_F(PamTest, letsInWhoHasThePassword) {
+TEST_F(PamTest, LetsInWhoHasThePassword) {
     const Server::LogIn result = logIn("nobody", "small");
     ASSERT_TRUE(result.caller);
     EXPECT_EQ(result.caller->user, "nobody");
 }
 
-TEST_F(PamTest, saysWhyItLetsNobodyElseIn) {
+TEST_F(PamTest, SaysWhyItLetsNobodyElseIn) {
     const std::pair<const char*, const char*> wrong[] = {
         {"nobody", "large"}, {"nobody", ""}, {"nobody", "small "}, {"stranger", "small"}, {"", ""}};
     for (const auto& [user, password] : wrong) {
@@ -63,31 +63,31 @@ TEST_F(PamTest, saysWhyItLetsNobodyElseIn) {
     EXPECT_EQ(logIn("nobody", "large").problem, "Authentication failure");
 }
 
-TEST_F(PamTest, asksWhetherTheUserMayUseTheService) {
+TEST_F(PamTest, AsksWhetherTheUserMayUseTheService) {
     const Server::LogIn result = logIn("elsewhere", "secret");
     EXPECT_FALSE(result.caller);
     EXPECT_EQ(result.problem, "Permission denied");
 }
 
-TEST_F(PamTest, letsNobodyInWhereTheServiceIsNotConfigured) {
+TEST_F(PamTest, LetsNobodyInWhereTheServiceIsNotConfigured) {
     _settings.service = "nothing";
     EXPECT_FALSE(logIn("nobody", "small").caller);
     _settings.folder = "/nowhere";
     EXPECT_FALSE(logIn("nobody", "small").caller);
 }
 
-TEST_F(PamTest, letsNobodyInWherePamAsksForMoreThanAPassword) {
+TEST_F(PamTest, LetsNobodyInWherePamAsksForMoreThanAPassword) {
     service("", " echo");
     EXPECT_FALSE(logIn("nobody", "small").caller);
 }
 
-TEST_F(PamTest, doesNotMindWhatPamSays) {
+TEST_F(PamTest, DoesNotMindWhatPamSays) {
     service("", " verbose");
     EXPECT_TRUE(logIn("nobody", "small").caller);
     EXPECT_FALSE(logIn("nobody", "large").caller);
 }
 
-TEST_F(PamTest, doesNotSleepAfterAFailure) {
+TEST_F(PamTest, DoesNotSleepAfterAFailure) {
     service("auth optional pam_faildelay.so delay=60000000\n");
     const auto begin = std::chrono::steady_clock::now();
     EXPECT_FALSE(logIn("nobody", "large").caller);
@@ -103,7 +103,7 @@ struct Roles {
     bool mayChangePower;
 };
 
-TEST_F(PamTest, takesRolesFromGroups) {
+TEST_F(PamTest, TakesRolesFromGroups) {
     const Roles cases[] = {
         {"", "orv-power-that-is-not", "nobody", "small", true, false},
         {"", "orv-power-that-is-not", "root", "top", true, true},
@@ -127,14 +127,14 @@ TEST_F(PamTest, takesRolesFromGroups) {
     }
 }
 
-TEST_F(PamTest, letsRootInOnlyWhereItIsToldTo) {
+TEST_F(PamTest, LetsRootInOnlyWhereItIsToldTo) {
     EXPECT_TRUE(logIn("root", "top").caller);
     _settings.allowRoot = false;
     EXPECT_EQ(logIn("root", "top").problem, "root may not log in (see --allow-root)");
     EXPECT_EQ(logIn("root", "wrong").problem, "Authentication failure");
 }
 
-TEST_F(PamTest, letsUsersWithoutALogInShellInOnlyWhereItIsToldTo) {
+TEST_F(PamTest, LetsUsersWithoutALogInShellInOnlyWhereItIsToldTo) {
     _settings.allowWithoutShell = false;
     // One whose shell lets nobody in, and one who has none, since the system does not know him.
     for (const auto& [user, password] : {std::pair("nobody", "small"), std::pair("visitor", "hello")}) {
@@ -143,7 +143,7 @@ TEST_F(PamTest, letsUsersWithoutALogInShellInOnlyWhereItIsToldTo) {
     EXPECT_TRUE(logIn("root", "top").caller);
 }
 
-TEST(GroupTest, existsOrNot) {
+TEST(GroupTest, ExistsOrNot) {
     EXPECT_TRUE(Server::groupExists("daemon"));
     EXPECT_FALSE(Server::groupExists("orv-power-that-is-not"));
     EXPECT_FALSE(Server::groupExists(""));

@@ -136,7 +136,7 @@ std::string pulledDisks(HttpClient& client, int atOnce) {
 
 class StressTest : public CimXml::ServiceFixture {};
 
-TEST_F(StressTest, everyClientGetsItsOwnReplies) {
+TEST_F(StressTest, EveryClientGetsItsOwnReplies) {
     constexpr unsigned int clients = 64;
     constexpr std::size_t requestsPerConnection = 40;
     const std::vector<Exchange> all = exchanges();

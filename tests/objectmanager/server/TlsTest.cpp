@@ -44,7 +44,7 @@ protected:
     AgentTest::TemporaryFolder _folder;
 };
 
-TEST_F(TlsTest, servesWithItsCertificate) {
+TEST_F(TlsTest, ServesWithItsCertificate) {
     serve();
     EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
     EXPECT_THAT(curl("--tls-max 1.2 --data hello").front(), HasSubstr("self-signed certificate"));
@@ -52,14 +52,14 @@ TEST_F(TlsTest, servesWithItsCertificate) {
                 ElementsAre("127.0.0.1: closed: the TLS handshake failed: the client refused: CA is unknown"));
 }
 
-TEST_F(TlsTest, answersALargeRequest) {
+TEST_F(TlsTest, AnswersALargeRequest) {
     serve();
     AgentTest::writeFile(_folder / "body", std::string(1'000'000, 'x'));
     EXPECT_THAT(curl(trusted() + " --data-binary @" + (_folder / "body").string()),
                 ElementsAre(std::string(1'000'000, 'x')));
 }
 
-TEST_F(TlsTest, survivesClientsThatSpeakNoTls) {
+TEST_F(TlsTest, SurvivesClientsThatSpeakNoTls) {
     serve();
     HttpClient plain = client();
     plain.send(post("in the clear"));
@@ -69,28 +69,28 @@ TEST_F(TlsTest, survivesClientsThatSpeakNoTls) {
     EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
 }
 
-TEST_F(TlsTest, closesAConnectionOnWhichNothingComes) {
+TEST_F(TlsTest, ClosesAConnectionOnWhichNothingComes) {
     _settings.limits.idleTime = 500ms;
     serve();
     HttpClient silent = client();
     EXPECT_EQ(silent.receiveAll(), "");
 }
 
-TEST_F(TlsTest, closesAConnectionWhoseRequestDoesNotArriveInTime) {
+TEST_F(TlsTest, ClosesAConnectionWhoseRequestDoesNotArriveInTime) {
     _settings.limits.requestTime = 500ms;
     serve();
     curl(trusted() + " --data x --header 'Content-Length: 50'");
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: answered 408: the request did not arrive within 0.5 s"));
 }
 
-TEST_F(TlsTest, doesNotStartWithoutAFile) {
+TEST_F(TlsTest, DoesNotStartWithoutAFile) {
     _settings.tls->key = "/nowhere/key";
     EXPECT_EQ(problem(), "/nowhere/key: No such file or directory");
     _settings.tls->certificate = "/dev/null";
     EXPECT_EQ(problem(), "/dev/null: found nothing in it, expected PEM");
 }
 
-TEST_F(TlsTest, doesNotStartWithAKeyOfAnotherCertificate) {
+TEST_F(TlsTest, DoesNotStartWithAKeyOfAnotherCertificate) {
     makeKey("other");
     _settings.tls->key = _folder / "other.key";
     EXPECT_THAT(problem(), StartsWith("cannot serve with the certificate " + (_folder / "server.pem").string() +

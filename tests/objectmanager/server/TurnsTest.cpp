@@ -45,7 +45,7 @@ protected:
     std::vector<Waiting> _waiting;
 };
 
-TEST_F(TurnsTest, areTakenByNetworksInTurns) {
+TEST_F(TurnsTest, AreTakenByNetworksInTurns) {
     Turns turns(1, 1, 10);
     {
         const Turns::Turn first = takeAtOnce(turns, "crowd");
@@ -60,7 +60,7 @@ TEST_F(TurnsTest, areTakenByNetworksInTurns) {
     EXPECT_EQ(_order.front(), "late");
 }
 
-TEST_F(TurnsTest, areForKnownClientsFirst) {
+TEST_F(TurnsTest, AreForKnownClientsFirst) {
     Turns turns(1, 1, 10);
     {
         const Turns::Turn first = takeAtOnce(turns, "a");
@@ -71,7 +71,7 @@ TEST_F(TurnsTest, areForKnownClientsFirst) {
     EXPECT_THAT(_order, testing::ElementsAre("c", "b"));
 }
 
-TEST_F(TurnsTest, leaveAPlaceToOthersThanOneNetworkAndStrangers) {
+TEST_F(TurnsTest, LeaveAPlaceToOthersThanOneNetworkAndStrangers) {
     Turns turns(4, 2, 10);
     const Turns::Turn one = takeAtOnce(turns, "crowd", false);
     const Turns::Turn two = takeAtOnce(turns, "crowd", false);
@@ -83,7 +83,7 @@ TEST_F(TurnsTest, leaveAPlaceToOthersThanOneNetworkAndStrangers) {
     EXPECT_TRUE(takeAtOnce(turns, "third", true));
 }
 
-TEST_F(TurnsTest, areNotWaitedForByMoreThanMayWait) {
+TEST_F(TurnsTest, AreNotWaitedForByMoreThanMayWait) {
     Turns turns(1, 1, 1);
     {
         const Turns::Turn first = takeAtOnce(turns, "a");
@@ -94,14 +94,14 @@ TEST_F(TurnsTest, areNotWaitedForByMoreThanMayWait) {
     EXPECT_THAT(_order, testing::ElementsAre("a"));
 }
 
-TEST_F(TurnsTest, areNotWaitedForByWhoHasGone) {
+TEST_F(TurnsTest, AreNotWaitedForByWhoHasGone) {
     Turns turns(1, 1, 1);
     const Turns::Turn first = takeAtOnce(turns, "a");
     EXPECT_FALSE(turns.take("b", true, Turns::Clock::now() + 1h, [] { return true; }));
     EXPECT_EQ(turns.waiting(), 0U);
 }
 
-TEST_F(TurnsTest, endForThoseWhoWaitWhenTheyAreClosed) {
+TEST_F(TurnsTest, EndForThoseWhoWaitWhenTheyAreClosed) {
     Turns turns(1, 1, 1);
     const Turns::Turn first = takeAtOnce(turns, "a");
     wait(turns, "b");

@@ -1,6 +1,6 @@
 /**
- * What announces power state management to clients (DMTF DSP1033): the registered profiles, the services that conform
- * to the one of power state management (DMTF DSP1027), and which profile refers to which.
+ * The providers that announce power state management to clients (DMTF DSP1033): they serve the registered profiles, the
+ * conformance of services to the profile of power state management (DMTF DSP1027), and the references between profiles.
  */
 #include "provider/Log.h"
 #include "provider/ServedClass.h"
@@ -21,12 +21,12 @@ using Provider::Request;
 constexpr const char* registeredProfileClass = "TALVO_RegisteredProfile";
 constexpr const char* conformanceClass = "TALVO_ElementConformsToProfile";
 constexpr const char* referencedProfileClass = "TALVO_ReferencedProfile";
-/** The central class of the profile of power state management. */
+/** The central class in the profile of power state management. */
 constexpr const char* serviceClass = "TALVO_PowerManagementService";
 
-/** What object managers call the namespace of discovery. */
+/** The names that object managers use for the namespace in which clients look for profiles. */
 constexpr const char* interopNameSpaces[] = {"root/interop", "interop", "root/PG_InterOp"};
-/** Where the services are, if they are not where the request is. */
+/** The namespace of the services; if they are not there, they are looked for in the request's own namespace. */
 constexpr const char* serviceNameSpace = "root/cimv2";
 
 /* Values of CIM_RegisteredProfile. */
@@ -34,9 +34,9 @@ constexpr CMPIUint16 specificationTypeProfile = 2;
 constexpr CMPIUint16 organizationDmtf = 2;
 constexpr CMPIUint16 notAdvertised = 2;
 
-/** A profile, in the words of its document. */
+/** A profile. Name and version are those of the DMTF document that defines it. */
 struct Profile {
-    /** Has the form that CIM_RegisteredSpecification prefers: who made it, a colon, what it names. */
+    /** In the form that CIM_RegisteredSpecification recommends: an organization, a colon, and a local name. */
     const char* instanceId;
     const char* name;
     const char* version;
@@ -65,7 +65,7 @@ Instance instanceOf(const Profile& profile, const std::string& nameSpace) {
              {"Description", std::string(profile.description)}}};
 }
 
-/** An association without properties of its own. */
+/** An association of two objects, which has no properties but its references. */
 Instance linkOf(const Request& request, const char* className, const char* firstRole, Path first,
                 const char* secondRole, Path second) {
     return {{request.nameSpace, className, {{firstRole, std::move(first)}, {secondRole, std::move(second)}}}, {}};
@@ -77,8 +77,8 @@ bool isInterop(const std::string& nameSpace) {
 }
 
 /**
- * Where the registered profiles are, seen from a request: in its own namespace if that is one of discovery, else in the
- * first of those in which the object manager serves them, else nowhere.
+ * The paths of the registered profiles: those in the request's own namespace if it is one of `interopNameSpaces`,
+ * otherwise those in the first of `interopNameSpaces` that has any, otherwise those in the request's own namespace.
  */
 std::vector<Path> registeredProfiles(const Request& request) {
     if (isInterop(request.nameSpace)) {
@@ -93,13 +93,13 @@ std::vector<Path> registeredProfiles(const Request& request) {
     return request.namesOf(request.nameSpace.c_str(), registeredProfileClass);
 }
 
-/** The central instances: each service once, though it is served in several namespaces. */
+/** The central instances: the services of one namespace, since other namespaces have the same services again. */
 std::vector<Path> services(const Request& request) {
     std::vector<Path> paths = request.namesOf(serviceNameSpace, serviceClass);
     return paths.empty() ? request.namesOf(request.nameSpace.c_str(), serviceClass) : paths;
 }
 
-/** What the classes have in common: where they log. */
+/** The base of the classes, which all log failures in the same category. */
 class ProfileClass : public Provider::ServedClass {
 public:
     using ServedClass::ServedClass;
@@ -151,7 +151,7 @@ public:
     std::vector<const char*> ends() const override { return {registeredProfileClass}; }
 };
 
-/* They are made with the first call of a factory, and end with the library. */
+/* The objects are made by the first call of a factory, and destroyed with the library. */
 
 RegisteredProfiles& registeredProfilesServed() {
     static RegisteredProfiles served("RegisteredProfileProvider");

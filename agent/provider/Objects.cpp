@@ -10,9 +10,9 @@ namespace Norv::Provider {
 
 namespace {
 
-/* A value is handed over as a whole CMPIValue, since some brokers copy all of it, and a text as such. */
+/* Brokers get a pointer to a whole CMPIValue, since some copy all of it; for CMPI_chars, they get the text itself. */
 
-/** A value and its type. For CMPI_chars, the text begins where the value would. */
+/** A value and its type. For CMPI_chars, the pointer to the value points to the text. */
 struct Typed {
     CMPIType type;
     CMPIValue value = {};
@@ -46,7 +46,7 @@ public:
         return made;
     }
 
-    /** Elements are strings: object managers do not convert them. */
+    /** The elements are string objects: in arrays, object managers do not convert CMPI_chars. */
     Typed operator()(const std::vector<std::string>& texts) const {
         return array(texts, CMPI_string, [this](const std::string& text) {
             CMPIValue value = {};
@@ -112,7 +112,7 @@ std::string textOf(const CMPIData& data) {
     return requireText("getKey", [&](CMPIStatus*) { return data.value.string; });
 }
 
-/** Whether a key has this value. */
+/** Whether the value of a key is equal to a value. */
 bool hasValue(const CMPIData& data, const Property& expected) {
     if (const auto* const text = std::get_if<std::string>(&expected.value)) {
         return isText(data) && textOf(data) == *text;

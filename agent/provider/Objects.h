@@ -15,13 +15,13 @@ namespace Norv::Provider {
 
 struct Property;
 
-/** What an instance is named by. */
+/** The path of an instance. */
 struct Path {
     std::string nameSpace;
     std::string className;
-    /** Each with a text or a path as its value. */
+    /** The keys, each with a text or a path as its value. */
     std::vector<Property> keys;
-    /** Empty where the object manager is to say it. */
+    /** The host; empty to leave it to the object manager. */
     std::string host{};
 };
 
@@ -30,30 +30,29 @@ struct Property {
     std::variant<std::string, bool, CMPIUint16, std::vector<std::string>, std::vector<CMPIUint16>, Path> value;
 };
 
-/** An instance. Its keys are properties too, and are not among the others again. */
+/** An instance. `properties` has the properties that are not keys; the keys are in the path. */
 struct Instance {
     Path path;
     std::vector<Property> properties;
 };
 
 /*
- * Objects belong to the broker and live as long as its request does. These functions throw OperationError where the
+ * The broker owns the objects, which live until its request ends. These functions throw OperationError if a call of the
  * broker fails.
  */
 
 CMPIObjectPath* newPath(const CMPIBroker* broker, const Path& path);
 
-/** @param properties names of those that are wanted beside the keys, ended by a null; null for all. */
+/** @param properties the names of the properties that are wanted beside the keys, ended by a null; null for all. */
 CMPIInstance* newInstance(const CMPIBroker* broker, const Instance& instance, const char** properties);
 
-/** The value of a path whose keys are texts. */
+/** Reads a path. @throws OperationError if a key is not a text. */
 Path pathOf(const CMPIObjectPath* path);
 
-/** Whether the broker's path names what `expected` does. Letter case counts in values of keys only, hosts not at all.
- */
+/** Whether the broker's path names the same object as `expected`. Hosts, and the letter case of names, are ignored. */
 bool isSame(const CMPIObjectPath* path, const Path& expected);
 
-/** Whether two names of classes, namespaces or properties are the same: letter case is ignored. */
+/** Whether two names of classes, namespaces or properties are equal; letter case is ignored. */
 bool isSameName(const std::string& left, const std::string& right);
 
 /** The namespace of a path. */

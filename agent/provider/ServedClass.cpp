@@ -17,7 +17,7 @@ const ServedClass& servedBy(const CMPIAssociationMI* mi) {
     return *static_cast<const ServedClass*>(mi->hdl);
 }
 
-/** Carries out an operation, which gets the request, and closes its result. */
+/** Carries out an operation: calls `operation` with the request, and then closes the result. */
 template <typename Operation>
 CMPIStatus perform(const ServedClass& served, const CMPIContext* context, const CMPIResult* result,
                    const CMPIObjectPath* reference, Operation operation) {
@@ -97,7 +97,7 @@ CMPIStatus execQuery(CMPIInstanceMI*, const CMPIContext*, const CMPIResult*, con
 
 /* Associations */
 
-/** What a traversal is restricted to; null restricts nothing. */
+/** Restricts which associations are followed. A null member restricts nothing. */
 struct Filter {
     const char* associationClass = nullptr;
     const char* resultClass = nullptr;
@@ -112,7 +112,7 @@ bool isA(const Request& request, const CMPIObjectPath* path, const char* classNa
     return is != 0;
 }
 
-/** As `isA`, where any class will do if none is asked for. */
+/** Whether the object's class is `className` or a descendant; true if `className` is null. */
 bool isAsked(const Request& request, const Path& path, const char* className) {
     return className == nullptr || isSameName(path.className, className) ||
            isA(request, newPath(request.broker, {path.nameSpace, path.className, {}}), className);
@@ -122,13 +122,13 @@ bool isRole(const Property& reference, const char* role) {
     return role == nullptr || isSameName(reference.name, role);
 }
 
-/** One association that refers to the source, and which of its references does. */
+/** An association that refers to the source, and that reference. */
 struct Link {
     const Instance& association;
     const Property& near;
 };
 
-/** Visits the associations that refer to a source, once for each reference that does. */
+/** Visits the associations that refer to a source, once for each reference to it. */
 template <typename Visit>
 void forEachLink(const ServedClass& served, const Request& request, const CMPIObjectPath* source, const Filter& filter,
                  Visit visit) {
@@ -149,7 +149,7 @@ void forEachLink(const ServedClass& served, const Request& request, const CMPIOb
     }
 }
 
-/** Visits what the associations link a source to. */
+/** Visits the paths of the objects that are associated with a source. */
 template <typename Visit>
 void forEachAssociated(const ServedClass& served, const Request& request, const CMPIObjectPath* source,
                        const Filter& filter, Visit visit) {

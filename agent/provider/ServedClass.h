@@ -1,8 +1,9 @@
 /**
- * A class whose instances a provider makes of what it knows, as providers of instances and of associations.
+ * Implements the instance and association provider of a class whose instances are computed. Derived classes only make
+ * the instances.
  *
- * An operation either closes its result and reports CMPI_RC_OK, or leaves it open and reports why. No exception leaves
- * it. Instances are neither made nor changed by clients.
+ * Each operation either closes its result and returns CMPI_RC_OK, or leaves the result open and returns the error; no
+ * exception leaves it. Clients can neither create nor modify nor delete instances.
  */
 #ifndef PROVIDER_SERVEDCLASS_H
 #define PROVIDER_SERVEDCLASS_H
@@ -17,45 +18,45 @@
 
 namespace Norv::Provider {
 
-/** What a provider is asked, and whom it may ask in its turn. */
+/** A request to the provider, and access to the object manager that made it. */
 struct Request {
     const CMPIBroker* broker;
     const CMPIContext* context;
-    /** In which the instances are served. */
+    /** The namespace of the request. */
     std::string nameSpace;
 
     /**
-     * The paths of a class's instances in a namespace, as the object manager gives them; none where nobody serves the
-     * class there.
+     * The paths of a class's instances in a namespace, as the object manager returns them; none if no provider serves
+     * the class there.
      *
-     * @throws OperationError where the object manager fails otherwise.
+     * @throws OperationError if the object manager fails for another reason.
      */
     std::vector<Path> namesOf(const char* inNameSpace, const char* className) const;
 };
 
 class ServedClass {
 public:
-    /** @param name names the class's factories. It lives as long as this. */
+    /** @param name the name of the provider, as in the names of its factories. It must outlive this object. */
     explicit ServedClass(const char* name);
     ServedClass(const ServedClass&) = delete;
     ServedClass& operator=(const ServedClass&) = delete;
     virtual ~ServedClass() = default;
 
     /**
-     * All instances in the namespace of the request. Of an association, the keys are its references.
+     * All instances in the namespace of the request. The keys of an association are its references.
      *
-     * @throws OperationError, which is the operation's failure.
+     * @throws OperationError, with which the operation then fails.
      */
     virtual std::vector<Instance> instances(const Request& request) const = 0;
 
-    /** The classes of which one has to be that of an association's source: others are not looked for. */
+    /** The classes that the references of an association refer to. A source of any other class has no associations. */
     virtual std::vector<const char*> ends() const { return {}; }
 
-    /** Takes why an operation failed. */
+    /** Called with the reason when an operation fails. */
     virtual void report(const char* message) const = 0;
 
-    /* The function tables for the factories, which may be called again and from any thread, but not while an operation
-       is running that came before. They live as long as this does. */
+    /* The function tables that the factories return. They live as long as this object. The functions may be called
+       again, from any thread, but not while an operation of an earlier table runs. */
 
     CMPIInstanceMI* instanceMI(const CMPIBroker* broker);
     CMPIAssociationMI* associationMI(const CMPIBroker* broker);

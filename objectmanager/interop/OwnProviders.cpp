@@ -51,7 +51,7 @@ std::string ownHostName() {
     return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "localhost";
 }
 
-/** The keys by which the machine itself is named, those of TALVO_ComputerSystem where that is served. */
+/** The class and name of the machine: those of TALVO_ComputerSystem, if a provider serves it. */
 std::pair<std::string, std::string> systemOf(const Request& request, const Facts& facts) {
     for (const std::string& nameSpace : facts.nameSpaces) {
         for (const Path& system : request.namesOf(nameSpace.c_str(), "TALVO_ComputerSystem")) {
@@ -68,7 +68,7 @@ std::pair<std::string, std::string> systemOf(const Request& request, const Facts
     return {"CIM_ComputerSystem", ownHostName()};
 }
 
-/** The path of what the machine hosts. */
+/** The path of an object that the machine hosts. */
 Path hosted(const Request& request, const Facts& facts, const char* className, const std::string& name) {
     auto [systemClass, systemName] = systemOf(request, facts);
     return {request.nameSpace,
@@ -79,7 +79,7 @@ Path hosted(const Request& request, const Facts& facts, const char* className, c
              {"Name", name}}};
 }
 
-/** The name of the object manager is unlike that of every other machine's. */
+/** The path of the object manager. Its name contains the machine's, so that it is unique in the network. */
 Path managerPath(const Request& request, const Facts& facts) {
     Path path = hosted(request, facts, managerClass, "");
     path.keys[3].value = "orvcim:" + std::get<std::string>(path.keys[1].value);
@@ -154,7 +154,7 @@ std::vector<Provider::Instance> mechanisms(const Request& request, const Facts& 
     return instances;
 }
 
-/** Links from the object manager to each of these. */
+/** The associations of a class from the object manager to each of the dependents. */
 template <typename Dependents>
 std::vector<Provider::Instance> dependencies(const Request& request, const Facts& facts, const char* className,
                                              Dependents dependents) {
@@ -176,11 +176,11 @@ std::vector<Provider::Instance> mechanismsForManager(const Request& request, con
     return dependencies(request, facts, "CIM_CommMechanismForManager", mechanismPaths);
 }
 
-/** A provider, and what it makes its instances with. */
+/** A provider: its name, and the function that makes its instances. */
 struct Row {
     const char* name;
     std::vector<Provider::Instance> (*instances)(const Request& request, const Facts& facts);
-    /** The classes that it links, where it is an association. */
+    /** If the provider serves an association, the classes that it associates. */
     std::vector<const char*> ends;
 };
 
@@ -206,7 +206,7 @@ public:
 
     std::vector<const char*> ends() const override { return _row.ends; }
 
-    /** The object manager tells its caller, and nobody else has to know. */
+    /** Does nothing: the client gets the error, and no other reader needs it. */
     void report(const char* /*message*/) const override {}
 
 private:

@@ -1,7 +1,7 @@
 /**
- * What the object manager tells of itself to clients that know nothing yet but its address: who it is, which namespaces
- * there are, and how it can be reached (DMTF DSP1071's forerunner, with the classes CIM_ObjectManager, CIM_Namespace
- * and CIM_ObjectManagerCommunicationMechanism).
+ * The providers with which the object manager describes itself to clients that know only its address: what it is, which
+ * namespaces it has, and how to reach it (the classes CIM_ObjectManager, CIM_Namespace and
+ * CIM_ObjectManagerCommunicationMechanism of DMTF's CIM schema).
  */
 #ifndef INTEROP_OWNPROVIDERS_H
 #define INTEROP_OWNPROVIDERS_H
@@ -24,27 +24,28 @@ namespace ObjectManager::Interop {
 
 /** How clients on the network reach the object manager. */
 struct Communication {
-    /** Scheme, host and port. */
+    /** The URL, with scheme, host and port. */
     std::string url;
     /** Whether clients have to log in. */
     bool authenticated = false;
 };
 
+/** What the object manager tells about itself. */
 struct Facts {
-    /** Of the program, for example "1.0.0". */
+    /** The program's version, for example "1.0.0". */
     std::string version;
     std::vector<std::string> nameSpaces;
-    /** Nothing as long as it does not answer clients on the network. */
+    /** No value while the object manager does not serve clients on the network. */
     std::optional<Communication> communication{};
 };
 
-/** The providers with the location "orvcim". */
+/** The providers that are registered with the location "orvcim". */
 class OwnProviders final : public BuiltInProviders {
 public:
     explicit OwnProviders(Facts facts);
     ~OwnProviders() override;
 
-    /** Clients on the network are answered from now on. */
+    /** Tells that the object manager serves clients on the network, and how to reach it. */
     void answerOn(const Communication& communication);
 
     std::string_view location() const override { return "orvcim"; }

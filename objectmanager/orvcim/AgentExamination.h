@@ -1,5 +1,5 @@
 /**
- * Examines the embedded agent as a provider of this user would find it now.
+ * Examines the embedded agent as a provider that this user runs finds it.
  */
 #ifndef ORVCIM_AGENTEXAMINATION_H
 #define ORVCIM_AGENTEXAMINATION_H

@@ -14,11 +14,11 @@ namespace ObjectManager::Orvcim {
 
 namespace {
 
-/** Where clients begin. */
+/** The namespace in which clients look for profiles. */
 constexpr const char* discoveryNameSpace = "root/interop";
 constexpr std::size_t indent = 2;
 
-/** From a central instance to what belongs to it. */
+/** An association from a central instance to objects that belong to it. */
 struct Way {
     const char* label;
     const char* associationClass;
@@ -29,7 +29,7 @@ constexpr Way ways[] = {{"hosted by", "CIM_HostedService", "Dependent"},
                         {"manages", "CIM_ServiceAvailableToElement", "ServiceProvided"},
                         {"capabilities", "CIM_ElementCapabilities", "ManagedElement"}};
 
-/** The instances of a class and its descendants in the namespace where clients begin. */
+/** The instances of a class and its descendants in that namespace. */
 std::vector<Instance> instancesOf(Session& session, const char* className) {
     Dispatcher& dispatcher = session.dispatcher();
     std::vector<Instance> instances;
@@ -43,14 +43,14 @@ std::vector<Instance> instancesOf(Session& session, const char* className) {
     return instances;
 }
 
-/** A property for people; empty where the instance has none. */
+/** The value of a property for people; empty if the instance does not have the property. */
 std::string textOf(Session& session, const Instance& instance, const std::string& name) {
     const NamedValue* const property = find(instance.properties, name);
     const Class* const known = session.catalogue().find(instance.path.className);
     return property == nullptr ? "" : plainText(property->value, known == nullptr ? nullptr : known->property(name));
 }
 
-/** What a way leads to. */
+/** The instances that a way leads to. */
 std::vector<Instance> farInstances(Session& session, const ObjectPath& source, const AssociationFilter& filter) {
     std::vector<Instance> instances;
     for (auto& found : session.dispatcher().associators(Session::invocation(), source, filter, std::nullopt)) {

@@ -111,7 +111,7 @@ void ServeLog::Queue::put(const std::string& line) {
         }
         const ssize_t written = ::write(STDERR_FILENO, rest.data(), rest.size());
         if (written < 0 && errno != EINTR && errno != EAGAIN) {
-            return; // nobody reads standard error any more
+            return; // The reader of standard error is gone.
         }
         rest.remove_prefix(written > 0 ? static_cast<std::size_t>(written) : 0);
     }

@@ -1,205 +1,75 @@
-/*
- * Attacks on the server from 127.0.0.0/8, which counts as one network, while a well-behaved client asks from ::1: it is
- * always answered, and soon.
- */
-#include "objectmanager/server/Served.h"
+/* Attacks on the server while users read the power state and switch the machine off: they are answered, and soon. */
+#include "Attack.h"
 
-#include "agent/TestSupport.h"
+#include "server/EventLog.h"
 
 #include <gnutls/gnutls.h>
 
-#include <sys/syscall.h>
+#include <gmock/gmock.h>
+
+#include <fcntl.h>
+#include <sys/mman.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
-#include <cstdlib>
-#include <ctime>
-#include <deque>
-#include <fstream>
-#include <functional>
+#include <cstdint>
+#include <random>
 #include <sstream>
+#include <system_error>
 
+namespace AttackTest {
 namespace {
 
-/** By how many seconds the wall clock of this process is wrong. */
-std::atomic<std::time_t> clockIsOffBy = 0;
+/** A user who has a password, but attacks. */
+const std::string insider = "bin:evil";
 
-void setClockOff(std::chrono::seconds by) {
-    clockIsOffBy = static_cast<std::time_t>(by.count());
+std::string asInsider() {
+    return logInAs("bin", "evil");
 }
 
-} // namespace
-
-// Libraries take their clock_gettime from the program.
-extern "C" int clock_gettime(clockid_t clock, timespec* time) noexcept {
-    const int status = static_cast<int>(syscall(SYS_clock_gettime, clock, time));
-    if (status == 0 && clock == CLOCK_REALTIME) {
-        time->tv_sec += clockIsOffBy;
-    }
-    return status;
-}
-
-namespace ServerTest {
-namespace {
-
-/** How long each attack goes on. */
-std::chrono::milliseconds attackTime() {
-    const char* const seconds = std::getenv("ORV_ATTACK_SECONDS");
-    return seconds == nullptr ? 1500ms : std::chrono::seconds{std::atoi(seconds)};
-}
-
-/** The longest wait that a test lets pass, on a machine that has much else to do. */
-constexpr auto patience = 10s;
-/** Half of the waits must be shorter: what is promised to users, and what a busy machine does not easily exceed. */
-constexpr auto usualPatience = 1s;
-
-/** Takes its time for a password, as PAM does, and lets in who has the right one. */
-class SlowDoorkeeper : public Server::Authenticator {
-public:
-    Server::LogIn logIn(const std::string& user, const std::string& password, const std::string&) override {
-        std::this_thread::sleep_for(20ms);
-        return password == "right" ? Server::LogIn{Server::Caller{user, true, true}, ""}
-                                   : Server::LogIn{std::nullopt, "wrong password"};
-    }
-};
-
-/** Asks again and again, on a new connection each time, and measures. */
-class GoodClient {
-public:
-    explicit GoodClient(std::function<void()> ask) : _ask(std::move(ask)), _thread([this] { run(); }) {}
-    ~GoodClient() { stop(); }
-
-    void stop() {
-        _stopping = true;
-        if (_thread.joinable()) {
-            _thread.join();
-        }
-    }
-
-    std::atomic<int> answers = 0;
-    std::vector<std::string> errors;
-    /** Of each answer, or failure. */
-    std::vector<std::chrono::steady_clock::duration> waits;
-
-    /** The wait that half of all waits exceed. */
-    std::chrono::steady_clock::duration usualWait() {
-        const auto middle = waits.begin() + static_cast<std::ptrdiff_t>(waits.size() / 2);
-        std::ranges::nth_element(waits, middle);
-        return *middle;
-    }
-
-private:
-    void run() {
-        while (!_stopping) {
-            const auto begin = std::chrono::steady_clock::now();
-            try {
-                _ask();
-                ++answers;
-            } catch (const std::exception& error) {
-                errors.emplace_back(error.what());
-            }
-            waits.push_back(std::chrono::steady_clock::now() - begin);
-            std::this_thread::sleep_for(10ms);
-        }
-    }
-
-    const std::function<void()> _ask;
-    std::atomic<bool> _stopping = false;
-    std::thread _thread;
-};
-
-class AttackTest : public Served {
-protected:
-    AttackTest() {
-        _settings.address = "::";
-        _settings.limits.connections = 300;
-        _settings.limits.connectionsPerAddress = 150;
-    }
-
-    ~AttackTest() override { _server.reset(); }
-
-    void serveWithLogIns() { serve(echo, &_doorkeeper); }
-
-    /** What the well-behaved client does. */
-    virtual void ask() {
-        HttpClient asking(_server->port(), "::1");
-        asking.send(post("hello", logInAs("admin", "right")));
-        const Reply reply = asking.receive();
-        if (reply.status != 200) {
-            throw std::runtime_error("answered " + std::to_string(reply.status));
-        }
-    }
-
-    /** Runs a step of an attack again and again. */
-    void attack(const std::function<void()>& step) {
-        ask();
-        GoodClient good([this] { ask(); });
-        const auto end = std::chrono::steady_clock::now() + attackTime();
-        while (std::chrono::steady_clock::now() < end || good.answers == 0) {
-            step();
-        }
-        good.stop();
-        EXPECT_THAT(good.errors, testing::IsEmpty());
-        const auto longest = *std::ranges::max_element(good.waits);
-        EXPECT_LT(longest, patience);
-        EXPECT_LT(good.usualWait(), usualPatience);
-        RecordProperty("longest_ms", static_cast<int>(longest / 1ms));
-        RecordProperty("usual_ms", static_cast<int>(good.usualWait() / 1ms));
-    }
-
-    /** A client of the attacker's, from anywhere in 127.0.0.0/8; nothing where it is not let in. */
-    std::optional<HttpClient> attacker() {
-        const std::string from = "127.0." + std::to_string(_attackers++ % 200) + ".7";
-        try {
-            return HttpClient(_server->port(), "127.0.0.1", from);
-        } catch (const std::system_error&) {
-            return std::nullopt;
-        }
-    }
-
-    /** Connections that each begin with the text and are then kept: the oldest of many goes for a new one. */
-    void hold(const std::string& text) {
-        constexpr std::size_t many = 400;
-        if (auto one = attacker()) {
-            one->send(text);
-            _held.push_back(std::move(*one));
-        }
-        if (_held.size() > many) {
-            _held.pop_front();
-        }
-    }
-
-    SlowDoorkeeper _doorkeeper;
-    std::deque<HttpClient> _held;
-    unsigned int _attackers = 0;
-};
+/** More than one network may have. */
+constexpr unsigned int many = 600;
 
 TEST_F(AttackTest, idleConnections) {
     serveWithLogIns();
-    attack([this] { hold(""); });
+    attack([this] { hold(attacker()); }, many);
+}
+
+TEST_F(AttackTest, idleConnectionsWithTls) {
+    serveWithLogIns();
+    attack([this] { hold(attackerWithTls()); }, many);
 }
 
 TEST_F(AttackTest, requestsThatAreNeverFinished) {
     serveWithLogIns();
-    attack([this] { hold("POST / HTTP/1.1\r\nHost: localhost\r\nX:"); });
+    attack([this] { hold(begunRequest); }, many);
+}
+
+TEST_F(AttackTest, connectionsThatAreHalfClosed) {
+    serveWithLogIns();
+    attack(
+        [this] {
+            hold(begunRequest);
+            if (!_held.empty()) {
+                _held.back().endSending();
+            }
+        },
+        many);
 }
 
 TEST_F(AttackTest, wrongPasswords) {
     serveWithLogIns();
-    attack([this] { hold(post("x", logInAs("eve" + std::to_string(_attackers), "wrong"))); });
+    attack([this] { hold(post("x", logInAs("eve" + std::to_string(_attackers), "wrong"))); }, many);
 }
 
 TEST_F(AttackTest, bodiesThatAreNeverFinished) {
-    _settings.limits.allBodiesBytes = std::size_t{8} * 1024 * 1024;
-    serve();
+    serveWithLogIns();
     const std::string most(900'000, 'x');
-    attack([&] { hold("POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 1000000\r\n\r\n" + most); });
-    std::ifstream status("/proc/self/status");
-    std::stringstream text;
-    text << status.rdbuf();
-    RecordProperty("memory", text.str().substr(text.str().find("VmHWM:"), 24));
+    attack([&] {
+        hold("POST / HTTP/1.1\r\nHost: localhost\r\n" + asInsider() + "Content-Length: 1000000\r\n\r\n" + most);
+    });
 }
 
 TEST_F(AttackTest, connectionsThatAreResetAtOnce) {
@@ -212,53 +82,39 @@ TEST_F(AttackTest, connectionsThatAreResetAtOnce) {
     });
 }
 
-TEST_F(AttackTest, answersThatAreNeverRead) {
-    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
-        return request.body == "much" ? Server::HttpReply{200, {}, std::string(3'000'000, 'x')} : echo(request, caller);
-    });
+TEST_F(AttackTest, connectionsThatAreResetAfterARequest) {
+    serveWithLogIns();
     attack([this] {
-        hold(post("much") + post("much"));
-        // Enough to fill the table: what more would cost is processor time of this program.
-        std::this_thread::sleep_for(5ms);
+        if (auto one = attackerWithTls()) {
+            one->send(enumerate("Test_Disk", "root/test", insider));
+            one->reset();
+        }
     });
 }
 
-/** The well-behaved client's answer needs as much of the memory for answers as each of the attackers'. */
+/** The user's answer needs as much memory as each of the attackers'. */
 TEST_F(AttackTest, largeAnswersThatAreNeverRead) {
-    _settings.stopTime = 100ms;
-    _settings.limits.allAnswersBytes = std::size_t{8} * 1024 * 1024;
-    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
-        request.outlet->hold(1'000'000);
-        if (request.body == "much") {
-            const std::string piece(Server::Outlet::pieceBytes, 'x');
-            request.outlet->begin({200, {}, piece});
-            for (int i = 0; i < 1000; ++i) {
-                request.outlet->send(piece);
-            }
-        }
-        return echo(request, caller);
-    });
-    attack([this] {
-        if (_held.size() < 100) {
-            hold(post("much"));
-        }
-        std::this_thread::sleep_for(1ms);
-    });
-    _server.reset();
+    serveWithLogIns({"--max-answers=4000000"}, {{"TEST_MORE_DISKS", "1000"}});
+    _ask = [this] { readMuch(); };
+    // To make such an answer takes the processor's time, which a busy machine has little of.
+    _usualPatience = 10s;
+    _patience = 30s;
+    attack([this] { holdSometimes(enumerate("Test_Disk", "root/test", insider)); });
+}
+
+TEST_F(AttackTest, pipelinesWhoseAnswersAreNeverRead) {
+    serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
+    const std::string request = enumerate("Test_Disk", "root/test", insider);
+    attack([&] { hold(request + request + request); });
 }
 
 TEST_F(AttackTest, answersThatAreDripped) {
-    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
-        return request.body == "much" ? Server::HttpReply{200, {}, std::string(1'000'000, 'x')} : echo(request, caller);
-    });
+    serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
     attack([this] {
-        hold(post("much"));
-        const std::size_t several = std::min<std::size_t>(_held.size(), 50);
-        for (std::size_t number = 0; number < several; ++number) {
-            try {
-                _held[number].receiveSome(1);
-            } catch (const std::exception&) {
-                // The server has closed the connection for another one.
+        hold(enumerate("Test_Disk", "root/test", insider));
+        for (const HttpClient& each : _held) {
+            if (each.isReadable()) {
+                each.receiveSome(1);
             }
         }
     });
@@ -266,72 +122,89 @@ TEST_F(AttackTest, answersThatAreDripped) {
 
 TEST_F(AttackTest, slowConnections) {
     serveWithLogIns();
-    std::size_t next = 0;
-    attack([&] {
-        hold("POST / HTTP/1.1\r\nHost: localhost\r\nX: ");
-        for (int count = 0; count < 20 && !_held.empty(); ++count) {
-            _held[next++ % _held.size()].send("x");
-        }
-    });
+    attack([this] { holdSlow(); }, many);
+}
+
+TEST_F(AttackTest, slowConnectionsByTheThousand) {
+    constexpr unsigned int atATime = 2000;
+    _mostHeld = atATime;
+    serveWithLogIns();
+    attack([this] { holdSlow(); }, 2 * atATime);
 }
 
 TEST_F(AttackTest, stormsOfConnects) {
     serveWithLogIns();
-    attack([this] {
-        std::deque<HttpClient> storm;
-        for (int count = 0; count < 100; ++count) {
-            if (auto one = attacker()) {
-                storm.push_back(std::move(*one));
-            }
-        }
-    });
-    EXPECT_GT(_attackers, 100U);
+    attack([this] { storm(); });
 }
+
+TEST_F(AttackTest, connectsByTheThousand) {
+    serveWithLogIns();
+    attack([this] { storm(); }, 100);
+    EXPECT_GE(_attackers, 10'000U);
+}
+
+/** By how many seconds the server's clock is wrong. */
+class WrongClock {
+public:
+    explicit WrongClock(const std::string& file) : _file(open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)) {
+        if (ftruncate(_file, sizeof(Seconds)) != 0) {
+            throw std::system_error(errno, std::generic_category(), file);
+        }
+        _seconds = static_cast<Seconds*>(mmap(nullptr, sizeof(Seconds), PROT_READ | PROT_WRITE, MAP_SHARED, _file, 0));
+    }
+    WrongClock(const WrongClock&) = delete;
+    WrongClock& operator=(const WrongClock&) = delete;
+    ~WrongClock() {
+        munmap(_seconds, sizeof(Seconds));
+        close(_file);
+    }
+
+    void set(std::chrono::seconds by) { *_seconds = static_cast<std::int32_t>(by.count()); }
+
+private:
+    using Seconds = std::atomic<std::int32_t>;
+
+    const int _file;
+    Seconds* _seconds;
+};
 
 TEST_F(AttackTest, clocksThatJumpByYears) {
-    serveWithLogIns();
-    attack([this] {
+    const std::string file = (_folder / "clock").string();
+    WrongClock clock(file);
+    serveWithLogIns({}, {{"LD_PRELOAD", TEST_CLOCK_LIBRARY}, {"TEST_CLOCK", file}});
+    attack([&] {
         using std::chrono::years;
-        setClockOff(std::chrono::seconds(_attackers % 2 == 0 ? years(10) : -years(10)));
-        hold("POST / HTTP/1.1\r\nHost: localhost\r\nX:");
+        clock.set(std::chrono::seconds(_attackers % 2 == 0 ? years(10) : -years(10)));
+        hold(begunRequest);
     });
-    setClockOff({});
 }
 
-TEST_F(AttackTest, handlersThatHang) {
-    Gate gate;
-    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
-        if (request.body == "hang") {
-            gate.wait();
-        }
-        return echo(request, caller);
-    });
-    attack([this] {
-        if (_held.size() < 100) {
-            hold(post("hang"));
-        }
-        std::this_thread::sleep_for(1ms);
-    });
-    gate.open();
-    _server.reset();
+TEST_F(AttackTest, providersThatHang) {
+    serveWithLogIns();
+    const std::string request = get("Test_Disk", "hangs", "root/test", insider);
+    attack([&] { holdSometimes(request); });
 }
 
 TEST_F(AttackTest, badRequestsThatFillTheLog) {
+    using ObjectManager::Server::EventLog;
     serveWithLogIns();
     attack([this] {
-        if (auto one = attacker()) {
+        if (auto one = attackerWithTls()) {
             one->send("POST / HTTP/1.1\r\nHost: " + std::string(10'000, 'x') + "\r\n\r\n");
             one->receiveAll();
         }
     });
-    const std::vector<std::string> lines = logged();
-    EXPECT_LE(lines.size(), Server::EventLog::linesOfNetwork * (2 + attackTime() / 1min) + 10);
-    for (const std::string& line : lines) {
-        EXPECT_LE(line.size(), Server::EventLog::longestLine + 30);
+    std::istringstream log(_server->err());
+    unsigned int lines = 0;
+    for (std::string line; std::getline(log, line);) {
+        lines += line.find("127.0.") != std::string::npos ? 1 : 0;
+        EXPECT_LE(line.size(), EventLog::longestLine + 40);
     }
+    EXPECT_GT(_attackers, 0U);
+    EXPECT_LE(lines, EventLog::linesOfNetwork * (3 + attackTime() / 1min));
 }
 
-/* TLS, before any log-in. */
+/* Before any log-in. */
 
 /** What a client of these priorities says first. */
 std::string helloOf(const char* priorities) {
@@ -354,42 +227,40 @@ std::string helloOf(const char* priorities) {
     gnutls_handshake(session);
     gnutls_deinit(session);
     gnutls_certificate_free_credentials(credentials);
+    EXPECT_FALSE(hello.empty());
     return hello;
 }
 
-class TlsAttackTest : public AttackTest {
-protected:
-    TlsAttackTest() {
-        const std::string base = (_folder / "server").string();
-        AgentTest::linesOf("openssl req -x509 -newkey rsa:2048 -noenc -days 2 -subj /CN=localhost -keyout " + base +
-                           ".key -out " + base + ".pem 2>&1");
-        _settings.tls = Server::Tls{base + ".pem", base + ".key"};
-        serveWithLogIns();
-    }
-
-    void ask() override {
-        const std::vector<std::string> lines = AgentTest::linesOf(
-            "curl --silent --show-error --insecure --max-time 30 --user admin:right --data hello https://[::1]:" +
-            std::to_string(_server->port()) + "/ 2>&1 || true");
-        if (lines != std::vector<std::string>{"hello"}) {
-            throw std::runtime_error(lines.empty() ? "no answer" : lines.front());
-        }
-    }
-
-    AgentTest::TemporaryFolder _folder;
-};
-
-TEST_F(TlsAttackTest, hellosForAGroupThatIsDear) {
+TEST_F(AttackTest, hellosForAGroupThatIsDear) {
+    serveWithLogIns();
     const std::string hello = helloOf("NORMAL:-GROUP-ALL:+GROUP-FFDHE8192");
-    ASSERT_FALSE(hello.empty());
-    attack([&] { hold(hello); });
+    attack([&] { holdInTheClear(hello); }, many);
 }
 
-TEST_F(TlsAttackTest, hellosThatAreNotGoneOnWith) {
+TEST_F(AttackTest, hellosThatAreNotGoneOnWith) {
+    serveWithLogIns();
     const std::string hello = helloOf("NORMAL");
-    ASSERT_FALSE(hello.empty());
-    attack([&] { hold(hello); });
+    attack([&] { holdInTheClear(hello); }, many);
+}
+
+TEST_F(AttackTest, halvesOfHellos) {
+    serveWithLogIns();
+    const std::string hello = helloOf("NORMAL");
+    attack([&] { holdInTheClear(hello.substr(0, _attackers % hello.size())); }, many);
+}
+
+TEST_F(AttackTest, junkInsteadOfAHello) {
+    serveWithLogIns();
+    std::minstd_rand random; // NOLINT(cert-msc32-c,cert-msc51-cpp): the same in each run
+    attack(
+        [&] {
+            std::string junk(1 + random() % 2000, '\0');
+            std::generate(junk.begin(), junk.end(), [&] { return static_cast<char>(random()); });
+            // Half of it looks like a record of a handshake at first.
+            holdInTheClear((_attackers % 2 == 0 ? std::string("\x16\x03\x01\x02\x00\x01", 6) : "") + junk);
+        },
+        many);
 }
 
 } // namespace
-} // namespace ServerTest
+} // namespace AttackTest

@@ -5,9 +5,12 @@
 #include "OrvLog/Observer.h"
 #include "cmpimacs.h"
 
+#include <unistd.h>
+
 #include <array>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <map>
 #include <stdexcept>
 #include <string>
@@ -250,12 +253,25 @@ CMPIStatus Test_EnumInstances(CMPIInstanceMI*, const CMPIContext* context, const
     return status;
 }
 
+/** Never returns. Writes a byte to the file that TEST_HANGS names, so that a test knows. */
+void hang() {
+    if (const char* const file = std::getenv("TEST_HANGS")) {
+        std::ofstream(file, std::ios::app) << '.';
+    }
+    while (true) {
+        pause();
+    }
+}
+
 CMPIStatus Test_GetInstance(CMPIInstanceMI*, const CMPIContext* context, const CMPIResult* result,
                             const CMPIObjectPath* path, const char** properties) {
     const Call call{context, result, path, properties};
     CMPIStatus status = ok;
     if (!behave(call, status)) {
         const CMPIString* name = CMGetKey(path, "Name", nullptr).value.string;
+        if (std::string_view(CMGetCharPtr(name)) == "hangs") {
+            hang();
+        }
         CMReturnInstance(result, disk(call, CMGetCharPtr(name)));
         CMReturnDone(result);
     }

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <fstream>
 #include <stdexcept>
 #include <system_error>
 #include <thread>
@@ -178,6 +179,16 @@ std::string RunningProcess::contentOf(Stream stream) const {
 
 void RunningProcess::send(int signal) const {
     require(kill(_process, signal) == 0, "kill");
+}
+
+std::size_t RunningProcess::peakMemory() const {
+    std::ifstream status("/proc/" + std::to_string(_process) + "/status");
+    for (std::string word; status >> word;) {
+        if (std::size_t kilobytes = 0; word == "VmHWM:" && status >> kilobytes) {
+            return kilobytes * 1024;
+        }
+    }
+    throw std::runtime_error("the program does not run");
 }
 
 Outcome RunningProcess::wait() {

@@ -6,6 +6,7 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <map>
 #include <memory>
 #include <optional>
@@ -50,6 +51,8 @@ public:
     /** The text that the program has written to its standard error so far. */
     std::string err() const;
     void send(int signal) const;
+    /** The most memory that was resident at a time so far, in bytes. */
+    std::size_t peakMemory() const;
     /** Waits for the program's end. */
     Outcome wait();
 

@@ -33,20 +33,6 @@ protected:
         return start(options)->wait();
     }
 
-    /** Makes a certificate for the name localhost. @return the file that has the certificate and its key. */
-    std::string makeCertificate() const {
-        const std::string file = (_folder / "server.pem").string();
-        const Outcome made =
-            runProcess({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-noenc",
-                        "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost", "-keyout",
-                        file + ".key", "-out", file + ".certificate"},
-                       {});
-        EXPECT_EQ(made.status, 0) << made.err;
-        std::ofstream(file) << std::ifstream(file + ".certificate").rdbuf() << std::ifstream(file + ".key").rdbuf();
-        std::filesystem::permissions(file, std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
-        return file;
-    }
-
     /** Of the certificate that the server shows to a new client. */
     std::string fingerprint() const {
         return runProcess({"sh", "-c",

@@ -26,20 +26,11 @@ constexpr const char* bob = "nobody:small";
 
 class WrongRequestTest : public ServingTest {
 protected:
-    using Environment = std::map<std::string, std::string>;
-
     /** Serves root, who may do everything, and nobody, who may read. */
-    void serveUsers(const Environment& environment = {}, std::vector<std::string> options = {}) {
-        std::vector<std::string> arguments = {ORVCIM_PROGRAM,         "serve",        "--port=0",
-                                              "--authenticate",       "--pam-folder", makeUsers(),
-                                              "--power-group=daemon", "--allow-root", "--allow-without-shell"};
-        arguments.insert(arguments.end(), options.begin(), options.end());
-        Environment all = {{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()}, {"LC_ALL", "C"}};
-        all.insert(environment.begin(), environment.end());
-        _server = std::make_unique<RunningProcess>(arguments, all);
-        const std::string line = _server->firstLine();
-        ASSERT_NE(line, "") << _server->err();
-        _port = line.substr(line.rfind(':') + 1);
+    void serveUsers(const Environment& variables = {}, std::vector<std::string> options = {}) {
+        options.insert(options.begin(), {"--authenticate", "--pam-folder", makeUsers(), "--power-group=daemon",
+                                         "--allow-root", "--allow-without-shell"});
+        serve(options, variables);
     }
 
     Outcome reboot(const std::string& element, const std::string& user = alice) const {
@@ -188,14 +179,9 @@ TEST_F(WrongRequestTest, IsAnEntryOfTheJournalWithFieldsUnderSystemd) {
                                               "--power-group=daemon",
                                               "--allow-root",
                                               "--allow-without-shell"};
-    _server =
-        std::make_unique<RunningProcess>(command, Environment{{"ORV_AGENT_CONFIG", (_folder / "agent.toml").string()},
-                                                              {"LC_ALL", "C"},
-                                                              {"LD_PRELOAD", TEST_JOURNAL_REDIRECT},
-                                                              {"TEST_JOURNAL_SOCKET", (_folder / "journal").string()}});
-    const std::string line = _server->firstLine();
-    ASSERT_NE(line, "") << _server->err();
-    _port = line.substr(line.rfind(':') + 1);
+    Environment variables = environment();
+    variables.insert({{"LD_PRELOAD", TEST_JOURNAL_REDIRECT}, {"TEST_JOURNAL_SOCKET", (_folder / "journal").string()}});
+    serveAs(std::make_unique<RunningProcess>(command, variables));
 
     reboot(_system, bob);
     const std::string entry = journal.entry();

@@ -1,7 +1,11 @@
 #include "HttpClient.h"
 
+#include <gnutls/gnutls.h>
+
 #include <arpa/inet.h>
 #include <netdb.h>
+#include <netinet/tcp.h>
+#include <poll.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -17,7 +21,8 @@ namespace ServerTest {
 
 namespace {
 
-constexpr int patience = 30;
+/** In seconds. */
+constexpr int patience = 60;
 
 void require(bool done, const char* what) {
     if (!done) {
@@ -33,6 +38,22 @@ ssize_t receiveFrom(int socket, char* data, std::size_t size) {
         received = recv(socket, data, size, 0);
     } while (received < 0 && errno == EINTR);
     return received;
+}
+
+/** What clients need that take any certificate. */
+gnutls_certificate_credentials_t anyCertificate() {
+    static const gnutls_certificate_credentials_t credentials = [] {
+        gnutls_certificate_credentials_t made = nullptr;
+        gnutls_certificate_allocate_credentials(&made);
+        return made;
+    }();
+    return credentials;
+}
+
+/** Whether a call of the TLS library has to be made again, since it was interrupted or was busy with keys. */
+bool isToBeRepeated(ssize_t code) {
+    // A time that is over looks like the latter, but with an error of the system.
+    return code == GNUTLS_E_INTERRUPTED || (code == GNUTLS_E_AGAIN && errno != EAGAIN);
 }
 
 addrinfo* resolve(const std::string& address, std::uint16_t port) {
@@ -69,6 +90,8 @@ HttpClient::HttpClient(std::uint16_t port, const std::string& to, const std::str
     const timeval time{patience, 0};
     setsockopt(_socket, SOL_SOCKET, SO_RCVTIMEO, &time, sizeof time);
     setsockopt(_socket, SOL_SOCKET, SO_SNDTIMEO, &time, sizeof time);
+    constexpr int yes = 1;
+    setsockopt(_socket, IPPROTO_TCP, TCP_NODELAY, &yes, sizeof yes);
     if (!from.empty()) {
         addrinfo* const source = resolve(from, 0);
         require(bind(_socket, source->ai_addr, source->ai_addrlen) == 0, "bind");
@@ -84,7 +107,8 @@ HttpClient::HttpClient(std::uint16_t port, const std::string& to, const std::str
 }
 
 HttpClient::HttpClient(HttpClient&& other) noexcept
-    : _socket(std::exchange(other._socket, -1)), _received(std::move(other._received)), _wasReset(other._wasReset) {}
+    : _socket(std::exchange(other._socket, -1)), _session(std::move(other._session)),
+      _received(std::move(other._received)), _wasReset(other._wasReset) {}
 
 HttpClient::~HttpClient() {
     if (_socket >= 0) {
@@ -92,8 +116,45 @@ HttpClient::~HttpClient() {
     }
 }
 
+void HttpClient::EndSession::operator()(gnutls_session_int* session) const {
+    gnutls_deinit(session);
+}
+
+void HttpClient::encrypt() {
+    gnutls_session_t session = nullptr;
+    gnutls_init(&session, GNUTLS_CLIENT | GNUTLS_NO_SIGNAL);
+    _session.reset(session);
+    gnutls_set_default_priority(session);
+    gnutls_credentials_set(session, GNUTLS_CRD_CERTIFICATE, anyCertificate());
+    gnutls_transport_set_int(session, _socket);
+    int code = 0;
+    do {
+        errno = 0;
+        code = gnutls_handshake(session);
+    } while (isToBeRepeated(code));
+    if (code != GNUTLS_E_SUCCESS) {
+        throw std::runtime_error(std::string("no TLS: ") + gnutls_strerror(code));
+    }
+}
+
+std::string HttpClient::certificate() const {
+    unsigned int count = 0;
+    const gnutls_datum_t* const first = gnutls_certificate_get_peers(_session.get(), &count);
+    return {reinterpret_cast<const char*>(first->data), first->size};
+}
+
 bool HttpClient::send(std::string_view text) const {
     while (!text.empty()) {
+        if (_session) {
+            errno = 0;
+            const ssize_t sent = gnutls_record_send(_session.get(), text.data(), text.size());
+            if (sent < 0 && !isToBeRepeated(sent)) {
+                require(sent != GNUTLS_E_AGAIN, "send");
+                return false;
+            }
+            text.remove_prefix(static_cast<std::size_t>(std::max<ssize_t>(sent, 0)));
+            continue;
+        }
         const ssize_t sent = ::send(_socket, text.data(), text.size(), MSG_NOSIGNAL);
         if (sent < 0 && (errno == EPIPE || errno == ECONNRESET)) {
             return false;
@@ -104,15 +165,30 @@ bool HttpClient::send(std::string_view text) const {
     return true;
 }
 
+std::size_t HttpClient::take(char* data, std::size_t size) const {
+    if (_session) {
+        ssize_t received = 0;
+        do {
+            errno = 0;
+            received = gnutls_record_recv(_session.get(), data, size);
+        } while (isToBeRepeated(received));
+        require(received != GNUTLS_E_AGAIN, "recv");
+        // Without the end that TLS has, the connection ends as well.
+        return static_cast<std::size_t>(std::max<ssize_t>(received, 0));
+    }
+    const ssize_t received = receiveFrom(_socket, data, size);
+    if (received < 0 && errno == ECONNRESET) {
+        _wasReset = true;
+        return 0;
+    }
+    require(received >= 0, "recv");
+    return static_cast<std::size_t>(received);
+}
+
 bool HttpClient::fill() {
     std::array<char, 65536> buffer{};
-    const ssize_t size = receiveFrom(_socket, buffer.data(), buffer.size());
-    if (size < 0 && errno == ECONNRESET) {
-        _wasReset = true;
-        return false;
-    }
-    require(size >= 0, "recv");
-    _received.append(buffer.data(), static_cast<std::size_t>(size));
+    const std::size_t size = take(buffer.data(), buffer.size());
+    _received.append(buffer.data(), size);
     return size > 0;
 }
 
@@ -178,16 +254,26 @@ Reply HttpClient::receive() {
 
 std::string HttpClient::receiveSome(std::size_t most) const {
     std::string text(most, '\0');
-    const ssize_t size = receiveFrom(_socket, text.data(), text.size());
-    require(size >= 0, "recv");
-    text.resize(static_cast<std::size_t>(size));
+    text.resize(take(text.data(), text.size()));
     return text;
+}
+
+bool HttpClient::isReadable() const {
+    pollfd source{_socket, POLLIN, 0};
+    return poll(&source, 1, 0) > 0;
 }
 
 std::string HttpClient::receiveAll() {
     while (fill()) {
     }
     return std::exchange(_received, "");
+}
+
+void HttpClient::endSending() const {
+    if (_session) {
+        gnutls_bye(_session.get(), GNUTLS_SHUT_WR);
+    }
+    shutdown(_socket, SHUT_WR);
 }
 
 void HttpClient::reset() {

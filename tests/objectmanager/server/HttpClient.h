@@ -5,9 +5,12 @@
 #include <chrono>
 #include <cstdint>
 #include <map>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
+
+struct gnutls_session_int;
 
 namespace ServerTest {
 
@@ -36,6 +39,14 @@ public:
     HttpClient(HttpClient&& other) noexcept;
     ~HttpClient();
 
+    /**
+     * Agrees with the server on keys, whatever its certificate is. What is sent and received from now on is encrypted.
+     * @throws std::runtime_error where the server does not agree.
+     */
+    void encrypt();
+    /** The certificate that the server has shown, in DER. */
+    std::string certificate() const;
+
     /** @return false where the server has closed the connection. */
     bool send(std::string_view text) const;
     /**
@@ -45,14 +56,24 @@ public:
     Reply receive();
     /** Waits until something has come, and takes as much of it as there is room for. */
     std::string receiveSome(std::size_t most) const;
+    /** Whether something has come that was not received yet, or the end. */
+    bool isReadable() const;
     /** Waits for the end of the connection. @return what came before. */
     std::string receiveAll();
     /** Whether the connection has ended with a reset. */
     bool wasReset() const { return _wasReset; }
+    /** Says that nothing more comes, and stays to read. */
+    void endSending() const;
     /** Goes away without a word. */
     void reset();
 
 private:
+    struct EndSession {
+        void operator()(gnutls_session_int* session) const;
+    };
+
+    /** Takes what has come; waits for that. @return how much it is, 0 at the end of the connection. */
+    std::size_t take(char* data, std::size_t size) const;
     bool fill();
     void requireMore();
     /** What has come up to the end of the line, without it. Waits for that. */
@@ -61,9 +82,11 @@ private:
     std::map<std::string, std::string> takeHeaders();
 
     int _socket;
+    /** Null in the clear. */
+    std::unique_ptr<gnutls_session_int, EndSession> _session;
     /** What was received and is not part of a reply yet. */
     std::string _received;
-    bool _wasReset = false;
+    mutable bool _wasReset = false;
 };
 
 /** The text of a request. @param headers each with its line end. */

@@ -81,9 +81,10 @@ void ServeLog::Queue::run() {
         lines.pop_front();
         aboutSwitch -= line.isAboutSwitch ? 1 : 0;
         if (lines.empty() && leftOut > 0) {
-            lines.push_back({fmt::format("{} more lines are left out: the reader of the log is too slow",
-                                         std::exchange(leftOut, 0)),
-                             false});
+            lines.push_back(
+                {fmt::format("{} more lines are left out: the log's reader is too slow, or its disk was full",
+                             std::exchange(leftOut, 0)),
+                 false});
         }
         writing = true;
         lock.unlock();
@@ -110,7 +111,11 @@ void ServeLog::Queue::put(const std::string& line) {
             continue;
         }
         const ssize_t written = ::write(STDERR_FILENO, rest.data(), rest.size());
-        if (written < 0 && errno != EINTR && errno != EAGAIN) {
+        if (written < 0 && (errno == ENOSPC || errno == EDQUOT)) {
+            // Standard error is a file: somebody has to make room on its disk.
+            std::unique_lock lock(mutex);
+            changed.wait_for(lock, std::chrono::milliseconds{lookInterval}, [this] { return ending; });
+        } else if (written < 0 && errno != EINTR && errno != EAGAIN) {
             return; // The reader of standard error is gone.
         }
         rest.remove_prefix(written > 0 ? static_cast<std::size_t>(written) : 0);

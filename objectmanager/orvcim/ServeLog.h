@@ -15,8 +15,9 @@ namespace ObjectManager::Orvcim {
 
 /**
  * Writes lines to standard error or to the system's log, in a thread of its own, so that callers do not wait for a slow
- * reader. Lines that the full queue has no room for are dropped and counted; the count is logged later. Lines about the
- * power switch are never dropped: their callers wait if there are too many of them. Used by several threads at once.
+ * reader or a full disk. Lines that the full queue has no room for are dropped and counted; the count is logged later.
+ * Lines about the power switch are never dropped: their callers wait if there are too many of them. Used by several
+ * threads at once.
  */
 class ServeLog {
 public:

@@ -32,22 +32,22 @@ std::string asInsider() {
 /** More than one network may have. */
 constexpr unsigned int many = 600;
 
-TEST_F(AttackTest, idleConnections) {
+TEST_F(AttackTest, IdleConnections) {
     serveWithLogIns();
     attack([this] { hold(attacker()); }, many);
 }
 
-TEST_F(AttackTest, idleConnectionsWithTls) {
+TEST_F(AttackTest, IdleConnectionsWithTls) {
     serveWithLogIns();
     attack([this] { hold(attackerWithTls()); }, many);
 }
 
-TEST_F(AttackTest, requestsThatAreNeverFinished) {
+TEST_F(AttackTest, RequestsThatAreNeverFinished) {
     serveWithLogIns();
     attack([this] { hold(begunRequest); }, many);
 }
 
-TEST_F(AttackTest, connectionsThatAreHalfClosed) {
+TEST_F(AttackTest, ConnectionsThatAreHalfClosed) {
     serveWithLogIns();
     attack(
         [this] {
@@ -59,12 +59,12 @@ TEST_F(AttackTest, connectionsThatAreHalfClosed) {
         many);
 }
 
-TEST_F(AttackTest, wrongPasswords) {
+TEST_F(AttackTest, WrongPasswords) {
     serveWithLogIns();
     attack([this] { hold(post("x", logInAs("eve" + std::to_string(_attackers), "wrong"))); }, many);
 }
 
-TEST_F(AttackTest, bodiesThatAreNeverFinished) {
+TEST_F(AttackTest, BodiesThatAreNeverFinished) {
     serveWithLogIns();
     const std::string most(900'000, 'x');
     attack([&] {
@@ -72,7 +72,7 @@ TEST_F(AttackTest, bodiesThatAreNeverFinished) {
     });
 }
 
-TEST_F(AttackTest, connectionsThatAreResetAtOnce) {
+TEST_F(AttackTest, ConnectionsThatAreResetAtOnce) {
     serveWithLogIns();
     attack([this] {
         if (auto one = attacker()) {
@@ -82,7 +82,7 @@ TEST_F(AttackTest, connectionsThatAreResetAtOnce) {
     });
 }
 
-TEST_F(AttackTest, connectionsThatAreResetAfterARequest) {
+TEST_F(AttackTest, ConnectionsThatAreResetAfterARequest) {
     serveWithLogIns();
     attack([this] {
         if (auto one = attackerWithTls()) {
@@ -93,7 +93,7 @@ TEST_F(AttackTest, connectionsThatAreResetAfterARequest) {
 }
 
 /** The user's answer needs as much memory as each of the attackers'. */
-TEST_F(AttackTest, largeAnswersThatAreNeverRead) {
+TEST_F(AttackTest, LargeAnswersThatAreNeverRead) {
     serveWithLogIns({"--max-answers=4000000"}, {{"TEST_MORE_DISKS", "1000"}});
     _ask = [this] { readMuch(); };
     // To make such an answer takes the processor's time, which a busy machine has little of.
@@ -102,13 +102,13 @@ TEST_F(AttackTest, largeAnswersThatAreNeverRead) {
     attack([this] { holdSometimes(enumerate("Test_Disk", "root/test", insider)); });
 }
 
-TEST_F(AttackTest, pipelinesWhoseAnswersAreNeverRead) {
+TEST_F(AttackTest, PipelinesWhoseAnswersAreNeverRead) {
     serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
     const std::string request = enumerate("Test_Disk", "root/test", insider);
     attack([&] { hold(request + request + request); });
 }
 
-TEST_F(AttackTest, answersThatAreDripped) {
+TEST_F(AttackTest, AnswersThatAreDripped) {
     serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
     attack([this] {
         hold(enumerate("Test_Disk", "root/test", insider));
@@ -120,24 +120,24 @@ TEST_F(AttackTest, answersThatAreDripped) {
     });
 }
 
-TEST_F(AttackTest, slowConnections) {
+TEST_F(AttackTest, SlowConnections) {
     serveWithLogIns();
     attack([this] { holdSlow(); }, many);
 }
 
-TEST_F(AttackTest, slowConnectionsByTheThousand) {
+TEST_F(AttackTest, SlowConnectionsByTheThousand) {
     constexpr unsigned int atATime = 2000;
     _mostHeld = atATime;
     serveWithLogIns();
     attack([this] { holdSlow(); }, 2 * atATime);
 }
 
-TEST_F(AttackTest, stormsOfConnects) {
+TEST_F(AttackTest, StormsOfConnects) {
     serveWithLogIns();
     attack([this] { storm(); });
 }
 
-TEST_F(AttackTest, connectsByTheThousand) {
+TEST_F(AttackTest, ConnectsByTheThousand) {
     serveWithLogIns();
     attack([this] { storm(); }, 100);
     EXPECT_GE(_attackers, 10'000U);
@@ -168,7 +168,7 @@ private:
     Seconds* _seconds;
 };
 
-TEST_F(AttackTest, clocksThatJumpByYears) {
+TEST_F(AttackTest, ClocksThatJumpByYears) {
     const std::string file = (_folder / "clock").string();
     WrongClock clock(file);
     serveWithLogIns({}, {{"LD_PRELOAD", TEST_CLOCK_LIBRARY}, {"TEST_CLOCK", file}});
@@ -179,13 +179,13 @@ TEST_F(AttackTest, clocksThatJumpByYears) {
     });
 }
 
-TEST_F(AttackTest, providersThatHang) {
+TEST_F(AttackTest, ProvidersThatHang) {
     serveWithLogIns();
     const std::string request = get("Test_Disk", "hangs", "root/test", insider);
     attack([&] { holdSometimes(request); });
 }
 
-TEST_F(AttackTest, badRequestsThatFillTheLog) {
+TEST_F(AttackTest, BadRequestsThatFillTheLog) {
     using ObjectManager::Server::EventLog;
     serveWithLogIns();
     attack([this] {
@@ -231,25 +231,25 @@ std::string helloOf(const char* priorities) {
     return hello;
 }
 
-TEST_F(AttackTest, hellosForAGroupThatIsDear) {
+TEST_F(AttackTest, HellosForAGroupThatIsDear) {
     serveWithLogIns();
     const std::string hello = helloOf("NORMAL:-GROUP-ALL:+GROUP-FFDHE8192");
     attack([&] { holdInTheClear(hello); }, many);
 }
 
-TEST_F(AttackTest, hellosThatAreNotGoneOnWith) {
+TEST_F(AttackTest, HellosThatAreNotGoneOnWith) {
     serveWithLogIns();
     const std::string hello = helloOf("NORMAL");
     attack([&] { holdInTheClear(hello); }, many);
 }
 
-TEST_F(AttackTest, halvesOfHellos) {
+TEST_F(AttackTest, HalvesOfHellos) {
     serveWithLogIns();
     const std::string hello = helloOf("NORMAL");
     attack([&] { holdInTheClear(hello.substr(0, _attackers % hello.size())); }, many);
 }
 
-TEST_F(AttackTest, junkInsteadOfAHello) {
+TEST_F(AttackTest, JunkInsteadOfAHello) {
     serveWithLogIns();
     std::minstd_rand random; // NOLINT(cert-msc32-c,cert-msc51-cpp): the same in each run
     attack(

@@ -1,6 +1,6 @@
 /*
  * For LD_PRELOAD: writes to files in the folder that the environment variable TEST_FULL_FOLDER names fail as on a full
- * disk.
+ * disk, until there is a file named "room" in it.
  */
 #include <dlfcn.h>
 #include <unistd.h>
@@ -18,7 +18,8 @@ bool isOnFullDisk(int file) {
     std::array<char, 4096> path{};
     const ssize_t size = readlink(("/proc/self/fd/" + std::to_string(file)).c_str(), path.data(), path.size());
     return folder != nullptr && size > 0 &&
-           std::string_view(path.data(), static_cast<std::size_t>(size)).starts_with(folder);
+           std::string_view(path.data(), static_cast<std::size_t>(size)).starts_with(folder) &&
+           access((std::string(folder) + "/room").c_str(), F_OK) != 0;
 }
 
 } // namespace

@@ -1,6 +1,7 @@
 /* The server as a program: addresses, clients and rights, its start and its end. */
 #include "Orvcim.h"
 #include "Serving.h"
+#include "objectmanager/server/HttpClient.h"
 
 #include <gmock/gmock.h>
 
@@ -13,10 +14,14 @@
 #include <unistd.h>
 
 #include <array>
+#include <chrono>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <ostream>
+#include <sstream>
 #include <system_error>
+#include <thread>
 
 namespace OrvcimTest {
 namespace {
@@ -40,6 +45,10 @@ protected:
                                " </dev/null 2>/dev/null | openssl x509 -noout -fingerprint -sha256"},
                           {})
             .out;
+    }
+
+    ServerTest::HttpClient client() const {
+        return ServerTest::HttpClient(static_cast<std::uint16_t>(std::stoi(_port)));
     }
 
     std::string ask(const std::string& options) const {
@@ -240,7 +249,7 @@ TEST_F(ServeTest, LogsABadRequestInOneLine) {
 }
 
 TEST_F(ServeTest, TakesLimitsFromTheCommandLine) {
-    serve({"--max-body=100", "--max-headers=1000", "--request-time=0.3", "--idle-time=0.3"});
+    serve({"--max-body=100", "--max-headers=1000", "--request-time=2"});
     const auto statusOf = [this](const std::string& options) {
         return ask(options + " --output /dev/null --write-out '%{http_code}' " + url(""));
     };
@@ -248,6 +257,8 @@ TEST_F(ServeTest, TakesLimitsFromTheCommandLine) {
     EXPECT_EQ(statusOf("--data x --header 'X: " + std::string(1000, 'x') + "'"), "431");
     // The request announces a body and does not send it.
     EXPECT_EQ(statusOf("--data x --header 'Content-Length: 50'"), "408");
+    serve({"--idle-time=0.3"});
+    EXPECT_EQ(client().receiveAll(), "") << "nothing but the end, since nothing was asked";
 }
 
 /* Who may do what. */
@@ -312,6 +323,37 @@ TEST_F(ServeTest, TakesANewCertificateOnASignalAndKeepsTheOldOneIfTheNewOneIsWro
     EXPECT_EQ(fingerprint(), second);
 }
 
+TEST_F(ServeTest, DropsNobodyForANewCertificate) {
+    const std::string file = makeCertificate();
+    serve({"--tls-cert", file, "--tls-key", file});
+    const auto connect = [this] {
+        ServerTest::HttpClient connected = client();
+        connected.encrypt();
+        return connected;
+    };
+    // One that was answered, one that has sent half of its request, and one that has only connected.
+    ServerTest::HttpClient answered = connect();
+    ServerTest::HttpClient asking = connect();
+    ServerTest::HttpClient silent = connect();
+    constexpr int unsupported = 415;
+    const std::string request = ServerTest::post("no CIM");
+    answered.send(request);
+    EXPECT_EQ(answered.receive().status, unsupported);
+    asking.send(request.substr(0, request.size() / 2));
+
+    makeCertificate();
+    _server->send(SIGHUP);
+    _server->errWith("read the certificate and its key again\n");
+    asking.send(request.substr(request.size() / 2));
+    answered.send(request);
+    silent.send(request);
+    for (ServerTest::HttpClient* each : {&answered, &asking, &silent}) {
+        EXPECT_EQ(each->receive().status, unsupported);
+        EXPECT_NE(each->certificate(), connect().certificate());
+    }
+    EXPECT_EQ(connect().certificate(), connect().certificate());
+}
+
 TEST_F(ServeTest, RefusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCanRead) {
     const std::string file = makeCertificate();
     std::filesystem::permissions(file, std::filesystem::perms::others_read, std::filesystem::perm_options::add);
@@ -341,6 +383,110 @@ TEST_F(ServeTest, RefusesCertificatesThatAreOverOrWeakAndWarnsOfAKeyThatOthersCa
                   "key -out request; openssl ca -batch -notext -config configuration -selfsign -keyfile key -in "
                   "request -startdate 20200101000000Z -enddate 20210101000000Z -out certificate"),
         "orvcim: " + made + "/certificate: the certificate was valid until 2021-01-01, expected one that still is\n");
+}
+
+/* What hangs. */
+
+class HangingTest : public ServeTest {
+protected:
+    /** A client that gets no answer. @param operation and the path, as the stock client takes them. */
+    void ask(const std::string& operation, const std::string& path, const std::string& user = "") {
+        _waiting.push_back(
+            std::make_unique<RunningProcess>(std::vector<std::string>{"wbemcli", operation, url(path, user)},
+                                             std::map<std::string, std::string>{{"LC_ALL", "C"}}));
+    }
+
+    /** Waits until so many things hang. */
+    void waitForHanging(std::uintmax_t count) const {
+        std::error_code isMissing;
+        const auto end = std::chrono::steady_clock::now() + std::chrono::minutes{1};
+        while (std::filesystem::file_size(_hanging, isMissing) != count || isMissing) {
+            ASSERT_LT(std::chrono::steady_clock::now(), end) << _server->err();
+            std::this_thread::sleep_for(std::chrono::milliseconds{2});
+        }
+    }
+
+    /** Asks the server to end: it takes less than ten seconds, and no more than the answers under way may have. */
+    void expectToEnd() const {
+        const auto begin = std::chrono::steady_clock::now();
+        _server->send(SIGTERM);
+        const Outcome outcome = _server->wait();
+        // What a busy machine adds is less than what waits here.
+        EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds{20});
+        EXPECT_EQ(outcome.status, 0);
+        EXPECT_THAT(outcome.err, EndsWith("orvcim: stopped before all answers were sent\n"
+                                          "orvcim: ended although a provider or PAM did not return\n"));
+    }
+
+    const std::string _system = "root/cimv2:TALVO_ComputerSystem";
+    const std::string _disk = "root/test:Test_Disk.Name=\"hangs\"";
+    const std::string _hanging = (_folder / "hanging").string();
+    std::vector<std::unique_ptr<RunningProcess>> _waiting;
+};
+
+TEST_F(HangingTest, PamHoldsUpNeitherUsersWhoWereLetInNorTheEnd) {
+    serve({"--authenticate", "--pam-folder", makeUsers("auth optional " TEST_PAM " hangs=" + _hanging + "\n"),
+           "--power-group=daemon", "--allow-root", "--allow-without-shell"});
+    EXPECT_EQ(wbemcli({"ein", url(_system, "root:top")}).status, 0);
+    constexpr int atATime = 2;
+    constexpr int queued = 8;
+    for (int i = 0; i < atATime + queued; ++i) {
+        ask("ein", _system, "nobody:small");
+    }
+    waitForHanging(atATime);
+    EXPECT_EQ(wbemcli({"ein", url(_system, "root:top")}).status, 0);
+    expectToEnd();
+}
+
+TEST_F(HangingTest, AProviderHoldsUpNeitherOthersNorTheEnd) {
+    serve({"--schema", TEST_DISKS_SCHEMA, "--provider-path", TEST_PROVIDERS}, {{"TEST_HANGS", _hanging}});
+    // As many as are answered at a time, of one network and of all.
+    constexpr int atATime = 6;
+    for (int i = 1; i < atATime; ++i) {
+        ask("gi", _disk);
+    }
+    waitForHanging(atATime - 1);
+    EXPECT_EQ(wbemcli({"ein", url(_system)}).status, 0);
+    constexpr int queued = 10;
+    for (int i = 0; i < queued; ++i) {
+        ask("gi", _disk);
+    }
+    waitForHanging(atATime);
+    expectToEnd();
+}
+
+TEST_F(ServeTest, GoesOnIfTheDiskOfItsLogIsFullAndWritesItsLinesOnceThereIsRoom) {
+    const std::filesystem::path full = _folder / "full";
+    std::filesystem::create_directory(full);
+    const std::string log = (full / "log").string();
+    Environment variables = environment();
+    variables.insert({{"LD_PRELOAD", TEST_FULL_DISK}, {"TEST_FULL_FOLDER", full.string()}});
+    serveAs(std::make_unique<RunningProcess>(
+        std::vector<std::string>{"sh", "-c", "exec \"$0\" serve --port=0 2>" + log, ORVCIM_PROGRAM}, variables));
+    EXPECT_EQ(ask("--output /dev/null --write-out '%{http_code}' " + url("")), "405");
+    EXPECT_EQ(wbemcli({"cm", url(_service), "RequestPowerStateChange.PowerState=5,ManagedElement=" + _system}).status,
+              0);
+    EXPECT_EQ(std::filesystem::file_size(log), 0U);
+
+    std::ofstream(full / "room");
+    std::string text;
+    const auto end = std::chrono::steady_clock::now() + std::chrono::minutes{1};
+    while (text.find(": accepted: ") == std::string::npos && std::chrono::steady_clock::now() < end) {
+        std::this_thread::sleep_for(std::chrono::milliseconds{2});
+        text = (std::ostringstream() << std::ifstream(log).rdbuf()).str();
+    }
+    EXPECT_THAT(text,
+                MatchesRegex("orvcim: 127.0.0.1: answered 405: .*\norvcim: .* 127.0.0.1 somebody without a log-in: "
+                             "TALVO_PowerManagementService.RequestPowerStateChange.*: accepted: .*\n"));
+    EXPECT_EQ(ask("--output /dev/null --write-out '%{http_code}' " + url("")), "405");
+}
+
+TEST_F(ServeTest, EndsThoughTheDiskOfItsLogIsFull) {
+    serveAs(std::make_unique<RunningProcess>(
+        std::vector<std::string>{"sh", "-c", "exec \"$0\" serve --port=0 2>/dev/full", ORVCIM_PROGRAM}, environment()));
+    EXPECT_EQ(ask("--output /dev/null --write-out '%{http_code}' " + url("")), "405");
+    _server->send(SIGTERM);
+    EXPECT_EQ(_server->wait().status, 0);
 }
 
 TEST_F(ServeTest, TellsOnASignalHowItIs) {
@@ -388,7 +534,8 @@ TEST_F(ServeTest, LosesNoLineAboutTheSwitchIfNobodyReadsTheLog) {
               0);
     std::string log;
     pollfd waiting{reader, POLLIN, 0};
-    while (log.find("the reader of the log is too slow") == std::string::npos && poll(&waiting, 1, 60'000) > 0) {
+    while (log.find("more lines are left out: the log's reader is too slow") == std::string::npos &&
+           poll(&waiting, 1, 60'000) > 0) {
         std::array<char, 65536> part{};
         const ssize_t size = read(reader, part.data(), part.size());
         log.append(part.data(), size > 0 ? static_cast<std::size_t>(size) : 0);

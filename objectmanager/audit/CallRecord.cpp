@@ -12,18 +12,6 @@ namespace ObjectManager::Audit {
 
 namespace {
 
-bool isControl(unsigned char c) {
-    constexpr unsigned char blank = 0x20;
-    constexpr unsigned char del = 0x7f;
-    return c < blank || c == del;
-}
-
-bool continuesCharacter(unsigned char c) {
-    constexpr unsigned char mask = 0xc0;
-    constexpr unsigned char continuation = 0x80;
-    return (c & mask) == continuation;
-}
-
 /** The record as fields of the journal: those of systemd.journal-fields(7), and fields of our own. */
 Journal::Fields fieldsOf(const CallRecord& record) {
     // The priorities of syslog(3): notice and warning.
@@ -48,18 +36,6 @@ std::string_view nameOf(Verdict verdict) {
         break;
     }
     return "denied";
-}
-
-std::string inOneLine(std::string_view text, std::size_t longest) {
-    std::string line;
-    for (const char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        if (line.size() >= longest && !continuesCharacter(byte)) {
-            return line + "...";
-        }
-        line += isControl(byte) ? fmt::format("\\x{:02x}", byte) : std::string(1, c);
-    }
-    return line;
 }
 
 std::string messageOf(const CallRecord& record) {

@@ -45,9 +45,6 @@ using Recorder = std::function<void(const CallRecord&)>;
 /** The verdict in a word: accepted, refused or denied. */
 std::string_view nameOf(Verdict verdict);
 
-/** The text as one line: control characters become \xNN, and bytes beyond the first `longest` become "...". */
-std::string inOneLine(std::string_view text, std::size_t longest = 2000);
-
 /** The record as one line, without its time. */
 std::string messageOf(const CallRecord& record);
 

@@ -1,5 +1,6 @@
 #include "cimxml/Recording.h"
 
+#include "basics/Printable.h"
 #include "cimxml/ValueReader.h"
 #include "text/MofText.h"
 #include "text/ObjectPathText.h"
@@ -12,11 +13,11 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-using Audit::inOneLine;
-
 /* Limits in bytes: a line of the log is cut at 1000, and the outcome of the call, at its end, must not be cut off. */
 constexpr std::size_t longestText = 300;
 constexpr std::size_t longestName = 80;
+/* The reason is the end of the line; the journal, where lines are not cut, gets more of it. */
+constexpr std::size_t longestReason = 2000;
 
 /** Puts a text in quotes, unless it is one word. */
 std::string valueText(const std::string& text) {
@@ -85,12 +86,12 @@ Audit::CallRecord recordOf(const Message& message, const Server::Caller& caller,
     return {std::chrono::system_clock::now(),
             caller.address,
             caller.user,
-            inOneLine(target, longestText),
-            inOneLine(className, longestName),
-            inOneLine(message.method(), longestName),
-            inOneLine(argumentsText(message, reader), longestText),
+            printable(target, longestText),
+            printable(className, longestName),
+            printable(message.method(), longestName),
+            printable(argumentsText(message, reader), longestText),
             verdict,
-            inOneLine(reason)};
+            printable(reason, longestReason)};
 }
 
 } // namespace ObjectManager::CimXml

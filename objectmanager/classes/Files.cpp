@@ -1,11 +1,9 @@
 #include "classes/Files.h"
 
+#include "basics/Files.h"
 #include "classes/MofLexer.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <fstream>
-#include <iterator>
 #include <system_error>
 
 namespace ObjectManager {
@@ -26,12 +24,11 @@ std::vector<std::filesystem::path> filesOf(const std::filesystem::path& folder, 
 }
 
 std::string readFile(const std::filesystem::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    std::string text{std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
-    if (!stream.is_open() || stream.bad()) {
-        throw SchemaError(file.string(), "cannot be read: " + std::generic_category().message(errno));
+    try {
+        return contentOf(file);
+    } catch (const std::system_error& error) {
+        throw SchemaError(file.string(), "cannot be read: " + error.code().message());
     }
-    return text;
 }
 
 } // namespace ObjectManager

@@ -1,5 +1,6 @@
 #include "classes/Literals.h"
 
+#include "basics/Utf8.h"
 #include "model/DateTime.h"
 
 #include <fmt/format.h>
@@ -157,18 +158,11 @@ void appendUtf8(std::string& text, char16_t character) {
  * char16.
  */
 std::optional<char16_t> singleCharacter(std::string_view text) {
-    const auto byte = [&](std::size_t index) { return static_cast<unsigned char>(text[index]); };
-    const auto continues = [&](std::size_t index) { return (byte(index) & 0xc0) == 0x80; };
-    if (text.size() == 1 && byte(0) < 0x80) {
-        return byte(0);
+    if (text.empty()) {
+        return std::nullopt;
     }
-    if (text.size() == 2 && (byte(0) & 0xe0) == 0xc0 && continues(1)) {
-        return static_cast<char16_t>(((byte(0) & 0x1f) << 6) | (byte(1) & 0x3f));
-    }
-    if (text.size() == 3 && (byte(0) & 0xf0) == 0xe0 && continues(1) && continues(2)) {
-        return static_cast<char16_t>(((byte(0) & 0x0f) << 12) | ((byte(1) & 0x3f) << 6) | (byte(2) & 0x3f));
-    }
-    return std::nullopt;
+    const auto [code, size] = firstCharacter(text);
+    return size == text.size() && code <= 0xffff ? std::optional(static_cast<char16_t>(code)) : std::nullopt;
 }
 
 struct Escape {

@@ -1,7 +1,7 @@
 #include "server/Exchange.h"
 
+#include "basics/Printable.h"
 #include "server/HttpStatus.h"
-#include "server/Printable.h"
 
 #include <fmt/chrono.h>
 #include <fmt/format.h>

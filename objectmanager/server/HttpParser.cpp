@@ -1,7 +1,7 @@
 #include "server/HttpParser.h"
 
+#include "basics/Printable.h"
 #include "server/HttpStatus.h"
-#include "server/Printable.h"
 
 #include <fmt/format.h>
 

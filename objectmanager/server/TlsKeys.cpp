@@ -1,5 +1,6 @@
 #include "server/TlsKeys.h"
 
+#include "basics/Files.h"
 #include "server/ServerError.h"
 
 #include <fmt/chrono.h>
@@ -7,10 +8,7 @@
 
 #include <sys/stat.h>
 
-#include <cerrno>
 #include <ctime>
-#include <fstream>
-#include <iterator>
 #include <system_error>
 
 namespace ObjectManager::Server {
@@ -33,11 +31,12 @@ constexpr unsigned int leastRsaBits = 2048;
 constexpr unsigned int leastCurveBits = 256;
 
 std::string readPem(const std::filesystem::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    if (!stream) {
-        throw ServerError(fmt::format("{}: {}", file.string(), std::generic_category().message(errno)));
+    std::string content;
+    try {
+        content = contentOf(file);
+    } catch (const std::system_error& error) {
+        throw ServerError(fmt::format("{}: {}", file.string(), error.code().message()));
     }
-    std::string content{std::istreambuf_iterator<char>(stream), {}};
     if (content.empty()) {
         throw ServerError(fmt::format("{}: found nothing in it, expected PEM", file.string()));
     }

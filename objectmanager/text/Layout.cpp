@@ -1,14 +1,15 @@
 #include "text/Layout.h"
 
+#include "basics/Utf8.h"
+
 #include <algorithm>
+#include <functional>
 #include <utility>
 
 namespace ObjectManager {
 
 std::size_t columnsOf(std::string_view text) {
-    // Continuation bytes of UTF-8 fill no column of their own.
-    return static_cast<std::size_t>(
-        std::count_if(text.begin(), text.end(), [](char c) { return (static_cast<unsigned char>(c) & 0xc0) != 0x80; }));
+    return static_cast<std::size_t>(std::count_if(text.begin(), text.end(), std::not_fn(continuesCharacter)));
 }
 
 std::string filled(const std::vector<std::string>& pieces, std::size_t indent) {

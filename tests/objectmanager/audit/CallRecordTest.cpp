@@ -48,15 +48,5 @@ TEST(CallRecordTest, IsALineOfTheLogWithItsTimeWhereThereIsNoJournal) {
     EXPECT_THAT(lines, ElementsAre("2001-09-09T01:46:40Z " + messageOf(reboot())));
 }
 
-TEST(InOneLineTest, WritesControlCharactersVisibly) {
-    EXPECT_EQ(inOneLine("a\nb\tc\x7f\x1b[2J d"), "a\\x0ab\\x09c\\x7f\\x1b[2J d");
-}
-
-TEST(InOneLineTest, CutsNoCharacterInTwo) {
-    EXPECT_EQ(inOneLine("abc", 3), "abc");
-    EXPECT_EQ(inOneLine("abcd", 3), "abc...");
-    EXPECT_EQ(inOneLine("ab\xc3\xa4z", 3), "ab\xc3\xa4...");
-}
-
 } // namespace
 } // namespace ObjectManager::Audit

@@ -78,6 +78,7 @@ INSTANTIATE_TEST_SUITE_P(
         NoValue{"128", CMPI_sint8, "a sint8 from -128 to 127"}, NoValue{"1e39", CMPI_real32, "a real32"},
         NoValue{"inf", CMPI_real64, "a real64"}, NoValue{"1.5x", CMPI_real64, "a real64"},
         NoValue{"1", CMPI_boolean, "TRUE or FALSE"}, NoValue{"xy", CMPI_char16, "one character"},
+        NoValue{"", CMPI_char16, "one character"}, NoValue{"\xc1\x81", CMPI_char16, "one character"},
         NoValue{"tomorrow", CMPI_dateTime, "a datetime"},
         NoValue{"20261320123107.123456+060", CMPI_dateTime, "a datetime"},
         NoValue{"20261120123107.123456+6", CMPI_dateTime, "a datetime"},

@@ -1,10 +1,12 @@
 #include "IdentifyingFacts.h"
 
+#include "base/Utf8.h"
+
 #include <algorithm>
 #include <fstream>
-#include <locale>
 #include <map>
 #include <optional>
+#include <string>
 #include <string_view>
 
 namespace Norv::ComputerSystemProvider {
@@ -51,26 +53,10 @@ std::string trimmed(const std::string& text) {
     return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of(blanks) - first + 1);
 }
 
-/** Surrogates are not characters, although the standard library decodes them. */
-bool isPrintable(char32_t character) {
-    const bool isControl = character < 0x20 || character == 0x7f;
-    const bool isSurrogate = character >= 0xd800 && character <= 0xdfff;
-    return !isControl && !isSurrogate;
-}
-
 /** Whether a text is UTF-8 without control characters. Firmware may contain any bytes, a CIM string may not. */
 bool isOneLine(const std::string& text) {
-    using Utf8 = std::codecvt<char32_t, char8_t, std::mbstate_t>;
-    const std::u8string bytes(text.begin(), text.end());
-    const char8_t* const end = bytes.data() + bytes.size();
-    const char8_t* next = nullptr;
-    std::u32string characters(bytes.size(), U'\0');
-    char32_t* last = nullptr;
-    std::mbstate_t state{};
-    const auto result =
-        std::use_facet<Utf8>(std::locale::classic())
-            .in(state, bytes.data(), end, next, characters.data(), characters.data() + characters.size(), last);
-    return result == Utf8::ok && std::all_of(characters.data(), last, isPrintable);
+    const std::optional<std::wstring> characters = Agent::wideFrom(text);
+    return characters && std::ranges::none_of(*characters, [](wchar_t c) { return c < 0x20 || c == 0x7f; });
 }
 
 void append(std::vector<IdentifyingFact>& facts, const char* description, const std::string& value) {

@@ -6,6 +6,7 @@
 #include "Wording.h"
 #include "base/Folders.h"
 #include "base/LockFile.h"
+#include "base/UtcText.h"
 
 #include <algorithm>
 #include <array>
@@ -123,9 +124,8 @@ std::optional<Pending> pendingOn(Logind& logind) {
     if (preparing) {
         return Pending{state, scheduled.type + " is under way", true, now};
     }
-    return Pending{
-        state, scheduled.type + " is scheduled for " + inUtc(std::chrono::floor<std::chrono::seconds>(scheduled.time)),
-        false, scheduled.time};
+    return Pending{state, scheduled.type + " is scheduled for " + UtcText(scheduled.time).inSeconds(), false,
+                   scheduled.time};
 }
 
 /** @throws Refusal if the machine cannot carry the request out now. */
@@ -240,9 +240,7 @@ public:
             const WallTime time =
                 std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
             std::string description = what;
-            description +=
-                atOnce ? ", at once"
-                       : ", at " + inUtc(std::chrono::floor<std::chrono::seconds>(time)) + ", in " + inSeconds(delay);
+            description += atOnce ? ", at once" : ", at " + UtcText(time).inSeconds() + ", in " + inSeconds(delay);
             EndOfTheMachine::Node ending{state, _states};
             carryOut(logind, *transition, time, atOnce);
             _state = state;

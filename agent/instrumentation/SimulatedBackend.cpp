@@ -4,6 +4,7 @@
 #include "Report.h"
 #include "Wording.h"
 #include "base/Folders.h"
+#include "base/UtcText.h"
 #include "config/PowerStates.h"
 
 #include <algorithm>
@@ -87,7 +88,7 @@ private:
 
     std::string describe(const PowerRequest& request) const {
         return std::string(request.transition->name) + " is over at " +
-               inUtc(std::chrono::ceil<std::chrono::seconds>(request.over)) + ", in " +
+               UtcText(std::chrono::ceil<std::chrono::seconds>(request.over)).inSeconds() + ", in " +
                inSeconds(request.over - _backend._clock());
     }
 

@@ -5,6 +5,7 @@
 #include "base/Folders.h"
 #include "base/LockFile.h"
 #include "base/RegularFile.h"
+#include "base/UtcText.h"
 
 #include <nlohmann/json.hpp>
 
@@ -12,7 +13,6 @@
 #include <array>
 #include <cerrno>
 #include <cstdint>
-#include <ctime>
 #include <initializer_list>
 #include <stdexcept>
 #include <string_view>
@@ -201,13 +201,11 @@ std::string format(const PowerRequests& requests) {
 
 /** The first "<file>.damaged-<UTC time>-<number>" that does not exist. */
 std::filesystem::path nameForDamaged(const std::filesystem::path& file) {
-    const std::time_t now = std::time(nullptr);
-    std::tm utc{};
-    ::gmtime_r(&now, &utc);
-    std::array<char, sizeof "20261120T123107Z"> time{};
-    std::strftime(time.data(), time.size(), "%Y%m%dT%H%M%SZ", &utc);
+    // The basic form of ISO 8601: in names of files, colons are a nuisance.
+    std::string time = UtcText(std::chrono::system_clock::now()).inSeconds();
+    std::erase_if(time, [](char c) { return c == '-' || c == ':'; });
     for (unsigned int number = 1;; ++number) {
-        auto name = withSuffix(file, std::string(".damaged-") + time.data() + '-' + std::to_string(number));
+        auto name = withSuffix(file, ".damaged-" + time + '-' + std::to_string(number));
         std::error_code ignored;
         if (!std::filesystem::exists(std::filesystem::symlink_status(name, ignored))) {
             return name;

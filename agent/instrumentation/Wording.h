@@ -12,9 +12,6 @@ namespace Norv::Agent {
 /** A duration in seconds, in the shortest exact form whatever the process's locale: "10 s", "2.5 s". */
 std::string inSeconds(std::chrono::milliseconds duration);
 
-/** A time in UTC, for example "2026-11-20T12:31:07Z". */
-std::string inUtc(std::chrono::sys_seconds time);
-
 /** The states of a table of transitions as text: "9 (reboot) or 12 (shutdown)". */
 std::string acceptedStates(const auto& transitions) {
     std::string text;

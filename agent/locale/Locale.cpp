@@ -1,6 +1,7 @@
 #include "Norv/Locale.h"
 
 #include "ResourceLibrary.h"
+#include "base/RegularFile.h"
 #include "base/Utf8.h"
 
 #include "OrvLog/OrvLogger.h"
@@ -12,8 +13,6 @@
 #include <cerrno>
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <memory>
 #include <mutex>
 #include <stdexcept>
@@ -70,10 +69,12 @@ fs::path catalogueFile(std::string_view language) {
 }
 
 ResourceLibrary readCatalogue(const fs::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    const std::string content{std::istreambuf_iterator<char>(stream), {}};
+    const auto content = Agent::readRegularFile(file);
+    if (!content) {
+        throw std::runtime_error(file.native() + ": has been removed");
+    }
     try {
-        return ResourceLibrary(content);
+        return ResourceLibrary(content->text);
     } catch (const std::runtime_error& error) {
         throw std::runtime_error(file.native() + ": " + error.what());
     }

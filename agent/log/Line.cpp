@@ -1,5 +1,7 @@
 #include "Line.h"
 
+#include "base/UtcText.h"
+
 #include <algorithm>
 #include <charconv>
 #include <chrono>
@@ -13,43 +15,12 @@ namespace {
 
 constexpr std::string_view cutOff = "...\n";
 
-struct TimeText {
-    std::array<char, sizeof "2026-11-20T12:31:07.123Z "> characters;
-    std::string_view view() const { return {characters.data(), characters.size() - 1}; }
-};
-
-// Does not call gmtime_r, which takes a lock of the C library: another thread may hold it while the host forks.
-TimeText timeText(std::chrono::system_clock::time_point time) {
-    const auto day = std::chrono::floor<std::chrono::days>(time);
-    const std::chrono::year_month_day date{day};
-    const std::chrono::hh_mm_ss clock{std::chrono::floor<std::chrono::milliseconds>(time - day)};
-
-    TimeText text{};
-    auto* at = text.characters.data();
-    const auto put = [&at](unsigned int number, int digits, char after) {
-        for (int i = digits - 1; i >= 0; --i) {
-            at[i] = static_cast<char>('0' + number % 10);
-            number /= 10;
-        }
-        at[digits] = after;
-        at += digits + 1;
-    };
-    put(static_cast<unsigned int>(static_cast<int>(date.year())), 4, '-');
-    put(static_cast<unsigned int>(date.month()), 2, '-');
-    put(static_cast<unsigned int>(date.day()), 2, 'T');
-    put(static_cast<unsigned int>(clock.hours().count()), 2, ':');
-    put(static_cast<unsigned int>(clock.minutes().count()), 2, ':');
-    put(static_cast<unsigned int>(clock.seconds().count()), 2, '.');
-    put(static_cast<unsigned int>(clock.subseconds().count()), 3, 'Z');
-    *at = ' ';
-    return text;
-}
-
 } // namespace
 
 Line::Line(const Record& record) : _level(record.level) {
     static_assert(_capacity <= PIPE_BUF, "a line is written to a pipe in one piece");
-    append(timeText(std::chrono::system_clock::now()).view());
+    append(Norv::Agent::UtcText(std::chrono::system_clock::now()).view());
+    append(" ");
     _timeSize = _size;
     append(record.kind == Kind::log ? "log " : "trace ");
     appendNumber(record.level);

@@ -85,6 +85,14 @@ TEST(CatalogueSearchTest, AMissingCatalogueGivesIdsAndIsLogged) {
                             id));
 }
 
+TEST(CatalogueSearchTest, ACatalogueThatCannotBeReadGivesIdsAndIsLogged) {
+    const Installation installation("lib");
+    std::filesystem::create_directories(installation.catalogue());
+    EXPECT_THAT(
+        installation.output(),
+        ElementsAre(EndsWith(installation.catalogue().string() + ": is not a regular file: Invalid argument"), id));
+}
+
 TEST(CatalogueSearchTest, ADamagedCatalogueGivesIdsAndIsLogged) {
     const Installation installation("lib");
     installation.addCatalogue("damaged");

@@ -23,6 +23,13 @@ using ServerTest::HttpClient;
 using ServerTest::logInAs;
 using ServerTest::post;
 
+/** Sanitizers make everything slow, and large. */
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr bool isSanitized = true;
+#else
+constexpr bool isSanitized = false;
+#endif
+
 class AttackTest : public OrvcimTest::ServingTest {
 protected:
     AttackTest();
@@ -67,9 +74,9 @@ protected:
     std::function<void()> _ask = [this] { readPowerState(); };
 
     /** Half of the user's waits must be shorter: what is promised, and what a busy machine does not easily exceed. */
-    std::chrono::milliseconds _usualPatience = 1s;
+    std::chrono::milliseconds _usualPatience = isSanitized ? 10s : 1s;
     /** The longest wait that a test lets pass, on a machine that has much else to do. */
-    std::chrono::milliseconds _patience = 10s;
+    std::chrono::milliseconds _patience = isSanitized ? 30s : 10s;
 
     std::deque<HttpClient> _held;
     std::size_t _mostHeld = 600;

@@ -86,7 +86,9 @@ TEST_F(HttpServerTest, ServesOthersWhileAHandlerTakesItsTime) {
 }
 
 TEST_F(HttpServerTest, RunsNoMoreHandlersAtATimeThanItHasThreads) {
+    constexpr int clientsAtOnce = 30;
     _settings.threads = 3;
+    Gate gate;
     std::atomic<int> running = 0;
     std::atomic<int> most = 0;
     serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
@@ -94,15 +96,19 @@ TEST_F(HttpServerTest, RunsNoMoreHandlersAtATimeThanItHasThreads) {
         int before = most;
         while (before < now && !most.compare_exchange_weak(before, now)) {
         }
-        std::this_thread::sleep_for(2ms);
+        gate.wait();
         --running;
         return echo(request, caller);
     });
     std::vector<HttpClient> clients;
-    for (int i = 0; i < 30; ++i) {
+    for (int i = 0; i < clientsAtOnce; ++i) {
         clients.push_back(client());
         clients.back().send(post("x"));
     }
+    waitUntil([&] {
+        return running == 3 && _server->health().find(std::to_string(clientsAtOnce) + " answered") != std::string::npos;
+    });
+    gate.open();
     for (HttpClient& each : clients) {
         EXPECT_EQ(each.receive().status, 200);
     }
@@ -188,17 +194,30 @@ TEST_F(HttpServerTest, RefusesARequestThatDoesNotArriveInTime) {
 }
 
 TEST_F(HttpServerTest, DoesNotCountTheTimeOfTheAnswerAsTheRequests) {
-    _settings.limits.requestTime = 100ms;
-    _settings.limits.idleTime = 100ms;
-    serve([](const Server::HttpRequest& request, const Server::Caller& caller) {
-        std::this_thread::sleep_for(1s);
+    _settings.limits.requestTime = 2s;
+    _settings.limits.idleTime = 2s;
+    Gate entered;
+    Gate gate;
+    serve([&](const Server::HttpRequest& request, const Server::Caller& caller) {
+        entered.open();
+        gate.wait();
         return echo(request, caller);
     });
-    EXPECT_EQ(ask(post("patience")).body, "patience");
+    HttpClient asking = client();
+    asking.send(post("patience"));
+    entered.wait();
+    // Both times are over for clients that come later.
+    HttpClient slow = client();
+    HttpClient idle = client();
+    slow.send("POST / HTTP/1.1\r\nHost:");
+    EXPECT_EQ(slow.receive().status, 408);
+    EXPECT_EQ(idle.receiveAll(), "");
+    gate.open();
+    EXPECT_EQ(asking.receive().body, "patience");
 }
 
 TEST_F(HttpServerTest, ClosesAnIdleConnection) {
-    _settings.limits.idleTime = 500ms;
+    _settings.limits.idleTime = 2s;
     serve();
     HttpClient idle = client();
     HttpClient served = client();
@@ -213,11 +232,7 @@ TEST_F(HttpServerTest, IsNotKeptWaitingByARequestLineThatComesInDrops) {
     _settings.limits.idleTime = 500ms;
     serve();
     const HttpClient slow = client();
-    const auto end = std::chrono::steady_clock::now() + 20s;
-    while (slow.send("P")) {
-        std::this_thread::sleep_for(50ms);
-        ASSERT_LT(std::chrono::steady_clock::now(), end);
-    }
+    waitUntil([&] { return !slow.send("P"); });
 }
 
 TEST_F(HttpServerTest, SurvivesAClientThatGoesAwayMidAnswer) {
@@ -362,10 +377,7 @@ TEST_F(HttpServerTest, RefusesANewConnectionWhereNoneIsIdle) {
         EXPECT_EQ(each.receive().status, 200);
     }
     // An answer can be here before the server has noted that it is sent.
-    const auto end = std::chrono::steady_clock::now() + 30s;
-    while (ask(post("later")).status == 503) {
-        ASSERT_LT(std::chrono::steady_clock::now(), end);
-    }
+    waitUntil([this] { return ask(post("later")).status == 200; });
 }
 
 TEST_F(HttpServerTest, BoundsTheConnectionsOfOneClient) {

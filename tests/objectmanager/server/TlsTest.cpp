@@ -3,6 +3,12 @@
 
 #include "agent/TestSupport.h"
 
+#include <algorithm>
+#include <atomic>
+#include <iterator>
+#include <random>
+#include <system_error>
+
 namespace ServerTest {
 namespace {
 
@@ -67,6 +73,76 @@ TEST_F(TlsTest, SurvivesClientsThatSpeakNoTls) {
     EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: closed: the TLS handshake failed: An unexpected TLS packet was "
                                        "received."));
     EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
+}
+
+TEST_F(TlsTest, TakesABodyInChunksWhereverTheyAreCut) {
+    serve();
+    HttpClient asking = client();
+    asking.encrypt();
+    const std::string large(50'000, 'x');
+    // Each piece is a record of its own, and the large one is several.
+    for (const std::string& piece :
+         {std::string("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Enc"), std::string("oding: chunked\r\n\r\n3"),
+          std::string("\r\nfir\r"), std::string("\n4\r\nst, \r\nc3"), "50\r\n" + large + "\r\n", std::string("0\r\n"),
+          std::string("\r\n")}) {
+        asking.send(piece);
+    }
+    EXPECT_EQ(asking.receive().body, "first, " + large);
+    asking.send("POST / HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n\r\nno size\r\n");
+    EXPECT_EQ(asking.receive().status, 400);
+    EXPECT_EQ(asking.receiveAll(), "");
+}
+
+/** What clients send who never agree on keys. @param number of the client, on which it depends */
+std::string junk(unsigned int number) {
+    // A record of a handshake with the beginning of a hello, and of an alert.
+    const std::string beginnings[] = {
+        {"\x16\x03\x01\x02\x00\x01\x00\x01\xfc\x03\x03", 11}, {"\x15\x03\x03\x00\x02\x02", 6}, ""};
+    std::minstd_rand random(number);
+    std::string bytes(random() % 700, '\0');
+    std::generate(bytes.begin(), bytes.end(), [&] { return static_cast<char>(random()); });
+    return beginnings[number % std::size(beginnings)] + bytes;
+}
+
+TEST_F(TlsTest, ServesWhileOthersSendJunkFromItsStartOn) {
+    // Nobody else has this address, so that the port stays free.
+    _settings.address = "127.0.0.77";
+    serve();
+    _settings.port = _server->port();
+    _server.reset();
+    std::atomic<bool> isDone = false;
+    std::atomic<unsigned int> sent = 0;
+    std::vector<std::thread> attackers;
+    for (unsigned int i = 0; i < 3; ++i) {
+        attackers.emplace_back([&, i] {
+            for (unsigned int number = i; !isDone; number += 3) {
+                try {
+                    HttpClient attacker(_settings.port, _settings.address, "127.0.0.78");
+                    attacker.send(junk(number));
+                    ++sent;
+                    if (number % 2 == 0) {
+                        attacker.endSending();
+                        attacker.receiveAll();
+                    }
+                } catch (const std::system_error&) {
+                    // The server is not there yet.
+                    std::this_thread::yield();
+                }
+            }
+        });
+    }
+    serve();
+    for (int i = 0; i < 20 || sent < 100; ++i) {
+        _server->renewKeys();
+        HttpClient asking(_settings.port, _settings.address);
+        asking.encrypt();
+        asking.send(post("hello"));
+        EXPECT_EQ(asking.receive().body, "hello");
+    }
+    isDone = true;
+    for (std::thread& attacker : attackers) {
+        attacker.join();
+    }
 }
 
 TEST_F(TlsTest, ClosesAConnectionOnWhichNothingComes) {

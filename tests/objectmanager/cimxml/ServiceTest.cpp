@@ -1,13 +1,12 @@
 #include "ServiceFixture.h"
 #include "WireCase.h"
+#include "basics/Files.h"
 #include "cimxml/ValueReader.h"
 
 #include <gmock/gmock.h>
 
 #include <atomic>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <thread>
 
 namespace ObjectManager::CimXml {
@@ -77,8 +76,7 @@ TEST_F(ServiceTest, NamesTheHostItselfWhereTheClientDoesNot) {
 
 /** The provider returns 0 whether or not the machine accepted the request. */
 TEST_F(ServiceTest, TellsThatTheMachineRefused) {
-    std::ifstream file(std::filesystem::path(TEST_CASES) / "invoke.wire", std::ios::binary);
-    const WireCase reboot = readWireCase({std::istreambuf_iterator<char>(file), {}});
+    const WireCase reboot = readWireCase(contentOf(std::filesystem::path(TEST_CASES) / "invoke.wire"));
     const auto status = [&] {
         const std::string body = service().answer(reboot.request(), reboot.caller).body;
         return body.substr(0, body.find('\n', body.find("<ERROR")));

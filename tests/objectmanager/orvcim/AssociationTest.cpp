@@ -1,5 +1,6 @@
 /* The associations of the shipped classes, from every end and as a drawing. */
 #include "Provided.h"
+#include "basics/Files.h"
 
 #include <gmock/gmock.h>
 
@@ -10,14 +11,9 @@
 namespace OrvcimTest {
 namespace {
 
+using ObjectManager::contentOf;
 using testing::HasSubstr;
 using testing::StartsWith;
-
-std::string contentOf(const std::filesystem::path& file) {
-    std::ifstream stream(file);
-    EXPECT_TRUE(stream.is_open()) << file;
-    return {std::istreambuf_iterator<char>(stream), {}};
-}
 
 /** The name of the file in data that has the expected answer. */
 struct Query {

@@ -3,6 +3,7 @@
 #include "cimxml/ServiceFixture.h"
 #include "cimxml/WireCase.h"
 
+#include "basics/Files.h"
 #include "broker/Arena.h"
 #include "server/HttpServer.h"
 
@@ -11,8 +12,6 @@
 #include <chrono>
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <optional>
 #include <random>
 #include <thread>
@@ -53,8 +52,7 @@ std::string requestOf(const WireCase& given) {
 std::vector<Exchange> exchanges() {
     std::vector<Exchange> all;
     for (const auto& file : std::filesystem::directory_iterator(TEST_CASES)) {
-        std::ifstream stream(file.path(), std::ios::binary);
-        const std::vector<WireCase> given = CimXml::readWireCases({std::istreambuf_iterator<char>(stream), {}});
+        const std::vector<WireCase> given = CimXml::readWireCases(contentOf(file.path()));
         // Several requests of one file are for a server of their own.
         if (given.size() == 1) {
             all.push_back({file.path().stem(), requestOf(given.front()), given.front()});

@@ -1,12 +1,11 @@
 #include "text/Writer.h"
+#include "basics/Files.h"
 #include "classes/MofReader.h"
 #include "text/MofText.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <fstream>
-#include <iterator>
 #include <sstream>
 #include <string>
 
@@ -61,9 +60,7 @@ Instance thing() {
 }
 
 std::string dataFile(const std::string& name) {
-    std::ifstream stream(std::string(ORV_TEST_DATA) + "/" + name);
-    EXPECT_TRUE(stream.is_open()) << name;
-    return {std::istreambuf_iterator<char>(stream), {}};
+    return contentOf(std::string(ORV_TEST_DATA) + "/" + name);
 }
 
 struct FormatName {

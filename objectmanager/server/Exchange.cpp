@@ -162,20 +162,19 @@ void Exchange::shakeHands() {
 bool Exchange::serve() {
     _head = {};
     _user.clear();
-    _body.clear();
     _bodyIsMissing = false;
     _begun = false;
     _sent = 0;
     bool keepAlive = false;
     HttpReply reply{};
     try {
-        Budget::Share share(_shared.bodies, _connection.network);
+        Body body{{_shared.bodies, _connection.network}, {}};
         readHead();
         check();
         Caller caller = logIn();
         caller.address = _connection.address;
-        readBody(&share);
-        reply = answer(caller);
+        readBody(&body);
+        reply = answer(caller, body.text);
         keepAlive = _head.keepAlive;
         _connection.served = true;
     } catch (const HttpError& error) {
@@ -297,7 +296,7 @@ Caller Exchange::logIn() {
     return *std::move(decision.caller);
 }
 
-void Exchange::readBody(Budget::Share* share) {
+void Exchange::readBody(Body* to) {
     if (_head.expectsContinue && _received.empty() && (_head.framing.chunked || _head.framing.length > 0)) {
         _stream->send("HTTP/1.1 100 Continue\r\n\r\n", _limits.idleTime);
     }
@@ -309,14 +308,14 @@ void Exchange::readBody(Budget::Share* share) {
             report(fmt::format("cut off: the body has more than {} bytes", readBeyondLimit * limit));
             throw Ended{};
         }
-        if (size > limit || share == nullptr) {
+        if (size > limit || to == nullptr) {
             return;
         }
-        if (size > freeBody && !share->grow(size)) {
+        if (size > freeBody && !to->share.grow(size)) {
             throw HttpError(Status::serviceUnavailable,
                             fmt::format("the bodies of all requests have more than {} bytes", _shared.bodies.bytes()));
         }
-        _body.append(data);
+        to->text.append(data);
     };
     if (_head.framing.chunked) {
         ChunkedBody chunks(_limits.headerBytes);
@@ -372,7 +371,7 @@ void Exchange::skipBody() {
     }
 }
 
-HttpReply Exchange::answer(const Caller& caller) {
+HttpReply Exchange::answer(const Caller& caller, std::string_view body) {
     enter(State::answering);
     Turns::Turn turn = _shared.answers.take(_connection.network, true, Clock::now() + _limits.requestTime,
                                             [this] { return _stream->isBroken(); });
@@ -380,7 +379,7 @@ HttpReply Exchange::answer(const Caller& caller) {
         throw HttpError(Status::serviceUnavailable, _shared.stopping ? "the server is stopping" : "too much to do");
     }
     _turn.emplace(std::move(turn));
-    HttpReply reply = _shared.handler({_head.method, std::move(_head.headers), _body, this}, caller);
+    HttpReply reply = _shared.handler({_head.method, std::move(_head.headers), body, this}, caller);
     _turn.reset();
     _memory.reset();
     return reply;

@@ -19,6 +19,7 @@
 #include <mutex>
 #include <optional>
 #include <string>
+#include <string_view>
 
 namespace ObjectManager::Server {
 
@@ -71,6 +72,12 @@ private:
     /** Thrown when the connection has to be closed without another answer. */
     struct Ended {};
 
+    /** A request's body with its share of the memory for all of them. Connections that wait for a request have none. */
+    struct Body {
+        Budget::Share share;
+        std::string text;
+    };
+
     void shakeHands();
     /** Serves one request. @return false if the connection has to be closed. */
     bool serve();
@@ -78,12 +85,12 @@ private:
     void readHead();
     void check() const;
     Caller logIn();
-    /** @param share the request's share of the memory for bodies; if it is null, the body is read and dropped. */
-    void readBody(Budget::Share* share);
+    /** @param to where the body is kept; if it is null, the body is read and dropped. */
+    void readBody(Body* to);
     void readMore(std::string& to);
     /** Reads and drops the body of a request that was answered before its body was read. */
     void skipBody();
-    HttpReply answer(const Caller& caller);
+    HttpReply answer(const Caller& caller, std::string_view body);
     /** Sends an answer as a whole. */
     void sendWhole(HttpReply reply, bool keepAlive);
 
@@ -120,7 +127,6 @@ private:
     Clock::time_point _until;
     Clock::time_point _begin;
     std::string _user;
-    std::string _body;
     /** Whether the body, or a part of it, has still to be read. */
     bool _bodyIsMissing = false;
 

@@ -15,9 +15,12 @@
 #include <atomic>
 #include <cerrno>
 #include <cstdint>
+#include <optional>
 #include <random>
 #include <sstream>
+#include <stdexcept>
 #include <system_error>
+#include <utility>
 
 namespace AttackTest {
 namespace {
@@ -65,11 +68,32 @@ TEST_F(AttackTest, WrongPasswords) {
 }
 
 TEST_F(AttackTest, BodiesThatAreNeverFinished) {
-    serveWithLogIns();
+    // As much as two networks could have.
+    serveWithLogIns({"--max-bodies=134217728"});
     const std::string most(900'000, 'x');
     attack([&] {
         hold("POST / HTTP/1.1\r\nHost: localhost\r\n" + asInsider() + "Content-Length: 1000000\r\n\r\n" + most);
     });
+}
+
+/** The body of a request that was answered takes no more memory, however long its connection stays. */
+TEST_F(AttackTest, LargeRequestsOnConnectionsThatStay) {
+    serveWithLogIns();
+    const std::string request = post(std::string(900'000, 'x'), asInsider());
+    attack(
+        [&] {
+            std::optional<HttpClient> connection = attackerWithTls();
+            try {
+                if (connection) {
+                    connection->send(request);
+                    connection->receive();
+                }
+            } catch (const std::runtime_error&) {
+                // The connection was closed for another one.
+            }
+            hold(std::move(connection));
+        },
+        many);
 }
 
 TEST_F(AttackTest, ConnectionsThatAreResetAtOnce) {

@@ -25,7 +25,7 @@ void requireTls(int status) {
 
 constexpr std::string_view lineEnd = "\r\n";
 
-/** Where the data of a chunk stands in a reply, which has at least the line with its size. */
+/** The position of a chunk's data in a reply that has at least the line with the chunk's size. */
 struct Chunk {
     Chunk(const std::string& reply, std::size_t start)
         : data(reply.find(lineEnd, start) + lineEnd.size()),
@@ -54,7 +54,7 @@ Client::Client(std::uint16_t port, Transport transport) : _socket(socket(AF_INET
     }
 }
 
-/** Whom the certificate names is of no interest here. */
+/** The name in the certificate does not matter here. */
 void Client::shakeHands() {
     gnutls_certificate_credentials_t credentials = nullptr;
     requireTls(gnutls_certificate_allocate_credentials(&credentials));

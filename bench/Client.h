@@ -1,4 +1,4 @@
-/** A client that takes as little as possible of the processor. */
+/** A client that uses as little processor time as possible. */
 #ifndef BENCH_CLIENT_H
 #define BENCH_CLIENT_H
 
@@ -29,17 +29,17 @@ public:
 
     void ask(const std::string& request);
 
-    /** Takes what came. @return whether the reply is whole. */
+    /** Takes the bytes that have arrived. @return whether the reply is complete. */
     bool take();
 
-    /** Asks, and waits for the whole reply without sleeping. */
+    /** Sends the request, and waits for the whole reply without sleeping. */
     const std::string& answerTo(const std::string& request);
 
     const std::string& reply() const { return _received; }
-    /** Without the headers, of which one tells how long the server took. Chunks are joined. */
+    /** The body of the reply, with its chunks joined. The headers are left out: one has the time that it took. */
     std::string body() const;
     std::size_t bodySize() const { return _bodySize; }
-    /** In milliseconds. */
+    /** The time until the reply was complete, in milliseconds. */
     double latency() const { return Milliseconds(_end - _begin).count(); }
     double firstByte() const { return Milliseconds(_firstByte - _begin).count(); }
 
@@ -56,19 +56,19 @@ private:
     void shakeHands();
     void add(std::string_view piece);
     void findSize();
-    /** Goes on from chunk to chunk as far as they have come. */
+    /** Walks from chunk to chunk as far as they have arrived. */
     void findChunks();
 
     int _socket;
     std::unique_ptr<gnutls_certificate_credentials_st, Freed<gnutls_certificate_free_credentials>> _credentials;
-    /** Null where there is no TLS. */
+    /** Null without TLS. */
     std::unique_ptr<gnutls_session_int, Freed<gnutls_deinit>> _session;
     std::string _received;
-    /** Of the reply; 0 while it is not known. */
+    /** The size of the reply in bytes; 0 while it is unknown. */
     std::size_t _size = 0;
     std::size_t _bodySize = 0;
     std::size_t _bodyStart = 0;
-    /** Where the next chunk begins, of a body in chunks; 0 otherwise. */
+    /** The position at which the next chunk of the body begins; 0 if the body has no chunks. */
     std::size_t _nextChunk = 0;
     Clock::time_point _begin;
     Clock::time_point _firstByte;

@@ -49,7 +49,7 @@ Request ofClass(const std::string& method, std::string_view objectBegin) {
     return intrinsic(method, "ClassName", "<CLASSNAME NAME=\"TALVO_PowerManagementService\"/>", objectBegin, 1, 0);
 }
 
-/** A machine is not switched on by asking for it. */
+/** A request for the power state On, which is refused, so that the machine's state never changes. */
 Request refusedMethodCall() {
     constexpr const char* method = "RequestPowerStateChange";
     return {"InvokeMethod",

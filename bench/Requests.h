@@ -1,4 +1,4 @@
-/** The requests that the server is measured with. */
+/** The requests with which the server is measured. */
 #ifndef BENCH_REQUESTS_H
 #define BENCH_REQUESTS_H
 
@@ -9,26 +9,26 @@
 
 namespace Bench {
 
-/** A kind of CIM-XML request, and what a right reply has. */
+/** A kind of CIM-XML request, and what a correct reply contains. */
 struct Request {
     std::string name;
     std::string method;
     std::string object;
     std::string body;
-    /** What each object of the reply begins with. */
+    /** The text with which each object in the reply begins. */
     std::string_view objectBegin;
-    /** Objects of the reply for each node of the machine, and besides. */
+    /** How many objects the reply has for each node of the machine, and how many more. */
     std::size_t objectsPerNode;
     std::size_t objects;
 
-    /** What is sent for it. @param headers besides, each with its line end. */
+    /** The text of the request. @param headers further headers, each with its line end. */
     std::string text(std::string_view headers = "") const;
 
-    /** @throws std::runtime_error where a reply has another number of objects than a machine of so many nodes. */
+    /** @throws std::runtime_error if the reply does not have the number of objects that the machine's nodes make. */
     void check(const std::string& replyBody, std::size_t nodes) const;
 };
 
-/** The six kinds that clients ask most, of the first node's service or of its class. The method call is refused. */
+/** The six most frequent kinds, for the first node's service or its class. The method call is refused. */
 const std::vector<Request>& requests();
 
 } // namespace Bench

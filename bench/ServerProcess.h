@@ -12,7 +12,7 @@
 
 namespace Bench {
 
-/** A folder that goes with this object. */
+/** A temporary folder, which is removed when the object is destroyed. */
 class Folder {
 public:
     Folder();
@@ -26,7 +26,7 @@ private:
     std::filesystem::path _path;
 };
 
-/** A simulated machine with so many nodes: whatever starts from now on manages it. */
+/** A simulated machine with some nodes. Programs that are started while the object exists manage this machine. */
 class Machine {
 public:
     explicit Machine(unsigned int nodes);
@@ -39,7 +39,7 @@ private:
  */
 class ServerProcess {
 public:
-    /** Waits until it listens. */
+    /** Starts the program, and waits until it listens. */
     explicit ServerProcess(const std::vector<std::string>& command);
     ServerProcess(const ServerProcess&) = delete;
     ServerProcess& operator=(const ServerProcess&) = delete;
@@ -48,10 +48,10 @@ public:
     std::uint16_t port() const { return _port; }
     pid_t process() const { return _process; }
 
-    /** Seconds of processor time so far. */
+    /** The processor time that the program has used, in seconds. */
     double processorTime() const;
 
-    /** The sum of the lines that begin so in a file of the kernel's on the process, in megabytes. */
+    /** The sum of all lines that begin with `lines` in a file in the process's folder of /proc, in megabytes. */
     double memory(const char* file, std::string_view lines) const;
 
 private:
@@ -59,7 +59,7 @@ private:
     std::uint16_t _port = 0;
 };
 
-/** Runs a command to its end. @throws std::runtime_error where it cannot be run or fails. */
+/** Runs a command to its end. @throws std::runtime_error if it cannot be run or fails. */
 void runCommand(const std::vector<std::string>& command);
 
 } // namespace Bench

@@ -7,7 +7,7 @@
 
 namespace Bench {
 
-/** @throws std::system_error with errno where a call has not done what it was to do. */
+/** @throws std::system_error with errno if a call failed. */
 inline void require(bool done, const char* what) {
     if (!done) {
         throw std::system_error(errno, std::generic_category(), what);

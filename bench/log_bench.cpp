@@ -1,5 +1,5 @@
 /**
- * What the agent's log costs whoever calls it: mostly nothing is written. Counts the allocations as well.
+ * What a call of the agent's log costs; most calls write nothing. Counts the allocations, too.
  */
 #include "Allocations.h"
 #include "OrvLog/OrvLogger.h"
@@ -26,7 +26,7 @@ using Write = void (*)(const char*, const char*, int, const std::string&, int, c
 /** Writes records with a text of as many characters as the benchmark's argument says. */
 void writeRecords(benchmark::State& state, Write write, const std::string& category, int level) {
     const std::string text(static_cast<std::size_t>(state.range(0)), 'x');
-    // What is made once was made before.
+    // The first record makes what exists once in a process, which is not measured.
     write(__func__, __FILE__, __LINE__, category, level, nullptr, 0, 0, text);
     const int before = LogTest::allocations();
     for (auto _ : state) {
@@ -35,12 +35,12 @@ void writeRecords(benchmark::State& state, Write write, const std::string& categ
     state.counters["allocations"] = LogTest::allocations() - before;
 }
 
-/** A step, by far below the threshold. */
+/** The record of a step, far below the threshold. */
 void filteredStep(benchmark::State& state) {
     writeRecords(state, OrvLogger::logLevelMessage, filtered, 3000);
 }
 
-/** An operation, which is remembered in case that a failure follows. */
+/** The record of an operation, which the log remembers in case a failure follows. */
 void filteredOperation(benchmark::State& state) {
     writeRecords(state, OrvLogger::logLevelMessage, filtered, 4000);
 }

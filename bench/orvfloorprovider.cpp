@@ -1,8 +1,8 @@
 /**
- * The floor: providers that do what the power management provider cannot do without. They make the same calls of the
- * broker and of the agent (the walk through the tree, properties, the system's name, texts), and hand the log's filter
- * as many records of the same levels, of a text that stands ready; and computer systems for the associations to refer
- * to, of which ORV_BENCH_SYSTEMS says how many there are.
+ * The floor: providers that do only what the power management provider cannot avoid. They make the same calls of the
+ * broker and of the agent (walk through the tree, properties, the system's name, texts), and as many log records of the
+ * same levels, with a constant text. They also serve the computer systems to which the associations refer; the
+ * environment variable ORV_BENCH_SYSTEMS has their number.
  */
 #include "Norv/Common.h"
 #include "Norv/Instrumentation.h"
@@ -28,7 +28,7 @@ constexpr int progressLevel = 3000;
 constexpr int operationLevel = 4000;
 constexpr int failureLevel = 6000;
 
-/** Hands so many records to the log, and each to the trace as well. */
+/** Writes `number` records to the log, and each to the trace as well. */
 void logRecords(int number, int level) {
     static const std::string category = "Corvane.Floor";
     static const std::string text(100, 'x');
@@ -48,7 +48,7 @@ CMPIStatus leave(const CMPIResult* result) {
     return {CMPI_RC_OK, nullptr};
 }
 
-/** The nodes of the tree, all of whose properties are read. */
+/** The nodes of the tree; all of their properties are read. */
 std::vector<std::string> readNodes() {
     std::vector<std::string> nodes;
     Norv::Instrumentation cursor;
@@ -126,7 +126,7 @@ CMPIInstance* newCapabilities(const CMPIObjectPath* ref, const std::string& node
     return instance;
 }
 
-/** Nodes that are no part of the tree. */
+/** Nodes that are not in the tree. */
 std::vector<std::string> computerSystems() {
     const char* const number = std::getenv("ORV_BENCH_SYSTEMS");
     std::vector<std::string> systems;
@@ -168,7 +168,7 @@ CMPIStatus notSupported() {
         return notSupported();                                                                                         \
     }
 
-/** The operations of a class of which there is an object for each of `nodes`. */
+/** The operations of a class that has an object for each of `nodes`. */
 #define FLOOR_CLASS(Class, key, newObjectPath, newInstance, nodes)                                                     \
     FLOOR_REFUSED(Class)                                                                                               \
     static CMPIStatus Class##_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext*, const CMPIResult* result,         \

@@ -1,14 +1,14 @@
 /**
- * The provider library's operations through the embedded object manager, beside the floor: what is fixed of them, the
- * same calls of the broker and the agent and as many log records, in a bare loop. Prints, after the measurements, the
- * cost of one object (an instance, a path, a pair of an association, a method call) and that of the floor, a figure a
- * line: table, row, column and value, with tabs between them.
+ * Measures the provider library's operations through the embedded object manager, and the floor: a bare loop with the
+ * same calls of the broker and the agent and as many log records, which no provider can avoid. After the measurements,
+ * prints the cost of one object (an instance, a path, a pair of an association, a method call) and that of the floor.
+ * Each line has one figure: table, row, column and value, with tabs between them.
  *
  * The agent reads its configuration once in a process, so each number of nodes and each setting of the log runs in a
  * process of its own.
  *
- * Where valgrind runs it with the tool callgrind, it leaves dumps of the instructions of each operation instead;
- * bench/count-instructions makes figures of them.
+ * If valgrind runs the program with the tool callgrind, it writes dumps of the instructions of each operation instead;
+ * bench/count-instructions reads them.
  */
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
@@ -39,7 +39,7 @@ using namespace ObjectManager;
 struct Setup {
     unsigned int nodes;
     unsigned int systems;
-    /** Whether every record is written to a file, or what the default thresholds let through. */
+    /** Whether every record is written to a file, or only those that the default thresholds let pass. */
     bool logEverything;
     bool associations;
 };
@@ -51,7 +51,7 @@ constexpr Setup setups[] = {
     {1'000, 10, false, true}, {300, 1, false, true},
 };
 
-/** Numbers of one length, so that the order of the nodes is that of their names, as an administrator would have it. */
+/** A name with a number of constant length, so that the order by name is that of the numbers. */
 std::string nodePath(unsigned int node) {
     return "node" + std::to_string(100'000 + node);
 }
@@ -98,7 +98,7 @@ Registration associationRegistration(const char* className, const char* provider
     return made;
 }
 
-/** @param systems computer systems: one as machines have it, more are made up. */
+/** @param systems how many computer systems there are; a machine has one. */
 Registry registry(unsigned int systems) {
     return Registry({
         registration("TALVO_PowerManagementService", "PowerManagementServiceProvider", library),
@@ -118,10 +118,10 @@ ObjectPath pathOf(const std::string& className, std::vector<NamedValue> keys = {
     return ObjectPath{"", nameSpace, className, std::move(keys)};
 }
 
-/** Runs one operation and says how many objects it returned. */
+/** Runs one operation. @return how many objects it returned. */
 using Operation = std::function<std::size_t(Dispatcher&, const std::string& className)>;
 
-// An answer is looked at object by object, as a client's is written, and not kept.
+// Each object of an answer is looked at and dropped, as when the answer for a client is written.
 
 const Operation enumInstanceNames = [](Dispatcher& dispatcher, const std::string& className) {
     std::size_t count = 0;
@@ -135,7 +135,7 @@ const Operation enumInstances = [](Dispatcher& dispatcher, const std::string& cl
     return count;
 };
 
-/** A lookup by key. The key is the last one of the floor as well, which does not look at it. */
+/** A lookup by key. The key is that of the last node; the floor does not look at it. */
 Operation getInstance(const std::string& key, const std::string& value) {
     return [key, value](Dispatcher& dispatcher, const std::string& className) {
         dispatcher.getInstance({}, pathOf(className, {{key, stringValue(value)}}), {});
@@ -143,7 +143,7 @@ Operation getInstance(const std::string& key, const std::string& value) {
     };
 }
 
-/** RequestPowerStateChange. A state that the provider refuses ends before anything is written. */
+/** RequestPowerStateChange. For a state that the provider refuses, nothing is written to the tree. */
 Operation requestPowerStateChange(std::uint64_t powerState) {
     return [powerState](Dispatcher& dispatcher, const std::string& className) {
         const std::vector<NamedValue> arguments = {
@@ -161,7 +161,7 @@ Operation requestPowerStateChange(std::uint64_t powerState) {
     };
 }
 
-/** Which objects are associated with the first node's service through the associations of a class. */
+/** The objects that are associated with the first node's service through associations of a class. */
 using Traversal = std::size_t (*)(Dispatcher&, const ObjectPath& source, const AssociationFilter& filter);
 
 template <typename Object>
@@ -202,7 +202,7 @@ Operation traversal(Traversal traverse) {
 
 struct Measured {
     std::string operation;
-    /** The class that is measured, and the one that stands for the floor; null where there is none. */
+    /** The class that is measured, and the class of the floor; null if the floor has none. */
     const char* className;
     const char* floorClass;
     Operation run;
@@ -239,7 +239,7 @@ std::vector<Measured> associationOperations(const Setup& setup) {
     };
     add("system association", "TALVO_AssociatedPowerManagementService");
     add("host association", "TALVO_PowerManagementHostedService");
-    // As clients mostly ask it.
+    // The way in which clients mostly ask.
     all.push_back({"service Associators", "", nullptr, traversal(associators)});
     all.push_back({"service References", "", nullptr, traversal(references)});
     // Every service with every capabilities object: many pairs.
@@ -292,7 +292,7 @@ std::regex filterOf(const std::vector<std::string_view>& arguments) {
     return std::regex("");
 }
 
-/** What a setup adds to an operation's name. */
+/** The text that a setup appends to an operation's name. */
 std::string suffixOf(const Setup& setup) {
     const std::string nodes = std::to_string(setup.nodes);
     const std::string size =
@@ -300,13 +300,13 @@ std::string suffixOf(const Setup& setup) {
     return std::string(setup.logEverything ? "/log everything/" : "/log default/") + size;
 }
 
-/** Whether instructions are counted of this setup: fewer than are timed, since they do not vary. */
+/** Whether instructions are counted for this setup: fewer setups than are timed, since instructions do not vary. */
 bool isCounted(const Setup& setup) {
     return setup.systems == 1 &&
            (setup.nodes == 1 || setup.nodes == 100 || (setup.nodes == 10'000 && !setup.logEverything));
 }
 
-/** Leaves callgrind's dump of each operation: the instructions of so many runs as its name says. */
+/** Has callgrind write a dump for each operation. The dump's name has the number of runs. */
 void countInstructions(Dispatcher& dispatcher, const std::vector<Measured>& operations, const Setup& setup,
                        const std::regex& filter) {
     const unsigned int runs = setup.nodes == 1 ? 20 : setup.nodes == 100 ? 4 : 1;
@@ -315,7 +315,7 @@ void countInstructions(Dispatcher& dispatcher, const std::vector<Measured>& oper
         if (!std::regex_search(name, filter)) {
             continue;
         }
-        // What is made once is made before.
+        // The first run makes what exists once in a process, which is not counted.
         measured.run(dispatcher, measured.className);
         CALLGRIND_ZERO_STATS;
         for (unsigned int i = 0; i < runs; ++i) {
@@ -328,7 +328,7 @@ void countInstructions(Dispatcher& dispatcher, const std::vector<Measured>& oper
 
 int runSetup(const Setup& setup, int argc, char** argv, const std::filesystem::path& folder, std::FILE* results) {
     writeConfiguration(setup, folder);
-    // Every power request is logged on standard error, which is of no interest here.
+    // Every power request is logged on standard error; these lines are dropped.
     if (std::freopen("/dev/null", "w", stderr) == nullptr) {
         return 1;
     }
@@ -359,7 +359,7 @@ int runSetup(const Setup& setup, int argc, char** argv, const std::filesystem::p
     return 0;
 }
 
-/** Nanoseconds of one object by the benchmark's name, in the order of measuring. */
+/** Nanoseconds for one object, by the benchmark's name, in the order of the measurements. */
 using Results = std::vector<std::pair<std::string, double>>;
 
 bool runInProcess(const Setup& setup, int argc, char** argv, Results& results) {
@@ -391,14 +391,14 @@ bool runInProcess(const Setup& setup, int argc, char** argv, Results& results) {
     return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }
 
-/** The floor's name for a measurement: it is measured once, since it logs nothing. */
+/** The name of the floor for a measurement. The floor is measured once for all settings of the log. */
 std::string floorOf(std::string name) {
     const std::size_t slash = name.find('/');
     const std::size_t size = name.rfind('/');
     return name.substr(0, slash) + " floor/log default" + name.substr(size);
 }
 
-/** A figure a line: table, row, column and value, with tabs between them. */
+/** Prints each figure in a line: table, row, column and value, with tabs between them. */
 void print(const Results& results) {
     const std::map<std::string, double> byName(results.begin(), results.end());
     for (const auto& [name, nanoseconds] : results) {

@@ -51,7 +51,7 @@ void print(const char* table, const std::string& row, const char* column, double
     std::fflush(stdout);
 }
 
-/** What is asked, of whom, and how large the body of every reply is. */
+/** A request, the server that answers it, and the size of the body of every reply. */
 struct Load {
     const ServerProcess& server;
     std::string request;
@@ -61,9 +61,9 @@ struct Load {
 
 struct Measurement {
     double requestsPerSecond = 0;
-    /** What a request costs the server in processor time. */
+    /** The server's processor time for one request. */
     double microseconds = 0;
-    /** In milliseconds, sorted. */
+    /** The latencies in milliseconds, sorted. */
     std::vector<double> latencies;
     std::vector<double> firstBytes;
 };
@@ -189,7 +189,7 @@ std::vector<std::string> operator+(std::vector<std::string> command, const std::
     return command;
 }
 
-/** Looks at a reply, which all others are to be like. */
+/** Checks a reply, to which all later replies are compared by size. @return its body. */
 std::string checkedBody(const ServerProcess& server, const Request& request, const std::string& text,
                         unsigned int nodes, Transport transport = Transport::plain) {
     Client client(server.port(), transport);
@@ -203,7 +203,7 @@ std::string rowOf(const std::string& name, unsigned int connections, unsigned in
     return name + '/' + std::to_string(connections) + '/' + std::to_string(nodes);
 }
 
-/** Each kind of request beside its limit. */
+/** Measures each kind of request, and the limit for it. */
 void measureRequests(const ServerProcess& server, unsigned int nodes, double seconds, const std::regex& filter) {
     const Folder folder;
     const std::string reply = folder / "reply";
@@ -235,7 +235,7 @@ void measureRequests(const ServerProcess& server, unsigned int nodes, double sec
     }
 }
 
-/** What log-ins and TLS cost, of one node: three servers in turn. */
+/** Measures what log-ins and TLS cost, with three servers of one node. */
 void measureProtection(double seconds, const std::regex& filter) {
     const Machine machine(1);
     const Folder folder;
@@ -273,7 +273,7 @@ void measureProtection(double seconds, const std::regex& filter) {
     }
 }
 
-/** Milliseconds that something takes, at the median. */
+/** The median of the time that something takes, in milliseconds. */
 template <typename Run>
 double timeOf(Run run) {
     constexpr unsigned int runs = 21;
@@ -293,7 +293,7 @@ void measureStart(const std::regex& filter) {
         print("start", "orvcim power status", "ms", timeOf([] { runCommand({ORV_PROGRAM, "power", "status"}); }));
     }
     if (std::regex_search("orvcim serve/1", filter)) {
-        // Its end is not counted.
+        // The program's end is not measured.
         std::vector<std::unique_ptr<ServerProcess>> servers;
         print("start", "orvcim serve, until it listens", "ms",
               timeOf([&] { servers.push_back(std::make_unique<ServerProcess>(serve)); }));
@@ -317,7 +317,7 @@ void measureAll(double seconds, const std::regex& filter) {
     measureProtection(seconds, filter);
 }
 
-/** Hands out a file's content, whatever it is asked, until it is ended. */
+/** Answers every request with the content of a file, until a signal ends the program. */
 void serveConstant(const std::filesystem::path& file) {
     std::ifstream stream(file);
     const std::string body{std::istreambuf_iterator<char>(stream), {}};

@@ -46,7 +46,7 @@ std::string readAll(const Descriptor& open, const std::filesystem::path& file, o
 } // namespace
 
 std::optional<FileContent> readRegularFile(const std::filesystem::path& file) {
-    // Opening what is no regular file must not wait for its other end.
+    // O_NONBLOCK: opening a pipe must not wait for its other end.
     const Descriptor open(::open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (!open.isOpen()) {
         if (errno == ENOENT) {

@@ -9,21 +9,21 @@
 
 namespace Norv::Agent {
 
-/** What a file holds, and what tells it from what it holds at other times. */
+/** The content of a file, and a signature by which a later change can be noticed. */
 struct FileContent {
     FileSignature signature;
     std::string text;
 };
 
-/** More than any file has that a person or the agent writes, in bytes. */
+/** The largest file that is read, in bytes: larger than any file that a person or the agent writes. */
 inline constexpr off_t largestFile = off_t{16} * 1024 * 1024;
 
 /**
- * Reads a regular file of `largestFile` bytes at most. What is none, such as a pipe, is not waited for.
+ * Reads a regular file of `largestFile` bytes at most. Does not wait for another kind of file, such as a pipe.
  *
- * @return nothing where there is no file.
- * @throws std::system_error where it cannot be read: EINVAL where it is no regular file, EFBIG where it is larger;
- *         what() names the file. std::bad_alloc where memory is short, and nothing else then.
+ * @return no value if the file does not exist.
+ * @throws std::system_error if the file cannot be read: with EINVAL if it is not a regular file, with EFBIG if it is
+ *         too large; what() names the file. std::bad_alloc if there is too little memory, and then nothing else.
  */
 std::optional<FileContent> readRegularFile(const std::filesystem::path& file);
 

@@ -170,7 +170,7 @@ protected:
 /** The status is OK, without message. */
 void expectOk(const CMPIStatus& status);
 
-/** The lines before the `occurrence`th that is equal to `line`. Throws std::invalid_argument where it is not there. */
+/** The lines before the `occurrence`th that is equal to `line`. Throws std::invalid_argument if it is missing. */
 Lines before(const Lines& all, const std::string& line, int occurrence = 1);
 
 /** "path#3" and so on. */

@@ -61,7 +61,7 @@ extern const Source capabilitiesSource;
 /** The walk over the stand-in's nodes, without lists of states, that the construction of an object factory makes. */
 Lines discovery();
 
-/** The same where there are no nodes, with the factory's message. */
+/** The same without nodes, with the factory's message. */
 Lines failedDiscovery();
 
 /** A class path's creation by the factory or a provider, and the line where its namespace is set. */
@@ -69,7 +69,7 @@ std::string newPath(int number, const std::string& className);
 std::string namespaceSet(const std::string& path);
 std::string hostSet(const std::string& path);
 
-/** For what the factory builds: the path in whose namespace it does, and the broker's objects of before. */
+/** What the factory builds from: the path whose namespace it uses, and how many objects the broker made before. */
 struct Place {
     std::string ref = "ref";
     int paths = 0;
@@ -82,15 +82,15 @@ struct ElementClass {
     std::string className;
     std::string key;
     Source source;
-    /** What stands before a node's path in the value of the key property. */
+    /** The text before a node's path in the value of the key property. */
     std::string keyPrefix;
     std::string getAllPaths;
     std::string getAllInstances;
     std::string getOneInstance;
     std::string makeInstance;
-    /** The factory's message where a path cannot be made. */
+    /** The factory's message if a path cannot be made. */
     std::string noPath;
-    /** The provider's message where there is no element under a key. */
+    /** The provider's message if no element has the key. */
     std::string noInstance;
     /** Whether getAllInstances and getAllPaths, in this order, write their EXITING line. */
     bool instancesExit;
@@ -116,7 +116,7 @@ struct ElementClass {
     Lines instanceWithElementName(int number, const std::string& node) const;
     /** All of them with all properties, in the factory's order, between the factory's own lines. */
     Lines allInstances(const Lines& nodes, const Place& place = {}) const;
-    /** The same where they are wanted for their paths. */
+    /** The same if the instances are wanted only for their paths. */
     Lines allInstancesForPaths(const Lines& nodes, const Place& place = {}) const;
 
 private:

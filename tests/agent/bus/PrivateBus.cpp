@@ -129,7 +129,7 @@ std::vector<std::string> PrivateBus::requests() const {
     std::vector<std::string> requests;
     std::istringstream lines(contentOf(_folder / "calls"));
     for (std::string line; std::getline(lines, line);) {
-        // The call stands behind the time.
+        // The line has the time, and after it the call.
         const std::string call = line.substr(line.find(' ') + 1);
         for (const char* method : {"Reboot", "PowerOff", "ScheduleShutdown", "CancelScheduledShutdown"}) {
             if (call == method || call.starts_with(method + std::string(" "))) {

@@ -30,8 +30,8 @@ public:
 };
 
 /**
- * The power-management nodes and their states at the time of the selection. It belongs to one thread at a time and must
- * not outlive its backend. Every `node` is an index below `size()`.
+ * The power-management nodes, and their states when one of them was first asked for or before. It belongs to one thread
+ * at a time and must not outlive its backend. Every `node` is an index below `size()`.
  */
 class NodeSelection {
 public:

@@ -71,6 +71,7 @@ public:
     ORV_FUNCTION(sd_bus_message_read);
     ORV_FUNCTION(sd_bus_message_set_expect_reply);
     ORV_FUNCTION(sd_bus_message_ref);
+    ORV_FUNCTION(sd_bus_message_rewind);
     ORV_FUNCTION(sd_bus_message_unref);
     ORV_FUNCTION(sd_bus_open_system);
     ORV_FUNCTION(sd_bus_process);
@@ -262,13 +263,12 @@ Logind::Message Logind::answerTo(const char* question) {
     if (asked->answer == nullptr) {
         failToAnswer(question, -ECONNRESET);
     }
-    const Message answer = std::move(asked->answer);
-    _asked.erase(asked);
-    if (const sd_bus_error* error = libsystemd().sd_bus_message_get_error(answer.get())) {
+    if (const sd_bus_error* error = libsystemd().sd_bus_message_get_error(asked->answer.get())) {
         failToAnswer(question, -ECONNRESET, printable(error->name), textOf(*error));
     }
     _answers = true;
-    return Message(libsystemd().sd_bus_message_ref(answer.get()));
+    require(libsystemd().sd_bus_message_rewind(asked->answer.get(), 1), question);
+    return Message(libsystemd().sd_bus_message_ref(asked->answer.get()));
 }
 
 void Logind::failToAnswer(const char* method, int result, const std::string& error, const std::string& text) {

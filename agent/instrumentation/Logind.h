@@ -83,8 +83,8 @@ public:
     static constexpr const char* listInhibitors = "ListInhibitors";
 
     /**
-     * Sends several questions at once, so that together they take the time of one. The members below return these
-     * answers when they are next called, and throw the errors among them then.
+     * Sends several questions at once, so that together they take the time of one. From then on, the members below
+     * return these answers, and throw the errors among them.
      *
      * @param questions the constants above, and methods for `can`.
      */

@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <array>
 #include <functional>
+#include <initializer_list>
 #include <iterator>
 #include <stdexcept>
 #include <system_error>
@@ -111,6 +112,17 @@ struct Pending {
     WallTime time;
 };
 
+/** What `pendingOn` asks. */
+constexpr std::array pendingQuestions = {Logind::preparingForShutdown, Logind::scheduledShutdownProperty};
+
+/** Asks at once what is under way, what the machine can be asked to do, and `more`. */
+void askWhatItDoes(Logind& logind, std::initializer_list<const char*> more = {}) {
+    std::vector<const char*> questions(more);
+    questions.insert(questions.end(), pendingQuestions.begin(), pendingQuestions.end());
+    std::ranges::transform(listedStates, std::back_inserter(questions), &ListedState::canMethod);
+    logind.askTogether(questions);
+}
+
 std::optional<Pending> pendingOn(Logind& logind) {
     const bool preparing = logind.isPreparingForShutdown();
     const ScheduledShutdown scheduled = logind.scheduledShutdown();
@@ -130,8 +142,7 @@ std::optional<Pending> pendingOn(Logind& logind) {
 
 /** @throws Refusal if the machine cannot carry the request out now. */
 void requireThatItCanBeDone(Logind& logind, const Transition& transition) {
-    logind.askTogether(std::array{Logind::preparingForShutdown, Logind::scheduledShutdownProperty,
-                                  Logind::listInhibitors, transition.canMethod});
+    askWhatItDoes(logind, {Logind::listInhibitors});
     if (const auto pending = pendingOn(logind)) {
         throw Refusal("another request is in progress: " + pending->description);
     }
@@ -188,30 +199,39 @@ std::string reasonOf(const LogindError& error) {
     return error.what() + (isMasked ? adviceFor(error.kind()) : std::string());
 }
 
+/** The list in property 125: what the machine can be asked to do. */
+std::vector<unsigned int> listedStatesOf(Logind& logind) {
+    std::vector<unsigned int> states{listedOn};
+    try {
+        for (const ListedState& listed : listedStates) {
+            if (logind.can(listed.canMethod) == yes) {
+                states.push_back(listed.state);
+            }
+        }
+    } catch (const LogindError& error) {
+        if (error.kind() != LogindError::Kind::polkitMasked) {
+            throw;
+        }
+        report(failureLevel, std::string("What this machine can be asked to do cannot be told: ") + reasonOf(error));
+    }
+    std::ranges::sort(states);
+    return states;
+}
+
+/** The same without what cannot be told: a request that can be carried out does not depend on it. */
+std::vector<unsigned int> listedStatesIfTold(Logind& logind) {
+    try {
+        return listedStatesOf(logind);
+    } catch (const LogindError&) {
+        return {listedOn};
+    }
+}
+
 } // namespace
 
 class LogindBackend::Selection final : public NodeSelection {
 public:
-    explicit Selection(LogindBackend& backend) : _backend(backend) {
-        if (const auto known = backend._end.begun()) {
-            show(*known);
-            return;
-        }
-        const auto due = backend._end.due();
-        try {
-            const Patience patience(due ? std::min(backend._settings.timeout, shortTimeout)
-                                        : backend._settings.timeout);
-            Logind logind(patience.deadline());
-            read(logind);
-        } catch (const LogindError& error) {
-            if (due) {
-                show(*due);
-                return;
-            }
-            _states.clear();
-            report(failureLevel, std::string("The power state of this machine cannot be told: ") + reasonOf(error));
-        }
-    }
+    explicit Selection(LogindBackend& backend) : _backend(backend) {}
 
     std::size_t size() const override { return 1; }
 
@@ -221,9 +241,9 @@ public:
         return path;
     }
 
-    std::optional<unsigned int> powerState(std::size_t /*node*/) const override { return _state; }
+    std::optional<unsigned int> powerState(std::size_t /*node*/) const override { return reading().state; }
 
-    const std::vector<unsigned int>& powerStates(std::size_t /*node*/) const override { return _states; }
+    const std::vector<unsigned int>& powerStates(std::size_t /*node*/) const override { return reading().powerStates; }
 
     PowerRequestOutcome requestPowerState(std::size_t node, unsigned int state) override {
         const std::string where = "of this machine, node " + path(node);
@@ -241,9 +261,10 @@ public:
                 std::chrono::floor<std::chrono::microseconds>(std::chrono::system_clock::now()) + delay;
             std::string description = what;
             description += atOnce ? ", at once" : ", at " + UtcText(time).inSeconds() + ", in " + inSeconds(delay);
-            EndOfTheMachine::Node ending{state, _states};
+            Reading requested{state, listedStatesIfTold(logind)};
+            EndOfTheMachine::Node ending{state, requested.powerStates};
             carryOut(logind, *transition, time, atOnce);
-            _state = state;
+            _reading = std::move(requested);
             _backend._end.note(time, atOnce, std::move(ending));
             return description;
         });
@@ -252,6 +273,7 @@ public:
     PowerRequestOutcome cancelRequest(std::size_t node) override {
         const std::string what = "cancellation of the request of this machine, node " + path(node);
         return attempt(what, [&](Logind& logind) {
+            logind.askTogether(pendingQuestions);
             const auto pending = pendingOn(logind);
             if (!pending) {
                 throw Refusal("no request is in progress");
@@ -260,7 +282,7 @@ public:
             if (pending->begun || !logind.cancelScheduledShutdown()) {
                 throw Refusal("it is too late: " + pending->description);
             }
-            _state = running;
+            _reading.reset();
             _backend._end.forget();
             return description;
         });
@@ -273,37 +295,49 @@ private:
      */
     static constexpr std::chrono::milliseconds shortTimeout{500};
 
-    void show(const EndOfTheMachine::Node& node) {
-        _state = node.state;
-        _states = node.powerStates;
+    struct Reading {
+        /** No value if the state is not known. */
+        std::optional<unsigned int> state;
+        std::vector<unsigned int> powerStates;
+    };
+
+    /** The node's states, which are read when they are first asked for: whoever only writes need not wait for them. */
+    const Reading& reading() const {
+        if (!_reading) {
+            _reading = read();
+        }
+        return *_reading;
     }
 
-    void read(Logind& logind) {
-        std::vector<const char*> questions = {Logind::preparingForShutdown, Logind::scheduledShutdownProperty};
-        std::ranges::transform(listedStates, std::back_inserter(questions), &ListedState::canMethod);
-        logind.askTogether(questions);
-        const auto pending = pendingOn(logind);
-        _states.push_back(listedOn);
-        try {
-            for (const ListedState& listed : listedStates) {
-                if (logind.can(listed.canMethod) == yes) {
-                    _states.push_back(listed.state);
-                }
-            }
-        } catch (const LogindError& error) {
-            if (error.kind() != LogindError::Kind::polkitMasked) {
-                throw;
-            }
-            report(failureLevel,
-                   std::string("What this machine can be asked to do cannot be told: ") + reasonOf(error));
+    Reading read() const {
+        if (const auto known = _backend._end.begun()) {
+            return {known->state, known->powerStates};
         }
-        std::ranges::sort(_states);
-        _state = pending ? pending->state : running;
+        const auto due = _backend._end.due();
+        try {
+            const Patience patience(due ? std::min(_backend._settings.timeout, shortTimeout)
+                                        : _backend._settings.timeout);
+            Logind logind(patience.deadline());
+            return readFrom(logind);
+        } catch (const LogindError& error) {
+            if (due) {
+                return {due->state, due->powerStates};
+            }
+            report(failureLevel, std::string("The power state of this machine cannot be told: ") + reasonOf(error));
+            return {};
+        }
+    }
+
+    Reading readFrom(Logind& logind) const {
+        askWhatItDoes(logind);
+        const auto pending = pendingOn(logind);
+        Reading found{pending ? pending->state : running, listedStatesOf(logind)};
         if (pending) {
-            _backend._end.note(pending->time, pending->begun, {pending->state, _states});
+            _backend._end.note(pending->time, pending->begun, {pending->state, found.powerStates});
         } else {
             _backend._end.forget();
         }
+        return found;
     }
 
     /** @param action makes the request of systemd-logind; returns the description, or throws the reason of a refusal.
@@ -323,9 +357,7 @@ private:
     }
 
     LogindBackend& _backend;
-    /** No value if the state is not known. */
-    std::optional<unsigned int> _state;
-    std::vector<unsigned int> _states;
+    mutable std::optional<Reading> _reading;
 };
 
 std::unique_ptr<NodeSelection> LogindBackend::selectPowerManagementNodes() {
@@ -342,6 +374,7 @@ MachineReport LogindBackend::examine() {
         requireWritable(_settings.lockFile.parent_path());
         const Patience patience(_settings.timeout);
         Logind logind(patience.deadline());
+        askWhatItDoes(logind, {Logind::listInhibitors});
         const auto pending = pendingOn(logind);
         found.facts.push_back({"under way", pending ? pending->description : "nothing"});
         for (const Transition& transition : transitions) {

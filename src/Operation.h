@@ -10,6 +10,10 @@
 #include "cmpift.h"
 #include "cmpimacs.h"
 
+#include <array>
+#include <charconv>
+#include <cstdint>
+#include <ostream>
 #include <string>
 #include <tuple>
 
@@ -39,11 +43,23 @@ private:
     void write(MessageType type, const Site& site) const {
         OrvLog::OrvMessageBuffer buffer;
         std::ostream& stream = buffer;
-        std::apply([&](const Parts&... parts) { (stream << ... << parts); }, _parts);
+        std::apply([&](const Parts&... parts) { (put(stream, parts), ...); }, _parts);
         const std::string& parameters = OrvLog::OrvMessageBuffer::str(stream);
         writeRecord(_category, progressLevel, site,
                     [&] { return tracepara(site.function, site.file, site.line, parameters.c_str(), type); });
     }
+
+    static void put(std::ostream& stream, const char* text) { stream << text; }
+
+    /** As the stream itself writes a pointer, which takes several times as long. */
+    static void put(std::ostream& stream, const void* pointer) {
+        std::array<char, 2 + 2 * sizeof pointer> text{'0', 'x'};
+        char* const begin = text.data() + (pointer == nullptr ? 0 : 2);
+        const auto end = std::to_chars(begin, text.data() + text.size(), reinterpret_cast<std::uintptr_t>(pointer), 16);
+        stream.write(text.data(), end.ptr - text.data());
+    }
+
+    static void put(std::ostream& stream, bool flag) { stream.write(flag ? "1" : "0", 1); }
 
     const std::string& _category;
     std::tuple<Parts...> _parts;

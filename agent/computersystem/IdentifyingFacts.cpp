@@ -1,13 +1,15 @@
 #include "IdentifyingFacts.h"
 
+#include "base/RegularFile.h"
 #include "base/Utf8.h"
 
 #include <algorithm>
-#include <fstream>
+#include <cstddef>
 #include <map>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <system_error>
 
 namespace Norv::ComputerSystemProvider {
 
@@ -67,12 +69,21 @@ void append(std::vector<IdentifyingFact>& facts, const char* description, const 
 
 /** The file's lines, without blanks at their ends; no value if the file cannot be read. */
 std::optional<std::vector<std::string>> linesOf(const std::string& file) {
-    std::ifstream stream(file);
-    std::vector<std::string> lines;
-    for (std::string line; std::getline(stream, line);) {
-        lines.push_back(trimmed(line));
+    try {
+        const auto content = Agent::readRegularFile(file);
+        if (!content) {
+            return std::nullopt;
+        }
+        std::vector<std::string> lines;
+        for (std::size_t begin = 0; begin < content->text.size();) {
+            const std::size_t end = std::min(content->text.find('\n', begin), content->text.size());
+            lines.push_back(trimmed(content->text.substr(begin, end - begin)));
+            begin = end + 1;
+        }
+        return lines;
+    } catch (const std::system_error&) {
+        return std::nullopt;
     }
-    return stream.is_open() && !stream.bad() ? std::optional(std::move(lines)) : std::nullopt;
 }
 
 /** A value of an os-release file, without the shell's quotes and backslashes. */

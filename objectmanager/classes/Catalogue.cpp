@@ -30,8 +30,8 @@ void inheritQualifiers(Method& method, const Method& inherited, const QualifierT
 
 /** Adds the elements that a class declares to those that it inherits. */
 template <typename T>
-void addElements(std::vector<T>& elements, const std::vector<T>& own, const Class& owner, const QualifierTypes& types) {
-    for (T element : own) {
+void addElements(std::vector<T>& elements, std::vector<T> own, const Class& owner, const QualifierTypes& types) {
+    for (T& element : own) {
         element.origin = owner.name;
         element.declaredBy = owner.name;
         const auto inherited = std::find_if(elements.begin(), elements.end(),
@@ -58,25 +58,35 @@ public:
     Completion(std::vector<Class> declarations, const QualifierTypes& types) : _types(types) {
         for (Class& declared : declarations) {
             convertQualifiers(declared);
-            const auto [known, added] = _declared.try_emplace(declared.name, declared);
+            const auto [known, added] = _classes.try_emplace(declared.name);
             if (!added) {
                 throw SchemaError(declared.place,
                                   fmt::format("found a second declaration of {}, expected only the one at {}",
-                                              declared.name, known->second.place));
+                                              declared.name, known->second.declared.place));
             }
+            known->second.declared = std::move(declared);
         }
     }
 
-    std::vector<Class> classes() const {
+    std::vector<Class> classes() && {
+        for (auto& [name, entry] : _classes) {
+            checkReferences(complete(entry, 0));
+        }
         std::vector<Class> whole;
-        for (const auto& [name, declared] : _declared) {
-            whole.push_back(complete(declared, 0));
-            checkReferences(whole.back());
+        whole.reserve(_classes.size());
+        for (auto& [name, entry] : _classes) {
+            whole.push_back(std::move(entry.declared));
         }
         return whole;
     }
 
 private:
+    struct Entry {
+        /** The declaration; with what it inherits once it is complete. */
+        Class declared;
+        bool isComplete = false;
+    };
+
     /** Converts the qualifiers of the class and of its elements to their types. */
     void convertQualifiers(Class& declared) const {
         _types.convert(declared.qualifiers, declared.place);
@@ -92,37 +102,41 @@ private:
     }
 
     /**
-     * `descendants` counts the classes between `declared` and the class whose completion began this: it finds cycles.
+     * `descendants` counts the classes between this one and the class whose completion began this: it finds cycles.
      */
-    Class complete(const Class& declared, std::size_t descendants) const {
-        Class whole = declared;
-        whole.properties.clear();
-        whole.methods.clear();
-        if (!declared.superClass.empty()) {
-            Class inherited = complete(superClassOf(declared, descendants), descendants + 1);
-            whole.properties = std::move(inherited.properties);
-            whole.methods = std::move(inherited.methods);
+    const Class& complete(Entry& entry, std::size_t descendants) {
+        Class& whole = entry.declared;
+        if (entry.isComplete) {
+            return whole;
+        }
+        std::vector<Property> properties = std::exchange(whole.properties, {});
+        std::vector<Method> methods = std::exchange(whole.methods, {});
+        if (!whole.superClass.empty()) {
+            const Class& inherited = complete(superClassOf(whole, descendants), descendants + 1);
+            whole.properties = inherited.properties;
+            whole.methods = inherited.methods;
             whole.qualifiers = _types.merged(inherited.qualifiers, std::move(whole.qualifiers));
         }
-        addElements(whole.properties, declared.properties, declared, _types);
-        addElements(whole.methods, declared.methods, declared, _types);
+        addElements(whole.properties, std::move(properties), whole, _types);
+        addElements(whole.methods, std::move(methods), whole, _types);
+        entry.isComplete = true;
         return whole;
     }
 
-    const Class& superClassOf(const Class& declared, std::size_t descendants) const {
-        const auto ancestor = _declared.find(declared.superClass);
-        if (ancestor == _declared.end() || descendants > _declared.size()) {
+    Entry& superClassOf(const Class& declared, std::size_t descendants) {
+        const auto ancestor = _classes.find(declared.superClass);
+        if (ancestor == _classes.end() || descendants > _classes.size()) {
             throw SchemaError(
                 declared.place,
                 fmt::format("found {} as superclass of {}, expected {}", declared.superClass, declared.name,
-                            ancestor == _declared.end() ? "a declared class" : "a class that is not its descendant"));
+                            ancestor == _classes.end() ? "a declared class" : "a class that is not its descendant"));
         }
         return ancestor->second;
     }
 
     void checkReferences(const Class& whole) const {
         const auto check = [&](const Element& element) {
-            if (!element.referenceClass.empty() && !_declared.contains(element.referenceClass)) {
+            if (!element.referenceClass.empty() && !_classes.contains(element.referenceClass)) {
                 throw SchemaError(whole.place, fmt::format("found {} REF {} in {}, expected a declared class",
                                                            element.referenceClass, element.name, whole.name));
             }
@@ -134,7 +148,7 @@ private:
     }
 
     const QualifierTypes& _types;
-    std::map<std::string, Class, NameLess> _declared;
+    std::map<std::string, Entry, NameLess> _classes;
 };
 
 } // namespace

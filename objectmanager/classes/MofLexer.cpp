@@ -53,8 +53,8 @@ private:
                     fail("found no end of the comment that begins here, expected */");
                 }
                 advance(end + 2);
-            } else if (std::string_view(" \t\r\n\f").find(rest.front()) != std::string_view::npos) {
-                advance(1);
+            } else if (const std::size_t blanks = std::min(rest.find_first_not_of(" \t\r\n\f"), rest.size())) {
+                advance(blanks);
             } else {
                 return true;
             }

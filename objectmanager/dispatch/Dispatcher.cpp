@@ -117,10 +117,13 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
     try {
         Request request(_broker);
         Result result(request);
-        ObjectPath target = path;
-        if (equalNames(target.className, registration.className)) {
-            target.className = registration.className; // spelled as the provider's registration has it
+        // The class is spelled as the provider's registration has it.
+        std::optional<ObjectPath> respelled;
+        if (path.className != registration.className && equalNames(path.className, registration.className)) {
+            respelled = path;
+            respelled->className = registration.className;
         }
+        const ObjectPath& target = respelled ? *respelled : path;
         const CMPIContext* context = request.context({
             {CMPIInitNameSpace, stringValue(path.nameSpace)},
             {CMPIInvocationFlags, unsignedValue(CMPI_uint32, invocation.flags)},

@@ -3,15 +3,21 @@
  */
 #include "Allocations.h"
 #include "OrvLog/OrvLogger.h"
+#include "base/Descriptor.h"
+#include "base/FolderOfFile.h"
 
 #include <benchmark/benchmark.h>
 
+#include <csignal>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <string>
 
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/uio.h>
 #include <unistd.h>
 
 namespace {
@@ -53,10 +59,38 @@ void writtenToAFile(benchmark::State& state) {
     writeRecords(state, OrvLogger::logLevelMessage, written, 4000);
 }
 
+/**
+ * What nobody can leave out of a record that is written: the system calls by which the destination opens the file,
+ * looks whether it is full, keeps signals away from the host, writes the line and closes the file.
+ */
+void systemCallsOfARecord(benchmark::State& state) {
+    using Norv::Agent::Descriptor;
+    using Norv::Agent::FolderOfFile;
+    const std::string path = std::string(std::getenv("ORV_AGENT_CONFIG")) + ".log";
+    std::string line(200, 'x');
+    line.back() = '\n';
+    const iovec piece{line.data(), line.size()};
+    for (auto _ : state) {
+        const FolderOfFile folder(path);
+        const Descriptor file =
+            folder.openFile(O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOCTTY | O_NONBLOCK, 0640);
+        struct stat status {};
+        sigset_t signals{};
+        sigset_t before{};
+        if (!file.isOpen() || fstat(file.number(), &status) != 0 ||
+            pthread_sigmask(SIG_BLOCK, &signals, &before) != 0 || writev(file.number(), &piece, 1) < 0 ||
+            pthread_sigmask(SIG_SETMASK, &before, nullptr) != 0) {
+            state.SkipWithError("a system call failed");
+            return;
+        }
+    }
+}
+
 BENCHMARK(filteredStep)->Arg(1)->Arg(100);
 BENCHMARK(filteredOperation)->Arg(1)->Arg(100);
 BENCHMARK(filteredTrace)->Arg(1)->Arg(100);
 BENCHMARK(writtenToAFile)->Arg(1)->Arg(100);
+BENCHMARK(systemCallsOfARecord);
 
 } // namespace
 

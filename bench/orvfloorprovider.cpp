@@ -1,8 +1,8 @@
 /**
  * The floor: providers that do only what the power management provider cannot avoid. They make the same calls of the
- * broker and of the agent (walk through the tree, properties, the system's name, texts), and as many log records of the
- * same levels, with a constant text. They also serve the computer systems to which the associations refer; the
- * environment variable ORV_BENCH_SYSTEMS has their number.
+ * broker and of the agent (walk through the tree, properties, the system's name, texts), a record of each node, and as
+ * many log records of the same levels, with a constant text. They also serve the computer systems to which the
+ * associations refer; the environment variable ORV_BENCH_SYSTEMS has their number.
  */
 #include "Norv/Common.h"
 #include "Norv/Instrumentation.h"
@@ -14,7 +14,9 @@
 #include "cmpimacs.h"
 
 #include <cstdlib>
+#include <map>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -48,19 +50,39 @@ CMPIStatus leave(const CMPIResult* result) {
     return {CMPI_RC_OK, nullptr};
 }
 
-/** The nodes of the tree; all of their properties are read. */
-std::vector<std::string> readNodes() {
-    std::vector<std::string> nodes;
+/** What each request has to know of a node. */
+struct Record {
+    std::string path;
+    std::string name;
+    std::string elementName;
+    std::string capabilitiesElementName;
+    unsigned int powerState;
+};
+
+/** The nodes of the tree by name; all of their properties are read. */
+std::map<std::string, Record> readNodes() {
+    std::map<std::string, Record> nodes;
     Norv::Instrumentation cursor;
     cursor.selectNode(Norv::NodeLexicon::POWER_MANAGEMENT_NODE);
     std::vector<unsigned int> powerStates;
     unsigned int powerState = 0;
     for (; cursor; ++cursor) {
-        nodes.push_back(cursor.convertPathToString(cursor.getPathToNode()));
+        std::string path = cursor.convertPathToString(cursor.getPathToNode());
         cursor.getProperty(Norv::NodeLexicon::POWER_STATE_LIST, powerStates);
         cursor.getProperty(Norv::NodeLexicon::POWER_STATE, powerState);
+        const std::string name = "PowerStateManagement_" + path;
+        std::string capabilities = "PowerStateManagementCapabilities_" + path;
+        nodes.try_emplace(nodes.end(), name, Record{std::move(path), name, name, std::move(capabilities), powerState});
     }
     return nodes;
+}
+
+const std::string& nameOf(const std::pair<const std::string, Record>& node) {
+    return node.second.path;
+}
+
+const std::string& nameOf(const std::string& system) {
+    return system;
 }
 
 CMPIObjectPath* newPath(const CMPIObjectPath* ref, const char* className) {
@@ -175,8 +197,8 @@ CMPIStatus notSupported() {
                                                 const CMPIObjectPath* ref) {                                           \
         enter();                                                                                                       \
         logRecords(2, progressLevel);                                                                                  \
-        for (const std::string& node : nodes()) {                                                                      \
-            CMReturnObjectPath(result, newObjectPath(ref, node));                                                      \
+        for (const auto& node : nodes()) {                                                                             \
+            CMReturnObjectPath(result, newObjectPath(ref, nameOf(node)));                                              \
         }                                                                                                              \
         return leave(result);                                                                                          \
     }                                                                                                                  \
@@ -184,8 +206,8 @@ CMPIStatus notSupported() {
                                             const CMPIObjectPath* ref, const char** properties) {                      \
         enter();                                                                                                       \
         logRecords(1, progressLevel);                                                                                  \
-        for (const std::string& node : nodes()) {                                                                      \
-            CMReturnInstance(result, newInstance(ref, node, properties));                                              \
+        for (const auto& node : nodes()) {                                                                             \
+            CMReturnInstance(result, newInstance(ref, nameOf(node), properties));                                      \
         }                                                                                                              \
         return leave(result);                                                                                          \
     }                                                                                                                  \
@@ -196,7 +218,7 @@ CMPIStatus notSupported() {
         CMGetCharPtr(CMGetKey(ref, key, nullptr).value.string);                                                        \
         logRecords(2, progressLevel);                                                                                  \
         logRecords(1, operationLevel);                                                                                 \
-        CMReturnInstance(result, newInstance(ref, nodes().front(), properties));                                       \
+        CMReturnInstance(result, newInstance(ref, nameOf(*nodes().begin()), properties));                              \
         return leave(result);                                                                                          \
     }                                                                                                                  \
     CMInstanceMIStub(Class##_, Floor##Class##Provider, broker, CMNoHook)

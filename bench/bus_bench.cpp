@@ -6,8 +6,10 @@
 #include "LogindStandIn.h"
 #include "PrivateBus.h"
 
+#include "agentlog/LogTap.h"
 #include "classes/Catalogue.h"
 #include "dispatch/Dispatcher.h"
+#include "power/PowerRequests.h"
 #include "registry/RegistrationReader.h"
 
 #include <benchmark/benchmark.h>
@@ -21,6 +23,7 @@
 #include <numeric>
 #include <stdexcept>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -40,6 +43,15 @@ ObjectPath servicePath() {
                             {"Name", stringValue("PowerStateManagement_system")},
                             {"SystemCreationClassName", stringValue("TALVO_ComputerSystem")},
                             {"SystemName", stringValue("bench.example")}});
+}
+
+ObjectPath systemPath() {
+    return pathOf("TALVO_ComputerSystem",
+                  {{"CreationClassName", stringValue("TALVO_ComputerSystem")}, {"Name", stringValue("bench.example")}});
+}
+
+std::vector<NamedValue> rebootOf(ObjectPath system) {
+    return {{"PowerState", unsignedValue(CMPI_uint16, 5)}, {"ManagedElement", referenceValue(std::move(system))}};
 }
 
 /** One reading of the machine's state asks six questions at once. */
@@ -72,14 +84,18 @@ const Measured operations[] = {
     {"RequestPowerStateChange",
      {reading, check, request},
      [](Dispatcher& dispatcher) {
-         const std::vector<NamedValue> arguments = {{"PowerState", unsignedValue(CMPI_uint16, 5)},
-                                                    {"ManagedElement", referenceValue(pathOf("TALVO_ComputerSystem"))}};
-         dispatcher.invokeMethod({}, pathOf(service), "RequestPowerStateChange", arguments);
+         dispatcher.invokeMethod({}, servicePath(), "RequestPowerStateChange", rebootOf(systemPath()));
      }},
     associators("Associators, computer system", "TALVO_AssociatedPowerManagementService", {reading, reading}),
     associators("Associators, capabilities", "TALVO_PowerManagementElementCapabilities", {reading, reading, reading}),
     // As clients mostly ask: whether the service is there, and then the providers of all associations.
     associators("Associators", "", {reading, reading, reading, reading, reading, reading}),
+    // As clients make the request: whether the service is there, and whose power it manages, and then the provider.
+    {"InvokeMethod",
+     {reading, reading, reading, reading, check, request},
+     [](Dispatcher& dispatcher) {
+         dispatcher.callMethod({}, servicePath(), "RequestPowerStateChange", rebootOf(systemPath()));
+     }},
 };
 
 void configure(const PrivateBus& bus) {
@@ -143,7 +159,10 @@ int main(int argc, char** argv) {
         configure(bus);
         LogindStandIn logind;
         const Catalogue catalogue = readCatalogue(ORV_SCHEMA_FOLDER);
-        Dispatcher dispatcher(Registry(readRegistrations(ORV_SCHEMA_FOLDER)), {{ORV_LIBRARY_FOLDER}, &catalogue});
+        LogTap log;
+        const PowerRequestRule powerRequests(catalogue, log);
+        Dispatcher dispatcher(Registry(readRegistrations(ORV_SCHEMA_FOLDER)),
+                              {{ORV_LIBRARY_FOLDER}, &catalogue, &log, {&powerRequests}});
         for (const Measured& measured : operations) {
             benchmark::RegisterBenchmark(measured.name, measure, std::ref(dispatcher), std::ref(logind),
                                          std::cref(measured));

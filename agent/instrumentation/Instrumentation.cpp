@@ -3,6 +3,7 @@
 
 #include "Backend.h"
 #include "Report.h"
+#include "base/Utf8.h"
 #include "config/Configuration.h"
 
 #include <cerrno>
@@ -75,7 +76,7 @@ public:
     /** Writes the record, and returns whether the request was accepted. */
     bool reported(const PowerRequestOutcome& outcome) {
         _text = outcome.accepted ? Norv::acceptedRequestText : Norv::refusedRequestText;
-        _text.append(beginningOf(outcome.description)).append(_requester);
+        _text.append(beginningOf(outcome.description, longestDescription)).append(_requester);
         OrvLog::OrvLogger::logLevelMessage(
             static_cast<const char*>(__func__), __FILE__, __LINE__, _category, alwaysWrittenLevel, nullptr,
             outcome.accepted ? OrvLog::POWER_REQUEST_ACCEPTED_RECORD : OrvLog::POWER_REQUEST_REFUSED_RECORD, 0, _text);
@@ -86,18 +87,6 @@ private:
     static constexpr std::size_t longestPrefix = 32;
     /** In bytes; a line of the log has no room for more. */
     static constexpr std::size_t longestDescription = 3072;
-
-    /** As much of the text as there is room for, in whole UTF-8 characters. */
-    static std::string_view beginningOf(std::string_view text) {
-        if (text.size() <= longestDescription) {
-            return text;
-        }
-        std::size_t size = longestDescription;
-        while (size > 0 && (static_cast<unsigned char>(text[size]) & 0xc0) == 0x80) {
-            --size;
-        }
-        return text.substr(0, size);
-    }
 
     const std::string _category = instrumentationCategory;
     const std::string _requester = requester();

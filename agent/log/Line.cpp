@@ -1,6 +1,7 @@
 #include "Line.h"
 
 #include "base/UtcText.h"
+#include "base/Utf8.h"
 
 #include <algorithm>
 #include <charconv>
@@ -52,10 +53,10 @@ void Line::appendNumber(int number) {
     append({digits.data(), end});
 }
 
-// As much of the text as there is room for.
+// Appends the whole characters for which there is room.
 void Line::appendText(std::string_view text) {
     const std::size_t room = _full ? 0 : _capacity - cutOff.size() - _size;
-    append(text.substr(0, room));
+    append(Norv::Agent::beginningOf(text, room));
     _full = _full || text.size() > room;
 }
 
@@ -89,13 +90,6 @@ void Line::end() {
     if (!_full) {
         _text[_size++] = '\n';
         return;
-    }
-    // If the cut goes through a UTF-8 character, the character's other bytes are removed, too.
-    while ((static_cast<unsigned char>(_text[_size - 1]) & 0xc0) == 0x80) {
-        --_size;
-    }
-    if (static_cast<unsigned char>(_text[_size - 1]) >= 0xc0) {
-        --_size;
     }
     std::ranges::copy(cutOff, _text.begin() + _size);
     _size += cutOff.size();

@@ -1,9 +1,9 @@
 #include "cimxml/HttpHeaders.h"
 
-#include "cimxml/StatusCodes.h"
-
+#include "basics/Trimmed.h"
 #include "cimxml/Markup.h"
 #include "cimxml/ProtocolError.h"
+#include "cimxml/StatusCodes.h"
 #include "classes/Literals.h"
 
 #include <algorithm>

@@ -1,5 +1,6 @@
 #include "cimxml/ValueReader.h"
 
+#include "basics/Trimmed.h"
 #include "cimxml/Markup.h"
 #include "cimxml/ProtocolError.h"
 #include "cimxml/RequestReader.h"

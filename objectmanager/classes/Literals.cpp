@@ -219,12 +219,6 @@ std::string typeName(CMPIType type) {
     return (type & CMPI_ARRAY) != 0 ? name + "[]" : name;
 }
 
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view whiteSpace = " \t\r\n";
-    const std::size_t start = std::min(text.find_first_not_of(whiteSpace), text.size());
-    return text.substr(start, text.find_last_not_of(whiteSpace) - start + 1);
-}
-
 bool isInteger(CMPIType type) {
     return type >= CMPI_uint8 && type <= CMPI_sint64;
 }

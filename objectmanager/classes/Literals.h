@@ -36,9 +36,6 @@ std::optional<CMPIType> typeByName(std::string_view name);
 /** The name of a type as in a declaration, for example "uint16", "uint16[]" for an array, "reference", "instance". */
 std::string typeName(CMPIType type);
 
-/** The text without the white space at its ends. */
-std::string_view trimmed(std::string_view text);
-
 bool isInteger(CMPIType type);
 bool isReal(CMPIType type);
 

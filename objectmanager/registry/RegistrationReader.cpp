@@ -1,5 +1,6 @@
 #include "registry/RegistrationReader.h"
 
+#include "basics/Trimmed.h"
 #include "classes/Files.h"
 #include "classes/Literals.h"
 #include "classes/MofLexer.h"

@@ -1,6 +1,7 @@
 #include "server/HttpParser.h"
 
 #include "basics/Printable.h"
+#include "basics/Trimmed.h"
 #include "server/HttpStatus.h"
 
 #include <fmt/format.h>
@@ -38,10 +39,9 @@ bool isTargetCharacter(char character) {
     return character > ' ' && character != '\x7f';
 }
 
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view blanks = " \t";
-    const std::size_t first = text.find_first_not_of(blanks);
-    return first == std::string_view::npos ? "" : text.substr(first, text.find_last_not_of(blanks) + 1 - first);
+/** Removes the blanks that may stand around values of headers (RFC 9110, section 5.6.3), and no other white space. */
+std::string_view withoutBlanks(std::string_view text) {
+    return trimmed(text, " \t");
 }
 
 /** Removes the first line from the text, and returns it. The text must contain the line's end. */
@@ -80,7 +80,7 @@ void parseHeader(std::string_view line, HttpHeaders& headers) {
     if (colon == std::string_view::npos || !isToken(name)) {
         refuse(fmt::format("found \"{}\", expected the name of a header, followed by a colon", printable(name)));
     }
-    const std::string_view value = trimmed(line.substr(colon + 1));
+    const std::string_view value = withoutBlanks(line.substr(colon + 1));
     if (!std::all_of(value.begin(), value.end(), isValueCharacter)) {
         refuse(fmt::format("found a control character in the header {}, expected none", name));
     }
@@ -140,7 +140,7 @@ bool hasToken(const HttpHeaders& headers, std::string_view name, std::string_vie
         std::string_view rest = header.second;
         while (!rest.empty()) {
             const std::size_t comma = std::min(rest.find(','), rest.size());
-            if (equalTokens(trimmed(rest.substr(0, comma)), token)) {
+            if (equalTokens(withoutBlanks(rest.substr(0, comma)), token)) {
                 return true;
             }
             rest.remove_prefix(std::min(comma + 1, rest.size()));
@@ -220,7 +220,7 @@ void ChunkedBody::take(std::string& received, std::string& data) {
         case Part::size:
             line = lineOf(rest, longestSizeLine);
             if (line) {
-                const std::string_view digits = trimmed(line->substr(0, line->find(';')));
+                const std::string_view digits = withoutBlanks(line->substr(0, line->find(';')));
                 const char* const end = digits.data() + digits.size();
                 constexpr int hexadecimal = 16;
                 const auto [last, error] = std::from_chars(digits.data(), end, _missing, hexadecimal);

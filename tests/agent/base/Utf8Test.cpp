@@ -2,8 +2,13 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
+#include <iterator>
+#include <string>
+
 namespace {
 
+using Norv::Agent::beginningOf;
 using Norv::Agent::utf8From;
 using Norv::Agent::wideFrom;
 
@@ -18,6 +23,15 @@ TEST(Utf8Test, IsNotReadFromAnythingElse) {
                              "\xff", "a\xe3\x81"}) {
         EXPECT_EQ(wideFrom(text), std::nullopt) << testing::PrintToString(text);
     }
+}
+
+TEST(Utf8Test, BeginsWithWholeCharacters) {
+    const std::string text = "a\u00e4\u96fbb";
+    const char* const beginnings[] = {"", "a", "a", "a\u00e4", "a\u00e4", "a\u00e4", "a\u00e4\u96fb", "a\u00e4\u96fbb"};
+    for (std::size_t longest = 0; longest < std::size(beginnings); ++longest) {
+        EXPECT_EQ(beginningOf(text, longest), beginnings[longest]);
+    }
+    EXPECT_EQ(beginningOf(text, 1000), text);
 }
 
 } // namespace

@@ -15,7 +15,7 @@ namespace AgentTest {
 
 namespace {
 
-void require(int result, const char* what) {
+void requireSuccess(int result, const char* what) {
     if (result < 0) {
         throw std::system_error(-result, std::generic_category(), what);
     }
@@ -33,14 +33,14 @@ void LogindStandIn::Unreferencer::operator()(sd_bus_message* message) const {
 
 LogindStandIn::LogindStandIn() : _end(eventfd(0, EFD_CLOEXEC)) {
     sd_bus* bus = nullptr;
-    require(sd_bus_open_system(&bus), "sd_bus_open_system");
+    requireSuccess(sd_bus_open_system(&bus), "sd_bus_open_system");
     _bus.reset(bus);
     const auto take = [](sd_bus_message* call, void* standIn, sd_bus_error* /*error*/) {
         static_cast<LogindStandIn*>(standIn)->take(call);
         return 1;
     };
-    require(sd_bus_add_object(bus, nullptr, "/org/freedesktop/login1", take, this), "sd_bus_add_object");
-    require(sd_bus_request_name(bus, "org.freedesktop.login1", 0), "org.freedesktop.login1");
+    requireSuccess(sd_bus_add_object(bus, nullptr, "/org/freedesktop/login1", take, this), "sd_bus_add_object");
+    requireSuccess(sd_bus_request_name(bus, "org.freedesktop.login1", 0), "org.freedesktop.login1");
     _thread = std::thread([this] { serve(); });
 }
 

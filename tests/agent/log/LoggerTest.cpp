@@ -78,6 +78,8 @@ TEST(LoggerTest, NoCharacterIsCutInTwo) {
         }
     });
     EXPECT_THAT(process.standardError(), testing::Each(EndsWith("電...")));
+    // A character that ends where the line is cut is kept: so one of the lines has the full length.
+    EXPECT_THAT(process.standardError(), testing::Contains(SizeIs(4095)));
     EXPECT_THAT(process.standardError(), SizeIs(3));
 }
 

@@ -89,6 +89,18 @@ TEST_F(ServiceTest, TellsThatTheMachineRefused) {
     EXPECT_THAT(status(), Not(HasSubstr("<ERROR")));
 }
 
+TEST_F(ServiceTest, RecordsNothingThatForgesOrTurnsALineOfTheLog) {
+    std::string target;
+    ServiceSettings settings;
+    settings.recorder = [&](const Audit::CallRecord& record) { target = record.target; };
+    Service recording = serviceWith(settings);
+    WireCase invocation = readWireCase(contentOf(std::filesystem::path(TEST_CASES) / "stranger-invokes.wire"));
+    const std::string name = "machine.example";
+    invocation.body.replace(invocation.body.find(name), name.size(), "a\u202eb\u009bc");
+    recording.answer(invocation.request(), invocation.caller);
+    EXPECT_THAT(target, HasSubstr("a\\xe2\\x80\\xaeb\\xc2\\x9bc"));
+}
+
 TEST_F(ServiceTest, AnswersSeveralThreadsAtOnce) {
     const std::string disks = enumerate("Test_Disk").body;
     const std::string failure = enumerate("Test_Fails").body;

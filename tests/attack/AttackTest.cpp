@@ -125,6 +125,18 @@ TEST_F(AttackTest, LargeAnswersThatAreNeverRead) {
     attack([this] { holdSometimes(enumerate("Test_Disk", "root/test", insider)); });
 }
 
+/** The largest answer that the shipped providers have: each of 255 services with each of as many capabilities. */
+TEST_F(AttackTest, ReadsOfObjectsByTheThousand) {
+    constexpr int mostNodes = 255;
+    std::string nodes = "shutdown-time = 0\n[[instrumentation.simulated.node]]\npath = \"chassis/blade1\"\n";
+    for (int number = 2; number <= mostNodes; ++number) {
+        nodes += "[[instrumentation.simulated.node]]\npath = \"chassis/blade" + std::to_string(number) + "\"\n";
+    }
+    configure(nodes);
+    serveWithLogIns();
+    attack([this] { holdSometimes(enumerate("TALVO_PowerManagementElementCapabilities", "root/cimv2", insider)); });
+}
+
 TEST_F(AttackTest, PipelinesWhoseAnswersAreNeverRead) {
     serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
     const std::string request = enumerate("Test_Disk", "root/test", insider);

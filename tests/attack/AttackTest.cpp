@@ -143,6 +143,26 @@ TEST_F(AttackTest, PipelinesWhoseAnswersAreNeverRead) {
     attack([&] { hold(request + request + request); });
 }
 
+/** Each is refused, but so many connections always have another one that keep the processors busy. */
+TEST_F(AttackTest, PipelinesWithoutALogIn) {
+    serveWithLogIns();
+    std::string requests;
+    for (int count = 0; count < 20; ++count) {
+        requests += "POST / HTTP/1.1\r\nHost: localhost\r\nContent-Length: 0\r\n\r\n";
+    }
+    attack([&] {
+        hold(requests);
+        for (const HttpClient& each : _held) {
+            const bool isAnswered = each.isReadable();
+            while (each.isReadable() && !each.receiveSome(100'000).empty()) {
+            }
+            if (isAnswered) {
+                each.send(requests);
+            }
+        }
+    });
+}
+
 TEST_F(AttackTest, AnswersThatAreDripped) {
     serveWithLogIns({}, {{"TEST_MORE_DISKS", "5000"}});
     attack([this] {

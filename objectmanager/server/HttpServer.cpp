@@ -199,6 +199,12 @@ void HttpServer::Implementation::acceptOne() {
         }
         return;
     }
+    // A connection that its client has reset before it is accepted costs no thread: very many of them hold up nobody.
+    pollfd client{socket, 0, 0};
+    if (poll(&client, 1, 0) > 0) {
+        close(socket);
+        return;
+    }
     try {
         begin(socket, address);
     } catch (const std::bad_alloc&) {

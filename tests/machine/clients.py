@@ -75,7 +75,7 @@ class Client:
         return self._paths("ain", service, "-arr", "Capabilities")[0]
 
     def power_state(self):
-        """As the association of the machine with its service shows it; another answer's text, None where none comes."""
+        """The power state that the association of machine and service has; any other answer as text; else None."""
         answer = self.wbemcli("ei", f"{NAMESPACE}:TALVO_AssociatedPowerManagementService", "PowerState")
         found = re.search(r" PowerState=(\d+)$", answer.text)
         if answer.status == 0 and found:

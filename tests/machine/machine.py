@@ -13,7 +13,7 @@ import socket
 import subprocess
 import time
 
-# In seconds, of a machine that is emulated on a busy host: they are there to end what hangs, not to measure.
+# Limits in seconds for a machine that is emulated on a busy host: they end what hangs, and measure nothing.
 BOOT_PATIENCE = 900
 PATIENCE = 900
 PAUSE = 1
@@ -63,7 +63,7 @@ class JsonSocket:
         self._socket.sendall(before + json.dumps(message).encode() + b"\n")
 
     def receive(self, patience=None):
-        """The next message; None where none comes in time."""
+        """The next message; None if none comes in time."""
         deadline = None if patience is None else time.monotonic() + patience
         while b"\n" not in self._received:
             if deadline is not None:
@@ -178,7 +178,7 @@ class Machine:
     # From inside
 
     def _agent(self, patience):
-        """A conversation with the guest agent; None where nobody answers in time."""
+        """A conversation with the guest agent; None if it does not answer in time."""
         agent = JsonSocket(self._agent_path, patience)
         number = time.monotonic_ns() % 2**31
         try:

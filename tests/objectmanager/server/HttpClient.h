@@ -1,4 +1,4 @@
-/** A client that does exactly what a test says, right or wrong. */
+/** An HTTP client that sends exactly what a test says, correct or not. */
 #ifndef TESTS_SERVER_HTTPCLIENT_H
 #define TESTS_SERVER_HTTPCLIENT_H
 
@@ -22,7 +22,7 @@ struct Reply {
     std::string body;
     /** How many chunks there were. */
     std::size_t chunks = 0;
-    /** What came behind the last chunk. */
+    /** The trailers, after the last chunk. */
     std::map<std::string, std::string> trailers;
 };
 
@@ -30,8 +30,8 @@ struct Reply {
 class HttpClient {
 public:
     /**
-     * @param from the address that the client has; any where it is empty.
-     * @throws std::system_error where it is not let in.
+     * @param from the client's own address; empty for any.
+     * @throws std::system_error if it cannot connect.
      */
     explicit HttpClient(std::uint16_t port, const std::string& to = "127.0.0.1", const std::string& from = "");
     HttpClient(const HttpClient&) = delete;
@@ -40,29 +40,29 @@ public:
     ~HttpClient();
 
     /**
-     * Agrees with the server on keys, whatever its certificate is. What is sent and received from now on is encrypted.
-     * @throws std::runtime_error where the server does not agree.
+     * Carries out a TLS handshake, and accepts any certificate. Everything that follows is encrypted.
+     * @throws std::runtime_error if the handshake fails.
      */
     void encrypt();
     /** The certificate that the server has shown, in DER. */
     std::string certificate() const;
 
-    /** @return false where the server has closed the connection. */
+    /** Sends a text. @return false if the server has closed the connection. */
     bool send(std::string_view text) const;
     /**
      * Waits for the whole reply. One without a length or chunks ends with the connection.
-     * @throws std::runtime_error where the connection ends before.
+     * @throws std::runtime_error if the connection ends before.
      */
     Reply receive();
     /** Waits until something has come, and takes as much of it as there is room for. */
     std::string receiveSome(std::size_t most) const;
-    /** Whether something has come that was not received yet, or the end. */
+    /** Whether bytes, or the end of the connection, can be received. */
     bool isReadable() const;
-    /** Waits for the end of the connection. @return what came before. */
+    /** Waits for the end of the connection. @return what was received before. */
     std::string receiveAll();
     /** Whether the connection has ended with a reset. */
     bool wasReset() const { return _wasReset; }
-    /** Says that nothing more comes, and stays to read. */
+    /** Closes the sending direction; the client can still receive. */
     void endSending() const;
     /** Goes away without a word. */
     void reset();
@@ -72,7 +72,7 @@ private:
         void operator()(gnutls_session_int* session) const;
     };
 
-    /** Takes what has come; waits for that. @return how much it is, 0 at the end of the connection. */
+    /** Waits for bytes, and takes them. @return how many; 0 at the end of the connection. */
     std::size_t take(char* data, std::size_t size) const;
     bool fill();
     void requireMore();

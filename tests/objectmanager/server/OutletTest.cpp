@@ -29,7 +29,7 @@ protected:
         return {200, {}, "three"};
     }
 
-    /** Fails behind its first piece. */
+    /** Fails after the first piece was sent. */
     static HttpReply brokenOff(const HttpRequest& request, const Caller& /*caller*/) {
         request.outlet->begin({200, {}, "one"});
         return {200, {{"Reason", "no more"}}, "", "found no more"};

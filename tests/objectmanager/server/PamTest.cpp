@@ -6,7 +6,7 @@
 
 #include <chrono>
 
-/** PAM itself loses a few bytes where a service is not configured. LeakSanitizer asks for this by its name. */
+/** PAM itself leaks a few bytes if a service is not configured. LeakSanitizer calls this function by its name. */
 extern "C" const char* __lsan_default_suppressions();
 extern "C" const char* __lsan_default_suppressions() {
     return "leak:libpam.so";

@@ -1,4 +1,4 @@
-/** A server on a free port, and what it logs. */
+/** A server on a free port, whose log lines are kept. */
 #ifndef TESTS_SERVER_SERVED_H
 #define TESTS_SERVER_SERVED_H
 
@@ -22,7 +22,7 @@ namespace ServerTest {
 using namespace ObjectManager;
 using namespace std::chrono_literals;
 
-/** Waits until it is so; where it does not come to be so, the test fails. */
+/** Waits until a condition is true; if it does not become true, the test fails. */
 template <typename Condition>
 void waitUntil(Condition isSo) {
     const auto end = std::chrono::steady_clock::now() + 60s;
@@ -34,7 +34,7 @@ void waitUntil(Condition isSo) {
 
 class Served : public testing::Test {
 protected:
-    /** What the server answers where a test serves nothing else: the request's body. */
+    /** The default handler: answers with the request's body. */
     static Server::HttpReply echo(const Server::HttpRequest& request, const Server::Caller& /*caller*/) {
         return {200, {{"Content-Type", "text/plain"}}, std::string(request.body)};
     }
@@ -60,7 +60,7 @@ protected:
         return _logged;
     }
 
-    /** Waits until so many lines are logged. */
+    /** Waits until the log has `lines` lines, and returns them. */
     std::vector<std::string> logged(std::size_t lines) {
         waitUntil([&] { return logged().size() >= lines; });
         return logged();

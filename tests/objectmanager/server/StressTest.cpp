@@ -61,7 +61,7 @@ std::vector<Exchange> exchanges() {
     return all;
 }
 
-/** What a case expects, read as what came over the wire is. */
+/** The reply that a case expects, in the form in which a client receives it. */
 void expectReply(const Reply& reply, const Exchange& exchange) {
     const WireCase expected = CimXml::readWireCase("# reply\n" + exchange.expected.reply);
     EXPECT_EQ(std::to_string(reply.status), expected.method) << exchange.name;
@@ -87,7 +87,7 @@ std::string requestOf(const std::string& method, const std::string& parameters) 
     return requestOf(given);
 }
 
-/** What stands in a document between two texts; empty where it has not both. */
+/** The part of a document between two texts; empty if it does not contain both. */
 std::string between(const std::string& document, const std::string& before, const std::string& behind) {
     const std::size_t found = document.find(before);
     if (found == std::string::npos) {
@@ -113,7 +113,7 @@ Reply ask(HttpClient& client, const std::string& request) {
     return reply;
 }
 
-/** The instances of Test_Disk, opened with so many of them and pulled one by one. */
+/** The instances of Test_Disk: opens the enumeration with some of them, and pulls the others one by one. */
 std::string pulledDisks(HttpClient& client, int atOnce) {
     const std::string count =
         "<IPARAMVALUE NAME=\"MaxObjectCount\"><VALUE>" + std::to_string(atOnce) + "</VALUE></IPARAMVALUE>";
@@ -230,7 +230,7 @@ TEST_F(StressTest, LargeAnswersShareABoundedMemory) {
     done = true;
     watching.join();
     unsetenv("TEST_MORE_DISKS");
-    // The half of one network, one beyond it, and what is free in each that is being answered.
+    // The half of one network, one answer beyond the limit, and the free part of each answer that is being made.
     EXPECT_LT(most, 512 * kilobyte + ofOne + settings.threads * 512 * kilobyte);
 }
 

@@ -28,19 +28,19 @@ Request* Request::current() {
 }
 
 CMPIObjectPath* Request::objectPath(const ObjectPath& path) {
-    return newObjectOf<CMPIObjectPath>(*this, fromModel(_arena, path));
+    return newObject<CMPIObjectPath>(*this, path);
 }
 
 CMPIInstance* Request::instance(const Instance& instance) {
-    return newObjectOf<CMPIInstance>(*this, fromModel(_arena, instance));
+    return newObject<CMPIInstance>(*this, instance);
 }
 
 CMPIArgs* Request::arguments(const std::vector<NamedValue>& arguments) {
-    return newObjectOf<CMPIArgs>(*this, {fromModel(_arena, arguments)});
+    return newObject<CMPIArgs>(*this, arguments.begin(), arguments.end());
 }
 
-CMPIContext* Request::context(const std::vector<NamedValue>& entries) {
-    return newObjectOf<CMPIContext>(*this, {fromModel(_arena, entries)});
+CMPIContext* Request::context(std::initializer_list<NamedValue> entries) {
+    return newObject<CMPIContext>(*this, entries);
 }
 
 const char** Request::propertyList(const PropertyList& properties) {

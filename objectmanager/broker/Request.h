@@ -6,6 +6,7 @@
 #include "broker/Broker.h"
 
 #include <cstddef>
+#include <initializer_list>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -38,7 +39,7 @@ public:
     CMPIObjectPath* objectPath(const ObjectPath& path);
     CMPIInstance* instance(const Instance& instance);
     CMPIArgs* arguments(const std::vector<NamedValue>& arguments);
-    CMPIContext* context(const std::vector<NamedValue>& entries);
+    CMPIContext* context(std::initializer_list<NamedValue> entries);
     /** Ended by a null; null itself where the list means all properties. */
     const char** propertyList(const PropertyList& properties);
 

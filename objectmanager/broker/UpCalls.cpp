@@ -10,23 +10,23 @@ namespace {
 
 Invocation invocationOf(const CMPIContext* context) {
     Invocation invocation;
-    const NamedItemsContent* content = contentOf(context, nullptr);
-    if (content == nullptr) {
+    const NamedValues* entries = contentOf(context, nullptr);
+    if (entries == nullptr) {
         return invocation;
     }
-    if (const NamedItem* principal = findItem(content->items, CMPIPrincipal);
-        principal != nullptr && !principal->item.null && principal->item.type == CMPI_string) {
-        invocation.principal = principal->item.content.text;
+    const NamedValue* principal = find(*entries, CMPIPrincipal);
+    if (const Text* user = principal != nullptr ? std::get_if<Text>(&principal->value.content) : nullptr) {
+        invocation.principal = *user;
     }
-    if (const NamedItem* flags = findItem(content->items, CMPIInvocationFlags);
-        flags != nullptr && !flags->item.null && flags->item.type == CMPI_uint32) {
-        std::memcpy(&invocation.flags, &flags->item.content.scalar, sizeof invocation.flags);
+    if (const NamedValue* flags = find(*entries, CMPIInvocationFlags);
+        flags != nullptr && flags->value.type == CMPI_uint32 && !flags->value.isNull()) {
+        invocation.flags = static_cast<CMPIUint32>(std::get<std::uint64_t>(flags->value.content));
     }
     return invocation;
 }
 
 CMPIStatus failed(CMPIrc code, const std::string& message) {
-    return {code, returnedString(message.c_str(), nullptr)};
+    return {code, returnedString(message, nullptr)};
 }
 
 /**
@@ -67,12 +67,12 @@ CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call cal
 template <typename Call>
 CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path, Call call) {
     CMPIStatus status;
-    const PathContent* content = contentOf(path, &status);
+    const ObjectPath* content = contentOf(path, &status);
     if (content == nullptr) {
         return status;
     }
     return upCall(broker, context, [&](Operations& operations, Request& request, const Invocation& invocation) {
-        call(operations, request, invocation, toModel(*content));
+        call(operations, request, invocation, *content);
     });
 }
 
@@ -88,32 +88,29 @@ CMPIStatus instanceCall(const CMPIBroker* broker, const CMPIContext* context, co
     return pathCall(
         broker, context, path,
         [&](Operations& operations, Request& request, const Invocation& invocation, const ObjectPath& target) {
-            call(operations, request, invocation, target, fullInstance(*content, request.broker().classes()));
+            Instance full = content->instance;
+            completePath(full.path, *content, request.broker().classes());
+            call(operations, request, invocation, target, full);
         });
 }
 
 /** Collects paths or instances for an enumeration in a request. */
 class Elements {
 public:
-    Elements(Request& request, CMPIType type) : _request(request), _type(type) {}
+    Elements(Request& request, CMPIType type)
+        : _request(request), _enumeration(place<EnumerationContent>(request.memory(), type)) {}
 
     template <typename Object>
-    void add(Object&& object) {
-        const Value value{_type, std::make_shared<const Object>(std::forward<Object>(object))};
-        _items.push_back(fromModel(_request.memory(), value));
+    void add(const Object& object) {
+        Value::Array& elements = _enumeration->elements;
+        elements.emplace_back(_enumeration->elementType, Box<Object>(object, elements.get_allocator()));
     }
 
-    CMPIEnumeration* enumeration() {
-        const auto count = static_cast<std::uint32_t>(_items.size());
-        Item* elements = newElements(_request.memory(), count);
-        std::copy(_items.begin(), _items.end(), elements);
-        return newObjectOf<CMPIEnumeration>(_request, {{_type, count, elements}, 0});
-    }
+    CMPIEnumeration* enumeration() { return adopted<CMPIEnumeration>(_request, _enumeration); }
 
 private:
     Request& _request;
-    CMPIType _type;
-    std::vector<Item> _items;
+    EnumerationContent* _enumeration;
 };
 
 /** The object, or null where the call failed. Sets `rc`, where it is not null, to the status. */
@@ -128,14 +125,13 @@ Handle* answer(Handle* object, const CMPIStatus& status, CMPIStatus* rc) {
 CMPIEnumeration* enumerateInstanceNames(const CMPIBroker* broker, const CMPIContext* context,
                                         const CMPIObjectPath* path, CMPIStatus* rc) {
     CMPIEnumeration* result = nullptr;
-    const CMPIStatus status =
-        pathCall(broker, context, path,
-                 [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
-                     Elements names(request, CMPI_ref);
-                     operations.enumerateInstanceNames(invocation, target,
-                                                       [&](ObjectPath&& name) { names.add(std::move(name)); });
-                     result = names.enumeration();
-                 });
+    const CMPIStatus status = pathCall(
+        broker, context, path,
+        [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
+            Elements names(request, CMPI_ref);
+            operations.enumerateInstanceNames(invocation, target, [&](const ObjectPath& name) { names.add(name); });
+            result = names.enumeration();
+        });
     return answer(result, status, rc);
 }
 
@@ -189,7 +185,7 @@ CMPIEnumeration* execQuery(const CMPIBroker* broker, const CMPIContext* context,
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
                      Elements found(request, CMPI_instance);
                      operations.execQuery(invocation, target, query, language,
-                                          [&](Instance&& instance) { found.add(std::move(instance)); });
+                                          [&](const Instance& instance) { found.add(instance); });
                      result = found.enumeration();
                  });
     return answer(result, status, rc);
@@ -203,7 +199,7 @@ CMPIEnumeration* enumerateInstances(const CMPIBroker* broker, const CMPIContext*
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
                      Elements found(request, CMPI_instance);
                      operations.enumerateInstances(invocation, target, propertyListOf(properties),
-                                                   [&](Instance&& instance) { found.add(std::move(instance)); });
+                                                   [&](const Instance& instance) { found.add(instance); });
                      result = found.enumeration();
                  });
     return answer(result, status, rc);
@@ -215,22 +211,20 @@ CMPIData invokeMethod(const CMPIBroker* broker, const CMPIContext* context, cons
     if (method == nullptr) {
         return noData(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    const NamedItemsContent* arguments = contentOf(in, &status);
-    NamedItemsContent* answers = arguments != nullptr ? contentOf(out, &status) : nullptr;
+    const NamedValues* arguments = contentOf(in, &status);
+    NamedValues* answers = arguments != nullptr ? contentOf(out, &status) : nullptr;
     if (answers == nullptr) {
         return noData(rc, status.rc);
     }
     CMPIData data = noData(nullptr, CMPI_RC_OK);
-    status = pathCall(broker, context, path,
-                      [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
-                          const MethodResult result =
-                              operations.invokeMethod(invocation, target, method, toModel(arguments->items));
-                          Memory& memory = *headerOf(out).memory;
-                          for (const NamedValue& argument : result.outArguments) {
-                              setItem(memory, answers->items, argument.name, fromModel(memory, argument.value));
-                          }
-                          data = dataOf(fromModel(request.memory(), result.returnValue), CMPI_goodValue, nullptr);
-                      });
+    status = pathCall(
+        broker, context, path, [&](Operations& operations, Request&, const auto& invocation, const auto& target) {
+            const MethodResult result = operations.invokeMethod(invocation, target, method, argumentsOf(in));
+            for (const NamedValue& argument : result.outArguments) {
+                setValue(*answers, argument.name, Value(argument.value));
+            }
+            data = dataOf(result.returnValue, CMPI_goodValue, nullptr);
+        });
     if (rc != nullptr) {
         *rc = status;
     }
@@ -252,9 +246,9 @@ CMPIEnumeration* associationCall(const CMPIBroker* broker, const CMPIContext* co
         pathCall(broker, context, path,
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& source) {
                      Elements found(request, type);
-                     call(operations, invocation, source, [&](auto objects) {
-                         for (auto& object : objects) {
-                             found.add(std::move(object));
+                     call(operations, invocation, source, [&](const auto& objects) {
+                         for (const auto& object : objects) {
+                             found.add(object);
                          }
                      });
                      result = found.enumeration();
@@ -271,8 +265,8 @@ CMPIEnumeration* associators(const CMPIBroker* broker, const CMPIContext* contex
         broker, context, path, CMPI_instance, rc,
         [&](Operations& operations, const auto& invocation, const auto& source, const auto& take) {
             const AssociationFilter filter = filterOf(associationClass, resultClass, role, resultRole);
-            for (auto& each : operations.associators(invocation, source, filter, propertyListOf(properties))) {
-                take(std::move(each.objects));
+            for (const auto& each : operations.associators(invocation, source, filter, propertyListOf(properties))) {
+                take(each.objects);
             }
         });
 }
@@ -284,8 +278,8 @@ CMPIEnumeration* associatorNames(const CMPIBroker* broker, const CMPIContext* co
                            [&](Operations& operations, const auto& invocation, const auto& source, const auto& take) {
                                const AssociationFilter filter =
                                    filterOf(associationClass, resultClass, role, resultRole);
-                               for (auto& each : operations.associatorNames(invocation, source, filter)) {
-                                   take(std::move(each.objects));
+                               for (const auto& each : operations.associatorNames(invocation, source, filter)) {
+                                   take(each.objects);
                                }
                            });
 }

@@ -30,6 +30,7 @@ protected:
                                       "Test_ReturnsOneAndLeavesOpen",
                                       "Test_ClosesEmpty",
                                       "Test_ReturnsTwo",
+                                      "Test_ReturnsAThousand",
                                       "Test_ReturnsMany",
                                       "Test_ReturnsNull",
                                       "Test_ReturnsReleased",
@@ -45,17 +46,17 @@ protected:
         return Registry(registrations);
     }
 
-    static ObjectPath path(const std::string& className, const std::vector<NamedValue>& keys = {}) {
+    static ObjectPath path(const std::string& className, const NamedValues& keys = {}) {
         return {"", "root/cimv2", className, keys};
     }
 
     static ObjectPath disk(const std::string& name) { return path("Test_Disk", {{"Name", stringValue(name)}}); }
 
-    static std::vector<std::string> namesOf(const std::vector<NamedValue>& values) {
+    static std::vector<std::string> namesOf(std::span<const NamedValue> values) {
         std::vector<std::string> names;
         names.reserve(values.size());
         for (const NamedValue& value : values) {
-            names.push_back(value.name);
+            names.emplace_back(value.name);
         }
         return names;
     }
@@ -97,7 +98,7 @@ TEST_F(DispatcherTest, EnumeratesNamesAndInstances) {
 TEST_F(DispatcherTest, GivesInstancesOneByOne) {
     std::vector<ObjectPath> paths;
     dispatcher.enumerateInstances(invocation, path("Test_Disk"), std::nullopt,
-                                  [&](Instance&& instance) { paths.push_back(std::move(instance.path)); });
+                                  [&](const Instance& instance) { paths.push_back(instance.path); });
     EXPECT_THAT(paths, ElementsAre(disk("a"), disk("b")));
 }
 
@@ -182,7 +183,7 @@ TEST_F(DispatcherTest, GivesTheProviderAContext) {
     const std::vector<Instance> shown =
         dispatcher.enumerateInstances(invocation, path("Test_ShowsContext"), std::nullopt);
     ASSERT_EQ(1U, shown.size());
-    const std::vector<NamedValue>& entries = shown[0].properties;
+    const NamedValues& entries = shown[0].properties;
     EXPECT_THAT(namesOf(entries), ElementsAre(CMPIInitNameSpace, CMPIInvocationFlags, CMPIPrincipal));
     EXPECT_EQ(stringValue("root/cimv2"), entries[0].value);
     EXPECT_EQ(unsignedValue(CMPI_uint32, CMPI_FLAG_LocalOnly), entries[1].value);
@@ -261,6 +262,21 @@ TEST_F(DispatcherTest, ARequestHasSoManyObjectsAndBytesAtMost) {
     EXPECT_THAT(failureOf(getMany),
                 isError(serverLimitsExceeded,
                         "TestProvider needed more than 1000000 bytes, which one request may have at most"));
+}
+
+TEST_F(DispatcherTest, AnEnumerationThatNeedsTooMuchMemoryGivesNothingWhereverTheMemoryEnds) {
+    std::size_t given = 0;
+    for (std::size_t bytes = Arena::chunkBytes; given == 0; bytes += Arena::chunkBytes) {
+        dispatcher.broker().setLimits({.bytes = bytes});
+        try {
+            dispatcher.enumerateInstances(invocation, path("Test_ReturnsAThousand"), std::nullopt,
+                                          [&](const Instance& /*instance*/) { ++given; });
+        } catch (const CimError& error) {
+            ASSERT_EQ(serverLimitsExceeded, error.code) << error.what();
+            ASSERT_EQ(0U, given);
+        }
+    }
+    EXPECT_EQ(1'000U, given);
 }
 
 TEST_F(DispatcherTest, TheOtherInstanceOperationsHaveToCloseTheirResult) {

@@ -101,12 +101,8 @@ private:
     std::size_t _retained = 0;
 };
 
-thread_local Arena::Meter* Arena::Meter::_ofThread = nullptr;
-
 Arena::~Arena() {
-    if (_meter != nullptr) {
-        _meter->_bytes -= _held;
-    }
+    give(_held);
     if (_chunks != nullptr) {
         Pool::instance().release(_chunks);
     }
@@ -176,17 +172,16 @@ void Arena::take(std::size_t bytes) {
         _exhausted = true;
         throw std::bad_alloc();
     }
-    _held += bytes;
     if (_meter != nullptr) {
-        _meter->_bytes += bytes;
-        _meter->grow(_meter->_bytes);
+        _meter->take(bytes);
     }
+    _held += bytes;
 }
 
 void Arena::give(std::size_t bytes) {
     _held -= bytes;
     if (_meter != nullptr) {
-        _meter->_bytes -= bytes;
+        _meter->give(bytes);
     }
 }
 

@@ -2,6 +2,8 @@
 #ifndef BROKER_ARENA_H
 #define BROKER_ARENA_H
 
+#include "model/Operations.h"
+
 #include <array>
 #include <cstddef>
 #include <limits>
@@ -22,30 +24,11 @@ public:
     static constexpr std::size_t retainedBytes = std::size_t{128} * 1024 * 1024;
 
     /**
-     * Is told what the arenas hold together that its thread makes while it is there. It is the only one of its thread,
-     * and outlives those arenas.
+     * @param limit how many bytes the arena holds at most; an allocation that needs more fails with std::bad_alloc.
+     * @param meter is told what the arena holds; may be null, outlives the arena.
      */
-    class Meter {
-    public:
-        Meter() { _ofThread = this; }
-        Meter(const Meter&) = delete;
-        Meter& operator=(const Meter&) = delete;
-        virtual ~Meter() { _ofThread = nullptr; }
-
-    private:
-        friend class Arena;
-
-        /** Before they hold so many bytes. May wait; what it throws, the allocation throws. */
-        virtual void grow(std::size_t bytes) = 0;
-
-        static thread_local Meter* _ofThread;
-
-        std::size_t _bytes = 0;
-    };
-
-    /** @param limit how many bytes the arena holds at most; an allocation that needs more fails with std::bad_alloc. */
-    explicit Arena(std::size_t limit = std::numeric_limits<std::size_t>::max())
-        : _limit(limit), _meter(Meter::_ofThread) {}
+    explicit Arena(std::size_t limit = std::numeric_limits<std::size_t>::max(), MemoryMeter* meter = nullptr)
+        : _limit(limit), _meter(meter) {}
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
     ~Arena() override;
@@ -75,7 +58,11 @@ private:
     bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override { return this == &other; }
 
     void* allocateLarge(std::size_t bytes);
-    /** Counts what the arena is about to take. @throws std::bad_alloc if that is more than the limit. */
+    /**
+     * Counts what the arena is about to take.
+     *
+     * @throws std::bad_alloc if it would hold more than the limit; what the meter throws. Nothing is counted then.
+     */
     void take(std::size_t bytes);
     /** Counts what the arena has given back. */
     void give(std::size_t bytes);
@@ -87,8 +74,7 @@ private:
     std::array<FreeBlock*, smallBytes / granule + 1> _free{};
     LargeBlock* _large = nullptr;
     const std::size_t _limit;
-    /** Null where nobody wants to know. */
-    Meter* const _meter;
+    MemoryMeter* const _meter;
     /** In bytes, of chunks and large blocks. */
     std::size_t _held = 0;
     bool _exhausted = false;

@@ -8,9 +8,9 @@ thread_local Request* currentRequest = nullptr;
 
 } // namespace
 
-Request::Request(const Broker& broker)
-    : _broker(broker), _outer(currentRequest), _depth(_outer != nullptr ? _outer->_depth + 1 : 1),
-      _arena(broker.limits().bytes) {
+Request::Request(const Broker& broker, MemoryMeter* meter)
+    : _broker(broker), _outer(currentRequest), _depth(_outer != nullptr ? _outer->_depth + 1 : 1), _meter(meter),
+      _arena(broker.limits().bytes, meter) {
     currentRequest = this;
 }
 

@@ -22,7 +22,8 @@ struct ObjectHeader;
  */
 class Request {
 public:
-    explicit Request(const Broker& broker);
+    /** @param meter is told of the memory of the request; may be null, outlives the request. */
+    explicit Request(const Broker& broker, MemoryMeter* meter = nullptr);
     Request(const Request&) = delete;
     Request& operator=(const Request&) = delete;
     ~Request();
@@ -33,6 +34,8 @@ public:
     const Broker& broker() const { return _broker; }
     /** 1 for a request that is not nested in another. */
     unsigned int depth() const { return _depth; }
+    /** May be null. */
+    MemoryMeter* meter() const { return _meter; }
 
     /* CMPI objects of this request, made of values. */
 
@@ -72,6 +75,7 @@ private:
     const Broker& _broker;
     Request* _outer;
     unsigned int _depth;
+    MemoryMeter* _meter;
     Arena _arena;
     ObjectHeader* _newest = nullptr;
     ObjectHeader* _buried = nullptr;

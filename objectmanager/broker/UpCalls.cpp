@@ -8,8 +8,10 @@ namespace ObjectManager {
 
 namespace {
 
-Invocation invocationOf(const CMPIContext* context) {
+/** How a provider asks in its turn: as the context says, and as a part of the request that it serves. */
+Invocation invocationOf(const CMPIContext* context, const Request& request) {
     Invocation invocation;
+    invocation.meter = request.meter();
     const NamedValues* entries = contentOf(context, nullptr);
     if (entries == nullptr) {
         return invocation;
@@ -56,7 +58,7 @@ CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call cal
                                               " levels: does a provider ask for itself?");
     }
     try {
-        call(*operations, *request, invocationOf(context));
+        call(*operations, *request, invocationOf(context, *request));
     } catch (const CimError& error) {
         return failed(error.code, error.what());
     }

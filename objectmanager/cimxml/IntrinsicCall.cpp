@@ -18,9 +18,7 @@ CimError failureOf(std::string_view className, const CimError& error) {
 } // namespace
 
 Invocation Call::invocation() const {
-    Invocation invocation;
-    invocation.principal = operation.caller.user;
-    invocation.address = operation.caller.address;
+    Invocation invocation = operation.invocation();
     invocation.flags = (parameters.flag("IncludeClassOrigin", false) ? CMPI_FLAG_IncludeClassOrigin : 0) |
                        (parameters.flag("DeepInheritance", true) ? CMPI_FLAG_DeepInheritance : 0);
     return invocation;

@@ -409,10 +409,8 @@ std::string callMethod(const Operation& operation) {
     }
     std::vector<NamedValue> arguments = argumentsOf(operation, *method);
     requireServed(operation, path.className);
-    Invocation invocation;
-    invocation.principal = operation.caller.user;
-    invocation.address = operation.caller.address;
-    MethodOutcome outcome = operation.dispatcher.callMethod(invocation, path, method->name, std::move(arguments));
+    MethodOutcome outcome =
+        operation.dispatcher.callMethod(operation.invocation(), path, method->name, std::move(arguments));
     operation.writer.returnValue(outcome.result.returnValue);
     for (const NamedValue& argument : outcome.result.outArguments) {
         operation.writer.parameter(argument);
@@ -439,6 +437,10 @@ void requireAccess(const Caller& caller, Access access) {
 }
 
 } // namespace
+
+Invocation Operation::invocation() const {
+    return {.principal = caller.user, .address = caller.address, .meter = &stream};
+}
 
 std::string perform(const Operation& operation) {
     requireAccess(operation.caller, Access::read);

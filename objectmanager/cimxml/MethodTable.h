@@ -19,6 +19,9 @@ struct Operation {
     /** Takes the text that the writer has written. */
     ReplyStream& stream;
     Enumerations& enumerations;
+
+    /** On whose behalf providers are called. */
+    Invocation invocation() const;
 };
 
 /**

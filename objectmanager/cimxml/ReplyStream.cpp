@@ -19,13 +19,18 @@ void ReplyStream::send(std::string_view piece) {
 
 void ReplyStream::holdText(std::size_t bytes) {
     _text = bytes;
-    grow(_results);
+    hold();
 }
 
-void ReplyStream::grow(std::size_t bytes) {
-    _results = std::max(_results, bytes);
+void ReplyStream::take(std::size_t bytes) {
+    _mostResults = std::max(_mostResults, _results + bytes);
+    hold();
+    _results += bytes;
+}
+
+void ReplyStream::hold() {
     if (_outlet != nullptr) {
-        _outlet->hold(_results + _text);
+        _outlet->hold(_mostResults + _text);
     }
 }
 

@@ -2,7 +2,7 @@
 #ifndef CIMXML_REPLYSTREAM_H
 #define CIMXML_REPLYSTREAM_H
 
-#include "broker/Arena.h"
+#include "model/Operations.h"
 #include "server/HttpMessage.h"
 
 #include <cstddef>
@@ -15,7 +15,7 @@ namespace ObjectManager::CimXml {
  * Sends a document piece by piece, and reserves the memory that the document needs: for the objects that providers
  * returned, and for text that cannot be sent yet. Without an outlet it does nothing. Exceptions of the outlet pass.
  */
-class ReplyStream final : private Arena::Meter {
+class ReplyStream final : public MemoryMeter {
 public:
     /**
      * @param outlet null if the document has to be returned as a whole.
@@ -34,13 +34,19 @@ public:
     /** Waits until so many bytes of text can be held in memory, beside the objects that providers returned. */
     void holdText(std::size_t bytes);
 
+    void take(std::size_t bytes) override;
+    void give(std::size_t bytes) noexcept override { _results -= bytes; }
+
 private:
-    void grow(std::size_t bytes) override;
+    void hold();
 
     Server::Outlet* const _outlet;
     const std::function<Server::HttpHeaders()> _headers;
     bool _hasBegun = false;
+    /** In bytes, of what providers returned: now, and the most so far, for which room is kept. */
     std::size_t _results = 0;
+    std::size_t _mostResults = 0;
+    /** In bytes. */
     std::size_t _text = 0;
 };
 

@@ -117,7 +117,7 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
                        Call call, Take take) {
     const std::uint64_t before = _log != nullptr ? _log->newest() : 0;
     try {
-        Request request(_broker);
+        Request request(_broker, invocation.meter);
         Result result(request);
         // The class is spelled as the provider's registration has it.
         std::optional<ObjectPath> respelled;

@@ -5,12 +5,28 @@
 #include "model/CimError.h"
 #include "model/Model.h"
 
+#include <cstddef>
 #include <functional>
 #include <optional>
 #include <string>
 #include <vector>
 
 namespace ObjectManager {
+
+/** Is told how much memory an operation takes for what providers make. Used by the operation's thread only. */
+class MemoryMeter {
+public:
+    MemoryMeter() = default;
+    MemoryMeter(const MemoryMeter&) = delete;
+    MemoryMeter& operator=(const MemoryMeter&) = delete;
+    virtual ~MemoryMeter() = default;
+
+    /** Called before so many bytes more are taken. May wait. What it throws, the allocation throws, and takes nothing.
+     */
+    virtual void take(std::size_t bytes) = 0;
+    /** Called when so many bytes are given back. */
+    virtual void give(std::size_t bytes) noexcept = 0;
+};
 
 /** On whose behalf and how an operation is done. */
 struct Invocation {
@@ -20,6 +36,11 @@ struct Invocation {
     CMPIUint32 flags = 0;
     /** Where the user's client is; empty where it is this process. */
     std::string address{};
+    /**
+     * Told of the memory of this operation and of those that its providers ask for in their turn. May be null; outlives
+     * the operation.
+     */
+    MemoryMeter* meter = nullptr;
 };
 
 /** The properties wanted of an instance; nothing means all of them. */

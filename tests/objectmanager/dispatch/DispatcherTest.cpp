@@ -279,6 +279,57 @@ TEST_F(DispatcherTest, AnEnumerationThatNeedsTooMuchMemoryGivesNothingWhereverTh
     EXPECT_EQ(1'000U, given);
 }
 
+/** Counts, and lets an operation take no more than so many bytes. */
+class Meter final : public MemoryMeter {
+public:
+    explicit Meter(std::size_t limit = SIZE_MAX) : _limit(limit) {}
+
+    void take(std::size_t bytes) override {
+        if (bytes > _limit - now) {
+            throw CimError(CMPI_RC_ERR_FAILED, "no room");
+        }
+        now += bytes;
+        most = std::max(most, now);
+    }
+    void give(std::size_t bytes) noexcept override { now -= bytes; }
+
+    std::size_t now = 0;
+    std::size_t most = 0;
+
+private:
+    const std::size_t _limit;
+};
+
+TEST_F(DispatcherTest, TheMemoryOfAnOperationIsMeasured) {
+    Meter meter;
+    invocation.meter = &meter;
+    std::size_t whileResultsPass = 0;
+    dispatcher.enumerateInstances(invocation, path("Test_ReturnsAThousand"), std::nullopt,
+                                  [&](const Instance& /*instance*/) { whileResultsPass = meter.now; });
+    EXPECT_GE(whileResultsPass, 1'000 * sizeof(Instance));
+    EXPECT_EQ(whileResultsPass, meter.most);
+    EXPECT_EQ(0U, meter.now);
+}
+
+TEST_F(DispatcherTest, TheMemoryOfWhatProvidersAskForIsMeasuredWithThatOfTheOperation) {
+    Meter alone;
+    invocation.meter = &alone;
+    dispatcher.enumerateInstances(invocation, path("Test_Disk"), std::nullopt);
+    Meter nested;
+    invocation.meter = &nested;
+    dispatcher.enumerateInstances(invocation, path("Test_AsksForDisks"), std::nullopt);
+    EXPECT_EQ(2 * alone.most, nested.most);
+    EXPECT_EQ(0U, nested.now);
+}
+
+TEST_F(DispatcherTest, AnOperationWhoseMeterRefusesMemoryFails) {
+    Meter meter(Arena::chunkBytes);
+    invocation.meter = &meter;
+    EXPECT_THAT(enumerationFailure("Test_ReturnsAThousand"),
+                isError(CMPI_RC_ERR_FAILED, "TestProvider threw an exception: no room"));
+    EXPECT_EQ(0U, meter.now);
+}
+
 TEST_F(DispatcherTest, TheOtherInstanceOperationsHaveToCloseTheirResult) {
     const ObjectPath open = path("Test_LeavesOpen");
     const Instance instance{open, {}};

@@ -21,6 +21,13 @@ int millisecondsUntil(Stream::Clock::time_point until) {
     return static_cast<int>(std::clamp<std::chrono::milliseconds::rep>(left, 0, most));
 }
 
+/** The alert that the client has sent, in words. The TLS library has no words for most numbers that clients may send.
+ */
+std::string alertOf(gnutls_session_t session) {
+    const char* const name = gnutls_alert_get_name(gnutls_alert_get(session));
+    return name == nullptr ? "alert " + std::to_string(static_cast<int>(gnutls_alert_get(session))) : name;
+}
+
 } // namespace
 
 Stream::Stream(int socket, std::shared_ptr<const TlsKeys> keys) : _socket(socket), _keys(std::move(keys)) {
@@ -70,10 +77,8 @@ Stream::Outcome Stream::shakeHands(Clock::time_point until,
         }
         outcome = proceed(code, until);
         if (outcome == Outcome::gone) {
-            _handshakeProblem =
-                code == GNUTLS_E_FATAL_ALERT_RECEIVED
-                    ? std::string("the client refused: ") + gnutls_alert_get_name(gnutls_alert_get(_session.get()))
-                    : gnutls_strerror(code);
+            _handshakeProblem = code == GNUTLS_E_FATAL_ALERT_RECEIVED ? "the client refused: " + alertOf(_session.get())
+                                                                      : gnutls_strerror(code);
             gnutls_alert_send_appropriate(_session.get(), code);
         }
     }

@@ -75,6 +75,17 @@ TEST_F(TlsTest, SurvivesClientsThatSpeakNoTls) {
     EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
 }
 
+TEST_F(TlsTest, SurvivesAnAlertThatNobodyKnows) {
+    serve();
+    HttpClient refusing = client();
+    // A record with the beginning of a hello, and one with the alert.
+    refusing.send(std::string("\x16\x03\x01\x00\x06\x01\x00\x01\xfc\x03\x03", 11));
+    refusing.send(std::string("\x15\x03\x01\x00\x02\x02\xee", 7));
+    refusing.receiveAll();
+    EXPECT_THAT(logged(1), ElementsAre("127.0.0.1: closed: the TLS handshake failed: the client refused: alert 238"));
+    EXPECT_THAT(curl(trusted() + " --data hello"), ElementsAre("hello"));
+}
+
 TEST_F(TlsTest, TakesABodyInChunksWhereverTheyAreCut) {
     serve();
     HttpClient asking = client();

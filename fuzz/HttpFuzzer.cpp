@@ -1,6 +1,6 @@
 /*
  * Sends the bytes of a whole connection to the server, through a pair of sockets. Whatever they are, the server must
- * accept or refuse them, and close the connection when the client has closed it.
+ * accept or refuse them, and close the connection when the client has closed it. With FUZZ_TLS, the server expects TLS.
  */
 #include "server/Exchange.h"
 
@@ -9,7 +9,14 @@
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <system_error>
 
 using namespace ObjectManager;
 
@@ -32,6 +39,26 @@ Server::Settings settings() {
     return made;
 }
 
+#ifdef FUZZ_TLS
+/** A key and a certificate that are made for this run. */
+std::shared_ptr<const Server::TlsKeys> makeKeys() {
+    std::string folder = (std::filesystem::temp_directory_path() / "orv-fuzz-XXXXXX").string();
+    if (mkdtemp(folder.data()) == nullptr) {
+        throw std::system_error(errno, std::generic_category(), folder);
+    }
+    const std::string command = "openssl req -x509 -newkey ec -pkeyopt ec_paramgen_curve:P-256 -noenc -days 2 -subj "
+                                "/CN=localhost -keyout " +
+                                folder + "/key -out " + folder + "/certificate 2>/dev/null";
+    if (std::system(command.c_str()) != 0) {
+        throw std::runtime_error(command + ": failed");
+    }
+    auto keys = std::make_shared<const Server::TlsKeys>(Server::Tls{folder + "/certificate", folder + "/key"},
+                                                        [](const std::string&) {});
+    std::filesystem::remove_all(folder);
+    return keys;
+}
+#endif
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -43,6 +70,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const bool logsIn = size > 0 && data[0] == '!';
     Server::Shared shared(settings(), echo, logsIn ? &doorkeeper : nullptr, [](const std::string&) {});
     shared.stop = eventfd(0, EFD_CLOEXEC);
+#ifdef FUZZ_TLS
+    static const std::shared_ptr<const Server::TlsKeys> keys = makeKeys();
+    shared.setKeys(keys);
+#endif
 
     std::array<int, 2> pair{};
     if (socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair.data()) != 0) {

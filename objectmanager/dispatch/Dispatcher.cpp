@@ -69,6 +69,14 @@ void requireSuccess(const Registration& registration, const std::string& operati
     }
 }
 
+const CMPIContext* contextOf(Request& request, const Invocation& invocation, const ObjectPath& path) {
+    return request.context({
+        {CMPIInitNameSpace, stringValue(path.nameSpace)},
+        {CMPIInvocationFlags, unsignedValue(CMPI_uint32, invocation.flags)},
+        {CMPIPrincipal, stringValue(invocation.principal)},
+    });
+}
+
 void passPaths(const Result& result, const PathSink& sink) {
     for (std::size_t i = 0; i < result.pathCount(); ++i) {
         sink(result.path(i));
@@ -127,11 +135,7 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
             respelled->className = registration.className;
         }
         const ObjectPath& target = respelled ? *respelled : path;
-        const CMPIContext* context = request.context({
-            {CMPIInitNameSpace, stringValue(path.nameSpace)},
-            {CMPIInvocationFlags, unsignedValue(CMPI_uint32, invocation.flags)},
-            {CMPIPrincipal, stringValue(invocation.principal)},
-        });
+        const CMPIContext* context = contextOf(request, invocation, path);
         CMPIStatus status{CMPI_RC_OK, nullptr};
         const std::optional<std::string> thrown = callProvider([&] {
             status = call(request, context, result.handle(), request.objectPath(target));

@@ -34,7 +34,7 @@ using AgentTest::PrivateBus;
 
 constexpr const char* service = "TALVO_PowerManagementService";
 
-ObjectPath pathOf(const std::string& className, NamedValues keys = {}) {
+ObjectPath pathOf(const std::string& className, std::vector<NamedValue> keys = {}) {
     return ObjectPath{"", "root/cimv2", className, std::move(keys)};
 }
 
@@ -76,10 +76,10 @@ Measured associators(const char* name, const std::string& className, std::vector
 const Measured operations[] = {
     {"EnumerateInstanceNames",
      {reading},
-     [](Dispatcher& dispatcher) { dispatcher.enumerateInstanceNames({}, pathOf(service), [](const ObjectPath&) {}); }},
+     [](Dispatcher& dispatcher) { dispatcher.enumerateInstanceNames({}, pathOf(service), [](ObjectPath&&) {}); }},
     {"EnumerateInstances",
      {reading},
-     [](Dispatcher& dispatcher) { dispatcher.enumerateInstances({}, pathOf(service), {}, [](const Instance&) {}); }},
+     [](Dispatcher& dispatcher) { dispatcher.enumerateInstances({}, pathOf(service), {}, [](Instance&&) {}); }},
     {"GetInstance", {reading}, [](Dispatcher& dispatcher) { dispatcher.getInstance({}, servicePath(), {}); }},
     {"RequestPowerStateChange",
      {reading, check, request},

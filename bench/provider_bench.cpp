@@ -114,7 +114,7 @@ Registry registry(unsigned int systems) {
     });
 }
 
-ObjectPath pathOf(const std::string& className, NamedValues keys = {}) {
+ObjectPath pathOf(const std::string& className, std::vector<NamedValue> keys = {}) {
     return ObjectPath{"", nameSpace, className, std::move(keys)};
 }
 
@@ -125,13 +125,13 @@ using Operation = std::function<std::size_t(Dispatcher&, const std::string& clas
 
 const Operation enumInstanceNames = [](Dispatcher& dispatcher, const std::string& className) {
     std::size_t count = 0;
-    dispatcher.enumerateInstanceNames({}, pathOf(className), [&](const ObjectPath& /*path*/) { ++count; });
+    dispatcher.enumerateInstanceNames({}, pathOf(className), [&](ObjectPath&& /*path*/) { ++count; });
     return count;
 };
 
 const Operation enumInstances = [](Dispatcher& dispatcher, const std::string& className) {
     std::size_t count = 0;
-    dispatcher.enumerateInstances({}, pathOf(className), {}, [&](const Instance& /*instance*/) { ++count; });
+    dispatcher.enumerateInstances({}, pathOf(className), {}, [&](Instance&& /*instance*/) { ++count; });
     return count;
 };
 

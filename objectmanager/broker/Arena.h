@@ -51,7 +51,7 @@ private:
     class Pool;
 
     static constexpr std::size_t granule = alignof(std::max_align_t);
-    static constexpr std::size_t smallBytes = 2048;
+    static constexpr std::size_t smallBytes = 512;
 
     void* do_allocate(std::size_t bytes, std::size_t alignment) override;
     void do_deallocate(void* block, std::size_t bytes, std::size_t alignment) override;

@@ -7,7 +7,7 @@ namespace {
 
 CMPICount getSize(const CMPIArray* self, CMPIStatus* rc) {
     const ArrayContent* array = contentOf(self, rc);
-    return array != nullptr ? static_cast<CMPICount>(array->elements.size()) : 0;
+    return array != nullptr ? array->count : 0;
 }
 
 CMPIType getSimpleType(const CMPIArray* self, CMPIStatus* rc) {
@@ -21,8 +21,8 @@ CMPIData getElementAt(const CMPIArray* self, CMPICount index, CMPIStatus* rc) {
     if (array == nullptr) {
         return noData(rc, status.rc);
     }
-    return index < array->elements.size() ? dataOf(array->elements[index], CMPI_goodValue, rc)
-                                          : noData(rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
+    return index < array->count ? dataOf(array->elements[index], CMPI_goodValue, rc)
+                                : noData(rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
 }
 
 CMPIStatus setElementAt(const CMPIArray* self, CMPICount index, const CMPIValue* value, CMPIType type) {
@@ -31,21 +31,24 @@ CMPIStatus setElementAt(const CMPIArray* self, CMPICount index, const CMPIValue*
     if (array == nullptr) {
         return status;
     }
-    if (index >= array->elements.size()) {
+    if (index >= array->count) {
         return statusOf(CMPI_RC_ERR_NO_SUCH_PROPERTY);
     }
-    Value read;
-    status.rc = readValue(array->elements.get_allocator(), value, type, read);
+    Memory& memory = *headerOf(self).memory;
+    Item item;
+    status.rc = readValue(memory, value, type, item);
     if (status.rc != CMPI_RC_OK) {
         return status;
     }
     // The strictest object managers convert no text: a provider that works here works there.
     const CMPIType expected = array->takesChars ? CMPIType{CMPI_chars} : array->elementType;
     if (type != expected && type != CMPI_null) {
+        drop(memory, item);
         return statusOf(CMPI_RC_ERR_TYPE_MISMATCH);
     }
-    read.type = array->elementType;
-    array->elements[index] = std::move(read);
+    item.type = array->elementType;
+    std::swap(array->elements[index], item);
+    drop(memory, item);
     return status;
 }
 
@@ -55,21 +58,21 @@ CMPIData getNext(const CMPIEnumeration* self, CMPIStatus* rc) {
     if (enumeration == nullptr) {
         return noData(rc, status.rc);
     }
-    if (enumeration->next == enumeration->elements.size()) {
+    if (enumeration->next == enumeration->elements.count) {
         return noData(rc, CMPI_RC_ERR_NOT_FOUND);
     }
-    return dataOf(enumeration->elements[enumeration->next++], CMPI_goodValue, rc);
+    return dataOf(enumeration->elements.elements[enumeration->next++], CMPI_goodValue, rc);
 }
 
 CMPIBoolean hasNext(const CMPIEnumeration* self, CMPIStatus* rc) {
     const EnumerationContent* enumeration = contentOf(self, rc);
-    return enumeration != nullptr && enumeration->next < enumeration->elements.size() ? 1 : 0;
+    return enumeration != nullptr && enumeration->next < enumeration->elements.count ? 1 : 0;
 }
 
 /** All elements, including those that getNext has already given. */
 CMPIArray* toArray(const CMPIEnumeration* self, CMPIStatus* rc) {
     const EnumerationContent* enumeration = contentOf(self, rc);
-    return enumeration != nullptr ? returnedCopy<CMPIArray>(*enumeration, rc) : nullptr;
+    return enumeration != nullptr ? returnedCopy<CMPIArray>(enumeration->elements, rc) : nullptr;
 }
 
 } // namespace

@@ -7,23 +7,23 @@ namespace ObjectManager {
 namespace {
 
 /** What a datetime object holds was checked when it was made. */
-DateTime valueOf(const Text& text) {
-    return parseDateTime(text).value_or(DateTime{});
+DateTime valueOf(const DateTimeContent& content) {
+    return parseDateTime(content.text).value_or(DateTime{});
 }
 
 CMPIUint64 getBinaryFormat(const CMPIDateTime* self, CMPIStatus* rc) {
-    const Text* text = contentOf(self, rc);
-    return text != nullptr ? valueOf(*text).microseconds : 0;
+    const DateTimeContent* content = contentOf(self, rc);
+    return content != nullptr ? valueOf(*content).microseconds : 0;
 }
 
 CMPIString* getStringFormat(const CMPIDateTime* self, CMPIStatus* rc) {
-    const Text* text = contentOf(self, rc);
-    return text != nullptr ? returnedString(*text, rc) : nullptr;
+    const DateTimeContent* content = contentOf(self, rc);
+    return content != nullptr ? returnedString(content->text, rc) : nullptr;
 }
 
 CMPIBoolean isInterval(const CMPIDateTime* self, CMPIStatus* rc) {
-    const Text* text = contentOf(self, rc);
-    return text != nullptr && valueOf(*text).interval ? 1 : 0;
+    const DateTimeContent* content = contentOf(self, rc);
+    return content != nullptr && valueOf(*content).interval ? 1 : 0;
 }
 
 } // namespace

@@ -4,13 +4,13 @@ namespace ObjectManager {
 
 namespace {
 
-template <ErrorContent::TextOf which>
+template <Text ErrorContent::*member>
 CMPIString* getText(const CMPIError* self, CMPIStatus* rc) {
     const ErrorContent* error = contentOf(self, rc);
-    return error != nullptr ? returnedString(error->texts[which], rc) : nullptr;
+    return error != nullptr ? returnedString(error->*member, rc) : nullptr;
 }
 
-template <ErrorContent::TextOf which>
+template <Text ErrorContent::*member>
 CMPIStatus setText(const CMPIError* self, const char* text) {
     CMPIStatus status;
     ErrorContent* error = contentOf(self, &status);
@@ -18,7 +18,7 @@ CMPIStatus setText(const CMPIError* self, const char* text) {
         return statusOf(CMPI_RC_ERR_INVALID_PARAMETER);
     }
     if (error != nullptr) {
-        error->texts[which] = text;
+        assignText(*headerOf(self).memory, error->*member, text);
     }
     return status;
 }
@@ -27,11 +27,11 @@ CMPIStatus setText(const CMPIError* self, const char* text) {
 template <auto member>
 auto getCode(const CMPIError* self, CMPIStatus* rc) {
     const ErrorContent* error = contentOf(self, rc);
-    return error != nullptr ? error->*member : decltype(ErrorCodes{}.*member){};
+    return error != nullptr ? error->*member : decltype(ErrorContent{}.*member){};
 }
 
 template <auto member>
-CMPIStatus setCode(const CMPIError* self, const std::remove_cvref_t<decltype(ErrorCodes{}.*member)> code) {
+CMPIStatus setCode(const CMPIError* self, const std::remove_cvref_t<decltype(ErrorContent{}.*member)> code) {
     CMPIStatus status;
     ErrorContent* error = contentOf(self, &status);
     if (error != nullptr) {
@@ -58,8 +58,9 @@ CMPIStatus setArray(const CMPIError* self, const CMPIArray* array) {
     if (texts->elementType != CMPI_string) {
         return statusOf(CMPI_RC_ERR_TYPE_MISMATCH);
     }
-    Value::Array& elements = (error->*member).elements;
-    elements = Value::Array(texts->elements, elements.get_allocator());
+    Memory& memory = *headerOf(self).memory;
+    ArrayContent replaced = std::exchange(error->*member, copy(memory, *texts));
+    drop(memory, replaced);
     return status;
 }
 
@@ -69,29 +70,29 @@ const CMPIErrorFT errorTable = {
     CMPIVersion200,
     release<CMPIError>,
     clone<CMPIError>,
-    getCode<&ErrorCodes::type>,
-    getText<ErrorContent::otherType>,
-    getText<ErrorContent::owningEntity>,
-    getText<ErrorContent::messageId>,
-    getText<ErrorContent::message>,
-    getCode<&ErrorCodes::severity>,
-    getCode<&ErrorCodes::probableCause>,
-    getText<ErrorContent::probableCauseDescription>,
+    getCode<&ErrorContent::type>,
+    getText<&ErrorContent::otherType>,
+    getText<&ErrorContent::owningEntity>,
+    getText<&ErrorContent::messageId>,
+    getText<&ErrorContent::message>,
+    getCode<&ErrorContent::severity>,
+    getCode<&ErrorContent::probableCause>,
+    getText<&ErrorContent::probableCauseDescription>,
     getArray<&ErrorContent::recommendedActions>,
-    getText<ErrorContent::source>,
-    getCode<&ErrorCodes::sourceFormat>,
-    getText<ErrorContent::otherSourceFormat>,
-    getCode<&ErrorCodes::code>,
-    getText<ErrorContent::codeDescription>,
+    getText<&ErrorContent::source>,
+    getCode<&ErrorContent::sourceFormat>,
+    getText<&ErrorContent::otherSourceFormat>,
+    getCode<&ErrorContent::code>,
+    getText<&ErrorContent::codeDescription>,
     getArray<&ErrorContent::messageArguments>,
-    setCode<&ErrorCodes::type>,
-    setText<ErrorContent::otherType>,
-    setText<ErrorContent::probableCauseDescription>,
+    setCode<&ErrorContent::type>,
+    setText<&ErrorContent::otherType>,
+    setText<&ErrorContent::probableCauseDescription>,
     setArray<&ErrorContent::recommendedActions>,
-    setText<ErrorContent::source>,
-    setCode<&ErrorCodes::sourceFormat>,
-    setText<ErrorContent::otherSourceFormat>,
-    setText<ErrorContent::codeDescription>,
+    setText<&ErrorContent::source>,
+    setCode<&ErrorContent::sourceFormat>,
+    setText<&ErrorContent::otherSourceFormat>,
+    setText<&ErrorContent::codeDescription>,
     setArray<&ErrorContent::messageArguments>,
 };
 

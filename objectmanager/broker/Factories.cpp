@@ -26,11 +26,11 @@ Request* factoryRequest(const CMPIBroker* broker, CMPIStatus* rc) {
 
 CMPIInstance* newInstance(const CMPIBroker* broker, const CMPIObjectPath* path, CMPIStatus* rc) {
     Request* request = factoryRequest(broker, rc);
-    const ObjectPath* content = request != nullptr ? contentOf(path, rc) : nullptr;
+    const PathContent* content = request != nullptr ? contentOf(path, rc) : nullptr;
     if (content == nullptr) {
         return nullptr;
     }
-    return newObject<CMPIInstance>(*request, *content);
+    return newObjectOf<CMPIInstance>(*request, {copy(request->memory(), *content), {}, {}, {}, false, false});
 }
 
 CMPIObjectPath* newObjectPath(const CMPIBroker* broker, const char* nameSpace, const char* className, CMPIStatus* rc) {
@@ -41,15 +41,14 @@ CMPIObjectPath* newObjectPath(const CMPIBroker* broker, const char* nameSpace, c
     if (nameSpace == nullptr || className == nullptr) {
         return failure(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    auto* path = place<ObjectPath>(request->memory());
-    path->nameSpace = nameSpace;
-    path->className = className;
-    return adopted<CMPIObjectPath>(*request, path);
+    Memory& memory = request->memory();
+    return newObjectOf<CMPIObjectPath>(*request,
+                                       {nullptr, copyText(memory, nameSpace), copyText(memory, className), {}, false});
 }
 
 CMPIArgs* newArgs(const CMPIBroker* broker, CMPIStatus* rc) {
     Request* request = factoryRequest(broker, rc);
-    return request != nullptr ? newObject<CMPIArgs>(*request) : nullptr;
+    return request != nullptr ? newObjectOf<CMPIArgs>(*request, {}) : nullptr;
 }
 
 CMPIString* newStringSlot(const CMPIBroker* broker, const char* text, CMPIStatus* rc) {
@@ -61,7 +60,8 @@ CMPIString* newStringSlot(const CMPIBroker* broker, const char* text, CMPIStatus
 
 /** Whether values of this type can be kept, one for one. */
 bool isElementType(CMPIType type) {
-    return isScalar(type) || type == CMPI_string || type == CMPI_dateTime || type == CMPI_ref || type == CMPI_instance;
+    return scalarSize(type) != 0 || type == CMPI_string || type == CMPI_dateTime || type == CMPI_ref ||
+           type == CMPI_instance;
 }
 
 CMPIArray* newArray(const CMPIBroker* broker, CMPICount size, CMPIType type, CMPIStatus* rc) {
@@ -76,10 +76,9 @@ CMPIArray* newArray(const CMPIBroker* broker, CMPICount size, CMPIType type, CMP
     if (size > maximumArraySize) {
         return failure(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    auto* array = place<ArrayContent>(request->memory(), elementType);
-    array->elements.assign(size, nullValue(elementType));
-    array->takesChars = type == CMPI_chars;
-    return adopted<CMPIArray>(*request, array);
+    Item* elements = newElements(request->memory(), size);
+    std::for_each(elements, elements + size, [&](Item& element) { element.type = elementType; });
+    return newObjectOf<CMPIArray>(*request, {elementType, size, elements, type == CMPI_chars});
 }
 
 CMPIDateTime* newDateTimeOf(const CMPIBroker* broker, const std::optional<std::string>& text, CMPIStatus* rc) {
@@ -90,7 +89,7 @@ CMPIDateTime* newDateTimeOf(const CMPIBroker* broker, const std::optional<std::s
     if (!text) {
         return failure(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    return newObject<CMPIDateTime>(*request, *text);
+    return newObjectOf<CMPIDateTime>(*request, {copyText(request->memory(), *text)});
 }
 
 CMPIDateTime* newDateTimeFromBinary(const CMPIBroker* broker, CMPIUint64 microseconds, CMPIBoolean interval,
@@ -115,7 +114,7 @@ CMPISelectExp* newSelectExp(const CMPIBroker* broker, const char*, const char*, 
 
 CMPIBoolean classPathIsA(const CMPIBroker* handle, const CMPIObjectPath* path, const char* className, CMPIStatus* rc) {
     const Broker* broker = brokerOf(handle, rc);
-    const ObjectPath* content = broker != nullptr ? contentOf(path, rc) : nullptr;
+    const PathContent* content = broker != nullptr ? contentOf(path, rc) : nullptr;
     if (content == nullptr) {
         return 0;
     }
@@ -123,7 +122,7 @@ CMPIBoolean classPathIsA(const CMPIBroker* handle, const CMPIObjectPath* path, c
         setStatus(rc, CMPI_RC_ERR_INVALID_PARAMETER);
         return 0;
     }
-    const std::string_view name = content->className;
+    const char* name = orEmpty(content->className);
     const bool derived = broker->classes() != nullptr && broker->classes()->isA(name, className);
     return equalNames(name, className) || derived ? 1 : 0;
 }
@@ -133,27 +132,32 @@ CMPIBoolean classPathIsA(const CMPIBroker* handle, const CMPIObjectPath* path, c
 std::string describeContent(const char& text) {
     return &text;
 }
-std::string describeContent(const Text& dateTime) {
-    return std::string(dateTime);
+std::string describeContent(const PathContent& path) {
+    return formatObjectPath(toModel(path));
 }
-std::string describeContent(const ObjectPath& path) {
-    return formatObjectPath(path);
+std::string describeContent(const InstanceContent& instance) {
+    return mofInstance(toModel(instance));
 }
-std::string describeContent(const InstanceContent& held) {
-    return mofInstance(held.instance);
-}
-std::string describeContent(const NamedValues& values) {
+std::string describeContent(const NamedItemsContent& content) {
     std::string text;
-    for (const NamedValue& named : values) {
-        text.append(text.empty() ? "" : ", ").append(named.name).append("=").append(mofLiteral(named.value));
+    for (const NamedValue& named : toModel(content.items)) {
+        text += (text.empty() ? "" : ", ") + named.name + '=' + mofLiteral(named.value);
     }
     return text;
 }
 std::string describeContent(const ArrayContent& array) {
-    return mofLiteral(arrayValue(array.elementType, array.elements));
+    Item item{static_cast<CMPIType>(array.elementType | CMPI_ARRAY), false, array.count, {}};
+    item.content.elements = array.elements;
+    return mofLiteral(toModel(item));
+}
+std::string describeContent(const EnumerationContent& enumeration) {
+    return describeContent(enumeration.elements);
+}
+std::string describeContent(const DateTimeContent& dateTime) {
+    return dateTime.text;
 }
 std::string describeContent(const ErrorContent& error) {
-    return std::string(error.texts[ErrorContent::message]);
+    return orEmpty(error.message);
 }
 std::string describeContent(const Result& result) {
     return result.closed() ? "closed" : "open";
@@ -164,7 +168,7 @@ CMPIString* toString(const CMPIBroker*, const void* object, CMPIStatus* rc) {
     setStatus(rc, CMPI_RC_ERR_INVALID_HANDLE);
     visitObject(object, [&](const auto* handle) {
         if (const auto* content = contentOf(handle, rc); content != nullptr) {
-            text = returnedString(describeContent(*content), rc);
+            text = returnedString(describeContent(*content).c_str(), rc);
         }
     });
     return text;
@@ -231,11 +235,9 @@ CMPIStatus pass(const CMPIBroker* handle, BrokerMessage::Kind kind, int level, c
     if (text == nullptr && string == nullptr) {
         return statusOf(CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    if (text == nullptr) {
-        text = contentOf(string, &status);
-    }
-    if (text != nullptr) {
-        broker->message({kind, level, orEmpty(source), text});
+    const char* content = text != nullptr ? text : contentOf(string, &status);
+    if (content != nullptr) {
+        broker->message({kind, level, orEmpty(source), content});
     }
     return status;
 }
@@ -257,12 +259,17 @@ CMPIError* newCMPIError(const CMPIBroker* broker, const char* owner, const char*
     if (request == nullptr) {
         return nullptr;
     }
-    auto* error =
-        place<ErrorContent>(request->memory(), ErrorCodes{.severity = severity, .probableCause = cause, .code = code});
-    error->texts[ErrorContent::owningEntity] = orEmpty(owner);
-    error->texts[ErrorContent::messageId] = orEmpty(messageId);
-    error->texts[ErrorContent::message] = orEmpty(message);
-    return adopted<CMPIError>(*request, error);
+    Memory& memory = request->memory();
+    ErrorContent error;
+    error.severity = severity;
+    error.probableCause = cause;
+    error.code = code;
+    error.owningEntity = copyText(memory, orEmpty(owner));
+    error.messageId = copyText(memory, orEmpty(messageId));
+    error.message = copyText(memory, orEmpty(message));
+    error.recommendedActions.elementType = CMPI_string;
+    error.messageArguments.elementType = CMPI_string;
+    return newObjectOf<CMPIError>(*request, error);
 }
 
 } // namespace

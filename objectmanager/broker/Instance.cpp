@@ -1,40 +1,38 @@
 #include "broker/Objects.h"
 
-#include <algorithm>
-
 namespace ObjectManager {
 
 namespace {
 
-bool contains(const Names& names, std::string_view name) {
-    return std::any_of(names.begin(), names.end(), [&](const Text& text) { return equalNames(text, name); });
+bool contains(const List<Text>& names, std::string_view name) {
+    return std::any_of(names.begin(), names.end(), [&](const char* text) { return equalNames(text, name); });
 }
 
 /** Puts copies of a null-ended list's names in place of those in `names`. */
-void assignNames(Names& names, const char** list) {
-    names.clear();
+void assignNames(Memory& memory, List<Text>& names, const char** list) {
+    std::for_each(names.begin(), names.end(), [&](Text name) { dropText(memory, name); });
+    names.size = 0;
     for (; list != nullptr && *list != nullptr; ++list) {
-        names.emplace_back(*list);
+        names.append(memory, copyText(memory, *list));
     }
 }
 
 CMPIData getProperty(const CMPIInstance* self, const char* name, CMPIStatus* rc) {
     CMPIStatus status;
     const InstanceContent* instance = contentOf(self, &status);
-    return instance != nullptr ? namedValue(instance->instance.properties, name, CMPI_goodValue, rc)
-                               : noData(rc, status.rc);
+    return instance != nullptr ? namedValue(instance->properties, name, CMPI_goodValue, rc) : noData(rc, status.rc);
 }
 
 CMPIData getPropertyAt(const CMPIInstance* self, CMPICount index, CMPIString** name, CMPIStatus* rc) {
     CMPIStatus status;
     const InstanceContent* instance = contentOf(self, &status);
-    return instance != nullptr ? namedValueAt(instance->instance.properties, index, name, CMPI_goodValue, rc)
+    return instance != nullptr ? namedValueAt(instance->properties, index, name, CMPI_goodValue, rc)
                                : noData(rc, status.rc);
 }
 
 CMPICount getPropertyCount(const CMPIInstance* self, CMPIStatus* rc) {
     const InstanceContent* instance = contentOf(self, rc);
-    return instance != nullptr ? static_cast<CMPICount>(instance->instance.properties.size()) : 0;
+    return instance != nullptr ? instance->properties.size : 0;
 }
 
 /** A property that the filter leaves out is not kept, and that is no failure. */
@@ -48,7 +46,7 @@ CMPIStatus setProperty(const CMPIInstance* self, const char* name, const CMPIVal
         !contains(instance->keyNames, name)) {
         return status;
     }
-    return setNamedValue(instance->instance.properties, name, value, type);
+    return setNamedValue(*headerOf(self).memory, instance->properties, name, value, type);
 }
 
 CMPIObjectPath* getObjectPath(const CMPIInstance* self, CMPIStatus* rc) {
@@ -57,18 +55,17 @@ CMPIObjectPath* getObjectPath(const CMPIInstance* self, CMPIStatus* rc) {
     if (request == nullptr) {
         return nullptr;
     }
-    auto* path = place<ObjectPath>(request->memory(), instance->instance.path);
-    completePath(*path, *instance, request->broker().classes());
-    return adopted<CMPIObjectPath>(*request, path);
+    return newObjectOf<CMPIObjectPath>(*request, fullPath(request->memory(), *instance, request->broker().classes()));
 }
 
 CMPIStatus setPropertyFilter(const CMPIInstance* self, const char** properties, const char** keys) {
     CMPIStatus status;
     InstanceContent* instance = changeableContentOf(self, &status);
     if (instance != nullptr) {
+        Memory& memory = *headerOf(self).memory;
         instance->filtered = properties != nullptr;
-        assignNames(instance->wanted, properties);
-        assignNames(instance->keyNames, keys);
+        assignNames(memory, instance->wanted, properties);
+        assignNames(memory, instance->keyNames, keys);
     }
     return status;
 }
@@ -76,9 +73,11 @@ CMPIStatus setPropertyFilter(const CMPIInstance* self, const char** properties, 
 CMPIStatus setObjectPath(const CMPIInstance* self, const CMPIObjectPath* path) {
     CMPIStatus status;
     InstanceContent* instance = changeableContentOf(self, &status);
-    const ObjectPath* given = instance != nullptr ? contentOf(path, &status) : nullptr;
-    if (given != nullptr) {
-        instance->instance.path = ObjectPath(*given, instance->wanted.get_allocator());
+    const PathContent* content = instance != nullptr ? contentOf(path, &status) : nullptr;
+    if (content != nullptr) {
+        Memory& memory = *headerOf(self).memory;
+        drop(memory, instance->path);
+        instance->path = copy(memory, *content);
     }
     return status;
 }

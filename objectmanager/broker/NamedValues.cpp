@@ -8,28 +8,28 @@ namespace {
 template <typename Handle>
 CMPIStatus add(const Handle* self, const char* name, const CMPIValue* value, const CMPIType type) {
     CMPIStatus status;
-    NamedValues* values = contentOf(self, &status);
-    return values != nullptr ? setNamedValue(*values, name, value, type) : status;
+    NamedItemsContent* content = contentOf(self, &status);
+    return content != nullptr ? setNamedValue(*headerOf(self).memory, content->items, name, value, type) : status;
 }
 
 template <typename Handle>
 CMPIData get(const Handle* self, const char* name, CMPIStatus* rc) {
     CMPIStatus status;
-    const NamedValues* values = contentOf(self, &status);
-    return values != nullptr ? namedValue(*values, name, CMPI_goodValue, rc) : noData(rc, status.rc);
+    const NamedItemsContent* content = contentOf(self, &status);
+    return content != nullptr ? namedValue(content->items, name, CMPI_goodValue, rc) : noData(rc, status.rc);
 }
 
 template <typename Handle>
 CMPIData getAt(const Handle* self, CMPICount index, CMPIString** name, CMPIStatus* rc) {
     CMPIStatus status;
-    const NamedValues* values = contentOf(self, &status);
-    return values != nullptr ? namedValueAt(*values, index, name, CMPI_goodValue, rc) : noData(rc, status.rc);
+    const NamedItemsContent* content = contentOf(self, &status);
+    return content != nullptr ? namedValueAt(content->items, index, name, CMPI_goodValue, rc) : noData(rc, status.rc);
 }
 
 template <typename Handle>
 CMPICount count(const Handle* self, CMPIStatus* rc) {
-    const NamedValues* values = contentOf(self, rc);
-    return values != nullptr ? static_cast<CMPICount>(values->size()) : 0;
+    const NamedItemsContent* content = contentOf(self, rc);
+    return content != nullptr ? content->items.size : 0;
 }
 
 } // namespace

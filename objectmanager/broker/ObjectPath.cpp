@@ -5,80 +5,80 @@ namespace ObjectManager {
 namespace {
 
 /** Sets one of a path's texts. */
-CMPIStatus setText(const CMPIObjectPath* self, Text ObjectPath::*member, const char* text) {
+CMPIStatus setText(const CMPIObjectPath* self, Text PathContent::*member, const char* text) {
     CMPIStatus status;
-    ObjectPath* path = changeableContentOf(self, &status);
+    PathContent* path = changeableContentOf(self, &status);
     if (path == nullptr) {
         return status;
     }
     if (text == nullptr) {
         return statusOf(CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    path->*member = text;
+    assignText(*headerOf(self).memory, path->*member, text);
     return status;
 }
 
-CMPIString* getText(const CMPIObjectPath* self, Text ObjectPath::*member, CMPIStatus* rc) {
-    const ObjectPath* path = contentOf(self, rc);
+CMPIString* getText(const CMPIObjectPath* self, Text PathContent::*member, CMPIStatus* rc) {
+    const PathContent* path = contentOf(self, rc);
     return path != nullptr ? returnedString(path->*member, rc) : nullptr;
 }
 
 CMPIStatus setNameSpace(const CMPIObjectPath* self, const char* nameSpace) {
-    return setText(self, &ObjectPath::nameSpace, nameSpace);
+    return setText(self, &PathContent::nameSpace, nameSpace);
 }
 
 CMPIString* getNameSpace(const CMPIObjectPath* self, CMPIStatus* rc) {
-    return getText(self, &ObjectPath::nameSpace, rc);
+    return getText(self, &PathContent::nameSpace, rc);
 }
 
 CMPIStatus setHostname(const CMPIObjectPath* self, const char* host) {
-    return setText(self, &ObjectPath::host, host);
+    return setText(self, &PathContent::host, host);
 }
 
 CMPIString* getHostname(const CMPIObjectPath* self, CMPIStatus* rc) {
-    return getText(self, &ObjectPath::host, rc);
+    return getText(self, &PathContent::host, rc);
 }
 
 CMPIStatus setClassName(const CMPIObjectPath* self, const char* className) {
-    return setText(self, &ObjectPath::className, className);
+    return setText(self, &PathContent::className, className);
 }
 
 CMPIString* getClassName(const CMPIObjectPath* self, CMPIStatus* rc) {
-    return getText(self, &ObjectPath::className, rc);
+    return getText(self, &PathContent::className, rc);
 }
 
 CMPIStatus addKey(const CMPIObjectPath* self, const char* name, const CMPIValue* value, const CMPIType type) {
     CMPIStatus status;
-    ObjectPath* path = changeableContentOf(self, &status);
-    return path != nullptr ? setNamedValue(path->keys, name, value, type) : status;
+    PathContent* path = changeableContentOf(self, &status);
+    return path != nullptr ? setNamedValue(*headerOf(self).memory, path->keys, name, value, type) : status;
 }
 
 CMPIData getKey(const CMPIObjectPath* self, const char* name, CMPIStatus* rc) {
     CMPIStatus status;
-    const ObjectPath* path = contentOf(self, &status);
+    const PathContent* path = contentOf(self, &status);
     return path != nullptr ? namedValue(path->keys, name, CMPI_keyValue, rc) : noData(rc, status.rc);
 }
 
 CMPIData getKeyAt(const CMPIObjectPath* self, CMPICount index, CMPIString** name, CMPIStatus* rc) {
     CMPIStatus status;
-    const ObjectPath* path = contentOf(self, &status);
+    const PathContent* path = contentOf(self, &status);
     return path != nullptr ? namedValueAt(path->keys, index, name, CMPI_keyValue, rc) : noData(rc, status.rc);
 }
 
 CMPICount getKeyCount(const CMPIObjectPath* self, CMPIStatus* rc) {
-    const ObjectPath* path = contentOf(self, rc);
-    return path != nullptr ? static_cast<CMPICount>(path->keys.size()) : 0;
+    const PathContent* path = contentOf(self, rc);
+    return path != nullptr ? path->keys.size : 0;
 }
 
 CMPIStatus setNameSpaceFromObjectPath(const CMPIObjectPath* self, const CMPIObjectPath* source) {
     CMPIStatus status;
-    const ObjectPath* path = contentOf(source, &status);
-    return path != nullptr ? setNameSpace(self, path->nameSpace.c_str()) : status;
+    const PathContent* path = contentOf(source, &status);
+    return path != nullptr ? setNameSpace(self, orEmpty(path->nameSpace)) : status;
 }
 
 CMPIStatus setHostAndNameSpaceFromObjectPath(const CMPIObjectPath* self, const CMPIObjectPath* source) {
     CMPIStatus status = setNameSpaceFromObjectPath(self, source);
-    return status.rc == CMPI_RC_OK ? setHostname(self, contentOf(source, nullptr)->host.c_str()) : status;
+    return status.rc == CMPI_RC_OK ? setHostname(self, orEmpty(contentOf(source, nullptr)->host)) : status;
 }
 
 /** Qualifiers are not served: classes are known to the layers above only. */

@@ -1,7 +1,5 @@
 #include "broker/Objects.h"
 
-#include <algorithm>
-
 namespace ObjectManager {
 
 void reportMisuse(const std::string& what) {
@@ -16,24 +14,13 @@ Request* requestFor(CMPIStatus* rc) {
     return request;
 }
 
-CMPIString* returnedString(std::string_view text, CMPIStatus* rc) {
-    Request* request = requestFor(rc);
-    return request != nullptr ? newString(*request, text) : nullptr;
-}
-
 CMPIString* newString(Request& request, std::string_view text) {
-    return adopted<CMPIString>(request, copyText(request.memory(), text));
+    return newObject<CMPIString>(request, copyText(request.memory(), text));
 }
 
-char* copyText(Memory& memory, std::string_view text) {
-    text = text.substr(0, text.find('\0'));
-    auto* copy = static_cast<char*>(memory.allocate(text.size() + 1, 1));
-    *std::copy(text.begin(), text.end(), copy) = '\0';
-    return copy;
-}
-
-void dropText(Memory& memory, char* text) {
-    memory.deallocate(text, std::strlen(text) + 1, 1);
+CMPIString* returnedString(const char* text, CMPIStatus* rc) {
+    Request* request = requestFor(rc);
+    return request != nullptr ? newString(*request, orEmpty(text)) : nullptr;
 }
 
 void endClone(ObjectHeader& clone) {
@@ -50,59 +37,28 @@ void deleteShell(ObjectHeader& clone) {
 
 namespace {
 
-/**
- * Calls `visit` with the member of CMPIValue in which a scalar of this type stands, and a null pointer to the type of
- * its content in a value. Whether there is such a member.
- */
-template <typename Visitor>
-bool visitScalar(CMPIType type, Visitor visit) {
-    constexpr bool* truth = nullptr;
-    constexpr char16_t* character = nullptr;
-    constexpr std::uint64_t* natural = nullptr;
-    constexpr std::int64_t* integer = nullptr;
-    constexpr double* real = nullptr;
-    switch (type) {
-    case CMPI_boolean:
-        return visit(&CMPIValue::boolean, truth), true;
-    case CMPI_char16:
-        return visit(&CMPIValue::char16, character), true;
-    case CMPI_uint8:
-        return visit(&CMPIValue::uint8, natural), true;
-    case CMPI_uint16:
-        return visit(&CMPIValue::uint16, natural), true;
-    case CMPI_uint32:
-        return visit(&CMPIValue::uint32, natural), true;
-    case CMPI_uint64:
-        return visit(&CMPIValue::uint64, natural), true;
-    case CMPI_sint8:
-        return visit(&CMPIValue::sint8, integer), true;
-    case CMPI_sint16:
-        return visit(&CMPIValue::sint16, integer), true;
-    case CMPI_sint32:
-        return visit(&CMPIValue::sint32, integer), true;
-    case CMPI_sint64:
-        return visit(&CMPIValue::sint64, integer), true;
-    case CMPI_real32:
-        return visit(&CMPIValue::real32, real), true;
-    case CMPI_real64:
-        return visit(&CMPIValue::real64, real), true;
-    default:
-        return false;
+CMPIrc readText(Memory& memory, CMPIType type, const char* text, Item& item) {
+    item = {type, text == nullptr, 0, {}};
+    if (text != nullptr) {
+        item.content.text = copyText(memory, text);
     }
+    return CMPI_RC_OK;
 }
 
-/** Reads the object of an encapsulated type: `contentFrom` makes a value's content of what it holds. */
-template <typename Handle, typename ContentFrom>
-CMPIrc readObject(CMPIType type, const Handle* object, Value& value, ContentFrom contentFrom) {
-    if (object == nullptr) {
-        value = nullValue(type);
-        return CMPI_RC_OK;
+/** Reads the object of an encapsulated type: `store` copies its content into the item. */
+template <typename Handle, typename Store>
+CMPIrc readObject(CMPIType type, const Handle* object, Item& item, Store store) {
+    Item read{type, object == nullptr, 0, {}};
+    if (object != nullptr) {
+        CMPIStatus status = statusOf(CMPI_RC_OK);
+        const auto* content = contentOf(object, &status);
+        if (content == nullptr) {
+            return status.rc;
+        }
+        store(read, *content);
     }
-    CMPIStatus status = statusOf(CMPI_RC_OK);
-    if (const auto* held = contentOf(object, &status); held != nullptr) {
-        value = Value(type, contentFrom(held));
-    }
-    return status.rc;
+    item = read;
+    return CMPI_RC_OK;
 }
 
 CMPIType keptType(CMPIType type) {
@@ -110,162 +66,169 @@ CMPIType keptType(CMPIType type) {
     return element == CMPI_chars ? static_cast<CMPIType>((type & CMPI_ARRAY) | CMPI_string) : type;
 }
 
-CMPIrc readArray(Allocator allocator, CMPIType type, const CMPIArray* array, Value& value) {
+CMPIrc readArray(Memory& memory, CMPIType type, const CMPIArray* array, Item& item) {
     CMPIStatus status = statusOf(CMPI_RC_OK);
-    const ArrayContent* held = array != nullptr ? contentOf(array, &status) : nullptr;
-    if (held == nullptr) {
+    const ArrayContent* content = array != nullptr ? contentOf(array, &status) : nullptr;
+    if (content == nullptr) {
         if (status.rc == CMPI_RC_OK) {
-            value = nullValue(type);
+            item = {type, true, 0, {}};
         }
         return status.rc;
     }
-    if (held->elementType != static_cast<CMPIType>(type & ~CMPI_ARRAY)) {
+    if (content->elementType != static_cast<CMPIType>(type & ~CMPI_ARRAY)) {
         return CMPI_RC_ERR_TYPE_MISMATCH;
     }
-    value = Value(type, Value::Array(held->elements, allocator));
+    item = {type, false, content->count, {}};
+    item.content.elements = copy(memory, *content).elements;
     return CMPI_RC_OK;
+}
+
+/** Where the path has no keys and every key property is set, calls `add` with each of these properties. */
+template <typename Add>
+void forMissingKeys(const InstanceContent& instance, const ClassInformation* classes, Add add) {
+    if (instance.path.keys.size != 0) {
+        return;
+    }
+    const auto addAll = [&](const auto& names) {
+        const auto property = [&](std::string_view name) { return findItem(instance.properties, name); };
+        if (std::all_of(names.begin(), names.end(), property)) {
+            std::for_each(names.begin(), names.end(), [&](std::string_view name) { add(*property(name)); });
+        }
+    };
+    const std::span<const std::string> names =
+        classes != nullptr ? classes->keyNames(orEmpty(instance.path.className)) : std::span<const std::string>();
+    if (names.empty()) {
+        addAll(instance.keyNames);
+    } else {
+        addAll(names);
+    }
 }
 
 } // namespace
 
-bool isScalar(CMPIType type) {
-    return visitScalar(type, [](auto, auto) {});
-}
-
-CMPIrc readValue(Allocator allocator, const CMPIValue* given, CMPIType type, Value& value) {
+CMPIrc readValue(Memory& memory, const CMPIValue* value, CMPIType type, Item& item) {
     const CMPIType kept = keptType(type);
-    if (given == nullptr || type == CMPI_null) {
-        value = nullValue(kept);
-        return CMPI_RC_OK;
-    }
     if (type == CMPI_chars) {
-        value.type = kept;
-        value.content.emplace<Text>(reinterpret_cast<const char*>(given), allocator);
+        return readText(memory, kept, reinterpret_cast<const char*>(value), item);
+    }
+    if (value == nullptr || type == CMPI_null) {
+        item = {kept, true, 0, {}};
         return CMPI_RC_OK;
     }
     if ((type & CMPI_ARRAY) != 0) {
-        return readArray(allocator, kept, given->array, value);
+        return readArray(memory, kept, value->array, item);
     }
-    // No more is read than a value of the type has.
-    if (visitScalar(type, [&]<typename Member, typename Kept>(Member CMPIValue::*, Kept*) {
-            Member scalar{};
-            std::memcpy(&scalar, given, sizeof scalar);
-            value.type = type;
-            value.content.emplace<Kept>(static_cast<Kept>(scalar));
-        })) {
+    if (const std::size_t size = scalarSize(type); size != 0) {
+        item = {type, false, 0, {}};
+        std::memcpy(&item.content.scalar, value, size);
         return CMPI_RC_OK;
     }
     switch (type) {
     case CMPI_string:
-        return readObject(type, given->string, value, [&](const char* text) { return Text(text, allocator); });
+        return readObject(type, value->string, item,
+                          [&](Item& read, const char& text) { read.content.text = copyText(memory, &text); });
     case CMPI_dateTime:
-        return readObject(type, given->dateTime, value, [&](const Text* text) { return Text(*text, allocator); });
+        return readObject(type, value->dateTime, item, [&](Item& read, const DateTimeContent& content) {
+            read.content.text = copyText(memory, content.text);
+        });
     case CMPI_ref:
-        return readObject(type, given->ref, value,
-                          [&](const ObjectPath* path) { return Box<ObjectPath>(*path, allocator); });
+        return readObject(type, value->ref, item,
+                          [&](Item& read, const PathContent& content) { read.content.path = place(memory, content); });
     case CMPI_instance:
-        return readObject(type, given->inst, value,
-                          [&](const InstanceContent* held) { return Box<Instance>(held->instance, allocator); });
+        return readObject(type, value->inst, item, [&](Item& read, const InstanceContent& content) {
+            read.content.instance = place(memory, content);
+        });
     default:
         return CMPI_RC_ERR_INVALID_DATA_TYPE;
     }
 }
 
-CMPIData dataOf(const Value& value, CMPIValueState state, CMPIStatus* rc) {
+CMPIData dataOf(const Item& item, CMPIValueState state, CMPIStatus* rc) {
     CMPIData data{};
-    data.type = value.type;
+    data.type = item.type;
     data.state = state;
     setStatus(rc, CMPI_RC_OK);
-    if (value.isNull()) {
+    if (item.null) {
         data.state |= CMPI_nullValue;
         return data;
     }
-    if (visitScalar(value.type, [&]<typename Member, typename Kept>(Member CMPIValue::*member, Kept*) {
-            data.value.*member = static_cast<Member>(std::get<Kept>(value.content));
-        })) {
+    if (scalarSize(item.type) != 0) {
+        std::memcpy(&data.value, &item.content.scalar, sizeof item.content.scalar);
         return data;
     }
     Request* request = requestFor(rc);
     if (request == nullptr) {
         return noData(rc, CMPI_RC_ERR_FAILED);
     }
-    if (const auto* elements = std::get_if<Value::Array>(&value.content)) {
-        data.value.array = newObject<CMPIArray>(*request, static_cast<CMPIType>(value.type & ~CMPI_ARRAY), *elements);
-    } else if (const auto* path = std::get_if<Box<ObjectPath>>(&value.content)) {
-        data.value.ref = newObject<CMPIObjectPath>(*request, **path);
-    } else if (const auto* instance = std::get_if<Box<Instance>>(&value.content)) {
-        data.value.inst = newObject<CMPIInstance>(*request, **instance);
-    } else if (value.type == CMPI_dateTime) {
-        data.value.dateTime = newObject<CMPIDateTime>(*request, std::get<Text>(value.content));
-    } else {
-        data.value.string = newString(*request, std::get<Text>(value.content));
+    Memory& memory = request->memory();
+    if ((item.type & CMPI_ARRAY) != 0) {
+        const ArrayContent array{static_cast<CMPIType>(item.type & ~CMPI_ARRAY), item.count, item.content.elements};
+        data.value.array = newObject<CMPIArray>(*request, place(memory, array));
+        return data;
+    }
+    switch (item.type) {
+    case CMPI_string:
+        data.value.string = newString(*request, item.content.text);
+        break;
+    case CMPI_dateTime:
+        data.value.dateTime = newObject<CMPIDateTime>(*request, place(memory, DateTimeContent{item.content.text}));
+        break;
+    case CMPI_ref:
+        data.value.ref = newObject<CMPIObjectPath>(*request, place(memory, *item.content.path));
+        break;
+    default: // CMPI_instance: nothing else becomes an item
+        data.value.inst = newObject<CMPIInstance>(*request, place(memory, *item.content.instance));
+        break;
     }
     return data;
 }
 
-void setValue(NamedValues& values, std::string_view name, Value&& value) {
-    const auto present =
-        std::find_if(values.begin(), values.end(), [&](const NamedValue& each) { return equalNames(each.name, name); });
-    if (present != values.end()) {
-        present->value = Value(std::move(value), values.get_allocator());
-        return;
-    }
-    // Most objects get several values, one by one.
-    if (values.size() == values.capacity()) {
-        values.reserve(std::max<std::size_t>(4, values.capacity() * 2));
-    }
-    values.emplace_back(name, std::move(value));
-}
-
-CMPIStatus setNamedValue(NamedValues& values, const char* name, const CMPIValue* given, CMPIType type) {
+CMPIStatus setNamedValue(Memory& memory, NamedItems& items, const char* name, const CMPIValue* value, CMPIType type) {
     if (name == nullptr) {
         return statusOf(CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    Value value;
-    const CMPIrc code = readValue(values.get_allocator(), given, type, value);
+    Item item;
+    const CMPIrc code = readValue(memory, value, type, item);
     if (code == CMPI_RC_OK) {
-        setValue(values, name, std::move(value));
+        setItem(memory, items, name, item);
     }
     return statusOf(code);
 }
 
-CMPIData namedValue(const NamedValues& values, const char* name, CMPIValueState state, CMPIStatus* rc) {
+CMPIData namedValue(const NamedItems& items, const char* name, CMPIValueState state, CMPIStatus* rc) {
     if (name == nullptr) {
         return noData(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    const NamedValue* found = find(values, name);
-    return found != nullptr ? dataOf(found->value, state, rc) : noData(rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
+    const NamedItem* found = findItem(items, name);
+    return found != nullptr ? dataOf(found->item, state, rc) : noData(rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
 }
 
-CMPIData namedValueAt(const NamedValues& values, CMPICount index, CMPIString** name, CMPIValueState state,
+CMPIData namedValueAt(const NamedItems& items, CMPICount index, CMPIString** name, CMPIValueState state,
                       CMPIStatus* rc) {
-    if (index >= values.size()) {
+    if (index >= items.size) {
         return noData(rc, CMPI_RC_ERR_NO_SUCH_PROPERTY);
     }
+    const NamedItem& item = items.items[index];
     if (name != nullptr) {
-        *name = returnedString(values[index].name, rc);
+        *name = returnedString(item.name, rc);
     }
-    return dataOf(values[index].value, state, rc);
+    return dataOf(item.item, state, rc);
 }
 
-void completePath(ObjectPath& path, const InstanceContent& instance, const ClassInformation* classes) {
-    if (!path.keys.empty()) {
-        return;
-    }
-    const auto addAll = [&](const auto& names) {
-        const auto property = [&](std::string_view name) { return find(instance.instance.properties, name); };
-        if (std::all_of(names.begin(), names.end(), property)) {
-            std::for_each(names.begin(), names.end(),
-                          [&](std::string_view name) { path.keys.push_back(*property(name)); });
-        }
-    };
-    const std::span<const std::string> names =
-        classes != nullptr ? classes->keyNames(path.className) : std::span<const std::string>();
-    if (names.empty()) {
-        addAll(instance.keyNames);
-    } else {
-        addAll(names);
-    }
+PathContent fullPath(Memory& memory, const InstanceContent& instance, const ClassInformation* classes) {
+    PathContent path = copy(memory, instance.path);
+    forMissingKeys(instance, classes, [&](const NamedItem& property) {
+        path.keys.append(memory, {copyText(memory, property.name), copy(memory, property.item)});
+    });
+    return path;
+}
+
+Instance fullInstance(const InstanceContent& instance, const ClassInformation* classes) {
+    Instance full = toModel(instance);
+    forMissingKeys(instance, classes, [&](const NamedItem& property) {
+        full.path.keys.push_back({property.name, toModel(property.item)});
+    });
+    return full;
 }
 
 PropertyList propertyListOf(const char** properties) {
@@ -280,13 +243,12 @@ PropertyList propertyListOf(const char** properties) {
 }
 
 std::vector<NamedValue> argumentsOf(const CMPIArgs* arguments) {
-    const NamedValues* held = contentOf(arguments, nullptr);
-    return held != nullptr ? std::vector<NamedValue>(held->begin(), held->end()) : std::vector<NamedValue>();
+    const NamedItemsContent* content = contentOf(arguments, nullptr);
+    return content != nullptr ? toModel(content->items) : std::vector<NamedValue>();
 }
 
 std::string textOf(const CMPIString* string) {
-    const char* text = string != nullptr ? contentOf(string, nullptr) : nullptr;
-    return text != nullptr ? text : "";
+    return string != nullptr ? orEmpty(contentOf(string, nullptr)) : "";
 }
 
 } // namespace ObjectManager

@@ -9,14 +9,13 @@
 #ifndef BROKER_OBJECTS_H
 #define BROKER_OBJECTS_H
 
+#include "broker/Content.h"
 #include "broker/Request.h"
 #include "broker/Result.h"
-#include "model/Model.h"
 
 #include "cmpift.h"
 
 #include <cstring>
-#include <memory_resource>
 #include <new>
 #include <string>
 #include <type_traits>
@@ -39,107 +38,6 @@ extern const CMPIBrokerEncFT factoryTable;
 extern const CMPIBrokerExtFT operatingSystemTable;
 extern const CMPIBrokerMemFT memoryTable;
 
-using Memory = std::pmr::memory_resource;
-
-/* What handles hold beside model values. All of it lies in the memory of the handle. */
-
-using Names = std::pmr::vector<Text>;
-
-struct InstanceContent {
-    using allocator_type = Allocator;
-
-    Instance instance;
-    /** The key list and the property list of the filter; the latter holds where `filtered` is set. */
-    Names keyNames;
-    Names wanted;
-    bool filtered = false;
-
-    InstanceContent(const Instance& given, Allocator allocator)
-        : instance(given, allocator), keyNames(allocator), wanted(allocator) {}
-    /** An instance without properties. */
-    InstanceContent(const ObjectPath& path, Allocator allocator)
-        : instance(allocator), keyNames(allocator), wanted(allocator) {
-        instance.path = ObjectPath(path, allocator);
-    }
-    InstanceContent(const InstanceContent& other, Allocator allocator)
-        : instance(other.instance, allocator), keyNames(other.keyNames, allocator), wanted(other.wanted, allocator),
-          filtered(other.filtered) {}
-};
-
-struct ArrayContent {
-    using allocator_type = Allocator;
-
-    /** Without CMPI_ARRAY. */
-    CMPIType elementType;
-    Value::Array elements;
-    /** Whether it was made for CMPI_chars: its elements, which are strings then, have to be handed over as such. */
-    bool takesChars = false;
-
-    ArrayContent(CMPIType type, Allocator allocator) : elementType(type), elements(allocator) {}
-    ArrayContent(CMPIType type, const Value::Array& given, Allocator allocator)
-        : elementType(type), elements(given, allocator) {}
-    ArrayContent(const ArrayContent& other, Allocator allocator)
-        : elementType(other.elementType), elements(other.elements, allocator), takesChars(other.takesChars) {}
-};
-
-struct EnumerationContent : ArrayContent {
-    using ArrayContent::ArrayContent;
-    EnumerationContent(const EnumerationContent& other, Allocator allocator)
-        : ArrayContent(other, allocator), next(other.next) {}
-
-    std::size_t next = 0;
-};
-
-struct ErrorCodes {
-    CMPIErrorType type = UnknownErrorType;
-    CMPIErrorSeverity severity = ErrorSevUnknown;
-    CMPIErrorProbableCause probableCause = ErrorProbCauseUnknown;
-    CMPIErrorSrcFormat sourceFormat = CIMErrorSrcFormatUnknown;
-    CMPIrc code = CMPI_RC_OK;
-};
-
-struct ErrorContent : ErrorCodes {
-    using allocator_type = Allocator;
-
-    enum TextOf {
-        otherType,
-        owningEntity,
-        messageId,
-        message,
-        probableCauseDescription,
-        source,
-        otherSourceFormat,
-        codeDescription,
-        textCount,
-    };
-
-    Names texts;
-    /* Of strings. */
-    ArrayContent recommendedActions;
-    ArrayContent messageArguments;
-
-    ErrorContent(const ErrorCodes& codes, Allocator allocator)
-        : ErrorCodes(codes), texts(textCount, allocator), recommendedActions(CMPI_string, allocator),
-          messageArguments(CMPI_string, allocator) {}
-    ErrorContent(const ErrorContent& other, Allocator allocator)
-        : ErrorCodes(other), texts(other.texts, allocator), recommendedActions(other.recommendedActions, allocator),
-          messageArguments(other.messageArguments, allocator) {}
-};
-
-/** Makes an object in a block of its own. */
-template <typename T, typename... Arguments>
-T* place(Memory& memory, Arguments&&... arguments) {
-    return Allocator(&memory).new_object<T>(std::forward<Arguments>(arguments)...);
-}
-
-inline const char* orEmpty(const char* text) {
-    return text != nullptr ? text : "";
-}
-
-/** The text up to its first null character, with one at the end. */
-char* copyText(Memory& memory, std::string_view text);
-void dropText(Memory& memory, char* text);
-
 /** Of a handle type: what its `hdl` points to, its function table and its name. */
 template <typename Handle>
 struct Kind;
@@ -151,7 +49,7 @@ struct KindOf {
 };
 
 template <>
-struct Kind<CMPIObjectPath> : KindOf<ObjectPath, objectPathTable> {
+struct Kind<CMPIObjectPath> : KindOf<PathContent, objectPathTable> {
     static constexpr const char* name = "CMPIObjectPath";
 };
 template <>
@@ -159,14 +57,14 @@ struct Kind<CMPIInstance> : KindOf<InstanceContent, instanceTable> {
     static constexpr const char* name = "CMPIInstance";
 };
 template <>
-struct Kind<CMPIArgs> : KindOf<NamedValues, argsTable> {
+struct Kind<CMPIArgs> : KindOf<NamedItemsContent, argsTable> {
     static constexpr const char* name = "CMPIArgs";
 };
 template <>
-struct Kind<CMPIContext> : KindOf<NamedValues, contextTable> {
+struct Kind<CMPIContext> : KindOf<NamedItemsContent, contextTable> {
     static constexpr const char* name = "CMPIContext";
 };
-/** `hdl` is the text itself: in the headers that many providers are compiled with, CMGetCharPtr reads it there. */
+/** `hdl` is the text itself. */
 template <>
 struct Kind<CMPIString> : KindOf<char, stringTable> {
     static constexpr const char* name = "CMPIString";
@@ -180,7 +78,7 @@ struct Kind<CMPIEnumeration> : KindOf<EnumerationContent, enumerationTable> {
     static constexpr const char* name = "CMPIEnumeration";
 };
 template <>
-struct Kind<CMPIDateTime> : KindOf<Text, dateTimeTable> {
+struct Kind<CMPIDateTime> : KindOf<DateTimeContent, dateTimeTable> {
     static constexpr const char* name = "CMPIDateTime";
 };
 template <>
@@ -202,8 +100,6 @@ struct ObjectHeader {
     Memory* memory;
     /** The object that the request adopted before this one, or the clone buried before it. */
     ObjectHeader* previous;
-    /** Whether a result keeps the content, which nobody may change any more. */
-    bool returned;
 };
 
 /** The handle that providers hold, and behind it what is ours; laid out as ObjectHeader. */
@@ -212,14 +108,13 @@ struct Shell {
     Handle handle;
     Memory* memory;
     ObjectHeader* previous;
-    bool returned;
 };
 
 template <typename Handle>
 Handle* newShell(Memory& memory, void* content) {
     static_assert(sizeof(Shell<Handle>) == sizeof(ObjectHeader) && alignof(Shell<Handle>) == alignof(ObjectHeader));
     auto* shell = new (memory.allocate(sizeof(ObjectHeader), alignof(ObjectHeader)))
-        Shell<Handle>{{content, &Kind<Handle>::table}, &memory, nullptr, false};
+        Shell<Handle>{{content, &Kind<Handle>::table}, &memory, nullptr};
     return &shell->handle;
 }
 
@@ -277,29 +172,29 @@ typename Kind<Handle>::Content* contentOf(const Handle* object, CMPIStatus* rc) 
 template <typename Handle>
 typename Kind<Handle>::Content* changeableContentOf(const Handle* object, CMPIStatus* rc) {
     auto* content = contentOf(object, rc);
-    if (content == nullptr || !headerOf(object).returned) {
+    if (content == nullptr || !content->returned) {
         return content;
     }
     ObjectHeader& header = headerOf(object);
-    content = place<typename Kind<Handle>::Content>(*header.memory, *content);
+    content = place(*header.memory, *content);
     header.hdl = content;
-    header.returned = false;
     return content;
 }
 
-/** An object of the current request that holds `content`, which lies in the request's memory or is a Result. */
+/** An object of the current request that takes over `content`, which lies in the request's memory. */
 template <typename Handle>
-Handle* adopted(Request& request, typename Kind<Handle>::Content* content) {
+Handle* newObject(Request& request, typename Kind<Handle>::Content* content) {
     auto* object = newShell<Handle>(request.memory(), content);
     request.adopt(headerOf(object));
     return object;
 }
 
-/** An object of the current request; what it holds is made of `arguments` in the request's memory. */
-template <typename Handle, typename... Arguments>
-Handle* newObject(Request& request, Arguments&&... arguments) {
-    return adopted<Handle>(
-        request, place<typename Kind<Handle>::Content>(request.memory(), std::forward<Arguments>(arguments)...));
+/** An object of the current request that takes over what `content` points to. */
+template <typename Handle>
+Handle* newObjectOf(Request& request, const typename Kind<Handle>::Content& content) {
+    using Content = typename Kind<Handle>::Content;
+    return newObject<Handle>(request,
+                             new (request.memory().allocate(sizeof(Content), alignof(Content))) Content(content));
 }
 
 CMPIString* newString(Request& request, std::string_view text);
@@ -308,13 +203,13 @@ CMPIString* newString(Request& request, std::string_view text);
 Request* requestFor(CMPIStatus* rc);
 
 /** A new string, or null with `rc` set where the thread has no request. */
-CMPIString* returnedString(std::string_view text, CMPIStatus* rc);
+CMPIString* returnedString(const char* text, CMPIStatus* rc);
 
 /** An object of its own with a copy of `content`, or null with `rc` set where the thread has no request. */
 template <typename Handle>
 Handle* returnedCopy(const typename Kind<Handle>::Content& content, CMPIStatus* rc) {
     Request* request = requestFor(rc);
-    return request != nullptr ? newObject<Handle>(*request, content) : nullptr;
+    return request != nullptr ? newObject<Handle>(*request, place(request->memory(), content)) : nullptr;
 }
 
 /** Gives back what an object holds and nobody else keeps. */
@@ -323,10 +218,12 @@ void dropContent(ObjectHeader& object) {
     auto* content = static_cast<typename Kind<Handle>::Content*>(std::exchange(object.hdl, nullptr));
     if constexpr (std::is_same_v<Handle, CMPIString>) {
         dropText(*object.memory, content);
-    } else if constexpr (!std::is_same_v<Handle, CMPIResult>) {
-        if (!object.returned) {
-            Allocator(object.memory).delete_object(content);
+    } else if constexpr (std::is_same_v<Handle, CMPIObjectPath> || std::is_same_v<Handle, CMPIInstance>) {
+        if (!content->returned) {
+            displace(*object.memory, content);
         }
+    } else if constexpr (!std::is_same_v<Handle, CMPIResult>) {
+        displace(*object.memory, content);
     }
 }
 
@@ -361,11 +258,13 @@ Handle* clone(const Handle* object, CMPIStatus* rc) {
         return nullptr;
     }
     Memory& heap = *std::pmr::new_delete_resource();
+    void* copied = nullptr;
     if constexpr (std::is_same_v<Handle, CMPIString>) {
-        return newShell<Handle>(heap, copyText(heap, content));
+        copied = copyText(heap, content);
     } else {
-        return newShell<Handle>(heap, place<typename Kind<Handle>::Content>(heap, *content));
+        copied = place(heap, *content);
     }
+    return newShell<Handle>(heap, copied);
 }
 
 /** Calls `visit` with the object as what it is; whether it is a CMPI object of ours. */
@@ -396,37 +295,32 @@ bool visitObject(const void* object, Visitor visit) {
 
 /* Values as they pass through the slots. */
 
-/** Whether values of this type stand in a CMPIValue themselves. */
-bool isScalar(CMPIType type);
-
 /**
- * Reads `given` as `type` says (cmpidt.h) into a value in the memory of `allocator`. A null pointer is a null value.
+ * Reads `value` as `type` says (cmpidt.h) into an item in `memory`. A null pointer is a null value.
  *
  * CMPI_RC_ERR_INVALID_DATA_TYPE for types that cannot be kept, CMPI_RC_ERR_TYPE_MISMATCH for an array of another type,
- * CMPI_RC_ERR_INVALID_HANDLE for an object that holds nothing; `value` is untouched then.
+ * CMPI_RC_ERR_INVALID_HANDLE for an object that holds nothing; `item` is untouched then.
  */
-CMPIrc readValue(Allocator allocator, const CMPIValue* given, CMPIType type, Value& value);
+CMPIrc readValue(Memory& memory, const CMPIValue* value, CMPIType type, Item& item);
 
 /** The value as data whose objects belong to the current request. `rc` is set. */
-CMPIData dataOf(const Value& value, CMPIValueState state, CMPIStatus* rc);
-
-/** Puts a value under `name`, in place of the one that has the name. A value from other memory is copied. */
-void setValue(NamedValues& values, std::string_view name, Value&& value);
+CMPIData dataOf(const Item& item, CMPIValueState state, CMPIStatus* rc);
 
 /** Reads a value and puts it under `name`. */
-CMPIStatus setNamedValue(NamedValues& values, const char* name, const CMPIValue* given, CMPIType type);
+CMPIStatus setNamedValue(Memory& memory, NamedItems& items, const char* name, const CMPIValue* value, CMPIType type);
 /** The value under `name`, or CMPI_RC_ERR_NO_SUCH_PROPERTY. */
-CMPIData namedValue(const NamedValues& values, const char* name, CMPIValueState state, CMPIStatus* rc);
+CMPIData namedValue(const NamedItems& items, const char* name, CMPIValueState state, CMPIStatus* rc);
 /** The value at `index`, with its name where `name` is not null, or CMPI_RC_ERR_NO_SUCH_PROPERTY. */
-CMPIData namedValueAt(const NamedValues& values, CMPICount index, CMPIString** name, CMPIValueState state,
+CMPIData namedValueAt(const NamedItems& items, CMPICount index, CMPIString** name, CMPIValueState state,
                       CMPIStatus* rc);
 
-/**
- * Gives `path`, which is the instance's or a copy of it, the keys that it lacks: a path without keys takes them from
- * the properties, those that the class names as its keys, or where it is not known those of the filter's key list, if
- * all of them are set.
+/*
+ * An instance's path, and the instance with it, where a path without keys takes them from the properties: those that
+ * the class names as its keys, or where it is not known those of the filter's key list, if all of them are set.
  */
-void completePath(ObjectPath& path, const InstanceContent& instance, const ClassInformation* classes);
+
+PathContent fullPath(Memory& memory, const InstanceContent& instance, const ClassInformation* classes);
+Instance fullInstance(const InstanceContent& instance, const ClassInformation* classes);
 
 /** A null-ended list of a provider's as values; nothing where it is null. */
 PropertyList propertyListOf(const char** properties);

@@ -28,19 +28,19 @@ Request* Request::current() {
 }
 
 CMPIObjectPath* Request::objectPath(const ObjectPath& path) {
-    return newObject<CMPIObjectPath>(*this, path);
+    return newObjectOf<CMPIObjectPath>(*this, fromModel(_arena, path));
 }
 
 CMPIInstance* Request::instance(const Instance& instance) {
-    return newObject<CMPIInstance>(*this, instance);
+    return newObjectOf<CMPIInstance>(*this, fromModel(_arena, instance));
 }
 
 CMPIArgs* Request::arguments(const std::vector<NamedValue>& arguments) {
-    return newObject<CMPIArgs>(*this, arguments.begin(), arguments.end());
+    return newObjectOf<CMPIArgs>(*this, {fromModel(_arena, arguments)});
 }
 
-CMPIContext* Request::context(std::initializer_list<NamedValue> entries) {
-    return newObject<CMPIContext>(*this, entries);
+CMPIContext* Request::context(const std::vector<NamedValue>& entries) {
+    return newObjectOf<CMPIContext>(*this, {fromModel(_arena, entries)});
 }
 
 const char** Request::propertyList(const PropertyList& properties) {

@@ -6,7 +6,6 @@
 #include "broker/Broker.h"
 
 #include <cstddef>
-#include <initializer_list>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -42,7 +41,7 @@ public:
     CMPIObjectPath* objectPath(const ObjectPath& path);
     CMPIInstance* instance(const Instance& instance);
     CMPIArgs* arguments(const std::vector<NamedValue>& arguments);
-    CMPIContext* context(std::initializer_list<NamedValue> entries);
+    CMPIContext* context(const std::vector<NamedValue>& entries);
     /** Ended by a null; null itself where the list means all properties. */
     const char** propertyList(const PropertyList& properties);
 

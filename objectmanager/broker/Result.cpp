@@ -54,7 +54,7 @@ const CMPIResultFT resultTable = {
     returnInstance, returnObjectPath,    returnDone,  returnError,
 };
 
-Result::Result(Request& request) : _request(request), _handle(adopted<CMPIResult>(request, this)) {}
+Result::Result(Request& request) : _request(request), _handle(newObject<CMPIResult>(request, this)) {}
 
 Result::~Result() {
     _handle->hdl = nullptr;
@@ -76,27 +76,25 @@ bool Result::mayTake(const char* attempt) {
  * the content of any other object is copied here.
  */
 template <typename Handle, typename Content>
-Content* Result::keep(const Handle* object, Content& content) {
+const Content* Result::keep(const Handle* object, Content& content) {
     if (headerOf(object).memory != &_request.memory()) {
-        return place<Content>(_request.memory(), content);
+        return place(_request.memory(), content);
     }
-    headerOf(object).returned = true;
+    content.returned = true;
     return &content;
 }
 
-void Result::completePaths() {
-    for (InstanceContent* held : _instances) {
-        completePath(held->instance.path, *held, _request.broker().classes());
-    }
+ObjectPath Result::path(std::size_t index) const {
+    return toModel(*_paths[index]);
 }
 
-const Instance& Result::instance(std::size_t index) const {
-    return _instances[index]->instance;
+Instance Result::instance(std::size_t index) const {
+    return fullInstance(*_instances[index], _request.broker().classes());
 }
 
 CMPIStatus Result::returnPath(const CMPIObjectPath* path) {
     CMPIStatus status = statusOf(CMPI_RC_ERR_FAILED);
-    ObjectPath* content = mayTake("an object path") ? returned(_request, path, status) : nullptr;
+    PathContent* content = mayTake("an object path") ? returned(_request, path, status) : nullptr;
     if (content != nullptr) {
         _paths.push_back(keep(path, *content));
     }
@@ -116,10 +114,10 @@ CMPIStatus Result::returnData(const CMPIValue* value, CMPIType type) {
     if (!mayTake("a value")) {
         return statusOf(CMPI_RC_ERR_FAILED);
     }
-    Value read;
-    const CMPIrc code = readValue({}, value, type, read);
+    Item item;
+    const CMPIrc code = readValue(_request.memory(), value, type, item);
     if (code == CMPI_RC_OK) {
-        _data.push_back(std::move(read));
+        _data.push_back(toModel(item));
     } else {
         _request.reportMisuse("returned a value that cannot be read");
     }
@@ -131,7 +129,7 @@ CMPIStatus Result::returnError(const CMPIError* error) {
     const ErrorContent* content = open("an error") ? returned(_request, error, status) : nullptr;
     if (content != nullptr) {
         _errors.emplace_back(content->code != CMPI_RC_OK ? content->code : CMPI_RC_ERR_FAILED,
-                             std::string(content->texts[ErrorContent::message]));
+                             orEmpty(content->message));
     }
     return status;
 }

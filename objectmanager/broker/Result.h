@@ -8,6 +8,7 @@
 
 namespace ObjectManager {
 
+struct PathContent;
 struct InstanceContent;
 
 /**
@@ -29,18 +30,13 @@ public:
     /** Whether nothing at all was returned. */
     bool empty() const { return _paths.empty() && _instances.empty() && _data.empty() && _errors.empty(); }
 
-    /**
-     * Gives the paths of instances the keys that they lack and that can be taken from the properties. To be called once
-     * the provider has ended.
-     */
-    void completePaths();
-
-    /* In the order in which they were returned; paths and instances lie in the memory of the request. */
+    /* In the order in which they were returned. Paths and instances become values when they are asked for. */
 
     std::size_t pathCount() const { return _paths.size(); }
-    const ObjectPath& path(std::size_t index) const { return *_paths[index]; }
+    ObjectPath path(std::size_t index) const;
     std::size_t instanceCount() const { return _instances.size(); }
-    const Instance& instance(std::size_t index) const;
+    /** A path without keys takes them from the properties where it can. */
+    Instance instance(std::size_t index) const;
     const std::vector<Value>& data() const { return _data; }
     const std::vector<CimError>& errors() const { return _errors; }
 
@@ -57,14 +53,14 @@ private:
     /** Whether the result is open, and the request may have one more object. */
     bool mayTake(const char* attempt);
     template <typename Handle, typename Content>
-    Content* keep(const Handle* object, Content& content);
+    const Content* keep(const Handle* object, Content& content);
 
     Request& _request;
     CMPIResult* _handle;
     bool _closed = false;
     /** In the request's memory. */
-    std::vector<const ObjectPath*> _paths;
-    std::vector<InstanceContent*> _instances;
+    std::vector<const PathContent*> _paths;
+    std::vector<const InstanceContent*> _instances;
     std::vector<Value> _data;
     std::vector<CimError> _errors;
 };

@@ -12,23 +12,23 @@ namespace {
 Invocation invocationOf(const CMPIContext* context, const Request& request) {
     Invocation invocation;
     invocation.meter = request.meter();
-    const NamedValues* entries = contentOf(context, nullptr);
-    if (entries == nullptr) {
+    const NamedItemsContent* content = contentOf(context, nullptr);
+    if (content == nullptr) {
         return invocation;
     }
-    const NamedValue* principal = find(*entries, CMPIPrincipal);
-    if (const Text* user = principal != nullptr ? std::get_if<Text>(&principal->value.content) : nullptr) {
-        invocation.principal = *user;
+    if (const NamedItem* principal = findItem(content->items, CMPIPrincipal);
+        principal != nullptr && !principal->item.null && principal->item.type == CMPI_string) {
+        invocation.principal = principal->item.content.text;
     }
-    if (const NamedValue* flags = find(*entries, CMPIInvocationFlags);
-        flags != nullptr && flags->value.type == CMPI_uint32 && !flags->value.isNull()) {
-        invocation.flags = static_cast<CMPIUint32>(std::get<std::uint64_t>(flags->value.content));
+    if (const NamedItem* flags = findItem(content->items, CMPIInvocationFlags);
+        flags != nullptr && !flags->item.null && flags->item.type == CMPI_uint32) {
+        std::memcpy(&invocation.flags, &flags->item.content.scalar, sizeof invocation.flags);
     }
     return invocation;
 }
 
 CMPIStatus failed(CMPIrc code, const std::string& message) {
-    return {code, returnedString(message, nullptr)};
+    return {code, returnedString(message.c_str(), nullptr)};
 }
 
 /**
@@ -69,12 +69,12 @@ CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call cal
 template <typename Call>
 CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path, Call call) {
     CMPIStatus status;
-    const ObjectPath* content = contentOf(path, &status);
+    const PathContent* content = contentOf(path, &status);
     if (content == nullptr) {
         return status;
     }
     return upCall(broker, context, [&](Operations& operations, Request& request, const Invocation& invocation) {
-        call(operations, request, invocation, *content);
+        call(operations, request, invocation, toModel(*content));
     });
 }
 
@@ -90,29 +90,32 @@ CMPIStatus instanceCall(const CMPIBroker* broker, const CMPIContext* context, co
     return pathCall(
         broker, context, path,
         [&](Operations& operations, Request& request, const Invocation& invocation, const ObjectPath& target) {
-            Instance full = content->instance;
-            completePath(full.path, *content, request.broker().classes());
-            call(operations, request, invocation, target, full);
+            call(operations, request, invocation, target, fullInstance(*content, request.broker().classes()));
         });
 }
 
 /** Collects paths or instances for an enumeration in a request. */
 class Elements {
 public:
-    Elements(Request& request, CMPIType type)
-        : _request(request), _enumeration(place<EnumerationContent>(request.memory(), type)) {}
+    Elements(Request& request, CMPIType type) : _request(request), _type(type) {}
 
     template <typename Object>
-    void add(const Object& object) {
-        Value::Array& elements = _enumeration->elements;
-        elements.emplace_back(_enumeration->elementType, Box<Object>(object, elements.get_allocator()));
+    void add(Object&& object) {
+        const Value value{_type, std::make_shared<const Object>(std::forward<Object>(object))};
+        _items.push_back(fromModel(_request.memory(), value));
     }
 
-    CMPIEnumeration* enumeration() { return adopted<CMPIEnumeration>(_request, _enumeration); }
+    CMPIEnumeration* enumeration() {
+        const auto count = static_cast<std::uint32_t>(_items.size());
+        Item* elements = newElements(_request.memory(), count);
+        std::copy(_items.begin(), _items.end(), elements);
+        return newObjectOf<CMPIEnumeration>(_request, {{_type, count, elements}, 0});
+    }
 
 private:
     Request& _request;
-    EnumerationContent* _enumeration;
+    CMPIType _type;
+    std::vector<Item> _items;
 };
 
 /** The object, or null where the call failed. Sets `rc`, where it is not null, to the status. */
@@ -127,13 +130,14 @@ Handle* answer(Handle* object, const CMPIStatus& status, CMPIStatus* rc) {
 CMPIEnumeration* enumerateInstanceNames(const CMPIBroker* broker, const CMPIContext* context,
                                         const CMPIObjectPath* path, CMPIStatus* rc) {
     CMPIEnumeration* result = nullptr;
-    const CMPIStatus status = pathCall(
-        broker, context, path,
-        [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
-            Elements names(request, CMPI_ref);
-            operations.enumerateInstanceNames(invocation, target, [&](const ObjectPath& name) { names.add(name); });
-            result = names.enumeration();
-        });
+    const CMPIStatus status =
+        pathCall(broker, context, path,
+                 [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
+                     Elements names(request, CMPI_ref);
+                     operations.enumerateInstanceNames(invocation, target,
+                                                       [&](ObjectPath&& name) { names.add(std::move(name)); });
+                     result = names.enumeration();
+                 });
     return answer(result, status, rc);
 }
 
@@ -187,7 +191,7 @@ CMPIEnumeration* execQuery(const CMPIBroker* broker, const CMPIContext* context,
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
                      Elements found(request, CMPI_instance);
                      operations.execQuery(invocation, target, query, language,
-                                          [&](const Instance& instance) { found.add(instance); });
+                                          [&](Instance&& instance) { found.add(std::move(instance)); });
                      result = found.enumeration();
                  });
     return answer(result, status, rc);
@@ -201,7 +205,7 @@ CMPIEnumeration* enumerateInstances(const CMPIBroker* broker, const CMPIContext*
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
                      Elements found(request, CMPI_instance);
                      operations.enumerateInstances(invocation, target, propertyListOf(properties),
-                                                   [&](const Instance& instance) { found.add(instance); });
+                                                   [&](Instance&& instance) { found.add(std::move(instance)); });
                      result = found.enumeration();
                  });
     return answer(result, status, rc);
@@ -213,20 +217,22 @@ CMPIData invokeMethod(const CMPIBroker* broker, const CMPIContext* context, cons
     if (method == nullptr) {
         return noData(rc, CMPI_RC_ERR_INVALID_PARAMETER);
     }
-    const NamedValues* arguments = contentOf(in, &status);
-    NamedValues* answers = arguments != nullptr ? contentOf(out, &status) : nullptr;
+    const NamedItemsContent* arguments = contentOf(in, &status);
+    NamedItemsContent* answers = arguments != nullptr ? contentOf(out, &status) : nullptr;
     if (answers == nullptr) {
         return noData(rc, status.rc);
     }
     CMPIData data = noData(nullptr, CMPI_RC_OK);
-    status = pathCall(
-        broker, context, path, [&](Operations& operations, Request&, const auto& invocation, const auto& target) {
-            const MethodResult result = operations.invokeMethod(invocation, target, method, argumentsOf(in));
-            for (const NamedValue& argument : result.outArguments) {
-                setValue(*answers, argument.name, Value(argument.value));
-            }
-            data = dataOf(result.returnValue, CMPI_goodValue, nullptr);
-        });
+    status = pathCall(broker, context, path,
+                      [&](Operations& operations, Request& request, const auto& invocation, const auto& target) {
+                          const MethodResult result =
+                              operations.invokeMethod(invocation, target, method, toModel(arguments->items));
+                          Memory& memory = *headerOf(out).memory;
+                          for (const NamedValue& argument : result.outArguments) {
+                              setItem(memory, answers->items, argument.name, fromModel(memory, argument.value));
+                          }
+                          data = dataOf(fromModel(request.memory(), result.returnValue), CMPI_goodValue, nullptr);
+                      });
     if (rc != nullptr) {
         *rc = status;
     }
@@ -248,9 +254,9 @@ CMPIEnumeration* associationCall(const CMPIBroker* broker, const CMPIContext* co
         pathCall(broker, context, path,
                  [&](Operations& operations, Request& request, const auto& invocation, const auto& source) {
                      Elements found(request, type);
-                     call(operations, invocation, source, [&](const auto& objects) {
-                         for (const auto& object : objects) {
-                             found.add(object);
+                     call(operations, invocation, source, [&](auto objects) {
+                         for (auto& object : objects) {
+                             found.add(std::move(object));
                          }
                      });
                      result = found.enumeration();
@@ -267,8 +273,8 @@ CMPIEnumeration* associators(const CMPIBroker* broker, const CMPIContext* contex
         broker, context, path, CMPI_instance, rc,
         [&](Operations& operations, const auto& invocation, const auto& source, const auto& take) {
             const AssociationFilter filter = filterOf(associationClass, resultClass, role, resultRole);
-            for (const auto& each : operations.associators(invocation, source, filter, propertyListOf(properties))) {
-                take(each.objects);
+            for (auto& each : operations.associators(invocation, source, filter, propertyListOf(properties))) {
+                take(std::move(each.objects));
             }
         });
 }
@@ -280,8 +286,8 @@ CMPIEnumeration* associatorNames(const CMPIBroker* broker, const CMPIContext* co
                            [&](Operations& operations, const auto& invocation, const auto& source, const auto& take) {
                                const AssociationFilter filter =
                                    filterOf(associationClass, resultClass, role, resultRole);
-                               for (const auto& each : operations.associatorNames(invocation, source, filter)) {
-                                   take(each.objects);
+                               for (auto& each : operations.associatorNames(invocation, source, filter)) {
+                                   take(std::move(each.objects));
                                }
                            });
 }

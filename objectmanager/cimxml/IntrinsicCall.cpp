@@ -9,8 +9,8 @@ namespace ObjectManager::CimXml {
 namespace {
 
 /** The error of one class's provider in an enumeration of an ancestor; its message begins with the class. */
-CimError failureOf(std::string_view className, const CimError& error) {
-    CimError failure(error.code, std::string(className) + ": " + error.what());
+CimError failureOf(const std::string& className, const CimError& error) {
+    CimError failure(error.code, className + ": " + error.what());
     failure.reasons = error.reasons;
     return failure;
 }
@@ -31,15 +31,15 @@ bool isRegistered(const Operation& operation, std::string_view className) {
     });
 }
 
-CimError unknownClass(std::string_view className, CMPIrc code) {
-    return {code, "there is no class " + std::string(className)};
+CimError unknownClass(const std::string& className, CMPIrc code) {
+    return {code, "there is no class " + className};
 }
 
-void requireServed(const Operation& operation, std::string_view className) {
+void requireServed(const Operation& operation, const std::string& className) {
     if (!isRegistered(operation, className)) {
         throw operation.catalogue.find(className) == nullptr
             ? unknownClass(className)
-            : CimError(CMPI_RC_ERR_NOT_FOUND, "no provider serves instances of the class " + std::string(className));
+            : CimError(CMPI_RC_ERR_NOT_FOUND, "no provider serves instances of the class " + className);
     }
 }
 
@@ -70,7 +70,7 @@ void forEachServed(const Call& call, const ObjectPath& classPath,
     }
 }
 
-const Class& declaredClass(const Call& call, std::string_view className, CMPIrc unknown) {
+const Class& declaredClass(const Call& call, const std::string& className, CMPIrc unknown) {
     const Class* declared = call.catalogue().find(className);
     if (declared == nullptr) {
         throw unknownClass(className, unknown);
@@ -78,7 +78,7 @@ const Class& declaredClass(const Call& call, std::string_view className, CMPIrc 
     return *declared;
 }
 
-PropertyList askedOfProvider(const Call& call, const PropertyList& properties, std::string_view className) {
+PropertyList askedOfProvider(const Call& call, const PropertyList& properties, const std::string& className) {
     const Class* declared = call.catalogue().find(className);
     if (!properties || declared == nullptr) {
         return properties;
@@ -144,9 +144,9 @@ void forEachMatch(const Call& call, const Query& query, const InstanceSink& sink
         const std::vector<std::string> compared = query.compared();
         needed->insert(needed->end(), compared.begin(), compared.end());
     }
-    forEachInstance(call, {{}, call.nameSpace(), query.className, {}}, needed, [&](const Instance& instance) {
+    forEachInstance(call, {{}, call.nameSpace(), query.className, {}}, needed, [&](Instance&& instance) {
         if (matches(query, instance)) {
-            sink(instance);
+            sink(std::move(instance));
         }
     });
 }

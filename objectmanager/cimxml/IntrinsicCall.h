@@ -29,13 +29,13 @@ struct Call {
 /** Whether a provider is registered for the class itself. */
 bool isRegistered(const Operation& operation, std::string_view className);
 
-CimError unknownClass(std::string_view className, CMPIrc code = CMPI_RC_ERR_INVALID_CLASS);
+CimError unknownClass(const std::string& className, CMPIrc code = CMPI_RC_ERR_INVALID_CLASS);
 
 /** Throws if no provider serves instances of the class itself, so that it has none. */
-void requireServed(const Operation& operation, std::string_view className);
+void requireServed(const Operation& operation, const std::string& className);
 
 /** Throws with the code `unknown` if the class does not exist: DSP0200's code depends on the operation. */
-const Class& declaredClass(const Call& call, std::string_view className, CMPIrc unknown = CMPI_RC_ERR_INVALID_CLASS);
+const Class& declaredClass(const Call& call, const std::string& className, CMPIrc unknown = CMPI_RC_ERR_INVALID_CLASS);
 
 /** Calls `doWith` for the named class and each of its descendants, if the class has an instance provider. */
 void forEachServed(const Call& call, const ObjectPath& classPath,
@@ -47,7 +47,7 @@ void forEachServed(const Call& call, const ObjectPath& classPath,
  * The properties to ask a provider for: those of the list that the class has, in the class's spelling, and its keys,
  * since the paths of instances are made of them.
  */
-PropertyList askedOfProvider(const Call& call, const PropertyList& properties, std::string_view className);
+PropertyList askedOfProvider(const Call& call, const PropertyList& properties, const std::string& className);
 
 /** For instances. LocalOnly and IncludeQualifiers are deprecated for instances, and always taken as false. */
 Selection selectionOfInstances(const Call& call);

@@ -28,13 +28,13 @@ void enumerateInstances(const Call& call) {
     const Selection selection = selectionOfEnumeration(call);
     call.writer().raw("<IRETURNVALUE>\n");
     forEachInstance(call, call.parameters.className("ClassName"), selection.properties,
-                    [&](const Instance& instance) { call.writer().namedInstance(instance, selection); });
+                    [&](Instance&& instance) { call.writer().namedInstance(instance, selection); });
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
 void enumerateInstanceNames(const Call& call) {
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachInstanceName(call, [&](const ObjectPath& name) { call.writer().instanceName(name); });
+    forEachInstanceName(call, [&](ObjectPath&& name) { call.writer().instanceName(name); });
     call.writer().raw("</IRETURNVALUE>\n");
 }
 
@@ -134,7 +134,7 @@ const Property& namedProperty(const Call& call, const ObjectPath& path) {
     requireServed(call.operation, path.className);
     const Property* property = declaredClass(call, path.className).property(name);
     if (property == nullptr) {
-        throw CimError(CMPI_RC_ERR_NO_SUCH_PROPERTY, std::string(path.className) + " has no property " + name);
+        throw CimError(CMPI_RC_ERR_NO_SUCH_PROPERTY, path.className + " has no property " + name);
     }
     return *property;
 }
@@ -191,7 +191,7 @@ void execQuery(const Call& call) {
     Selection selection;
     selection.properties = query.properties;
     call.writer().raw("<IRETURNVALUE>\n");
-    forEachMatch(call, query, [&](const Instance& instance) {
+    forEachMatch(call, query, [&](Instance&& instance) {
         call.writer().raw("<VALUE.OBJECT>\n");
         call.writer().instance(instance, selection);
         call.writer().raw("</VALUE.OBJECT>\n");
@@ -379,7 +379,7 @@ std::vector<NamedValue> argumentsOf(const Operation& operation, const Method& me
         const auto argument = std::find_if(given.begin(), given.end(),
                                            [&](const Argument& a) { return equalNames(a.name, parameter.name); });
         if (argument != given.end() && argument->content != nullptr) {
-            arguments.emplace_back(parameter.name, reader.argument(*argument->content, parameter));
+            arguments.push_back({parameter.name, reader.argument(*argument->content, parameter)});
         } else if (hasFlag(parameter.qualifiers, "Required")) {
             throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, "found no argument " + parameter.name +
                                                               ", expected it since " + method.name + " requires it");
@@ -407,10 +407,9 @@ std::string callMethod(const Operation& operation) {
                                                           method->name +
                                                           ", expected an instance: the method is not static");
     }
-    std::vector<NamedValue> arguments = argumentsOf(operation, *method);
+    const std::vector<NamedValue> arguments = argumentsOf(operation, *method);
     requireServed(operation, path.className);
-    MethodOutcome outcome =
-        operation.dispatcher.callMethod(operation.invocation(), path, method->name, std::move(arguments));
+    MethodOutcome outcome = operation.dispatcher.callMethod(operation.invocation(), path, method->name, arguments);
     operation.writer.returnValue(outcome.result.returnValue);
     for (const NamedValue& argument : outcome.result.outArguments) {
         operation.writer.parameter(argument);

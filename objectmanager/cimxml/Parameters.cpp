@@ -8,7 +8,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-[[noreturn]] void invalid(std::string_view message) {
+[[noreturn]] void invalid(const std::string& message) {
     throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, message);
 }
 
@@ -90,7 +90,7 @@ ObjectPath Parameters::className(std::string_view name) const {
 
 std::string Parameters::optionalClassName(std::string_view name) const {
     const XmlElement* const found = optional(name, {"CLASSNAME"});
-    return found == nullptr ? std::string() : std::string(_reader.className(*found).className);
+    return found == nullptr ? std::string() : _reader.className(*found).className;
 }
 
 ObjectPath Parameters::instanceName(std::string_view name) const {
@@ -110,7 +110,7 @@ PropertyList Parameters::propertyList() const {
     PropertyList properties(std::in_place);
     const Value value = _reader.value(*found, CMPI_stringA, std::string(name));
     for (const Value& element : std::get<Value::Array>(value.content)) {
-        const auto* property = std::get_if<Text>(&element.content);
+        const auto* property = std::get_if<std::string>(&element.content);
         if (property == nullptr || std::any_of(properties->begin(), properties->end(), [&](const std::string& other) {
                 return equalNames(other, *property);
             })) {
@@ -119,7 +119,7 @@ PropertyList Parameters::propertyList() const {
         if (properties->size() == maximumNames) {
             invalid("found more than " + std::to_string(maximumNames) + " properties in " + std::string(name));
         }
-        properties->emplace_back(*property);
+        properties->push_back(*property);
     }
     return properties;
 }

@@ -132,15 +132,14 @@ void pull(const Call& call, Pulled kind) {
 void openEnumerateInstances(const Call& call) {
     const Selection selection = selectionOfEnumeration(call);
     Opening opening(call, Pulled::instancesWithPath);
-    forEachInstance(call, call.parameters.className("ClassName"), selection.properties, [&](const Instance& instance) {
-        opening.add(&ResponseWriter::instanceWithPath, instance, selection);
-    });
+    forEachInstance(call, call.parameters.className("ClassName"), selection.properties,
+                    [&](Instance&& instance) { opening.add(&ResponseWriter::instanceWithPath, instance, selection); });
     opening.finish();
 }
 
 void openEnumerateInstancePaths(const Call& call) {
     Opening opening(call, Pulled::instancePaths);
-    forEachInstanceName(call, [&](const ObjectPath& path) { opening.add(&ResponseWriter::instancePath, path); });
+    forEachInstanceName(call, [&](ObjectPath&& path) { opening.add(&ResponseWriter::instancePath, path); });
     opening.finish();
 }
 
@@ -197,7 +196,7 @@ void openQueryInstances(const Call& call) {
     selection.properties = query.properties;
     Opening opening(call, Pulled::instances);
     forEachMatch(call, query,
-                 [&](const Instance& instance) { opening.add(&ResponseWriter::instance, instance, selection); });
+                 [&](Instance&& instance) { opening.add(&ResponseWriter::instance, instance, selection); });
     opening.finish();
 }
 

@@ -333,7 +333,7 @@ bool isComparable(CMPIType type, const Comparison& comparison) {
                comparison.comparedBy == Comparison::Operator::notEqual;
     }
     if (type == CMPI_dateTime && literal == CMPI_string) {
-        return parseDateTime(std::get<Text>(comparison.literal.content)).has_value();
+        return parseDateTime(std::get<std::string>(comparison.literal.content)).has_value();
     }
     return (isNumber(type) && isNumber(literal)) || (isText(type) && literal == CMPI_string);
 }
@@ -369,7 +369,7 @@ std::partial_ordering compareNumbers(const Value& left, const Value& right) {
 }
 
 /** A point in time and an interval cannot be compared. */
-std::partial_ordering compareTimes(std::string_view left, std::string_view right) {
+std::partial_ordering compareTimes(const std::string& left, const std::string& right) {
     const auto leftTime = parseDateTime(left);
     const auto rightTime = parseDateTime(right);
     return leftTime && rightTime && leftTime->interval == rightTime->interval
@@ -382,12 +382,12 @@ std::partial_ordering compare(const Value& value, const Value& literal) {
         return *truth == std::get<bool>(literal.content) ? std::partial_ordering::equivalent
                                                          : std::partial_ordering::unordered;
     }
-    if (const auto* text = std::get_if<Text>(&value.content)) {
-        const auto& other = std::get<Text>(literal.content);
+    if (const auto* text = std::get_if<std::string>(&value.content)) {
+        const auto& other = std::get<std::string>(literal.content);
         return value.type == CMPI_dateTime ? compareTimes(*text, other) : *text <=> other;
     }
     if (const auto* character = std::get_if<char16_t>(&value.content)) {
-        return std::string_view(utf8(*character)) <=> std::get<Text>(literal.content);
+        return utf8(*character) <=> std::get<std::string>(literal.content);
     }
     return compareNumbers(value, literal);
 }

@@ -101,9 +101,9 @@ void ResponseWriter::className(std::string_view name) {
     pass();
 }
 
-void ResponseWriter::localNameSpacePath(std::string_view nameSpace) {
+void ResponseWriter::localNameSpacePath(const std::string& nameSpace) {
     raw("<LOCALNAMESPACEPATH>");
-    const std::string_view whole = nameSpace.empty() ? std::string_view(_nameSpace) : nameSpace;
+    const std::string_view whole = nameSpace.empty() ? _nameSpace : nameSpace;
     for (std::size_t start = 0; start <= whole.size();) {
         const std::size_t end = std::min(whole.find('/', start), whole.size());
         raw("<NAMESPACE");
@@ -118,7 +118,7 @@ void ResponseWriter::key(const NamedValue& key) {
     raw("<KEYBINDING");
     attribute("NAME", key.name);
     raw(">");
-    if (std::holds_alternative<Box<ObjectPath>>(key.value.content)) {
+    if (std::holds_alternative<std::shared_ptr<const ObjectPath>>(key.value.content)) {
         value(key.value);
     } else {
         raw("<KEYVALUE");
@@ -142,7 +142,7 @@ void ResponseWriter::instanceName(const ObjectPath& path) {
     pass();
 }
 
-void ResponseWriter::nameSpacePath(std::string_view nameSpace) {
+void ResponseWriter::nameSpacePath(const std::string& nameSpace) {
     raw("<NAMESPACEPATH>\n<HOST>");
     appendText(_text, _host);
     raw("</HOST>\n");
@@ -195,13 +195,13 @@ void ResponseWriter::scalar(const Value& value) {
         appendNumber(_text, *natural);
     } else if (const auto* integer = std::get_if<std::int64_t>(&value.content)) {
         appendNumber(_text, *integer);
-    } else if (const auto* text = std::get_if<Text>(&value.content)) {
+    } else if (const auto* text = std::get_if<std::string>(&value.content)) {
         appendText(_text, *text);
     } else if (const auto* real = std::get_if<double>(&value.content)) {
         value.type == CMPI_real32 ? appendReal(_text, static_cast<float>(*real)) : appendReal(_text, *real);
     } else if (const auto* character = std::get_if<char16_t>(&value.content)) {
         appendText(_text, utf8(*character));
-    } else if (const auto* embedded = std::get_if<Box<Instance>>(&value.content)) {
+    } else if (const auto* embedded = std::get_if<std::shared_ptr<const Instance>>(&value.content)) {
         ResponseWriter inner(_catalogue, _host, _nameSpace);
         inner.instance(**embedded, {});
         appendText(_text, inner._text);
@@ -219,7 +219,7 @@ void ResponseWriter::value(const Value& value) {
             element.isNull() ? raw("<VALUE.NULL/>") : this->value(element);
         }
         raw(references ? "</VALUE.REFARRAY>" : "</VALUE.ARRAY>");
-    } else if (const auto* path = std::get_if<Box<ObjectPath>>(&value.content)) {
+    } else if (const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content)) {
         reference(**path);
     } else {
         raw("<VALUE>");

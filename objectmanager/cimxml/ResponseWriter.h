@@ -96,8 +96,8 @@ private:
         }
     }
     void send();
-    void localNameSpacePath(std::string_view nameSpace);
-    void nameSpacePath(std::string_view nameSpace);
+    void localNameSpacePath(const std::string& nameSpace);
+    void nameSpacePath(const std::string& nameSpace);
     void classPath(const std::string& name);
     void reference(const ObjectPath& path);
     void scalar(const Value& value);

@@ -15,7 +15,7 @@ namespace ObjectManager::CimXml {
 
 namespace {
 
-[[noreturn]] void invalid(std::string_view message) {
+[[noreturn]] void invalid(const std::string& message) {
     throw CimError(CMPI_RC_ERR_INVALID_PARAMETER, message);
 }
 
@@ -141,7 +141,7 @@ ObjectPath ValueReader::instanceName(const XmlElement& element, const std::strin
 void ValueReader::requireKeys(const ObjectPath& path) const {
     for (const std::string& name : _catalogue.keyNames(path.className)) {
         if (find(path.keys, name) == nullptr) {
-            invalid("found no key " + name + ", expected every key of " + std::string(path.className));
+            invalid("found no key " + name + ", expected every key of " + path.className);
         }
     }
 }
@@ -207,11 +207,10 @@ Value ValueReader::argument(const XmlElement& element, const Parameter& paramete
     } else {
         read = value(element, parameter.type, parameter.name);
     }
-    const auto* path = std::get_if<Box<ObjectPath>>(&read.content);
+    const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&read.content);
     if (path != nullptr && _catalogue.find((*path)->className) != nullptr &&
         !_catalogue.isA((*path)->className, parameter.referenceClass)) {
-        invalid(parameter.name + ": found a " + std::string((*path)->className) + ", expected a " +
-                parameter.referenceClass);
+        invalid(parameter.name + ": found a " + (*path)->className + ", expected a " + parameter.referenceClass);
     }
     return read;
 }

@@ -18,8 +18,8 @@ std::vector<std::string> textsOf(const Qualifiers& qualifiers, std::string_view 
     const auto* array = qualifier == nullptr ? nullptr : std::get_if<Value::Array>(&qualifier->value.content);
     if (array != nullptr) {
         for (const Value& element : *array) {
-            const auto* text = std::get_if<Text>(&element.content);
-            texts.emplace_back(text == nullptr ? std::string_view() : *text);
+            const auto* text = std::get_if<std::string>(&element.content);
+            texts.push_back(text == nullptr ? std::string() : *text);
         }
     }
     return texts;
@@ -51,8 +51,8 @@ constexpr std::string_view range = "..";
 
 /** Whether an entry of a ValueMap ("5", "7..4095", "..3", "32768..") covers the value. */
 bool covers(const std::string& entry, const Value& value) {
-    if (const auto* text = std::get_if<Text>(&value.content)) {
-        return std::string_view(entry) == *text;
+    if (const auto* text = std::get_if<std::string>(&value.content)) {
+        return entry == *text;
     }
     const auto number = integerOf(value);
     const std::size_t dots = entry.find(range);

@@ -3,8 +3,6 @@
 #include "dispatch/ProviderCall.h"
 #include "text/ObjectPathText.h"
 
-#include <fmt/format.h>
-
 #include <algorithm>
 #include <iterator>
 #include <optional>
@@ -91,13 +89,13 @@ void passInstances(const Result& result, const InstanceSink& sink) {
 
 std::vector<ObjectPath> pathsOf(const Result& result) {
     std::vector<ObjectPath> paths;
-    passPaths(result, [&](const ObjectPath& path) { paths.push_back(path); });
+    passPaths(result, [&](ObjectPath&& path) { paths.push_back(std::move(path)); });
     return paths;
 }
 
 std::vector<Instance> instancesOf(const Result& result) {
     std::vector<Instance> instances;
-    passInstances(result, [&](const Instance& instance) { instances.push_back(instance); });
+    passInstances(result, [&](Instance&& instance) { instances.push_back(std::move(instance)); });
     return instances;
 }
 
@@ -129,18 +127,15 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
         Result result(request);
         // The class is spelled as the provider's registration has it.
         std::optional<ObjectPath> respelled;
-        if (std::string_view(path.className) != registration.className &&
-            equalNames(path.className, registration.className)) {
+        if (path.className != registration.className && equalNames(path.className, registration.className)) {
             respelled = path;
             respelled->className = registration.className;
         }
         const ObjectPath& target = respelled ? *respelled : path;
         const CMPIContext* context = contextOf(request, invocation, path);
         CMPIStatus status{CMPI_RC_OK, nullptr};
-        const std::optional<std::string> thrown = callProvider([&] {
-            status = call(request, context, result.handle(), request.objectPath(target));
-            result.completePaths();
-        });
+        const std::optional<std::string> thrown =
+            callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); });
         // What the provider makes of an exceeded limit is of no interest.
         if (const std::string excess = request.excess(); !excess.empty()) {
             throw CimError(serverLimitsExceeded, registration.provider + ' ' + excess);
@@ -290,21 +285,19 @@ void Dispatcher::requireInstance(const Invocation& invocation, const ObjectPath&
 }
 
 /** Checks an argument that is a reference, or an array of references: each must name an instance that is there. */
-void Dispatcher::requireReference(const Invocation& invocation, std::string_view argument, const Value& value) {
+void Dispatcher::requireReference(const Invocation& invocation, const std::string& argument, const Value& value) {
     if (const auto* elements = std::get_if<Value::Array>(&value.content)) {
         for (const Value& element : *elements) {
             requireReference(invocation, argument, element);
         }
         return;
     }
-    const auto* const reference = std::get_if<Box<ObjectPath>>(&value.content);
+    const auto* const reference = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content);
     if (reference == nullptr) {
         return;
     }
     const ObjectPath& path = **reference;
-    const auto fail = [&](CMPIrc code, std::string_view what) {
-        throw CimError(code, fmt::format("{}: {}", argument, what));
-    };
+    const auto fail = [&](CMPIrc code, const std::string& what) { throw CimError(code, argument + ": " + what); };
     if (_broker.classes() != nullptr && _broker.classes()->declaredName(path.className) == nullptr) {
         fail(CMPI_RC_ERR_INVALID_PARAMETER, "found a path of the class " + path.className +
                                                 ", which is not declared, expected the path of an instance");
@@ -314,43 +307,41 @@ void Dispatcher::requireReference(const Invocation& invocation, std::string_view
              "found the class " + path.className + ", expected the path of an instance, with its keys");
     }
     if (!hasInstanceProvider(path) || !isNamed(invocation, path)) {
-        fail(CMPI_RC_ERR_NOT_FOUND,
-             fmt::format("there is no instance {}, expected one of those of {} that are served in that namespace",
-                         formatLocalPath(path), path.className));
+        fail(CMPI_RC_ERR_NOT_FOUND, "there is no instance " + formatLocalPath(path) + ", expected one of those of " +
+                                        path.className + " that are served in that namespace");
     }
 }
 
 namespace {
 
 /**
- * The path that the client means with a reference, if it is not the one given. The client wbemcli takes the first part
- * of a namespace for a host name: it turns root/cimv2:CLASS into the host root and the namespace cimv2. If the
- * namespace cimv2 is not registered but root/cimv2 is, the reference is one in root/cimv2.
+ * The reference that the client means. The client wbemcli takes the first part of a namespace for a host name: it turns
+ * root/cimv2:CLASS into the host root and the namespace cimv2. If the namespace cimv2 is not registered but root/cimv2
+ * is, the reference is one in root/cimv2.
  */
-std::optional<ObjectPath> meantPath(const Value& given, const Registry& registry) {
-    const auto* const reference = std::get_if<Box<ObjectPath>>(&given.content);
+Value meantReference(const Value& given, const Registry& registry) {
+    const auto* const reference = std::get_if<std::shared_ptr<const ObjectPath>>(&given.content);
     const auto isServed = [&](std::string_view nameSpace) {
         return std::ranges::any_of(registry.registrations(),
                                    [&](const Registration& registration) { return registration.isIn(nameSpace); });
     };
     if (reference == nullptr || isServed((*reference)->nameSpace) ||
-        !isServed(fmt::format("{}/{}", (*reference)->host, (*reference)->nameSpace))) {
-        return std::nullopt;
+        !isServed((*reference)->host + '/' + (*reference)->nameSpace)) {
+        return given;
     }
     ObjectPath meant = **reference;
-    meant.nameSpace = fmt::format("{}/{}", meant.host, meant.nameSpace);
+    meant.nameSpace = meant.host + '/' + meant.nameSpace;
     meant.host.clear();
-    return meant;
+    return referenceValue(std::move(meant));
 }
 
 } // namespace
 
 MethodOutcome Dispatcher::callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
-                                     std::vector<NamedValue> arguments) {
+                                     const std::vector<NamedValue>& given) {
+    std::vector<NamedValue> arguments = given;
     for (NamedValue& argument : arguments) {
-        if (std::optional<ObjectPath> meant = meantPath(argument.value, _registry)) {
-            argument.value = referenceValue(std::move(*meant));
-        }
+        argument.value = meantReference(argument.value, _registry);
     }
     if (!path.keys.empty()) {
         requireInstance(invocation, path);

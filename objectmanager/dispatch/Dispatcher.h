@@ -77,7 +77,7 @@ public:
      *         throw.
      */
     MethodOutcome callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
-                             std::vector<NamedValue> arguments);
+                             const std::vector<NamedValue>& arguments);
     /** Calls the method without those checks. If the provider refuses, the CimError has `refused` set. */
     MethodResult invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                               const std::vector<NamedValue>& arguments) override;
@@ -115,7 +115,7 @@ private:
     bool hasInstanceProvider(const ObjectPath& path) const;
     bool isNamed(const Invocation& invocation, const ObjectPath& path);
     void requireInstance(const Invocation& invocation, const ObjectPath& path);
-    void requireReference(const Invocation& invocation, std::string_view argument, const Value& value);
+    void requireReference(const Invocation& invocation, const std::string& argument, const Value& value);
 
     Registry _registry;
     std::vector<const MethodRule*> _rules;

@@ -6,7 +6,6 @@
 
 #include <stdexcept>
 #include <string>
-#include <string_view>
 #include <vector>
 
 namespace ObjectManager {
@@ -16,7 +15,7 @@ constexpr auto serverLimitsExceeded = static_cast<CMPIrc>(27);
 
 /** An operation that failed; what() is one line for the person who asked. */
 struct CimError : std::runtime_error {
-    CimError(CMPIrc failure, std::string_view message) : std::runtime_error(std::string(message)), code(failure) {}
+    CimError(CMPIrc failure, const std::string& message) : std::runtime_error(message), code(failure) {}
 
     /** Never CMPI_RC_OK. */
     CMPIrc code;

@@ -18,18 +18,8 @@ bool alike(char left, char right) {
     return left == right || lower(left) == lower(right);
 }
 
-/** Makes `to`, which is null, what `from` is, in the memory of the allocator. */
-template <typename From>
-void place(Value::Content& to, From&& from, Allocator allocator) {
-    const auto placeHeld = [&]<typename Held>(Held&& held) {
-        using Kind = std::remove_cvref_t<Held>;
-        if constexpr (std::uses_allocator_v<Kind, Allocator>) {
-            to.emplace<Kind>(std::forward<Held>(held), allocator);
-        } else {
-            to.emplace<Kind>(held);
-        }
-    };
-    std::visit(placeHeld, std::forward<From>(from));
+Value typed(CMPIType type, Value::Content content) {
+    return Value{type, std::move(content)};
 }
 
 std::size_t combined(std::size_t left, std::size_t right) {
@@ -46,8 +36,10 @@ std::size_t hashOfName(std::string_view name) {
 /** The hash of a value's content. Values of different types may have the same hash. */
 struct HashOfContent {
     std::size_t operator()(std::monostate) const { return 0; }
-    std::size_t operator()(const Box<ObjectPath>& path) const { return ObjectPathHash()(*path); }
-    std::size_t operator()(const Box<Instance>& instance) const { return ObjectPathHash()(instance->path); }
+    std::size_t operator()(const std::shared_ptr<const ObjectPath>& path) const { return ObjectPathHash()(*path); }
+    std::size_t operator()(const std::shared_ptr<const Instance>& instance) const {
+        return ObjectPathHash()(instance->path);
+    }
     std::size_t operator()(const Value::Array& array) const { return array.size(); }
     template <typename T>
     std::size_t operator()(const T& scalar) const {
@@ -67,76 +59,69 @@ bool NameLess::operator()(std::string_view left, std::string_view right) const {
     return inRight != right.end() && (inLeft == left.end() || lower(*inLeft) < lower(*inRight));
 }
 
-Value::Value(const Value& other) = default;
-Value::Value(Value&& other) noexcept = default;
-Value& Value::operator=(const Value& other) = default;
-Value& Value::operator=(Value&& other) = default;
-Value::~Value() = default;
-
-Value::Value(CMPIType valueType, Content valueContent, Allocator allocator) : type(valueType) {
-    place(content, std::move(valueContent), allocator);
-}
-
-Value::Value(const Value& other, Allocator allocator) : type(other.type) {
-    place(content, other.content, allocator);
-}
-
-Value::Value(Value&& other, Allocator allocator) : type(other.type) {
-    place(content, std::move(other.content), allocator);
-}
-
 bool operator==(const Value& left, const Value& right) {
-    return left.type == right.type && left.content == right.content;
+    if (left.type != right.type || left.content.index() != right.content.index()) {
+        return false;
+    }
+    if (const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&left.content)) {
+        return **path == *std::get<std::shared_ptr<const ObjectPath>>(right.content);
+    }
+    if (const auto* instance = std::get_if<std::shared_ptr<const Instance>>(&left.content)) {
+        const auto& other = std::get<std::shared_ptr<const Instance>>(right.content);
+        const auto same = [](const NamedValue& a, const NamedValue& b) {
+            return equalNames(a.name, b.name) && a.value == b.value;
+        };
+        return (*instance)->path == other->path &&
+               std::equal((*instance)->properties.begin(), (*instance)->properties.end(), other->properties.begin(),
+                          other->properties.end(), same);
+    }
+    return left.content == right.content;
 }
 
 Value nullValue(CMPIType type) {
-    return Value(type, std::monostate{});
+    return typed(type, std::monostate{});
 }
 
 Value booleanValue(bool value) {
-    return Value(CMPI_boolean, value);
+    return typed(CMPI_boolean, value);
 }
 
 Value unsignedValue(CMPIType type, std::uint64_t value) {
-    return Value(type, value);
+    return typed(type, value);
 }
 
 Value signedValue(CMPIType type, std::int64_t value) {
-    return Value(type, value);
+    return typed(type, value);
 }
 
 Value realValue(CMPIType type, double value) {
-    return Value(type, value);
+    return typed(type, value);
 }
 
-Value stringValue(std::string_view value) {
-    return Value(CMPI_string, Text(value));
+Value stringValue(std::string value) {
+    return typed(CMPI_string, std::move(value));
 }
 
-Value dateTimeValue(std::string_view value) {
-    return Value(CMPI_dateTime, Text(value));
+Value dateTimeValue(std::string value) {
+    return typed(CMPI_dateTime, std::move(value));
 }
 
 Value referenceValue(ObjectPath value) {
-    return Value(CMPI_ref, Box<ObjectPath>(std::move(value)));
-}
-
-Value instanceValue(Instance value) {
-    return Value(CMPI_instance, Box<Instance>(std::move(value)));
+    return typed(CMPI_ref, std::make_shared<const ObjectPath>(std::move(value)));
 }
 
 Value arrayValue(CMPIType elementType, Value::Array elements) {
-    return Value(static_cast<CMPIType>(elementType | CMPI_ARRAY), std::move(elements));
+    return typed(static_cast<CMPIType>(elementType | CMPI_ARRAY), std::move(elements));
 }
 
-bool operator==(const NamedValue& left, const NamedValue& right) {
-    return equalNames(left.name, right.name) && left.value == right.value;
-}
-
-const NamedValue* find(std::span<const NamedValue> values, std::string_view name) {
+const NamedValue* find(const std::vector<NamedValue>& values, std::string_view name) {
     const auto found =
         std::find_if(values.begin(), values.end(), [&](const NamedValue& v) { return equalNames(v.name, name); });
     return found == values.end() ? nullptr : &*found;
+}
+
+NamedValue* find(std::vector<NamedValue>& values, std::string_view name) {
+    return const_cast<NamedValue*>(find(std::as_const(values), name));
 }
 
 bool operator==(const ObjectPath& left, const ObjectPath& right) {
@@ -156,10 +141,6 @@ std::size_t ObjectPathHash::operator()(const ObjectPath& path) const {
         keys += combined(hashOfName(key.name), std::visit(HashOfContent(), key.value.content));
     }
     return combined(combined(hashOfName(path.nameSpace), hashOfName(path.className)), keys);
-}
-
-bool operator==(const Instance& left, const Instance& right) {
-    return left.path == right.path && left.properties == right.properties;
 }
 
 } // namespace ObjectManager

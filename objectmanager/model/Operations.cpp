@@ -6,7 +6,7 @@ namespace ObjectManager {
 
 std::vector<ObjectPath> Operations::enumerateInstanceNames(const Invocation& invocation, const ObjectPath& classPath) {
     std::vector<ObjectPath> paths;
-    enumerateInstanceNames(invocation, classPath, [&](const ObjectPath& path) { paths.push_back(path); });
+    enumerateInstanceNames(invocation, classPath, [&](ObjectPath&& path) { paths.push_back(std::move(path)); });
     return paths;
 }
 
@@ -14,14 +14,15 @@ std::vector<Instance> Operations::enumerateInstances(const Invocation& invocatio
                                                      const PropertyList& properties) {
     std::vector<Instance> instances;
     enumerateInstances(invocation, classPath, properties,
-                       [&](const Instance& instance) { instances.push_back(instance); });
+                       [&](Instance&& instance) { instances.push_back(std::move(instance)); });
     return instances;
 }
 
 std::vector<Instance> Operations::execQuery(const Invocation& invocation, const ObjectPath& classPath,
                                             const std::string& query, const std::string& language) {
     std::vector<Instance> instances;
-    execQuery(invocation, classPath, query, language, [&](const Instance& instance) { instances.push_back(instance); });
+    execQuery(invocation, classPath, query, language,
+              [&](Instance&& instance) { instances.push_back(std::move(instance)); });
     return instances;
 }
 

@@ -71,10 +71,10 @@ struct Associated {
     std::vector<Object> objects;
 };
 
-/* Called with each object of an enumeration in turn. Its memory ends with the enumeration: who keeps it copies it. */
+/* Take what an enumeration gives, one after the other, so that only one is there at a time. */
 
-using PathSink = std::function<void(const ObjectPath& path)>;
-using InstanceSink = std::function<void(const Instance& instance)>;
+using PathSink = std::function<void(ObjectPath&& path)>;
+using InstanceSink = std::function<void(Instance&& instance)>;
 
 /**
  * Every operation throws CimError where it fails. Paths name the namespace and class in which they are looked up. A

@@ -38,10 +38,10 @@ public:
      */
     void addAssociation(const Instance& association) {
         const Class* known = _catalogue.find(association.path.className);
-        std::string label(association.path.className);
+        std::string label = association.path.className;
         std::vector<std::string> nodes;
         for (const NamedValue& property : association.properties) {
-            if (const auto* end = std::get_if<Box<ObjectPath>>(&property.value.content)) {
+            if (const auto* end = std::get_if<std::shared_ptr<const ObjectPath>>(&property.value.content)) {
                 nodes.push_back(nodeOf(**end));
             } else {
                 const Property* declared = known == nullptr ? nullptr : known->property(property.name);
@@ -67,7 +67,7 @@ private:
 
     /** The class, and below it the keys, except those that repeat class names. */
     static std::string labelOf(const ObjectPath& path) {
-        std::string label(path.className);
+        std::string label = path.className;
         for (const NamedValue& key : path.keys) {
             if (!equalNames(key.name, "CreationClassName") && !equalNames(key.name, "SystemCreationClassName")) {
                 label += fmt::format("\n{}: {}", key.name, plainText(key.value, nullptr));

@@ -58,7 +58,8 @@ std::string textOf(const Session& session, const Instance& instance, const char*
 /** The key Name of the object that a property refers to; the whole reference if the object has no such key. */
 std::string nameBehind(const Session& session, const Instance& instance, const char* reference) {
     const NamedValue* property = find(instance.properties, reference);
-    const auto* path = property == nullptr ? nullptr : std::get_if<Box<ObjectPath>>(&property->value.content);
+    const auto* path =
+        property == nullptr ? nullptr : std::get_if<std::shared_ptr<const ObjectPath>>(&property->value.content);
     const NamedValue* name = path == nullptr ? nullptr : find((*path)->keys, "Name");
     return name == nullptr ? textOf(session, instance, reference) : plainText(name->value, nullptr);
 }

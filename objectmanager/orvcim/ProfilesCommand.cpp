@@ -37,7 +37,7 @@ std::vector<Instance> instancesOf(Session& session, const char* className) {
         if (session.catalogue().isA(registration->className, className)) {
             dispatcher.enumerateInstances(Session::invocation(), {{}, discoveryNameSpace, registration->className, {}},
                                           std::nullopt,
-                                          [&](const Instance& instance) { instances.push_back(instance); });
+                                          [&](Instance&& instance) { instances.push_back(std::move(instance)); });
         }
     }
     return instances;

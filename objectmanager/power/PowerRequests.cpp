@@ -24,7 +24,7 @@ const Value& requiredArgument(const MethodCall& call, std::string_view name) {
 /** The element whose power state is to change. */
 const ObjectPath& elementOf(const MethodCall& call) {
     constexpr std::string_view name = "ManagedElement";
-    const auto* const path = std::get_if<Box<ObjectPath>>(&requiredArgument(call, name).content);
+    const auto* const path = std::get_if<std::shared_ptr<const ObjectPath>>(&requiredArgument(call, name).content);
     if (path == nullptr) {
         throw CimError(CMPI_RC_ERR_INVALID_PARAMETER,
                        fmt::format("{}: found no reference, expected the path of an instance", name));
@@ -36,9 +36,8 @@ const ObjectPath& elementOf(const MethodCall& call) {
 void requireActing(const ObjectPath& service, const std::string& node) {
     constexpr std::string_view prefix = "PowerStateManagement_";
     const NamedValue* const key = find(service.keys, "Name");
-    const auto* const name = key == nullptr ? nullptr : std::get_if<Text>(&key->value.content);
-    if (!node.empty() && name != nullptr && name->starts_with(prefix) &&
-        std::string_view(*name).substr(prefix.size()) != node) {
+    const auto* const name = key == nullptr ? nullptr : std::get_if<std::string>(&key->value.content);
+    if (!node.empty() && name != nullptr && name->starts_with(prefix) && name->substr(prefix.size()) != node) {
         throw CimError(CMPI_RC_ERR_INVALID_PARAMETER,
                        fmt::format("found the service {}, expected {}{}: the agent's node {} takes all power requests",
                                    *name, prefix, node, node));

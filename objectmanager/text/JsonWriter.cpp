@@ -16,13 +16,13 @@ Json toJson(const Instance& instance);
 Json toJson(const Method& method);
 Json toJson(const ObjectPath& path);
 Json toJson(const Property& property);
-Json toJson(std::span<const NamedValue> values);
+Json toJson(const std::vector<NamedValue>& values);
 
 struct ToJson {
     Json operator()(std::monostate) const { return nullptr; }
     Json operator()(char16_t value) const { return utf8(value); }
-    Json operator()(const Box<ObjectPath>& value) const { return formatObjectPath(*value); }
-    Json operator()(const Box<Instance>& value) const { return toJson(*value); }
+    Json operator()(const std::shared_ptr<const ObjectPath>& value) const { return formatObjectPath(*value); }
+    Json operator()(const std::shared_ptr<const Instance>& value) const { return toJson(*value); }
     Json operator()(const Value::Array& value) const {
         Json elements = Json::array();
         for (const Value& element : value) {
@@ -40,10 +40,10 @@ Json toJson(const Value& value) {
     return std::visit(ToJson(), value.content);
 }
 
-Json toJson(std::span<const NamedValue> values) {
+Json toJson(const std::vector<NamedValue>& values) {
     Json members = Json::object();
     for (const NamedValue& value : values) {
-        members[std::string(value.name)] = toJson(value.value);
+        members[value.name] = toJson(value.value);
     }
     return members;
 }

@@ -27,9 +27,11 @@ struct Literal {
         // A real32 is written with no more digits than it has.
         return type == CMPI_real32 ? fmt::format("{:#}", static_cast<float>(value)) : fmt::format("{:#}", value);
     }
-    std::string operator()(const Text& value) const { return inQuotes(value); }
-    std::string operator()(const Box<ObjectPath>& value) const { return inQuotes(formatObjectPath(*value)); }
-    std::string operator()(const Box<Instance>& value) const { return inQuotes(mofInstance(*value)); }
+    std::string operator()(const std::string& value) const { return inQuotes(value); }
+    std::string operator()(const std::shared_ptr<const ObjectPath>& value) const {
+        return inQuotes(formatObjectPath(*value));
+    }
+    std::string operator()(const std::shared_ptr<const Instance>& value) const { return inQuotes(mofInstance(*value)); }
     std::string operator()(const Value::Array& value) const {
         std::string elements;
         for (const Value& element : value) {
@@ -41,16 +43,17 @@ struct Literal {
 
 /** `indent` is the column in which the value begins. */
 std::string qualifierText(const NamedValue& qualifier, std::size_t indent) {
-    const std::string name(qualifier.name);
     const auto* array = std::get_if<Value::Array>(&qualifier.value.content);
     if (array == nullptr) {
-        return qualifier.value == booleanValue(true) ? name : name + '(' + mofLiteral(qualifier.value) + ')';
+        return qualifier.value == booleanValue(true) ? qualifier.name
+                                                     : qualifier.name + '(' + mofLiteral(qualifier.value) + ')';
     }
     std::vector<std::string> elements;
     for (const Value& element : *array) {
         elements.push_back(mofLiteral(element) + (&element == &array->back() ? "}" : ","));
     }
-    return elements.empty() ? name + "{}" : name + '{' + filled(elements, indent + name.size() + 1);
+    return elements.empty() ? qualifier.name + "{}"
+                            : qualifier.name + '{' + filled(elements, indent + qualifier.name.size() + 1);
 }
 
 /** The qualifiers, each on a line of its own, and a line end; empty if there are none. */
@@ -89,9 +92,9 @@ std::string mofLiteral(const Value& value) {
 }
 
 std::string mofInstance(const Instance& instance) {
-    std::string text = fmt::format("instance of {} {{\n", instance.path.className);
+    std::string text = "instance of " + instance.path.className + " {\n";
     for (const NamedValue& property : instance.properties) {
-        text += fmt::format("{:{}}{} = {};\n", "", indentWidth, property.name, mofLiteral(property.value));
+        text += std::string(indentWidth, ' ') + property.name + " = " + mofLiteral(property.value) + ";\n";
     }
     return text + "};\n";
 }

@@ -196,16 +196,16 @@ std::string format(const ObjectPath& path, bool withHosts);
 
 /** The value in the form that it has in an object path's key. */
 std::string keyText(const Value& value, bool withHosts) {
-    const auto* reference = std::get_if<Box<ObjectPath>>(&value.content);
+    const auto* reference = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content);
     return reference == nullptr ? mofLiteral(value) : inQuotes(format(**reference, withHosts));
 }
 
 std::string format(const ObjectPath& path, bool withHosts) {
-    std::string text = withHosts && !path.host.empty() ? fmt::format("//{}/", path.host) : "";
-    text.append(path.nameSpace).append(path.nameSpace.empty() ? "" : ":").append(path.className);
+    std::string text = withHosts && !path.host.empty() ? "//" + path.host + "/" : "";
+    text += path.nameSpace.empty() ? path.className : path.nameSpace + ":" + path.className;
     char separator = '.';
     for (const NamedValue& key : path.keys) {
-        text += fmt::format("{}{}={}", std::exchange(separator, ','), key.name, keyText(key.value, withHosts));
+        text += std::exchange(separator, ',') + key.name + '=' + keyText(key.value, withHosts);
     }
     return text;
 }

@@ -15,10 +15,10 @@ namespace {
 constexpr std::size_t step = 2;
 
 /** The text on one line. A text with control characters becomes a quoted literal, in which they are escaped. */
-std::string oneLine(std::string_view text) {
+std::string oneLine(const std::string& text) {
     const bool plain = std::none_of(text.begin(), text.end(),
                                     [](char c) { return static_cast<unsigned char>(c) < 0x20 || c == 0x7f; });
-    return plain ? std::string(text) : inQuotes(text);
+    return plain ? text : inQuotes(text);
 }
 
 std::string joined(const std::vector<std::string>& texts) {
@@ -32,9 +32,9 @@ std::string joined(const std::vector<std::string>& texts) {
 std::string embeddedText(const Instance& instance) {
     std::vector<std::string> properties;
     for (const NamedValue& property : instance.properties) {
-        properties.push_back(std::string(property.name) + "=" + plainText(property.value, nullptr));
+        properties.push_back(property.name + "=" + plainText(property.value, nullptr));
     }
-    return std::string(instance.path.className) + " {" + joined(properties) + "}";
+    return instance.path.className + " {" + joined(properties) + "}";
 }
 
 /** The text of a value, as pieces between which a line may be broken. */
@@ -59,13 +59,13 @@ std::string plainText(const Value& value, const Element* element) {
                        [element](const Value& v) { return plainText(v, element); });
         return joined(elements);
     }
-    if (const auto* text = std::get_if<Text>(&value.content)) {
+    if (const auto* text = std::get_if<std::string>(&value.content)) {
         return oneLine(*text);
     }
-    if (const auto* path = std::get_if<Box<ObjectPath>>(&value.content)) {
+    if (const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&value.content)) {
         return formatLocalPath(**path);
     }
-    if (const auto* instance = std::get_if<Box<Instance>>(&value.content)) {
+    if (const auto* instance = std::get_if<std::shared_ptr<const Instance>>(&value.content)) {
         return embeddedText(**instance);
     }
     const auto means = element == nullptr ? std::nullopt : meaning(*element, value);
@@ -114,7 +114,7 @@ void TableWriter::write(const std::vector<Instance>& instances, std::size_t inde
         for (const NamedValue& property : instance.properties) {
             const Property* declared = known == nullptr ? nullptr : known->property(property.name);
             const bool key = declared != nullptr && declared->isKey();
-            rows.push_back({{(key ? "* " : "  ") + std::string(property.name)}, piecesOf(property.value, declared)});
+            rows.push_back({{(key ? "* " : "  ") + property.name}, piecesOf(property.value, declared)});
         }
         _out << separator << std::string(indent, ' ') << instance.path.nameSpace << ':' << instance.path.className
              << '\n'
@@ -138,8 +138,7 @@ void TableWriter::classes(const std::vector<Class>& classes) {
 void TableWriter::methodResult(const Method& method, const Value& returnValue, const std::vector<NamedValue>& outputs) {
     std::vector<Row> rows = {{{"ReturnValue"}, piecesOf(returnValue, &method)}};
     for (const NamedValue& output : outputs) {
-        rows.push_back(
-            {{std::string(output.name)}, piecesOf(output.value, findElement(method.parameters, output.name))});
+        rows.push_back({{output.name}, piecesOf(output.value, findElement(method.parameters, output.name))});
     }
     constexpr std::size_t indent = 4;
     _out << method.name << '\n' << aligned(rows, indent);

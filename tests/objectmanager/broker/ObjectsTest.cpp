@@ -201,21 +201,6 @@ TEST_F(InstanceTest, ItsPathIsACopy) {
     EXPECT_EQ("root/cimv2", text(CMGetNameSpace(CMGetObjectPath(instance, nullptr), nullptr)));
 }
 
-class StringTest : public RequestTest {};
-
-/** As CMGetCharPtr reads it in the headers that many providers are compiled with. */
-TEST_F(StringTest, ItsHdlIsItsText) {
-    const CMPIString* string = CMNewString(mb, "text", nullptr);
-    EXPECT_STREQ("text", static_cast<const char*>(string->hdl));
-    CMPIString* cloned = CMClone(string, nullptr);
-    EXPECT_STREQ("text", static_cast<const char*>(cloned->hdl));
-    CMRelease(cloned);
-    EXPECT_STREQ("root/cimv2", static_cast<const char*>(CMGetNameSpace(newPath(), nullptr)->hdl));
-    CMPIArgs* arguments = CMNewArgs(mb, nullptr);
-    CMAddArg(arguments, "Name", "a", CMPI_chars);
-    EXPECT_STREQ("a", static_cast<const char*>(CMGetArg(arguments, "Name", nullptr).value.string->hdl));
-}
-
 class NamedValuesTest : public RequestTest {};
 
 TEST_F(NamedValuesTest, ArgumentsAreFoundByNameAndPosition) {

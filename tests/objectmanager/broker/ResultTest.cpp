@@ -33,7 +33,6 @@ TEST_F(ResultTest, CollectsInstancesWithWholePaths) {
     CMSetProperty(instance, "Name", "a", CMPI_chars);
     CMSetProperty(instance, "System", "s", CMPI_chars);
     EXPECT_EQ(CMPI_RC_OK, CMReturnInstance(handle, instance).rc);
-    result.completePaths();
     ASSERT_EQ(1U, result.instanceCount());
     const Instance returned = result.instance(0);
     const ObjectPath path{"", "root/cimv2", "Test_Disk", {{"System", stringValue("s")}, {"Name", stringValue("a")}}};
@@ -66,19 +65,6 @@ TEST_F(ResultTest, WhatIsDoneToAnInstanceAfterwardsChangesNothing) {
                                             testing::Pair("Test_Disk", stringValue("large")),
                                             testing::Pair("Test_Disk", stringValue("large")),
                                             testing::Pair("Test_Tape", stringValue("large"))));
-}
-
-TEST_F(ResultTest, AnInstanceThatIsReturnedAgainWithAnotherKeyHasAnotherPath) {
-    CMPIInstance* instance = newInstance();
-    CMSetProperty(instance, "System", "s", CMPI_chars);
-    for (const char* name : {"a", "b"}) {
-        CMSetProperty(instance, "Name", name, CMPI_chars);
-        CMReturnInstance(handle, instance);
-    }
-    result.completePaths();
-    ASSERT_EQ(2U, result.instanceCount());
-    EXPECT_EQ(stringValue("a"), find(result.instance(0).path.keys, "Name")->value);
-    EXPECT_EQ(stringValue("b"), find(result.instance(1).path.keys, "Name")->value);
 }
 
 TEST_F(ResultTest, ClonesAreCopied) {

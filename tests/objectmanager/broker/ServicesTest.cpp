@@ -61,7 +61,7 @@ TEST_F(KindsTest, EveryObjectKnowsItsTypeAndHasAText) {
     const auto* dateTime = CMNewDateTimeFromChars(mb, "20260228235959.123456+000", nullptr);
     const auto* error =
         CMNewCMPIError(mb, "a", "b", "message", ErrorSevLow, ErrorProbCauseUnknown, CMPI_RC_ERR_FAILED, nullptr);
-    const auto* enumeration = newObject<CMPIEnumeration>(request, CMPIType{CMPI_uint16});
+    const auto* enumeration = newObjectOf<CMPIEnumeration>(request, {{CMPI_uint16, 0, nullptr}, 0});
     struct Case {
         const void* object;
         const char* type;

@@ -10,8 +10,8 @@ ObjectPath somePath() {
     return {"host", "root/cimv2", "Test_Disk", {{"Name", stringValue("a")}}};
 }
 
-Value someInstance() {
-    return instanceValue({somePath(), {{"Size", stringValue("5")}}});
+Value instanceValue() {
+    return {CMPI_instance, std::make_shared<const Instance>(Instance{somePath(), {{"Size", stringValue("5")}}})};
 }
 
 class ValuesTest : public RequestTest, public testing::WithParamInterface<Value> {
@@ -56,7 +56,7 @@ INSTANTIATE_TEST_SUITE_P(
                     signedValue(CMPI_sint32, INT32_MIN), signedValue(CMPI_sint64, INT64_MIN),
                     realValue(CMPI_real32, 0.5), realValue(CMPI_real64, 1e300), stringValue(""),
                     stringValue(std::string(2000, 'x')), dateTimeValue("20260228235959.123456+000"),
-                    referenceValue(somePath()), someInstance(), nullValue(CMPI_uint16), nullValue(CMPI_string),
+                    referenceValue(somePath()), instanceValue(), nullValue(CMPI_uint16), nullValue(CMPI_string),
                     nullValue(CMPI_uint16A), arrayValue(CMPI_uint16, {}),
                     arrayValue(CMPI_uint16, {unsignedValue(CMPI_uint16, 3), unsignedValue(CMPI_uint16, 4)}),
                     arrayValue(CMPI_string, {stringValue("a"), stringValue("b")})));

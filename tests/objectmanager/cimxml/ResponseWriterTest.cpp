@@ -100,7 +100,8 @@ TEST_F(ResponseWriterTest, WritesPropertiesWithTheTypeOfTheirValueElseOfTheirDec
 }
 
 TEST_F(ResponseWriterTest, WritesAnEmbeddedInstanceAsText) {
-    const Value embedded = instanceValue({{"", "", "Inner", {}}, {{"T", stringValue("a & b")}}});
+    const Value embedded{CMPI_instance, std::make_shared<const Instance>(
+                                            Instance{{"", "", "Inner", {}}, {{"T", stringValue("a & b")}}})};
     EXPECT_THAT(property(embedded),
                 HasSubstr("<PROPERTY NAME=\"P\" TYPE=\"string\" EmbeddedObject=\"instance\"><VALUE>"
                           "&lt;INSTANCE CLASSNAME=\"Inner\"&gt;\n"

@@ -145,7 +145,7 @@ TEST(ReadCatalogue, ReportsAFolderThatIsNotThere) {
 std::vector<std::string> namesOf(const Qualifiers& qualifiers) {
     std::vector<std::string> names;
     for (const NamedValue& qualifier : qualifiers) {
-        names.emplace_back(qualifier.name);
+        names.push_back(qualifier.name);
     }
     std::sort(names.begin(), names.end());
     return names;

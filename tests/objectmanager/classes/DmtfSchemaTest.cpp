@@ -107,7 +107,7 @@ private:
         }
     }
 
-    void qualifierOf(const std::string& owner, std::string_view name, const Qualifiers& ours,
+    void qualifierOf(const std::string& owner, const std::string& name, const Qualifiers& ours,
                      const Qualifiers& theirs) {
         constexpr std::array<std::string_view, 4> mayDiffer = {"Description", "MappingStrings", "ModelCorrespondence",
                                                                "UMLPackagePath"};
@@ -119,7 +119,7 @@ private:
             const NamedValue* found = find(qualifiers, name);
             return found == nullptr ? std::string("nothing") : mofLiteral(found->value);
         };
-        expectEqual(owner + ": " + std::string(name), text(ours), text(theirs));
+        expectEqual(owner + ": " + name, text(ours), text(theirs));
     }
 
     template <typename T>

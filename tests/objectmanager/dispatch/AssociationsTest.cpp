@@ -63,8 +63,7 @@ protected:
         std::vector<std::string> words;
         for (const Associated<ObjectPath>& each : found) {
             for (const ObjectPath& object : each.objects) {
-                words.push_back(each.associationClass + ' ' +
-                                std::string(std::get<Text>(object.keys.at(0).value.content)));
+                words.push_back(each.associationClass + ' ' + std::get<std::string>(object.keys.at(0).value.content));
             }
         }
         return words;
@@ -150,7 +149,7 @@ INSTANTIATE_TEST_SUITE_P(ByRole, RestrictionTest,
 TEST_F(AssociationsTest, AreAskedForTheirOwnClassAndToldTheFilter) {
     const auto shown = [&](const AssociationFilter& filter) {
         const auto found = serving({"Test_ShowsFilter"}).associators(invocation, host, filter, std::nullopt);
-        return std::get<Text>(find(found.at(0).objects.at(0).properties, "Vendor")->value.content);
+        return std::get<std::string>(find(found.at(0).objects.at(0).properties, "Vendor")->value.content);
     };
     EXPECT_EQ("Test_ShowsFilter none none none", shown({}));
     EXPECT_EQ("Test_ShowsFilter Test_Disk Host Disk", shown({"CIM_Has", "Test_Disk", "Host", "Disk"}));
@@ -160,7 +159,7 @@ TEST_F(AssociationsTest, AreAskedForTheirOwnClassAndToldTheFilter) {
 
 TEST_F(AssociationsTest, GiveTheSourceInTheSpellingOfItsDeclaration) {
     const auto references = serving({"Test_BootsFrom"}).referenceNames(invocation, path("TEST_HOST", "h"), {});
-    const auto& source = std::get<Box<ObjectPath>>(references.at(0).keys.at(0).value.content);
+    const auto& source = std::get<std::shared_ptr<const ObjectPath>>(references.at(0).keys.at(0).value.content);
     EXPECT_EQ("Test_Host", source->className);
 }
 
@@ -169,7 +168,7 @@ TEST_F(AssociationsTest, GiveThePropertiesThatAreWantedAndTheKeys) {
     const auto namesOf = [](const Instance& instance) {
         std::vector<std::string> names;
         for (const NamedValue& property : instance.properties) {
-            names.emplace_back(property.name);
+            names.push_back(property.name);
         }
         return names;
     };

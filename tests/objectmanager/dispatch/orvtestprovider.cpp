@@ -41,10 +41,8 @@ CMPIObjectPath* diskPath(const Call& call, const char* name) {
     return path;
 }
 
-/** Its path has no keys: they are to be taken from the properties. */
 CMPIInstance* disk(const Call& call, const char* name) {
-    const CMPIObjectPath* path =
-        CMNewObjectPath(broker, CMGetCharPtr(CMGetNameSpace(call.path, nullptr)), "Test_Disk", nullptr);
+    const CMPIObjectPath* path = diskPath(call, name);
     CMPIInstance* instance = CMNewInstance(broker, path, nullptr);
     std::array<const char*, 2> keys = {"Name", nullptr};
     CMSetPropertyFilter(instance, call.properties, keys.data());
@@ -53,14 +51,6 @@ CMPIInstance* disk(const Call& call, const char* name) {
     const CMPIUint32 size = 512;
     CMSetProperty(instance, "Size", &size, CMPI_uint32);
     return instance;
-}
-
-CMPIStatus returnDisks(const Call& call, int count) {
-    for (int i = 0; i < count; ++i) {
-        CMReturnInstance(call.result, disk(call, "a"));
-    }
-    CMReturnDone(call.result);
-    return ok;
 }
 
 const OrvLog::Observer1* observer = nullptr;
@@ -137,8 +127,14 @@ const std::map<std::string, Behaviour> behaviours = {
          CMReturnDone(call.result);
          return ok;
      }},
-    {"Test_ReturnsAThousand", [](const Call& call) { return returnDisks(call, 1'000); }},
-    {"Test_ReturnsMany", [](const Call& call) { return returnDisks(call, 10'000); }},
+    {"Test_ReturnsMany",
+     [](const Call& call) {
+         for (int count = 0; count < 10'000; ++count) {
+             CMReturnInstance(call.result, disk(call, "a"));
+         }
+         CMReturnDone(call.result);
+         return ok;
+     }},
     {"Test_ReturnsNull",
      [](const Call& call) {
          CMReturnInstance(call.result, nullptr);

@@ -56,7 +56,7 @@ Instance thing() {
              {"Nothing", nullValue(CMPI_string)},
              {"Texts", arrayValue(CMPI_string, {stringValue("a"), stringValue("b, c")})},
              {"None", arrayValue(CMPI_uint16, {})},
-             {"Part", instanceValue(embedded)}}};
+             {"Part", Value{CMPI_instance, std::make_shared<const Instance>(embedded)}}}};
 }
 
 std::string dataFile(const std::string& name) {

@@ -7,7 +7,7 @@
  * but refuses unknown keys, and FOLDER/pg/NAME.mof for object managers that take instances of PG_ProviderModule,
  * PG_Provider and PG_ProviderCapabilities.
  */
-#include "classes/Files.h"
+#include "classes/SchemaFiles.h"
 #include "registry/RegistrationReader.h"
 #include "registry/RegistrationWriter.h"
 

@@ -1,8 +1,8 @@
 #include "classes/Catalogue.h"
 
-#include "classes/Files.h"
 #include "classes/Literals.h"
 #include "classes/MofReader.h"
+#include "classes/SchemaFiles.h"
 
 #include <fmt/format.h>
 

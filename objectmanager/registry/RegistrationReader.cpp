@@ -1,9 +1,9 @@
 #include "registry/RegistrationReader.h"
 
 #include "basics/Trimmed.h"
-#include "classes/Files.h"
 #include "classes/Literals.h"
 #include "classes/MofLexer.h"
+#include "classes/SchemaFiles.h"
 #include "registry/ProviderTypes.h"
 
 #include <fmt/format.h>

@@ -4,8 +4,8 @@
  * not set, these tests are skipped.
  */
 #include "classes/Catalogue.h"
-#include "classes/Files.h"
 #include "classes/Literals.h"
+#include "classes/SchemaFiles.h"
 #include "text/MofText.h"
 
 #include <gmock/gmock.h>

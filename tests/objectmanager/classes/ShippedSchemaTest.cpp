@@ -1,6 +1,6 @@
 #include "classes/Catalogue.h"
-#include "classes/Files.h"
 #include "classes/Literals.h"
+#include "classes/SchemaFiles.h"
 #include "registry/RegistrationReader.h"
 
 #include <gmock/gmock.h>

@@ -1,4 +1,4 @@
-#include "classes/Files.h"
+#include "classes/SchemaFiles.h"
 
 #include "basics/Files.h"
 #include "classes/MofLexer.h"

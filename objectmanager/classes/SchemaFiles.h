@@ -1,8 +1,8 @@
 /**
  * The files of a schema folder.
  */
-#ifndef CLASSES_FILES_H
-#define CLASSES_FILES_H
+#ifndef CLASSES_SCHEMAFILES_H
+#define CLASSES_SCHEMAFILES_H
 
 #include <filesystem>
 #include <string>

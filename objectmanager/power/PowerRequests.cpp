@@ -122,6 +122,13 @@ bool reportsOutcomes(const LogTap& log) {
     return log.isAttached() && log.agentFunction<Norv::Machine1>(Norv::machine1Name) != nullptr;
 }
 
+/** The failure of a call after the machine had accepted the request, with the agent's text about that. */
+CimError failureAfter(const std::string& accepted, const CimError& error) {
+    CimError failure(error.code, fmt::format("{}; but before: {}", error.what(), accepted));
+    failure.reasons = error.reasons;
+    return failure;
+}
+
 /**
  * Calls the provider. If the call fails after the machine has accepted the request, the failure's message says that it
  * did.
@@ -134,9 +141,7 @@ MethodResult answerOf(const std::function<MethodResult()>& provider, const LogTa
         if (!report.accepted) {
             throw;
         }
-        CimError failure(error.code, fmt::format("{}; but before: {}", error.what(), *report.accepted));
-        failure.reasons = error.reasons;
-        throw failure;
+        throw failureAfter(*report.accepted, error);
     }
 }
 

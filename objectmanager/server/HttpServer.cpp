@@ -87,7 +87,8 @@ private:
         std::list<Served>::iterator self{};
     };
 
-    static void* serve(void* served);
+    /** @param data a Served. */
+    static void* serve(void* data);
 
     void acceptAll();
     void acceptOne();

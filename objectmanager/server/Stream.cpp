@@ -129,7 +129,7 @@ Stream::Outcome Stream::sendSome(std::string_view& text, Clock::time_point until
     return outcome;
 }
 
-void Stream::endWithReset() {
+void Stream::endWithReset() const {
     constexpr linger atOnce{1, 0};
     setsockopt(_socket, SOL_SOCKET, SO_LINGER, &atOnce, sizeof atOnce);
 }

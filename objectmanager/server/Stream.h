@@ -62,7 +62,7 @@ public:
      * Makes the connection end with a reset, which tells the client that the answer is incomplete. Needed for an answer
      * whose end is the end of the connection.
      */
-    void endWithReset();
+    void endWithReset() const;
 
     /** Waits until the time is over, the connection is broken, or the descriptor `wake` is readable. */
     void pause(Clock::time_point until, int wake) const;

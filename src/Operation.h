@@ -12,6 +12,7 @@
 
 #include <array>
 #include <charconv>
+#include <concepts>
 #include <cstdint>
 #include <ostream>
 #include <string>
@@ -59,7 +60,8 @@ private:
         stream.write(text.data(), end.ptr - text.data());
     }
 
-    static void put(std::ostream& stream, bool flag) { stream.write(flag ? "1" : "0", 1); }
+    /** Takes nothing that merely converts to a flag, such as a number. */
+    static void put(std::ostream& stream, std::same_as<bool> auto flag) { stream.write(flag ? "1" : "0", 1); }
 
     const std::string& _category;
     std::tuple<Parts...> _parts;

@@ -29,7 +29,7 @@ macro(write_headers variant)
 endmacro()
 
 # Handles that are changed are not const; what is not known of the platform and the version is an error; the services that
-# came late into version 2.0 are missing.
+# came late into version 2.0 are missing; a word of Windows' compilers says how a thread's function is called.
 read_headers()
 foreach(slot setNameSpace setHostname setClassName addKey setNameSpaceFromObjectPath setHostAndNameSpaceFromObjectPath)
   replace(cmpift.h "\\(\\*${slot}\\)\\(const CMPIObjectPath\\*" "(*${slot})(CMPIObjectPath*")
@@ -38,6 +38,7 @@ foreach(slot setPropertyFilter setObjectPath)
   replace(cmpift.h "\\(\\*${slot}\\)\\(const CMPIInstance\\*" "(*${slot})(CMPIInstance*")
 endforeach()
 replace(cmpift.h "\\(\\*setElementAt\\)\\(const CMPIArray\\*" "(*setElementAt)(CMPIArray*")
+replace(cmpift.h "\\(\\*newThread\\)\\(CMPIThreadFunc," "(*newThread)(CMPI_THREAD_RETURN (__cdecl* start)(void*),")
 replace(cmpift.h "[^;]*\\(\\*authorizeFilterCollection\\)[^}]*\\(\\*deActivateFilterCollection\\)[^;]*;" "")
 replace(cmpift.h "[^;]*\\(\\*setPropertyWithOrigin\\)\\(CMPIPropertyMI[^;]*;" "")
 string(APPEND cmpipl.h "

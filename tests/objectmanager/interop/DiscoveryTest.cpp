@@ -7,6 +7,7 @@
 #include "CimErrors.h"
 #include "TestSupport.h"
 #include "classes/Catalogue.h"
+#include "classes/Literals.h"
 #include "dispatch/Dispatcher.h"
 #include "registry/RegistrationReader.h"
 
@@ -15,8 +16,11 @@
 
 #include <array>
 #include <cstdlib>
+#include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
+#include <variant>
 #include <vector>
 
 #include <unistd.h>
@@ -118,10 +122,42 @@ protected:
     }
     static std::string key(const ObjectPath& path, const char* name) { return text({path, path.keys}, name); }
 
+    /** Expects that the class declares each of these values with the value's type. */
+    void expectDeclared(const std::string& className, const std::vector<NamedValue>& values) {
+        const Class* const declaration = catalogue.find(className);
+        ASSERT_NE(declaration, nullptr) << className;
+        for (const NamedValue& named : values) {
+            const std::string name = className + '.' + named.name;
+            const Property* const property = declaration->property(named.name);
+            ASSERT_NE(property, nullptr) << name << " is not declared";
+            EXPECT_EQ(typeName(named.value.type), typeName(property->type)) << name;
+            if (const auto* const path = std::get_if<std::shared_ptr<const ObjectPath>>(&named.value.content)) {
+                EXPECT_TRUE(catalogue.isA((*path)->className, property->referenceClass)) << name;
+                expectDeclared((*path)->className, (*path)->keys);
+            }
+        }
+    }
+
     Catalogue catalogue = readCatalogue(TEST_SCHEMA);
     std::optional<OwnProviders> providers;
     std::optional<Dispatcher> dispatcher;
 };
+
+/** OpenPegasus refuses values that the class does not declare, or not with their type. */
+TEST_F(Discovery, FindsOnlyValuesThatTheirClassesDeclare) {
+    providers->answerOn({"https://192.0.2.7:5989", true});
+    for (const Registration& registration : readRegistrations(std::filesystem::path(TEST_SCHEMA))) {
+        for (const std::string& nameSpace : registration.nameSpaces) {
+            const std::vector<Instance> found = instances(registration.className.c_str(), nameSpace.c_str());
+            EXPECT_FALSE(found.empty()) << nameSpace << ':' << registration.className;
+            for (const Instance& instance : found) {
+                expectDeclared(instance.path.className, instance.properties);
+                expectDeclared(instance.path.className, instance.path.keys);
+                EXPECT_EQ(instance.path.keys.size(), catalogue.find(instance.path.className)->keys().size());
+            }
+        }
+    }
+}
 
 /* The object manager */
 

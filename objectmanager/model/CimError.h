@@ -1,6 +1,6 @@
-/** How a CIM operation fails. */
-#ifndef OBJECTMANAGER_CIMERROR_H
-#define OBJECTMANAGER_CIMERROR_H
+/** The exception with which a CIM operation fails. */
+#ifndef MODEL_CIMERROR_H
+#define MODEL_CIMERROR_H
 
 #include "cmpidt.h"
 
@@ -10,19 +10,21 @@
 
 namespace ObjectManager {
 
-/** The status code CIM_ERR_SERVER_LIMITS_EXCEEDED (DSP0200), which CMPI has no name for. */
+/** The status code CIM_ERR_SERVER_LIMITS_EXCEEDED (DSP0200), for which CMPI has no name. */
 constexpr auto serverLimitsExceeded = static_cast<CMPIrc>(27);
 
-/** An operation that failed; what() is one line for the person who asked. */
+/** The failure of an operation. what() says in one line what went wrong, for the person who asked for the operation. */
 struct CimError : std::runtime_error {
     CimError(CMPIrc failure, const std::string& message) : std::runtime_error(message), code(failure) {}
 
-    /** Never CMPI_RC_OK. */
+    /** A status code of DSP0200, or a return code of CMPI; never CMPI_RC_OK. */
     CMPIrc code;
-    /** A method was refused, though the provider tells of no failure: what() and the reasons say all there is to say.
+    /**
+     * Whether a call of a method was refused although the provider reported no failure. The user needs no code then:
+     * what() and `reasons` say everything.
      */
     bool refused = false;
-    /** What the provider logged as failures meanwhile, in that order. */
+    /** The messages of the failures that the provider logged during the operation, in the order of the log. */
     std::vector<std::string> reasons;
 };
 

@@ -13,14 +13,14 @@ namespace {
 
 constexpr std::size_t length = 25;
 
-/** Reads the fields of the form from left to right; once something is wrong, everything after it is. */
+/** Reads the fields of a datetime from left to right. After a wrong field, every further field counts as wrong. */
 class Fields {
 public:
     explicit Fields(std::string_view text) : _text(text), _good(text.size() == length) {}
 
     bool good() const { return _good; }
 
-    /** The next `width` digits, or `least` where they are asterisks. */
+    /** The number in the next `width` digits; `least` if there are asterisks instead of digits. */
     std::uint32_t number(std::size_t width, std::uint32_t least, std::uint32_t greatest) {
         const std::string_view field = next(width);
         std::uint32_t value = least;
@@ -32,7 +32,7 @@ public:
         return value;
     }
 
-    /** Six digits, of which the last ones may be asterisks. */
+    /** The number of microseconds: six digits, of which the last ones may be asterisks, which count as zeros. */
     std::uint32_t fraction() {
         const std::string_view field = next(6);
         const std::size_t digits = std::min(field.find('*'), field.size());
@@ -45,7 +45,7 @@ public:
         return value;
     }
 
-    /** The next character, which has to be one of `expected`. */
+    /** The next character, which must be one of `expected`. */
     char separator(std::string_view expected) {
         const std::string_view field = next(1);
         _good = _good && expected.find(field) != std::string_view::npos;

@@ -9,7 +9,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** ASCII letters only: CIM names are compared without regard to the process's locale. */
+/** Converts ASCII letters only, since the process's locale must not decide which CIM names are equal. */
 char lower(char c) {
     return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
 }
@@ -50,7 +50,7 @@ struct HashOfContent {
 } // namespace
 
 bool equalNames(std::string_view left, std::string_view right) {
-    // Most names that are the same are also written in the same letter case.
+    // Most equal names have the same letter case, too, and the exact comparison is the faster one.
     return left.size() == right.size() && (left == right || std::equal(left.begin(), left.end(), right.begin(), alike));
 }
 
@@ -136,7 +136,7 @@ bool operator==(const ObjectPath& left, const ObjectPath& right) {
 }
 
 std::size_t ObjectPathHash::operator()(const ObjectPath& path) const {
-    std::size_t keys = 0; // a sum, which does not depend on their order
+    std::size_t keys = 0; // a sum does not depend on the order of the keys
     for (const NamedValue& key : path.keys) {
         keys += combined(hashOfName(key.name), std::visit(HashOfContent(), key.value.content));
     }

@@ -1,4 +1,7 @@
-/** The CIM operations on values: what a client asks for, and what providers ask of the object manager in their turn. */
+/**
+ * The interface of CIM operations. Operations on behalf of clients go through it, and so do the up-calls of providers:
+ * the operations for which a provider asks the object manager while it serves one itself.
+ */
 #ifndef MODEL_OPERATIONS_H
 #define MODEL_OPERATIONS_H
 
@@ -13,7 +16,10 @@
 
 namespace ObjectManager {
 
-/** Is told how much memory an operation takes for what providers make. Used by the operation's thread only. */
+/**
+ * Counts the memory that an operation takes for CMPI objects and for blocks of its providers, and may delay or refuse
+ * an allocation. Only the operation's thread uses it.
+ */
 class MemoryMeter {
 public:
     MemoryMeter() = default;
@@ -21,46 +27,54 @@ public:
     MemoryMeter& operator=(const MemoryMeter&) = delete;
     virtual ~MemoryMeter() = default;
 
-    /** Called before so many bytes more are taken. May wait. What it throws, the allocation throws, and takes nothing.
+    /**
+     * Called before the operation allocates `bytes` more. The function may wait. If it throws, no memory is allocated,
+     * and the exception leaves the allocation.
      */
     virtual void take(std::size_t bytes) = 0;
-    /** Called when so many bytes are given back. */
+    /** Called when the operation has given `bytes` back. */
     virtual void give(std::size_t bytes) noexcept = 0;
 };
 
-/** On whose behalf and how an operation is done. */
+/** Who asks for an operation, and how the operation has to be done. */
 struct Invocation {
-    /** The authenticated user; empty where there is none. */
+    /** The name of the user who asks; empty if the user is not known, since clients need not log in. */
     std::string principal;
-    /** Any of the CMPI_FLAG_ bits. */
+    /** The flags of the operation: CMPI_FLAG_ bits of CMPI, or-ed. */
     CMPIUint32 flags = 0;
-    /** Where the user's client is; empty where it is this process. */
+    /** The network address of the user's client; empty if the client is this process. */
     std::string address{};
     /**
-     * Told of the memory of this operation and of those that its providers ask for in their turn. May be null; outlives
+     * Counts the memory of this operation, and of the operations for which its providers ask. May be null; must outlive
      * the operation.
      */
     MemoryMeter* meter = nullptr;
 };
 
-/** The properties wanted of an instance; nothing means all of them. */
+/** The names of the properties that instances are to have; no value means all properties. */
 using PropertyList = std::optional<std::vector<std::string>>;
 
+/** The result of an extrinsic method. */
 struct MethodResult {
     Value returnValue;
     std::vector<NamedValue> outArguments;
 };
 
-/** What a walk over associations is restricted to. Names are taken in any letter case; an empty one restricts nothing.
+/**
+ * The conditions that restrict a walk over associations, from the parameters of the association operations (DSP0200).
+ * Names are compared with `equalNames`; an empty name is no condition.
  */
 struct AssociationFilter {
-    /** The associations' class, or an ancestor of it. */
+    /** The class of the associations, or a superclass of it. */
     std::string associationClass;
-    /** The associated objects' class, or an ancestor of it. Not for references. */
+    /** The class of the associated objects, or a superclass of it. Empty for `references` and `referenceNames`. */
     std::string resultClass;
-    /** The associations' property that refers to the source. */
+    /** The property of the associations that refers to the source. */
     std::string role;
-    /** The associations' property that refers to the associated object. Not for references. */
+    /**
+     * The property of the associations that refers to the associated object. Empty for `references` and
+     * `referenceNames`.
+     */
     std::string resultRole;
 };
 
@@ -71,14 +85,15 @@ struct Associated {
     std::vector<Object> objects;
 };
 
-/* Take what an enumeration gives, one after the other, so that only one is there at a time. */
+/* A sink takes the objects of an enumeration one by one, so that not all of them have to be in memory. */
 
 using PathSink = std::function<void(ObjectPath&& path)>;
 using InstanceSink = std::function<void(Instance&& instance)>;
 
 /**
- * Every operation throws CimError where it fails. Paths name the namespace and class in which they are looked up. A
- * sink is called once the operation is known to succeed, and not at all where it fails.
+ * The CIM operations (DSP0200). Every operation throws CimError if it fails. Each path names the namespace and the
+ * class that the operation is about. An operation with a sink calls it only after the provider has succeeded: if the
+ * operation fails, the sink gets no object. Exceptions of a sink pass through the operation.
  */
 class Operations {
 public:
@@ -93,7 +108,7 @@ public:
                                     const PropertyList& properties, const InstanceSink& sink) = 0;
     virtual Instance getInstance(const Invocation& invocation, const ObjectPath& path,
                                  const PropertyList& properties) = 0;
-    /** The path of the new instance. */
+    /** @return the path of the new instance. */
     virtual ObjectPath createInstance(const Invocation& invocation, const ObjectPath& path,
                                       const Instance& instance) = 0;
     virtual void modifyInstance(const Invocation& invocation, const ObjectPath& path, const Instance& instance,
@@ -105,9 +120,10 @@ public:
                                       const std::vector<NamedValue>& arguments) = 0;
 
     /*
-     * The walks from an instance over the associations that refer to it. No object comes twice from the associations of
-     * one class; one that is reached through several classes comes once from each. The order is that in which the
-     * classes were registered, then the provider's.
+     * These operations follow the associations that refer to a source instance. The associations of one class yield no
+     * object twice; an object that is associated through several association classes comes once for each of them. The
+     * objects are in the order in which their association classes were registered; the objects of one association class
+     * are in the order in which its provider returned them.
      */
 
     virtual std::vector<Associated<Instance>> associators(const Invocation& invocation, const ObjectPath& source,
@@ -115,13 +131,13 @@ public:
                                                           const PropertyList& properties) = 0;
     virtual std::vector<Associated<ObjectPath>> associatorNames(const Invocation& invocation, const ObjectPath& source,
                                                                 const AssociationFilter& filter) = 0;
-    /** The associations themselves. */
+    /** @return the association instances. */
     virtual std::vector<Instance> references(const Invocation& invocation, const ObjectPath& source,
                                              const AssociationFilter& filter, const PropertyList& properties) = 0;
     virtual std::vector<ObjectPath> referenceNames(const Invocation& invocation, const ObjectPath& source,
                                                    const AssociationFilter& filter) = 0;
 
-    /* The enumerations as a whole. */
+    /* These return the objects as a whole, instead of passing them to a sink. */
 
     std::vector<ObjectPath> enumerateInstanceNames(const Invocation& invocation, const ObjectPath& classPath);
     std::vector<Instance> enumerateInstances(const Invocation& invocation, const ObjectPath& classPath,

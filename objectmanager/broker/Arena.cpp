@@ -8,8 +8,9 @@
 #include <new>
 
 /*
- * Where AddressSanitizer is on, everything that is not handed out is poisoned, so that it finds a use of released
- * memory although the memory is still there. The macros do nothing otherwise.
+ * If AddressSanitizer is on, every byte that belongs to no allocated block is poisoned. AddressSanitizer then finds
+ * uses of deallocated memory, although the arena still has this memory. Without AddressSanitizer, its macros do
+ * nothing.
  */
 
 namespace ObjectManager {
@@ -22,7 +23,7 @@ struct Arena::FreeBlock {
     FreeBlock* next;
 };
 
-/** The head of a block from the heap. */
+/** The head of a large block. The allocated memory lies behind it. */
 struct Arena::LargeBlock {
     LargeBlock* next;
     LargeBlock* previous;
@@ -30,7 +31,7 @@ struct Arena::LargeBlock {
 
 namespace {
 
-/** At least one granule. */
+/** The size, rounded up to whole granules; at least one granule. */
 constexpr std::size_t roundUp(std::size_t bytes, std::size_t granule) {
     return bytes == 0 ? granule : (bytes + granule - 1) / granule * granule;
 }
@@ -187,7 +188,7 @@ void Arena::give(std::size_t bytes) {
 
 void* Arena::allocateLarge(std::size_t bytes) {
     constexpr std::size_t head = roundUp(sizeof(LargeBlock), granule);
-    // No object is larger, and sums with such sizes do not overflow.
+    // No object can be larger than PTRDIFF_MAX, and the sums of sizes below do not overflow.
     if (bytes > PTRDIFF_MAX - head) {
         throw std::bad_alloc();
     }

@@ -1,4 +1,4 @@
-/** The memory of a request. */
+/** The memory in which the CMPI objects of a request lie. */
 #ifndef BROKER_ARENA_H
 #define BROKER_ARENA_H
 
@@ -12,20 +12,26 @@
 namespace ObjectManager {
 
 /**
- * Memory that is given back as a whole, and cheaply, when the arena ends. What is deallocated before is used again by
- * the same arena. Destructors of what lies in an arena need not run.
+ * A memory resource that gives all its memory back, and does so cheaply, when it is destroyed. The destructors of
+ * objects that lie in an arena need not run.
  *
- * Small blocks are cut from chunks, which ended arenas leave to later ones (up to `retainedBytes`); large ones come
- * from the heap. An arena is used by one thread at a time.
+ * Small blocks are cut from chunks. A small block that is deallocated is used again by the same arena, and a destroyed
+ * arena leaves its chunks to later arenas. Large blocks come from the heap, and go back to it when they are
+ * deallocated. A block with a stricter alignment than std::max_align_t cannot be allocated.
+ *
+ * One thread at a time may use an arena.
  */
 class Arena final : public std::pmr::memory_resource {
 public:
     static constexpr std::size_t chunkBytes = std::size_t{64} * 1024;
+    /** The size of all chunks that the process keeps, at most, while no arena uses them. */
     static constexpr std::size_t retainedBytes = std::size_t{128} * 1024 * 1024;
 
     /**
-     * @param limit how many bytes the arena holds at most; an allocation that needs more fails with std::bad_alloc.
-     * @param meter is told what the arena holds; may be null, outlives the arena.
+     * @param limit how many bytes of chunks and large blocks the arena may hold; an allocation that would exceed the
+     *        limit throws std::bad_alloc.
+     * @param meter counts the bytes that the arena holds. An allocation throws what the meter throws. May be null; must
+     *        outlive the arena.
      */
     explicit Arena(std::size_t limit = std::numeric_limits<std::size_t>::max(), MemoryMeter* meter = nullptr)
         : _limit(limit), _meter(meter) {}
@@ -36,9 +42,10 @@ public:
     /** Whether an allocation has failed because of the limit. */
     bool isExhausted() const { return _exhausted; }
 
-    /** What all arenas of the process hold now. */
+    /** The numbers of chunks and blocks that the arenas of the process hold now. */
     struct Usage {
         std::size_t chunksInUse = 0;
+        /** The chunks that no arena uses. */
         std::size_t chunksRetained = 0;
         std::size_t largeBlocks = 0;
     };
@@ -59,23 +66,25 @@ private:
 
     void* allocateLarge(std::size_t bytes);
     /**
-     * Counts what the arena is about to take.
+     * Counts bytes that the arena is about to get.
      *
-     * @throws std::bad_alloc if it would hold more than the limit; what the meter throws. Nothing is counted then.
+     * @throws std::bad_alloc if the arena would hold more than the limit; what the meter throws. The bytes are not
+     * counted then.
      */
     void take(std::size_t bytes);
-    /** Counts what the arena has given back. */
+    /** Counts bytes that the arena has given back. */
     void give(std::size_t bytes);
 
     Chunk* _chunks = nullptr;
+    /** The unused part of the newest chunk is from `_next` to `_end`. */
     std::byte* _next = nullptr;
     std::byte* _end = nullptr;
-    /** Blocks to use again, by size in granules. */
+    /** The deallocated small blocks, which are to be used again, by their size in granules. */
     std::array<FreeBlock*, smallBytes / granule + 1> _free{};
     LargeBlock* _large = nullptr;
     const std::size_t _limit;
     MemoryMeter* const _meter;
-    /** In bytes, of chunks and large blocks. */
+    /** The size of the arena's chunks and large blocks, in bytes. */
     std::size_t _held = 0;
     bool _exhausted = false;
 };

@@ -1,4 +1,4 @@
-/* Arrays and enumerations: both are elements of one type. */
+/* Arrays and enumerations: both consist of elements of one type. */
 #include "broker/Objects.h"
 
 namespace ObjectManager {
@@ -40,7 +40,8 @@ CMPIStatus setElementAt(const CMPIArray* self, CMPICount index, const CMPIValue*
     if (status.rc != CMPI_RC_OK) {
         return status;
     }
-    // The strictest object managers convert no text: a provider that works here works there.
+    // CMPI_chars and CMPI_string are not converted into each other, since some object managers do not convert them: a
+    // provider that works here works with those, too.
     const CMPIType expected = array->takesChars ? CMPIType{CMPI_chars} : array->elementType;
     if (type != expected && type != CMPI_null) {
         drop(memory, item);
@@ -69,7 +70,7 @@ CMPIBoolean hasNext(const CMPIEnumeration* self, CMPIStatus* rc) {
     return enumeration != nullptr && enumeration->next < enumeration->elements.count ? 1 : 0;
 }
 
-/** All elements, including those that getNext has already given. */
+/** Returns all elements, including those that getNext has already returned. */
 CMPIArray* toArray(const CMPIEnumeration* self, CMPIStatus* rc) {
     const EnumerationContent* enumeration = contentOf(self, rc);
     return enumeration != nullptr ? returnedCopy<CMPIArray>(enumeration->elements, rc) : nullptr;

@@ -372,7 +372,7 @@ Value toModel(const Item& item) {
         return referenceValue(toModel(*item.content.path));
     case CMPI_instance:
         return {item.type, std::make_shared<const Instance>(toModel(*item.content.instance))};
-    default: // CMPI_string and CMPI_dateTime: nothing else becomes an item
+    default: // CMPI_string and CMPI_dateTime, since no other types become items
         return {item.type, std::string(item.content.text)};
     }
 }

@@ -1,6 +1,9 @@
 /**
- * What CMPI objects hold. Everything is plain data in a memory of its owner: an object's content is copied in, shared
- * with no other object, and either dropped piece by piece or left to its memory's end.
+ * The contents of CMPI objects: plain data without destructors, in a memory resource that the owner chooses. A content
+ * is a copy of the data that it was made from, and no two objects share one. Its owner either drops it, which gives its
+ * memory back at once, or leaves it to the end of the memory resource.
+ *
+ * A function that allocates throws what the memory resource throws: std::bad_alloc, or what a MemoryMeter throws.
  */
 #ifndef BROKER_CONTENT_H
 #define BROKER_CONTENT_H
@@ -18,20 +21,21 @@ namespace ObjectManager {
 
 using Memory = std::pmr::memory_resource;
 
-/** Ends with a null character; where nothing was set yet, the pointer is null and the text is empty. */
+/** A text that ends with a null character. Null if no text was set: it counts as an empty text then. */
 using Text = char*;
 
 inline const char* orEmpty(const char* text) {
     return text != nullptr ? text : "";
 }
 
-/** A null character ends the text. */
+/** A copy of `text` up to its first null character. The caller owns the copy. */
 Text copyText(Memory& memory, std::string_view text);
+/** Gives back a text that `copyText` made in `memory`; null is permitted. */
 void dropText(Memory& memory, Text text);
-/** Puts a copy of `text` in place of what `target` held. */
+/** Replaces the text `target`, which lies in `memory`, by a copy of `text`. */
 void assignText(Memory& memory, Text& target, std::string_view text);
 
-/** A growing array. */
+/** A growing array in a memory resource. It has no destructor, and copies of a list share its elements. */
 template <typename T>
 struct List {
     T* items = nullptr;
@@ -62,7 +66,7 @@ struct List {
         ++size;
     }
 
-    /** Gives back the array, not what its elements point to. */
+    /** Gives back the memory of the array, but not the data to which its elements point. */
     void dropStorage(Memory& memory) {
         if (items != nullptr) {
             memory.deallocate(items, capacity * sizeof(T), alignof(T));
@@ -74,16 +78,16 @@ struct PathContent;
 struct InstanceContent;
 struct Item;
 
-/** A value as `Value` in Model.h describes it. */
+/** The same as a `Value` of Model.h, but as plain data. */
 struct Item {
     CMPIType type = CMPI_null;
     bool null = true;
-    /** How many elements there are, where the value is an array. */
+    /** The number of elements if the value is an array. */
     std::uint32_t count = 0;
     union Content {
-        /** A scalar, at the address of the CMPIValue member of its type. */
+        /** A scalar: its bytes lie where CMPIValue has the member of the type. */
         CMPIUint64 scalar = 0;
-        /** Of a string or a datetime. */
+        /** The characters of a string or of a datetime. */
         Text text;
         PathContent* path;
         InstanceContent* instance;
@@ -103,41 +107,44 @@ struct PathContent {
     Text nameSpace = nullptr;
     Text className = nullptr;
     NamedItems keys;
-    /** Kept by a result, which nobody may change any more. */
+    /** Whether a result keeps this content: it must not be changed then. */
     bool returned = false;
 };
 
 struct InstanceContent {
     PathContent path;
     NamedItems properties;
-    /** The key list and the property list of the filter; the latter holds where `filtered` is set. */
+    /** The names of keys that the provider gave to setPropertyFilter. */
     List<Text> keyNames;
+    /** The names of properties that the provider gave to setPropertyFilter; they restrict it if `filtered` is set. */
     List<Text> wanted;
     bool filtered = false;
-    /** As in PathContent. */
+    /** Whether a result keeps this content: it must not be changed then. */
     bool returned = false;
 };
 
-/** Arguments, or the entries of a context. */
+/** The arguments of a method, or the entries of a context. */
 struct NamedItemsContent {
     NamedItems items;
 };
 
 struct ArrayContent {
-    /** Without CMPI_ARRAY. */
+    /** The type of each element; it does not include CMPI_ARRAY. */
     CMPIType elementType = CMPI_null;
     std::uint32_t count = 0;
     Item* elements = nullptr;
-    /** Whether it was made for CMPI_chars: its elements, which are strings then, have to be handed over as such. */
+    /** Whether the array was made for the type CMPI_chars: its elements are strings, but are set with this type. */
     bool takesChars = false;
 };
 
 struct EnumerationContent {
     ArrayContent elements;
+    /** The index of the element that getNext returns next. */
     std::uint32_t next = 0;
 };
 
 struct DateTimeContent {
+    /** The 25 characters of DSP0004. */
     Text text = nullptr;
 };
 
@@ -159,18 +166,21 @@ struct ErrorContent {
     ArrayContent messageArguments;
 };
 
-/** The size of the CMPIValue member of a scalar type; 0 where the type is none. */
+/** The size in bytes of the CMPIValue member of a scalar type; 0 if the type is not a scalar one. */
 std::size_t scalarSize(CMPIType type);
 
-/** Letter case is ignored. */
+/** The item called `name`, letter case ignored; null if there is none. */
 NamedItem* findItem(const NamedItems& items, std::string_view name);
-/** Takes over `item`, in place of what stands under this name. */
+/** Stores `item`, which the list takes over, under `name`. An item that had this name is dropped. */
 void setItem(Memory& memory, NamedItems& items, std::string_view name, const Item& item);
 
-/** Null items of an array. */
+/** Makes the elements of an array: `count` items, all null; a null pointer if `count` is 0. */
 Item* newElements(Memory& memory, std::uint32_t count);
 
-/* Copies into a memory, and what gives them back to it. Items go without CMPIValue's other pointers. */
+/*
+ * `copy` returns a copy in `memory` with copies of all parts; the caller owns it, and it is not marked as returned.
+ * `drop` gives the parts of a content back to the memory in which they lie.
+ */
 
 Item copy(Memory& memory, const Item& item);
 PathContent copy(Memory& memory, const PathContent& path);
@@ -189,20 +199,20 @@ void drop(Memory& memory, EnumerationContent& enumeration);
 void drop(Memory& memory, DateTimeContent& dateTime);
 void drop(Memory& memory, ErrorContent& error);
 
-/** A copy of `content` in a block of its own. */
+/** A copy of `content` in a new block of `memory`. The caller owns both. */
 template <typename T>
 T* place(Memory& memory, const T& content) {
     return new (memory.allocate(sizeof(T), alignof(T))) T(copy(memory, content));
 }
 
-/** Drops `content` and its block. */
+/** Drops `content`, and gives back the block that `place` made for it. */
 template <typename T>
 void displace(Memory& memory, T* content) {
     drop(memory, *content);
     memory.deallocate(content, sizeof(T), alignof(T));
 }
 
-/* To and from values. */
+/* Conversions of values into contents in `memory`, which the caller owns, and of contents into values. */
 
 Item fromModel(Memory& memory, const Value& value);
 PathContent fromModel(Memory& memory, const ObjectPath& path);

@@ -6,7 +6,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** What a datetime object holds was checked when it was made. */
+/** Reads the text of a datetime object, which was checked when the object was made. */
 DateTime valueOf(const DateTimeContent& content) {
     return parseDateTime(content.text).value_or(DateTime{});
 }

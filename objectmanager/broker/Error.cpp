@@ -23,7 +23,7 @@ CMPIStatus setText(const CMPIError* self, const char* text) {
     return status;
 }
 
-/** A code that was not set reads as 0, as everywhere in CIM_Error. */
+/** A code that was never set is 0, which means "unknown" in the properties of CIM_Error. */
 template <auto member>
 auto getCode(const CMPIError* self, CMPIStatus* rc) {
     const ErrorContent* error = contentOf(self, rc);
@@ -46,7 +46,7 @@ CMPIArray* getArray(const CMPIError* self, CMPIStatus* rc) {
     return error != nullptr ? returnedCopy<CMPIArray>(error->*member, rc) : nullptr;
 }
 
-/** Of strings. */
+/** Sets one of the arrays, which are arrays of strings. */
 template <ArrayContent ErrorContent::*member>
 CMPIStatus setArray(const CMPIError* self, const CMPIArray* array) {
     CMPIStatus status;

@@ -1,4 +1,4 @@
-/* New objects, and the services that work on them. */
+/* Functions that make objects, and functions that work with objects of every kind. */
 #include "broker/Objects.h"
 
 #include "model/DateTime.h"
@@ -11,7 +11,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** More elements than any array of CIM's has; a count beyond is a provider's error, not a wish. */
+/** The greatest number of elements of an array. A provider that asks for more has miscalculated. */
 constexpr CMPICount maximumArraySize = 1'000'000;
 
 const Broker* brokerOf(const CMPIBroker* handle, CMPIStatus* rc) {
@@ -19,7 +19,7 @@ const Broker* brokerOf(const CMPIBroker* handle, CMPIStatus* rc) {
     return handle != nullptr ? static_cast<const Broker*>(handle->hdl) : nullptr;
 }
 
-/** The request in which to make an object; null, with `rc` set, where a broker is missing or the thread has none. */
+/** The current request, for a new object. @return null, with `rc` set, if the thread has none or `broker` is null. */
 Request* factoryRequest(const CMPIBroker* broker, CMPIStatus* rc) {
     return brokerOf(broker, rc) != nullptr ? requestFor(rc) : nullptr;
 }
@@ -58,7 +58,7 @@ CMPIString* newStringSlot(const CMPIBroker* broker, const char* text, CMPIStatus
     return text != nullptr ? returnedString(text, rc) : failure(rc, CMPI_RC_ERR_INVALID_PARAMETER);
 }
 
-/** Whether values of this type can be kept, one for one. */
+/** Whether the elements of an array can have this type. */
 bool isElementType(CMPIType type) {
     return scalarSize(type) != 0 || type == CMPI_string || type == CMPI_dateTime || type == CMPI_ref ||
            type == CMPI_instance;
@@ -127,7 +127,7 @@ CMPIBoolean classPathIsA(const CMPIBroker* handle, const CMPIObjectPath* path, c
     return equalNames(name, className) || derived ? 1 : 0;
 }
 
-/* What an object holds, as text. */
+/* The contents of objects as text. */
 
 std::string describeContent(const char& text) {
     return &text;
@@ -198,7 +198,7 @@ CMPIString* getType(const CMPIBroker*, const void* object, CMPIStatus* rc) {
     return name;
 }
 
-/* There are no message files, so messages are the default texts. */
+/* Message files are not supported: every message is the default text that the provider gives. */
 
 CMPIString* getMessage(const CMPIBroker* broker, const char*, const char* text, CMPIStatus* rc, CMPICount, ...) {
     return newStringSlot(broker, text, rc);
@@ -224,7 +224,7 @@ CMPIString* getMessage2(const CMPIBroker* broker, const char*, CMPIMsgFileHandle
     return newStringSlot(broker, text, rc);
 }
 
-/** A message's text is given as characters or as a string. */
+/** Passes a message to the broker's sink. Its text is `text` or, if that is null, the string. */
 CMPIStatus pass(const CMPIBroker* handle, BrokerMessage::Kind kind, int level, const char* source, const char* text,
                 const CMPIString* string) {
     CMPIStatus status;

@@ -8,7 +8,7 @@ bool contains(const List<Text>& names, std::string_view name) {
     return std::any_of(names.begin(), names.end(), [&](const char* text) { return equalNames(text, name); });
 }
 
-/** Puts copies of a null-ended list's names in place of those in `names`. */
+/** Replaces `names` by copies of the names in `list`, which a null pointer ends; a null `list` has no names. */
 void assignNames(Memory& memory, List<Text>& names, const char** list) {
     std::for_each(names.begin(), names.end(), [&](Text name) { dropText(memory, name); });
     names.size = 0;
@@ -35,7 +35,7 @@ CMPICount getPropertyCount(const CMPIInstance* self, CMPIStatus* rc) {
     return instance != nullptr ? instance->properties.size : 0;
 }
 
-/** A property that the filter leaves out is not kept, and that is no failure. */
+/** Ignores a property that the filter excludes, and reports success then (setPropertyFilter). */
 CMPIStatus setProperty(const CMPIInstance* self, const char* name, const CMPIValue* value, CMPIType type) {
     CMPIStatus status;
     InstanceContent* instance = changeableContentOf(self, &status);
@@ -82,7 +82,7 @@ CMPIStatus setObjectPath(const CMPIInstance* self, const CMPIObjectPath* path) {
     return status;
 }
 
-/** The class of origin is ignored: the schema says where a property was declared. */
+/** Ignores the class of origin, since the schema tells which class declared a property. */
 CMPIStatus setPropertyWithOrigin(const CMPIInstance* self, const char* name, const CMPIValue* value,
                                  const CMPIType type, const char*) {
     return setProperty(self, name, value, type);

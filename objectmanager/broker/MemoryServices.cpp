@@ -1,16 +1,16 @@
-/* Memory of the current request for providers, and the early end of objects. */
+/* Providers get memory of the current request here, and release objects before the request ends. */
 #include "broker/Objects.h"
 
 namespace ObjectManager {
 
 namespace {
 
-/** Stands in front of each block that a provider gets: the provider gives back the address, not the size. */
+/** Stands in front of each block that a provider gets, since a provider that frees the block does not tell its size. */
 struct alignas(std::max_align_t) BlockHead {
     std::size_t bytes;
 };
 
-/** A size beyond is a provider's error, not a wish. */
+/** The greatest size of a block. A provider that asks for a greater one has miscalculated. */
 constexpr std::size_t maximumBlock = std::size_t{1} << 30U;
 
 BlockHead* headOf(void* block) {
@@ -103,7 +103,7 @@ void freeObject(const CMPIBroker*, Handle* object) {
     release(object);
 }
 
-/** There are none. */
+/** Does nothing, since no CMPISelectExp can be made (`newSelectExp`). */
 void freeSelectExp(const CMPIBroker*, CMPISelectExp*) {}
 
 } // namespace

@@ -1,4 +1,4 @@
-/* Arguments and contexts: both are values under names. */
+/* Arguments and contexts: both consist of values with names. */
 #include "broker/Objects.h"
 
 namespace ObjectManager {

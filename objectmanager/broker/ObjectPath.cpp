@@ -4,7 +4,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** Sets one of a path's texts. */
+/** Sets one text of a path. */
 CMPIStatus setText(const CMPIObjectPath* self, Text PathContent::*member, const char* text) {
     CMPIStatus status;
     PathContent* path = changeableContentOf(self, &status);
@@ -81,7 +81,7 @@ CMPIStatus setHostAndNameSpaceFromObjectPath(const CMPIObjectPath* self, const C
     return status.rc == CMPI_RC_OK ? setHostname(self, orEmpty(contentOf(source, nullptr)->host)) : status;
 }
 
-/** Qualifiers are not served: classes are known to the layers above only. */
+/** Reports that qualifiers are not supported: only higher layers know the declarations of classes. */
 CMPIData qualifier(const CMPIObjectPath* self, CMPIStatus* rc) {
     CMPIStatus status;
     return noData(rc, contentOf(self, &status) != nullptr ? CMPI_RC_ERR_NOT_SUPPORTED : status.rc);

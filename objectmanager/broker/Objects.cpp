@@ -45,7 +45,7 @@ CMPIrc readText(Memory& memory, CMPIType type, const char* text, Item& item) {
     return CMPI_RC_OK;
 }
 
-/** Reads the object of an encapsulated type: `store` copies its content into the item. */
+/** Reads an object into an item; `store` copies the object's content into the item. */
 template <typename Handle, typename Store>
 CMPIrc readObject(CMPIType type, const Handle* object, Item& item, Store store) {
     Item read{type, object == nullptr, 0, {}};
@@ -61,6 +61,7 @@ CMPIrc readObject(CMPIType type, const Handle* object, Item& item, Store store) 
     return CMPI_RC_OK;
 }
 
+/** The type with which a value is kept: strings instead of CMPI_chars. */
 CMPIType keptType(CMPIType type) {
     const auto element = static_cast<CMPIType>(type & ~CMPI_ARRAY);
     return element == CMPI_chars ? static_cast<CMPIType>((type & CMPI_ARRAY) | CMPI_string) : type;
@@ -83,7 +84,7 @@ CMPIrc readArray(Memory& memory, CMPIType type, const CMPIArray* array, Item& it
     return CMPI_RC_OK;
 }
 
-/** Where the path has no keys and every key property is set, calls `add` with each of these properties. */
+/** If the path has no keys and every key property is set, calls `add` with each of the key properties. */
 template <typename Add>
 void forMissingKeys(const InstanceContent& instance, const ClassInformation* classes, Add add) {
     if (instance.path.keys.size != 0) {
@@ -176,7 +177,7 @@ CMPIData dataOf(const Item& item, CMPIValueState state, CMPIStatus* rc) {
     case CMPI_ref:
         data.value.ref = newObject<CMPIObjectPath>(*request, place(memory, *item.content.path));
         break;
-    default: // CMPI_instance: nothing else becomes an item
+    default: // CMPI_instance, since no other types become items
         data.value.inst = newObject<CMPIInstance>(*request, place(memory, *item.content.instance));
         break;
     }

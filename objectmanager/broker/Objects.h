@@ -1,10 +1,15 @@
 /**
- * CMPI objects: the handles that providers hold, and what all kinds of them have in common.
+ * CMPI objects (The Open Group, C061): the handles that providers hold, and the functions that all kinds of objects
+ * have in common.
  *
- * The rules of every slot: an object or argument that is null gives CMPI_RC_ERR_INVALID_HANDLE or
- * CMPI_RC_ERR_INVALID_PARAMETER; so does an object that somebody else made. An object that was released gives
- * CMPI_RC_ERR_INVALID_HANDLE, and the current request learns of it. What a slot returns is an object of its own in the
- * current request, never a part of another object.
+ * These rules hold for every slot that reports a status. If an object is null, or is not one of this object manager's
+ * objects of the right kind, the slot reports CMPI_RC_ERR_INVALID_HANDLE; if another pointer is null that must not be
+ * null, it reports CMPI_RC_ERR_INVALID_PARAMETER. If an object was released, the slot reports
+ * CMPI_RC_ERR_INVALID_HANDLE, and the current request learns that the provider broke a rule. A slot returns an object
+ * as a new one of the current request, never as a part of another object; only a clone belongs to no request.
+ *
+ * If the request may not have the memory for an object, the slot throws the exception of `Request::memory`, which
+ * passes through the code of the provider to its caller.
  */
 #ifndef BROKER_OBJECTS_H
 #define BROKER_OBJECTS_H
@@ -38,7 +43,7 @@ extern const CMPIBrokerEncFT factoryTable;
 extern const CMPIBrokerExtFT operatingSystemTable;
 extern const CMPIBrokerMemFT memoryTable;
 
-/** Of a handle type: what its `hdl` points to, its function table and its name. */
+/** What is particular to a type of handle: the content to which its `hdl` points, its function table and its name. */
 template <typename Handle>
 struct Kind;
 
@@ -64,7 +69,7 @@ template <>
 struct Kind<CMPIContext> : KindOf<NamedItemsContent, contextTable> {
     static constexpr const char* name = "CMPIContext";
 };
-/** `hdl` is the text itself. */
+/** `hdl` points to the characters, which a null character ends. */
 template <>
 struct Kind<CMPIString> : KindOf<char, stringTable> {
     static constexpr const char* name = "CMPIString";
@@ -85,24 +90,25 @@ template <>
 struct Kind<CMPIError> : KindOf<ErrorContent, errorTable> {
     static constexpr const char* name = "CMPIError";
 };
-/** `hdl` is the embedder's object, which is not dropped with the handle. */
+/** `hdl` points to the Result of the operation, which is not dropped when the handle is released. */
 template <>
 struct Kind<CMPIResult> : KindOf<Result, resultTable> {
     static constexpr const char* name = "CMPIResult";
 };
 
-/** How every handle begins. */
+/** An object of any kind: the two members of every CMPI handle, and the members of the broker behind them. */
 struct ObjectHeader {
-    /** Null once the object was released. */
+    /** The content; null once the object was released. */
     void* hdl;
+    /** The function table, which tells the kind of the object. */
     const void* ft;
-    /** Where content lies: the request's arena, or the heap for a clone, which belongs to no request. */
+    /** The memory of the object and of its content: the request's arena or, for a clone, the heap. */
     Memory* memory;
-    /** The object that the request adopted before this one, or the clone buried before it. */
+    /** The object that the request adopted before this one. For a buried clone: the clone that was buried before it. */
     ObjectHeader* previous;
 };
 
-/** The handle that providers hold, and behind it what is ours; laid out as ObjectHeader. */
+/** An object of one kind: the handle that providers hold, and the broker's members. It has ObjectHeader's layout. */
 template <typename Handle>
 struct Shell {
     Handle handle;
@@ -110,6 +116,7 @@ struct Shell {
     ObjectHeader* previous;
 };
 
+/** Makes an object in `memory`. It takes over `content`, which lies in the same memory. */
 template <typename Handle>
 Handle* newShell(Memory& memory, void* content) {
     static_assert(sizeof(Shell<Handle>) == sizeof(ObjectHeader) && alignof(Shell<Handle>) == alignof(ObjectHeader));
@@ -137,13 +144,13 @@ inline void setStatus(CMPIStatus* rc, CMPIrc code) {
     }
 }
 
-/** Sets the code and gives null: the usual end of a slot that failed. */
+/** Sets the code, and returns null, as a slot does that fails to return an object. `rc` may be null. */
 inline std::nullptr_t failure(CMPIStatus* rc, CMPIrc code) {
     setStatus(rc, code);
     return nullptr;
 }
 
-/** What a slot gives back as data where there is none. */
+/** Sets the code, and returns the data that a slot returns if it has no value. `rc` may be null. */
 inline CMPIData noData(CMPIStatus* rc, CMPIrc code) {
     setStatus(rc, code);
     CMPIData data{};
@@ -151,10 +158,15 @@ inline CMPIData noData(CMPIStatus* rc, CMPIrc code) {
     return data;
 }
 
-/** Tells the current request, where there is one, that the provider broke a rule. */
+/** Reports a breach of the rules by a provider to the current request, if the thread has one (`Request::misuse`). */
 void reportMisuse(const std::string& what);
 
-/** What the object holds; null, with `rc` set, where it holds nothing. Sets `rc` to CMPI_RC_OK otherwise. */
+/**
+ * The content of an object.
+ *
+ * @param rc is set to CMPI_RC_OK or, if there is no content, to CMPI_RC_ERR_INVALID_HANDLE; may be null.
+ * @return null if the object is null, is of another kind, or was released.
+ */
 template <typename Handle>
 typename Kind<Handle>::Content* contentOf(const Handle* object, CMPIStatus* rc) {
     if (object == nullptr || object->ft != &Kind<Handle>::table) {
@@ -168,7 +180,10 @@ typename Kind<Handle>::Content* contentOf(const Handle* object, CMPIStatus* rc) 
     return static_cast<typename Kind<Handle>::Content*>(object->hdl);
 }
 
-/** As `contentOf`, of a path or instance that is to be changed: what a result keeps of it stays as it is. */
+/**
+ * Does what `contentOf` does, for a path or instance that is going to be changed. If a result keeps the content, the
+ * object gets a copy of it first, so that the result does not change.
+ */
 template <typename Handle>
 typename Kind<Handle>::Content* changeableContentOf(const Handle* object, CMPIStatus* rc) {
     auto* content = contentOf(object, rc);
@@ -181,7 +196,7 @@ typename Kind<Handle>::Content* changeableContentOf(const Handle* object, CMPISt
     return content;
 }
 
-/** An object of the current request that takes over `content`, which lies in the request's memory. */
+/** Makes an object of the request. It takes over `content`, which must lie in the request's memory. */
 template <typename Handle>
 Handle* newObject(Request& request, typename Kind<Handle>::Content* content) {
     auto* object = newShell<Handle>(request.memory(), content);
@@ -189,7 +204,7 @@ Handle* newObject(Request& request, typename Kind<Handle>::Content* content) {
     return object;
 }
 
-/** An object of the current request that takes over what `content` points to. */
+/** Makes an object of the request. It takes over the parts of `content`, which must lie in the request's memory. */
 template <typename Handle>
 Handle* newObjectOf(Request& request, const typename Kind<Handle>::Content& content) {
     using Content = typename Kind<Handle>::Content;
@@ -197,22 +212,23 @@ Handle* newObjectOf(Request& request, const typename Kind<Handle>::Content& cont
                              new (request.memory().allocate(sizeof(Content), alignof(Content))) Content(content));
 }
 
+/** Makes a string of the request with a copy of `text`. */
 CMPIString* newString(Request& request, std::string_view text);
 
-/** The current request; null, with `rc` set to CMPI_RC_ERR_FAILED, where the thread has none. */
+/** The current request. @return null if the thread has none; `rc` is set to CMPI_RC_ERR_FAILED unless it is null. */
 Request* requestFor(CMPIStatus* rc);
 
-/** A new string, or null with `rc` set where the thread has no request. */
+/** Makes a string of the current request; a null text counts as an empty one. Without a request, see `requestFor`. */
 CMPIString* returnedString(const char* text, CMPIStatus* rc);
 
-/** An object of its own with a copy of `content`, or null with `rc` set where the thread has no request. */
+/** Makes an object of the current request with a copy of `content`. Without a request, see `requestFor`. */
 template <typename Handle>
 Handle* returnedCopy(const typename Kind<Handle>::Content& content, CMPIStatus* rc) {
     Request* request = requestFor(rc);
     return request != nullptr ? newObject<Handle>(*request, place(request->memory(), content)) : nullptr;
 }
 
-/** Gives back what an object holds and nobody else keeps. */
+/** Takes the content from an object, and gives the content back unless a result keeps it. */
 template <typename Handle>
 void dropContent(ObjectHeader& object) {
     auto* content = static_cast<typename Kind<Handle>::Content*>(std::exchange(object.hdl, nullptr));
@@ -227,12 +243,15 @@ void dropContent(ObjectHeader& object) {
     }
 }
 
-/** Ends a clone whose content is gone: its shell goes with the current request, at once where there is none. */
+/**
+ * Ends a clone whose content was given back. Its shell stays until the current request ends; if there is none, the
+ * shell is deleted at once.
+ */
 void endClone(ObjectHeader& clone);
-/** Ends a clone's shell. */
+/** Gives back the memory of a clone's shell. */
 void deleteShell(ObjectHeader& clone);
 
-/* The slots that are the same for every kind. */
+/* These slots are the same for every kind of object. */
 
 template <typename Handle>
 CMPIStatus release(Handle* object) {
@@ -267,7 +286,7 @@ Handle* clone(const Handle* object, CMPIStatus* rc) {
     return newShell<Handle>(heap, copied);
 }
 
-/** Calls `visit` with the object as what it is; whether it is a CMPI object of ours. */
+/** Calls `visit` with the object as a handle of its type. @return false if it is not one of this broker's objects. */
 template <typename Visitor>
 bool visitObject(const void* object, Visitor visit) {
     struct {
@@ -293,36 +312,60 @@ bool visitObject(const void* object, Visitor visit) {
            tryKind(static_cast<const CMPIResult*>(nullptr));
 }
 
-/* Values as they pass through the slots. */
+/* These convert the values that pass through the slots. */
 
 /**
- * Reads `value` as `type` says (cmpidt.h) into an item in `memory`. A null pointer is a null value.
+ * Copies a provider's value into an item.
  *
- * CMPI_RC_ERR_INVALID_DATA_TYPE for types that cannot be kept, CMPI_RC_ERR_TYPE_MISMATCH for an array of another type,
- * CMPI_RC_ERR_INVALID_HANDLE for an object that holds nothing; `item` is untouched then.
+ * @param memory gets the parts of the item.
+ * @param value,type are in the form of CMPI: for CMPI_chars, the pointer is the text itself; a null pointer is a null
+ *        value.
+ * @param item does not change if the value cannot be read. The content that it had is not dropped.
+ * @return CMPI_RC_OK; CMPI_RC_ERR_INVALID_DATA_TYPE if the type is none of those that `Value` (Model.h) can have;
+ *         CMPI_RC_ERR_TYPE_MISMATCH if the array is of another type; CMPI_RC_ERR_INVALID_HANDLE if the object has no
+ *         content.
  */
 CMPIrc readValue(Memory& memory, const CMPIValue* value, CMPIType type, Item& item);
 
-/** The value as data whose objects belong to the current request. `rc` is set. */
+/**
+ * The value in the form of CMPI; its object, if it has one, is a new one of the current request.
+ *
+ * @param state the value's state; CMPI_nullValue is added to it if the value is null.
+ * @param rc is set to CMPI_RC_OK or, if the value needs an object and the thread has no request, to CMPI_RC_ERR_FAILED;
+ *        may be null.
+ */
 CMPIData dataOf(const Item& item, CMPIValueState state, CMPIStatus* rc);
 
-/** Reads a value and puts it under `name`. */
+/**
+ * Reads a value as `readValue` does, and stores it under `name`.
+ *
+ * @return the code of `readValue`; CMPI_RC_ERR_INVALID_PARAMETER if `name` is null.
+ */
 CMPIStatus setNamedValue(Memory& memory, NamedItems& items, const char* name, const CMPIValue* value, CMPIType type);
-/** The value under `name`, or CMPI_RC_ERR_NO_SUCH_PROPERTY. */
+/**
+ * The value called `name`, as `dataOf` gives it. If there is none, `rc` is set to CMPI_RC_ERR_NO_SUCH_PROPERTY; if
+ * `name` is null, to CMPI_RC_ERR_INVALID_PARAMETER.
+ */
 CMPIData namedValue(const NamedItems& items, const char* name, CMPIValueState state, CMPIStatus* rc);
-/** The value at `index`, with its name where `name` is not null, or CMPI_RC_ERR_NO_SUCH_PROPERTY. */
+/**
+ * The value at `index`, as `dataOf` gives it. Its name is stored in `name`, unless that is null. If there is no such
+ * value, `rc` is set to CMPI_RC_ERR_NO_SUCH_PROPERTY.
+ */
 CMPIData namedValueAt(const NamedItems& items, CMPICount index, CMPIString** name, CMPIValueState state,
                       CMPIStatus* rc);
 
 /*
- * An instance's path, and the instance with it, where a path without keys takes them from the properties: those that
- * the class names as its keys, or where it is not known those of the filter's key list, if all of them are set.
+ * The full path of an instance, and the instance with its full path. A path without keys gets them from the properties
+ * of the instance: from the properties that the class declares as keys or, if no keys of the class are known, from
+ * those in the key list of setPropertyFilter. If one of these properties is not set, the path stays without keys.
  */
 
+/** @param classes may be null. @return a path in `memory`, which the caller owns. */
 PathContent fullPath(Memory& memory, const InstanceContent& instance, const ClassInformation* classes);
+/** @param classes may be null. */
 Instance fullInstance(const InstanceContent& instance, const ClassInformation* classes);
 
-/** A null-ended list of a provider's as values; nothing where it is null. */
+/** The names in a provider's list, which a null pointer ends; no value if the list itself is null. */
 PropertyList propertyListOf(const char** properties);
 
 } // namespace ObjectManager

@@ -1,6 +1,7 @@
 /*
- * Threads, mutexes and conditions of the operating system under CMPI's names: handles are pthread's own, results its
- * error numbers. A null handle gives EINVAL, or does nothing where there is no result.
+ * Threads, mutexes and conditions of the operating system under CMPI's names. Handles are those of POSIX threads, and
+ * results are error numbers. A function that gets a null pointer instead of a handle returns EINVAL or, if it has no
+ * result, does nothing.
  */
 #include "broker/Objects.h"
 
@@ -29,7 +30,7 @@ pthread_t threadOf(void* handle) {
     return std::bit_cast<pthread_t>(handle);
 }
 
-/** Belongs to the current request. */
+/** The file name of a library, as a text in the memory of the current request. */
 char* resolveFileName(const char* library) {
     Request* request = Request::current();
     if (library == nullptr || request == nullptr) {
@@ -131,7 +132,7 @@ int condWait(void* condition, void* mutex) {
                                                     : EINVAL;
 }
 
-/** `until` is a time of the real-time clock. */
+/** @param until a time of the real-time clock. */
 int timedCondWait(void* condition, void* mutex, timespec* until) {
     return condition != nullptr && mutex != nullptr && until != nullptr
                ? pthread_cond_timedwait(conditionOf(condition), mutexOf(mutex), until)

@@ -67,7 +67,7 @@ std::string Request::excess() const {
 }
 
 bool Request::countObject() {
-    // One more than there may be stands for any number of them.
+    // The count stops at the limit and one, which stands for every greater number.
     if (_objects <= _broker.limits().objects) {
         ++_objects;
     }

@@ -4,7 +4,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** Calls a member of the result that the handle stands for. */
+/** Calls a member function of the result whose handle `self` is. */
 template <typename... Arguments>
 CMPIStatus forward(const CMPIResult* self, CMPIStatus (Result::*member)(Arguments...), Arguments... arguments) {
     CMPIStatus status;
@@ -12,7 +12,7 @@ CMPIStatus forward(const CMPIResult* self, CMPIStatus (Result::*member)(Argument
     return result != nullptr ? (result->*member)(arguments...) : status;
 }
 
-/** An operation has one result, which belongs to the object manager: it cannot be copied. */
+/** Refuses to copy a result: an operation has one result, which belongs to the object manager. */
 CMPIResult* refuseClone(const CMPIResult* self, CMPIStatus* rc) {
     return contentOf(self, rc) != nullptr ? failure(rc, CMPI_RC_ERR_NOT_SUPPORTED) : nullptr;
 }
@@ -37,7 +37,7 @@ CMPIStatus returnError(const CMPIResult* self, const CMPIError* error) {
     return forward(self, &Result::returnError, error);
 }
 
-/** The content of an object that a provider returned; where there is none, the request learns what was wrong. */
+/** The content of an object that a provider returned; if the object has none, this is reported to the request. */
 template <typename Handle>
 auto* returned(Request& request, const Handle* object, CMPIStatus& status) {
     auto* content = contentOf(object, &status);
@@ -72,8 +72,8 @@ bool Result::mayTake(const char* attempt) {
 }
 
 /**
- * The content as it is now. An object of this request is marked, so that it copies its content before it is changed;
- * the content of any other object is copied here.
+ * Keeps the content of a returned object as it is now. The content of an object of this request is marked as returned:
+ * the object then copies it before the provider changes it. The content of any other object is copied here.
  */
 template <typename Handle, typename Content>
 const Content* Result::keep(const Handle* object, Content& content) {

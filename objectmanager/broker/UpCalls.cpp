@@ -1,4 +1,4 @@
-/* What providers ask of the object manager in their turn. */
+/* Up-calls: operations for which a provider asks the object manager while it serves one itself. */
 #include "broker/Objects.h"
 
 #include <memory>
@@ -8,7 +8,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** How a provider asks in its turn: as the context says, and as a part of the request that it serves. */
+/** The invocation of an up-call: the user and the flags of the context, and the meter of the request. */
 Invocation invocationOf(const CMPIContext* context, const Request& request) {
     Invocation invocation;
     invocation.meter = request.meter();
@@ -32,8 +32,10 @@ CMPIStatus failed(CMPIrc code, const std::string& message) {
 }
 
 /**
- * Does one up-call: `call` gets the operations that answer it, the request in which it makes objects, and on whose
- * behalf the provider asks. What `call` throws becomes the status.
+ * Does one up-call: `call` gets the operations that serve it, the request in which it makes objects, and the
+ * invocation.
+ *
+ * @return a status; if `call` throws a CimError, the status has its code and message.
  */
 template <typename Call>
 CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call call) {
@@ -65,7 +67,7 @@ CMPIStatus upCall(const CMPIBroker* handle, const CMPIContext* context, Call cal
     return statusOf(CMPI_RC_OK);
 }
 
-/** As `upCall`, for calls on an object path. */
+/** Does an up-call whose target is an object path. `call` gets the path as its last argument. */
 template <typename Call>
 CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path, Call call) {
     CMPIStatus status;
@@ -78,7 +80,7 @@ CMPIStatus pathCall(const CMPIBroker* broker, const CMPIContext* context, const 
     });
 }
 
-/** As `pathCall`, for calls that bring an instance. */
+/** Does an up-call that has an object path and an instance. `call` gets both as its last arguments. */
 template <typename Call>
 CMPIStatus instanceCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                         const CMPIInstance* instance, Call call) {
@@ -94,7 +96,7 @@ CMPIStatus instanceCall(const CMPIBroker* broker, const CMPIContext* context, co
         });
 }
 
-/** Collects paths or instances for an enumeration in a request. */
+/** Collects paths or instances, and makes an enumeration of them in a request. */
 class Elements {
 public:
     Elements(Request& request, CMPIType type) : _request(request), _type(type) {}
@@ -118,7 +120,7 @@ private:
     std::vector<Item> _items;
 };
 
-/** The object, or null where the call failed. Sets `rc`, where it is not null, to the status. */
+/** Sets `rc` to the status, unless `rc` is null. @return the object, which is null if the call failed. */
 template <typename Handle>
 Handle* answer(Handle* object, const CMPIStatus& status, CMPIStatus* rc) {
     if (rc != nullptr) {
@@ -245,7 +247,10 @@ AssociationFilter filterOf(const char* associationClass, const char* resultClass
     return {orEmpty(associationClass), orEmpty(resultClass), orEmpty(role), orEmpty(resultRole)};
 }
 
-/** Does one association call: `call` gets what answers it, who asks, the source, and what takes the objects. */
+/**
+ * Does an up-call for associated objects: `call` gets the operations, the invocation, the source, and a function that
+ * takes the objects found.
+ */
 template <typename Call>
 CMPIEnumeration* associationCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                                  CMPIType type, CMPIStatus* rc, Call call) {
@@ -264,7 +269,10 @@ CMPIEnumeration* associationCall(const CMPIBroker* broker, const CMPIContext* co
     return answer(result, status, rc);
 }
 
-/* The interface has no place for the class of the association, so what is associated comes class after class. */
+/*
+ * An enumeration of CMPI cannot tell the association class of an object. Therefore it has the objects of one
+ * association class after those of another one.
+ */
 
 CMPIEnumeration* associators(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                              const char* associationClass, const char* resultClass, const char* role,
@@ -310,9 +318,9 @@ CMPIEnumeration* referenceNames(const CMPIBroker* broker, const CMPIContext* con
         });
 }
 
-/* Threads of a provider's own. */
+/* Threads that providers start. */
 
-/** The request of an attached thread, from attachThread to detachThread or the thread's end. */
+/** The request of an attached thread; it lasts until detachThread is called, or the thread ends. */
 thread_local std::unique_ptr<Request> attachedRequest;
 
 CMPIContext* prepareAttachThread(const CMPIBroker* broker, const CMPIContext* context) {
@@ -331,7 +339,7 @@ CMPIStatus attachThread(const CMPIBroker* broker, const CMPIContext* context) {
     return status;
 }
 
-/** Ends the context, which prepareAttachThread gave, with the thread's request. */
+/** Ends the thread's request, and releases the context, if it is the one that prepareAttachThread made. */
 CMPIStatus detachThread(const CMPIBroker* broker, const CMPIContext* context) {
     CMPIStatus status;
     if (broker == nullptr || contentOf(context, &status) == nullptr) {
@@ -348,7 +356,7 @@ CMPIStatus detachThread(const CMPIBroker* broker, const CMPIContext* context) {
     return isClone(headerOf(context)) ? release(const_cast<CMPIContext*>(context)) : status;
 }
 
-/* What is not supported. */
+/* The following slots are not supported. */
 
 CMPIStatus unsupported(const CMPIBroker* broker) {
     return statusOf(broker != nullptr ? CMPI_RC_ERR_NOT_SUPPORTED : CMPI_RC_ERR_INVALID_HANDLE);

@@ -18,13 +18,13 @@ struct ThreadRecords {
     std::uint64_t tap = 0;
     std::uint64_t newest = 0;
     std::deque<LogRecord> records;
-    /** The kind and number of the newest record, not an ordinary one, that there was no memory for; 0 if there is none.
-     */
+    /** The kind and number of the newest record that is not ordinary and could not be kept, as memory was short. */
     int unkeptKind = OrvLog::ORDINARY_RECORD;
+    /** 0 if there is no such record. */
     std::uint64_t unkept = 0;
 };
 
-/** Set when the ending thread has destroyed its records: its other destructors may still log. */
+/** Whether the ending thread has destroyed its records. Other destructors of the thread may log after that. */
 constinit thread_local bool isEnding = false;
 
 struct EndingThreadRecords : ThreadRecords {
@@ -144,7 +144,7 @@ std::vector<std::string> LogTap::failuresSince(std::uint64_t sequence) const {
     }
     auto* const machine = failures.empty() ? nullptr : agentFunction<Norv::Machine1>(Norv::machine1Name);
     if (machine != nullptr && machine() == Norv::NO_MACHINE) {
-        // Of a process's failures, the first says what is wrong with the configuration.
+        // The first failure in the process says what is wrong with the configuration.
         const std::lock_guard guard(_mutex);
         if (_mistake.empty()) {
             _mistake = failures.front() + " ('orvcim check' says more)";
@@ -186,7 +186,8 @@ void LogTap::keep(void* context, const OrvLog::ObservedRecord1* record) noexcept
                                 {record->text, record->textSize},
                                 own->newest});
     } catch (const std::bad_alloc&) {
-        // An ordinary record is lost. So is every record of a thread that did not ask for its newest one before.
+        // An ordinary record is lost. If even `recordsOf` failed, any record is; it cannot fail after `newest` was
+        // called.
         if (own != nullptr && record->kind != OrvLog::ORDINARY_RECORD) {
             own->unkeptKind = record->kind;
             own->unkept = own->newest;

@@ -1,4 +1,4 @@
-/** What the agent tells the object manager about the machine, and what providers log while they serve a request. */
+/** Receives the records that providers log while they serve a request, and asks the agent about the machine. */
 #ifndef AGENTLOG_LOGTAP_H
 #define AGENTLOG_LOGTAP_H
 
@@ -15,11 +15,11 @@
 namespace ObjectManager {
 
 struct LogRecord {
-    /** An OrvLog::RecordKind, or a number beyond them if the agent is newer. */
+    /** An OrvLog::RecordKind, or a greater number, which only a newer agent uses. */
     int kind = OrvLog::ORDINARY_RECORD;
     std::string category;
     int level = 0;
-    /** Empty if there was no memory for it. */
+    /** Empty if there was no memory for the text. */
     std::string text;
     /** Increases with each record of a thread. */
     std::uint64_t sequence = 0;
@@ -29,14 +29,15 @@ struct LogRecord {
 std::string_view messageOf(std::string_view text);
 
 /**
- * Receives the records of level 5000 and above from the agent's log library in this process, whatever its thresholds.
+ * Receives the records of level 5000 and above from the agent's log library in this process, whatever the thresholds of
+ * this library are.
  *
- * Each thread has the records that were logged in it. A process has one tap at most, and the tap outlives every call of
- * a provider. Used by several threads at once.
+ * Each thread has the records that were logged in it. A process may have only one tap at a time, and the tap must
+ * outlive every call of a provider. Used by several threads at once.
  */
 class LogTap {
 public:
-    /** How many ordinary records a thread keeps until it takes them; beyond that, the oldest one is dropped. */
+    /** How many records a thread keeps until it takes them; if more come, the oldest ordinary ones are dropped. */
     static constexpr std::size_t recordsPerThread = 1000;
 
     LogTap();
@@ -45,9 +46,10 @@ public:
     ~LogTap();
 
     /**
-     * Listens from now on to the agent's libraries that a provider library is linked to, as far as they offer that.
+     * Listens from now on to the agent's log library to which a provider library is linked, and calls functions of the
+     * agent's instrumentation to which it is linked. A library of the agent without the functions for this is ignored.
      *
-     * @param library the handle from dlopen.
+     * @param library the provider library's handle from dlopen.
      */
     void attach(void* library);
 
@@ -58,9 +60,9 @@ public:
     /**
      * An optional function of the agent's instrumentation.
      *
-     * @tparam Function its type, of those in Norv/Machine.h.
-     * @param name its name, from there.
-     * @return null if no agent is listened to that offers the function.
+     * @tparam Function the type of the function, from Norv/Machine.h.
+     * @param name the name of the function, from Norv/Machine.h.
+     * @return null if no instrumentation is known, or if it does not have the function.
      */
     template <typename Function>
     Function* agentFunction(const char* name) const {
@@ -75,11 +77,12 @@ public:
      */
     std::vector<LogRecord> since(std::uint64_t sequence) const;
     /**
-     * The messages of those of them that are failures. If the agent's configuration cannot be used, they follow from
-     * that: only the mistake in it is given, which the agent reports once in a process.
+     * The messages of the failures among the calling thread's records after the one numbered `sequence`. If the agent's
+     * configuration cannot be used, every failure follows from that. The result then has only the mistake in the
+     * configuration, which the agent logs once in a process.
      */
     std::vector<std::string> failuresSince(std::uint64_t sequence) const;
-    /** Moves the calling thread's records out of here. */
+    /** Returns the calling thread's records, and drops them here. */
     std::vector<LogRecord> take() const;
     /** Drops the calling thread's records. */
     void forget() const;
@@ -88,7 +91,7 @@ private:
     /** A log library that is listened to. */
     struct Heard {
         OrvLog::Observe1* observe;
-        /** Our own handle: it keeps the library loaded, since `observe` is called once more by the destructor. */
+        /** This object's own handle. It keeps the library loaded, since the destructor calls `observe` once more. */
         void* library;
     };
 
@@ -100,9 +103,9 @@ private:
     const std::uint64_t _number;
     mutable std::mutex _mutex;
     std::vector<Heard> _heard;
-    /** Our own handle of the agent's instrumentation; null until one is known. Does not change afterwards. */
+    /** This object's own handle of the agent's instrumentation; null until one is known. It does not change later. */
     std::atomic<void*> _instrumentation = nullptr;
-    /** The mistake in the agent's configuration; empty until it was reported. Guarded by `_mutex`. */
+    /** The mistake in the agent's configuration; empty until the agent has reported one. Guarded by `_mutex`. */
     mutable std::string _mistake;
 };
 

@@ -12,7 +12,7 @@ namespace ObjectManager::Audit {
 
 namespace {
 
-/** The record as fields of the journal: those of systemd.journal-fields(7), and fields of our own. */
+/** The record as fields of the journal: fields of systemd.journal-fields(7), and own fields, which begin with ORV_. */
 Journal::Fields fieldsOf(const CallRecord& record) {
     // The priorities of syslog(3): notice and warning.
     const char* const priority = record.verdict == Verdict::accepted ? "5" : "4";

@@ -12,7 +12,8 @@ namespace ObjectManager {
  * (including U+0080 to U+009F), characters that change the direction of text, and bytes that are not valid UTF-8 become
  * \x and the hexadecimal digits of their bytes.
  *
- * @param longest after so many bytes of the result, "..." replaces the rest of the text. No character is cut in two.
+ * @param longest once the result has this number of bytes, "..." replaces the rest of the text. No character is cut in
+ *        two.
  */
 std::string printable(std::string_view text, std::size_t longest = std::string::npos);
 

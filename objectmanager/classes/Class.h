@@ -21,7 +21,7 @@ bool hasFlag(const Qualifiers& qualifiers, std::string_view name);
 
 struct Class;
 
-/** What a property, a parameter and a method's return value have in common. */
+/** The common members of properties, parameters and methods (whose type is that of the return value). */
 struct Element {
     std::string name;
     /** Includes CMPI_ARRAY if the element is an array. */
@@ -46,7 +46,7 @@ struct Element {
 std::optional<std::string> meaning(const Element& element, const Value& value);
 
 struct Property : Element {
-    /** Null if the declaration gives none. */
+    /** Null if the declaration gives no default value. */
     Value defaultValue;
 
     bool isKey() const { return hasFlag(qualifiers, "Key"); }
@@ -65,7 +65,7 @@ struct Method : Element {
 
 struct Class {
     std::string name;
-    /** Empty if the class has none. */
+    /** Empty if the class has no superclass. */
     std::string superClass;
     Qualifiers qualifiers;
     /** Properties and references. */
@@ -74,8 +74,12 @@ struct Class {
     /** The place of the declaration, "file:line". */
     std::string place;
 
+    /* These find elements by their names, letter case ignored; null if the class has no such element. */
+
     const Property* property(std::string_view name) const;
     const Method* method(std::string_view name) const;
+
+    /** The key properties, in the order of `properties`. */
     std::vector<const Property*> keys() const;
 };
 

@@ -12,7 +12,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** What a flavor changes in a qualifier type. */
+/** A flavor, and the member of a qualifier type that it sets. */
 struct Flavor {
     std::string_view name;
     bool QualifierType::*member;
@@ -333,7 +333,7 @@ private:
         throw SchemaError(placeOf(_file, token.line), fmt::format("found {}, expected {}", describe(token), expected));
     }
 
-    /** Fails because of what stands before the next token. */
+    /** Fails because of `found`, which ends in the line of the token before the next one. */
     [[noreturn]] void failBefore(const std::string& found, const std::string& expected) const {
         throw SchemaError(placeOf(_file, _tokens[_next - 1].line),
                           fmt::format("found {}, expected {}", found, expected));

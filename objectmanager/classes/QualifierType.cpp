@@ -24,7 +24,7 @@ struct StandardType {
     bool toSubclass;
     bool translatable;
     Scopes scopes;
-    /** Null if the qualifier has none. */
+    /** Null if the qualifier has no default value. */
     const char* defaultValue;
 };
 

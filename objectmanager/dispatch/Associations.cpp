@@ -78,8 +78,10 @@ void AssociationWalk::requireDeclared(const std::string& className, const char* 
     }
 }
 
-/** The references by which the associations lead away from the source, within the filter's roles; none if no reference
- * of the class can refer to the source. */
+/**
+ * The references that can lead from the source to an associated object, and that the filter's roles permit; none if no
+ * reference of the class can refer to the source.
+ */
 std::vector<ReferenceEnd> AssociationWalk::farEndsOf(const Registration& registration) const {
     const std::span<const ReferenceEnd> ends = _classes->references(registration.className);
     if (ends.size() < fewestReferences) {

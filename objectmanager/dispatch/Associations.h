@@ -1,4 +1,4 @@
-/** Which associations are followed from an instance, and which of their providers' objects stay in the answer. */
+/** Decides which associations are followed from an instance, and which objects of their providers the answer has. */
 #ifndef DISPATCH_ASSOCIATIONS_H
 #define DISPATCH_ASSOCIATIONS_H
 

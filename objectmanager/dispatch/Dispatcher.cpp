@@ -101,7 +101,7 @@ std::vector<Instance> instancesOf(const Result& result) {
 
 } // namespace
 
-/** What an operation answers with. */
+/** The kind of objects or values that a provider has to return from an operation. */
 enum class Dispatcher::Answer { paths, instances, value, nothing };
 
 Dispatcher::Dispatcher(Registry registry, const Settings& settings)
@@ -136,7 +136,7 @@ auto Dispatcher::serve(const char* operation, const Invocation& invocation, cons
         CMPIStatus status{CMPI_RC_OK, nullptr};
         const std::optional<std::string> thrown =
             callProvider([&] { status = call(request, context, result.handle(), request.objectPath(target)); });
-        // What the provider makes of an exceeded limit is of no interest.
+        // If a limit was exceeded, the status or exception that the provider made of it does not matter.
         if (const std::string excess = request.excess(); !excess.empty()) {
             throw CimError(serverLimitsExceeded, registration.provider + ' ' + excess);
         }

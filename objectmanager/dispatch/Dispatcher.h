@@ -78,7 +78,7 @@ public:
      */
     MethodOutcome callMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                              const std::vector<NamedValue>& arguments);
-    /** Calls the method without those checks. If the provider refuses, the CimError has `refused` set. */
+    /** Calls the method without the checks of `callMethod`. If the provider refuses, the CimError has `refused` set. */
     MethodResult invokeMethod(const Invocation& invocation, const ObjectPath& path, const std::string& method,
                               const std::vector<NamedValue>& arguments) override;
 

@@ -23,7 +23,7 @@ struct MethodCall {
 /** The outcome of a call that the provider answered. */
 struct MethodOutcome {
     MethodResult result;
-    /** What is known about the outcome beyond the return value, or why nothing is known; may be empty. */
+    /** The facts about the outcome beyond the return value, or the reason why nothing is known; may be empty. */
     std::string remark{};
     /** False if nothing but the return value says that the call succeeded. */
     bool isKnown = true;
@@ -43,7 +43,7 @@ public:
     /**
      * Calls the provider if the rule permits it.
      *
-     * @param operations are for what the rule has to find out first.
+     * @param operations serve the rule if it has to look at objects first.
      * @param provider makes the call.
      * @throws CimError if the rule forbids the call, if the provider fails, or if the call failed although the provider
      * reports success.

@@ -15,7 +15,7 @@ namespace ObjectManager {
 
 namespace {
 
-/** What is particular to one kind of provider: the suffix of its factory functions, and the names of its functions. */
+/** The particulars of one kind of provider: the suffix of its factory functions, and the names of its functions. */
 template <typename MI>
 struct MIKind;
 
@@ -50,7 +50,8 @@ const char* missingSlot(const MI& mi) {
 }
 
 /**
- * What is wrong with a function table, as the end of a sentence that begins with its factory; empty if it is correct.
+ * The mistake in a provider's function table, as the end of a sentence that begins with the provider's factory; empty
+ * if the table is correct.
  */
 template <typename MI>
 std::string tableProblem(const MI& mi) {
@@ -80,8 +81,7 @@ std::string joined(const std::vector<std::filesystem::path>& folders) {
 
 } // namespace
 
-/** A loaded library, or what is built into the program in its place, with the providers that the factory functions
- * made. */
+/** A loaded library, or the program itself for built-in providers, with the providers that the factories made. */
 class ProviderLibrary {
 public:
     ProviderLibrary(const Broker& broker, const std::string& location,
@@ -92,14 +92,14 @@ public:
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
     ~ProviderLibrary();
 
-    /** The library's file, with every symbolic link resolved. */
+    /** The file of the library or of the program, with every symbolic link resolved. */
     const std::filesystem::path& file() const { return _file; }
-    /** Null where the providers are built in. */
+    /** The library's handle from dlopen; null if the providers are built in. */
     void* handle() const { return _handle; }
 
     /**
-     * The provider of one kind; its factory is called the first time. @return null if the factory failed: `report` says
-     * why.
+     * The provider of one kind; its factory is called the first time. @return null if the factory failed: `report` has
+     * the reason.
      */
     template <typename MI>
     MI* provider(const std::string& name, FactoryReport& report);
@@ -188,7 +188,7 @@ MI* ProviderLibrary::provider(const std::string& name, FactoryReport& report) {
     return mi;
 }
 
-/** The factory of a provider; an empty function where there is none. */
+/** The factory of a provider; an empty function if the library or program has none. */
 template <typename MI>
 ProviderLibrary::Factory<MI> ProviderLibrary::factoryOf(const std::string& name) {
     if (_builtIn != nullptr) {

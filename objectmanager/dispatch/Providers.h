@@ -25,16 +25,18 @@ struct FactoryReport {
     std::string miName;
     int tableVersion = 0;
     int miVersion = 0;
-    /** What is wrong, in one line; empty if the factory can be used. */
+    /** The reason why the factory cannot be used, in one line; empty if it can. */
     std::string problem;
 };
 
-/** What was found when a registered provider was loaded. */
+/** The findings about a registered provider when it was loaded. */
 struct ProviderReport {
-    /** The library's file with every symbolic link resolved, or the program's for a provider that is built in; empty if
-     * it was not found or does not load. */
+    /**
+     * The library's file with every symbolic link resolved, or the program's file for a provider that is built in;
+     * empty if the library was not found or does not load.
+     */
     std::filesystem::path library;
-    /** Why the library or the registration cannot be used, in one line; empty if it can. */
+    /** The reason why the library or the registration cannot be used, in one line; empty if both can. */
     std::string problem;
     /** One report for each kind of provider that is registered; none if the library cannot be used. */
     std::vector<FactoryReport> factories;
@@ -43,8 +45,8 @@ struct ProviderReport {
 };
 
 /**
- * Providers that are part of the program. In registrations they have a location of their own, which no library has;
- * they are called as those of a library are. Used by several threads at once.
+ * Providers that are part of the program. Registrations name them by a location that no library has. They are called in
+ * the same way as the providers of a library. Used by several threads at once.
  */
 class BuiltInProviders {
 public:
@@ -53,9 +55,11 @@ public:
     BuiltInProviders& operator=(const BuiltInProviders&) = delete;
     virtual ~BuiltInProviders() = default;
 
+    /** The location that registrations of built-in providers have. */
     virtual std::string_view location() const = 0;
 
-    /* What a provider's factory gives; null where it has none of that kind. */
+    /* These do the same as a provider's factory functions. They return null if there is no provider of this name and
+       kind. */
 
     virtual CMPIInstanceMI* instanceProvider(std::string_view provider, const CMPIBroker* broker) = 0;
     virtual CMPIAssociationMI* associationProvider(std::string_view provider, const CMPIBroker* broker) = 0;
@@ -106,7 +110,7 @@ private:
     std::vector<std::filesystem::path> _folders;
     BuiltInProviders* _builtIn;
     Loaded _loaded;
-    /** Recursive, since a factory may call the object manager in its turn. */
+    /** Recursive, since a factory may call functions of the object manager that need a provider. */
     std::recursive_mutex _mutex;
     std::map<std::string, std::unique_ptr<ProviderLibrary>> _libraries;
     /** The registrations whose factories were called. */

@@ -123,7 +123,7 @@ private:
     std::string_view _file;
     std::size_t _line = 0;
     std::size_t _sectionLine = 0;
-    /** The keys that the current section has had so far. */
+    /** The keys that were found so far in the current section. */
     std::vector<std::string> _keys;
     std::vector<Registration> _registrations;
 };

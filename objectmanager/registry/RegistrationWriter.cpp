@@ -42,7 +42,7 @@ std::vector<int> capabilities(const Registration& registration) {
 /** The location that all registrations have in common. */
 const std::string& locationOf(const std::vector<Registration>& registrations) {
     if (registrations.empty()) {
-        throw std::invalid_argument("found no registration, expected those of a library");
+        throw std::invalid_argument("found no registration, expected the registrations of a library");
     }
     const std::string& location = registrations.front().location;
     for (const Registration& registration : registrations) {

@@ -38,7 +38,10 @@ enum class ProviderKind { instance, method, association };
 /** All registrations. The registry does not change, so several threads may use it at once. */
 class Registry {
 public:
-    /** What is registered in one of the namespaces of discovery, root/interop and interop, is in the other one too. */
+    /**
+     * root/interop and interop are two names of the namespace for discovery: a class that is registered in one of them
+     * is registered in the other one, too.
+     */
     explicit Registry(std::vector<Registration> registrations);
 
     const std::vector<Registration>& registrations() const { return _registrations; }
@@ -46,7 +49,7 @@ public:
     /** All namespaces, each once, in the order of their names. */
     std::vector<std::string> nameSpaces() const;
 
-    /** @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace. */
+    /** @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE if no registration names the namespace. */
     void requireNameSpace(std::string_view nameSpace) const;
 
     /**
@@ -59,10 +62,10 @@ public:
     const Registration& find(std::string_view nameSpace, std::string_view className, ProviderKind kind) const;
 
     /**
-     * The registrations in the namespace that have a provider of this kind, in their order; of several for one class,
-     * the first.
+     * The registrations in the namespace that have a provider of this kind, in the order of `registrations`. If several
+     * of them are for one class, only the first one is among them.
      *
-     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE where no registration names the namespace.
+     * @throws CimError with CMPI_RC_ERR_INVALID_NAMESPACE if no registration names the namespace.
      */
     std::vector<const Registration*> all(std::string_view nameSpace, ProviderKind kind) const;
 

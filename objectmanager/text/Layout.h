@@ -18,7 +18,7 @@ inline constexpr std::size_t lineWidth = 100;
 std::size_t columnsOf(std::string_view text);
 
 /**
- * Joins pieces with blanks, and begins a new line where the next piece would exceed `lineWidth`.
+ * Joins pieces with blanks, and begins a new line if the next piece would exceed `lineWidth`.
  *
  * @param indent columns that are already filled in the first line; each further line begins with as many blanks.
  */

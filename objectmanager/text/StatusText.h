@@ -1,5 +1,5 @@
 /**
- * Why an operation failed, in words.
+ * The reasons of failed operations in words.
  */
 #ifndef TEXT_STATUSTEXT_H
 #define TEXT_STATUSTEXT_H

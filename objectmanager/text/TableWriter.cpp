@@ -86,7 +86,7 @@ void TableWriter::instance(const Instance& instance) {
     write({instance}, 0);
 }
 
-/* Each association class is followed by the objects that it leads to. */
+/* The name of each association class is followed by the objects to which its associations lead. */
 
 void TableWriter::associatedNames(const std::vector<Associated<ObjectPath>>& found) {
     for (const Associated<ObjectPath>& each : found) {

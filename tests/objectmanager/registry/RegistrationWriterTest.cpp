@@ -112,7 +112,7 @@ TEST(RegistrationInstances, AreOfOneLibrary) {
     Registration elsewhere = diskInBay();
     elsewhere.location = "testbays";
     EXPECT_EQ(errorOf({disk(), elsewhere}), "Test_DiskInBay: found location 'testbays', expected 'testdisks'");
-    EXPECT_EQ(errorOf({}), "found no registration, expected those of a library");
+    EXPECT_EQ(errorOf({}), "found no registration, expected the registrations of a library");
 }
 
 TEST(RegistrationInstances, HaveNoNumberForPropertyProviders) {

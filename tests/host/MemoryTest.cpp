@@ -1,9 +1,9 @@
 /**
- * Tests operations while memory is short: each allocation of an operation fails in turn, once alone and once with all
- * later ones. The operation must end as expected, and the host must go on.
+ * Tests operations while memory is short: each allocation of an operation fails in turn, first alone and then with all
+ * later allocations. The operation must end as expected, and the host must go on.
  *
- * The host's own allocations never fail, nor do the loader's, which allocates a library's thread-local variables when a
- * thread uses them first, and ends the process where it cannot.
+ * The host's own allocations never fail. Neither do those of the loader: it allocates a library's thread-local
+ * variables when a thread uses them first, and ends the process if it cannot.
  */
 #include "broker.h"
 
@@ -47,7 +47,7 @@ namespace {
 struct Shortage {
     bool counting = false;
     unsigned int allocations = 0;
-    /** The number of the allocation that fails; 0 for none. */
+    /** The number of the allocation that fails; 0 if none fails. */
     unsigned int first = 0;
     bool allThatFollow = false;
 };
@@ -59,7 +59,7 @@ bool isLoaders(const void* caller) {
     return dladdr(caller, &found) != 0 && reinterpret_cast<std::uintptr_t>(found.dli_fbase) == getauxval(AT_BASE);
 }
 
-/** Whether an allocation that is asked for at an address is to fail. */
+/** Counts an allocation. @return whether it has to fail. @param caller the address in the code that allocates. */
 bool fails(const void* caller) {
     const auto address = reinterpret_cast<std::uintptr_t>(caller);
     const bool isHost = address >= reinterpret_cast<std::uintptr_t>(&__executable_start) &&
@@ -156,7 +156,7 @@ private:
     void* _provider = load(ORV_PROVIDER_LIBRARY);
 };
 
-/** One request. Everything that the operation needs is made before, so that only the call itself may lack memory. */
+/** One request. It makes everything that the operation needs before the call, so that only the call lacks memory. */
 using Call = std::function<CMPIStatus()>;
 using Request = std::function<Call(CMPIResult* result)>;
 
@@ -165,14 +165,14 @@ struct Operation {
     Request request;
     /** Whether the operation closes its result when it succeeds. */
     bool closes = true;
-    /** Whether the host's name is in what it returns. */
+    /** Whether the returned objects contain the host's name. */
     bool namesTheHost = false;
 };
 
 /** The outcome of a request. */
 struct Outcome {
     bool threw = false;
-    /** Whether the machine was switched. */
+    /** Whether the power state of the machine was changed. */
     bool moved = false;
     CMPIrc code = CMPI_RC_OK;
     bool closed = false;
@@ -182,7 +182,7 @@ struct Outcome {
 
 const char* stateFile = nullptr;
 
-/** When the machine was last switched, in nanoseconds; 0 where it never was. */
+/** The time in nanoseconds when the power state of the machine was changed last; 0 if it was never changed. */
 std::int64_t lastMove() {
     struct stat status {};
     return stat(stateFile, &status) != 0 ? 0
@@ -234,12 +234,12 @@ private:
     off_t _read = 0;
 };
 
-/** The number of the allocation that fails now, in memory that the parent process shares. */
+/** The allocation that fails now, and the problem that was found, in memory that the parent process shares. */
 struct Progress {
     unsigned int failing;
     bool allThatFollow;
     unsigned int allocations;
-    /** What was wrong; empty if nothing was. */
+    /** The problem; empty if there was none. */
     char complaint[4096];
 };
 
@@ -248,11 +248,11 @@ void complain(Progress& progress, const std::string& text) {
     _exit(EXIT_FAILURE);
 }
 
-/** Ends the process where an operation, of which `reported` was said, has another outcome than it should. */
+/** Ends the process if the outcome of an operation does not agree with `reported`, the text on standard error. */
 void requireOutcome(const Outcome& outcome, const Outcome& usual, const std::string& reported, Progress& progress) {
     const bool failed = outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed;
-    // What nobody needs for the answer, such as a record of the log, may be lacking; and where the provider has to
-    // leave out what it could not read, it has to say so.
+    // A success with another text than usual is right only if a record tells what the provider could not read. A
+    // shortage that does not change the answer, such as one in the log, needs no record.
     if (!failed && outcome.text != usual.text && reported.find("bad_alloc") == std::string::npos &&
         reported.find(" log 6000 ") == std::string::npos) {
         complain(progress, "the operation succeeded and returned\n" + outcome.text + "instead of\n" + usual.text +
@@ -264,14 +264,14 @@ void requireOutcome(const Outcome& outcome, const Outcome& usual, const std::str
     }
 }
 
-/** The same for one that has all the memory that it needs. */
+/** Ends the process if an operation that had enough memory has another outcome than the usual one. */
 void requireUsualOutcome(const Outcome& outcome, const Outcome& usual, Progress& progress) {
     if (outcome.threw || outcome.code != CMPI_RC_OK || outcome.closed != usual.closed || outcome.text != usual.text) {
         complain(progress, "the next operation returned\n" + outcome.text + "instead of\n" + usual.text);
     }
 }
 
-/** Lets each allocation of an operation fail; ends the process at the first that has another outcome than it should. */
+/** Lets each allocation of an operation fail in turn. Ends the process, at the first wrong outcome with a failure. */
 void failEachAllocation(const Operation& operation, Progress& progress, const std::string& errors) {
     const Outcome usual = (run(operation, 0, false), run(operation, 0, false));
     if (usual.threw || usual.code != CMPI_RC_OK || usual.text.empty() || usual.closed != operation.closes) {
@@ -310,7 +310,7 @@ protected:
                                  "\"\nreboot-time = 0.0\nshutdown-time = 0\n");
     }
 
-    /** Runs a function that does not return in a process of its own. */
+    /** Runs a function, which ends the process, in a process of its own. */
     template <typename Function>
     void inHost(Function function) {
         const pid_t host = fork();
@@ -338,7 +338,7 @@ TEST_P(MemoryShortage, EndsTheOperationAndNotTheHost) {
     EXPECT_GT(progress.allocations, 0U);
 }
 
-/** The operations of which one is the first in its process, or notices that the configuration has changed. */
+/** Operations that are the first in their process, or that notice that the configuration has changed. */
 class ConfigurationInMemoryShortage : public MemoryShortage {};
 
 TEST_P(ConfigurationInMemoryShortage, EndsTheFirstOperationAndNotTheHost) {

@@ -13,7 +13,7 @@
 
 struct Block {
     struct Block* next;
-    /* Keeps what follows aligned for everything. */
+    /* Aligns the memory behind the head for every type. */
     max_align_t start[];
 };
 
@@ -47,7 +47,7 @@ void endRequest(void) {
     }
 }
 
-/* Objects. The handle that the interface passes round is each object itself. */
+/* Objects. Each object begins with the handle that CMPI passes round. */
 
 enum { maxEntries = 32 };
 
@@ -56,7 +56,7 @@ struct Entry {
     CMPIData data;
 };
 
-/* Keys, properties, arguments, elements: whatever has values, with or without names. */
+/* A list of values, with or without names: keys, properties, arguments or elements. */
 struct Values {
     struct Entry entries[maxEntries];
     CMPICount count;
@@ -153,7 +153,7 @@ static CMPIString* newString(const CMPIBroker* broker, const char* text, CMPISta
     return string;
 }
 
-/* Copies all of a value, as some object managers do: what is handed over has to be as large as that. */
+/* Copies a whole CMPIValue, as some object managers do: a provider must not pass a pointer to anything smaller. */
 static CMPIData dataOf(const CMPIBroker* broker, const CMPIValue* value, CMPIType type) {
     CMPIData data = {type, CMPI_goodValue, {0}};
     if (type == CMPI_chars) {
@@ -191,7 +191,7 @@ static CMPIData get(const struct Values* values, const char* name, CMPIStatus* s
     return (CMPIData){CMPI_null, CMPI_notFound | CMPI_nullValue, {0}};
 }
 
-/* Texts of what was returned */
+/* Texts of returned objects and values */
 
 static void append(struct Result* result, const char* format, ...) {
     va_list arguments;
@@ -348,7 +348,7 @@ static CMPIData getProperty(const CMPIInstance* object, const char* name, CMPISt
     return get(&((const struct Instance*)object->hdl)->properties, name, status);
 }
 
-/* The host asks for all properties. */
+/* Ignores the filter: the host asks for all properties. */
 static CMPIStatus setPropertyFilter(const CMPIInstance* object, const char** properties, const char** keys) {
     (void)object, (void)properties, (void)keys;
     return fine;
@@ -413,7 +413,7 @@ static struct Result* resultOf(const CMPIResult* object) {
     return (struct Result*)object->hdl;
 }
 
-/* What the up-call returns into a result of its own; nothing where there is no up-call. */
+/* The result of an up-call, which is one of its own; it is empty if the broker has no up-call. */
 static const struct Result* answerOf(const CMPIBroker* broker, UpCall* upCall, const CMPIContext* context,
                                      const CMPIObjectPath* classPath, CMPIStatus* status) {
     CMPIResult* result = newResult(broker);
@@ -489,7 +489,7 @@ static CMPIStatus returnDone(const CMPIResult* object) {
     return fine;
 }
 
-/* What the host makes */
+/* Objects that the host makes */
 
 CMPIContext* newContext(const CMPIBroker* broker) {
     CMPIContext* context = make(sizeof *context);

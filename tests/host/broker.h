@@ -1,6 +1,6 @@
 /*
- * A broker in plain C, with the functions that the providers call; other slots are null. The objects that a provider
- * makes belong to the request that runs in its thread.
+ * A broker in plain C, with the functions that the providers call; the other slots are null. The objects that a
+ * provider makes belong to the request that runs in the provider's thread.
  */
 #ifndef HOST_BROKER_H
 #define HOST_BROKER_H
@@ -14,12 +14,12 @@
 extern "C" {
 #endif
 
-/* The function tables of CMPI 2.0, or those of a later object manager: they have a higher version, and more slots at
+/* Function tables of CMPI 2.0, or tables of a later object manager: the latter have a higher version and more slots at
    the end, which end the program when they are called. */
 enum TableLength { knownTables, longerTables };
 
-/* Answers an up-call for the instance names or the instances of a class: returns them to the result. If it fails, the
-   up-call fails. */
+/* Serves an up-call for the instance names or the instances of a class, and returns these to the result. If it fails,
+   the up-call fails. */
 typedef CMPIStatus UpCall(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* classPath,
                           CMPIResult* result);
 
@@ -32,7 +32,7 @@ void endRequest(void);
 
 CMPIContext* newContext(const CMPIBroker* broker);
 
-/* Makes a result. It keeps what a provider returns as text, one line for each path, instance or value. */
+/* Makes a result. It keeps each path, instance and value that a provider returns as a line of text. */
 CMPIResult* newResult(const CMPIBroker* broker);
 const char* returnedText(const CMPIResult* result);
 int isClosed(const CMPIResult* result);

@@ -28,7 +28,7 @@ static _Noreturn void fail(const char* file, int line, const char* what, const c
 }
 
 #define EXPECT(condition) ((condition) ? (void)0 : fail(__FILE__, __LINE__, "expected " #condition, NULL))
-/* For calls that leave their reason in dlerror(). */
+/* Requires that a call succeeded. If it failed, the reason is in dlerror(). */
 #define EXPECT_LOADED(condition) ((condition) ? (void)0 : fail(__FILE__, __LINE__, #condition, dlerror()))
 #define EXPECT_TEXT(actual, expected)                                                                                  \
     (strcmp((actual), (expected)) == 0 ? (void)0 : fail(__FILE__, __LINE__, "unexpected " #actual, (actual)))
@@ -55,7 +55,7 @@ static void* loadLibrary(int flags) {
     return library;
 }
 
-/* A factory by the name of its class without "TALVO_", and its kind. */
+/* The factory of a class, whose name is given without "TALVO_", for one kind of provider. */
 static void* factory(void* library, const char* className, const char* kind) {
     char name[128];
     snprintf(name, sizeof name, "%sProvider_Create_%sMI", className, kind);
@@ -68,7 +68,7 @@ typedef CMPIInstanceMI* InstanceFactory(const CMPIBroker*, const CMPIContext*, C
 typedef CMPIAssociationMI* AssociationFactory(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
 typedef CMPIMethodMI* MethodFactory(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
 
-/* POSIX has functions as object pointers in dlsym(), which C has not: hence the extension. */
+/* dlsym() returns functions as object pointers. POSIX permits their conversion, C does not: hence __extension__. */
 static void callFactories(struct Providers* providers, const CMPIBroker* broker) {
     CMPIStatus status = {CMPI_RC_OK, NULL};
     for (int i = 0; i < classes; ++i) {
@@ -114,7 +114,7 @@ static void unload(struct Providers* providers) {
 
 /* Requests */
 
-/* The instances of this test's simulated machine. */
+/* The names of the instances of this test's simulated machine. */
 #define SERVICE                                                                                                        \
     "//host.example/root/cimv2:TALVO_PowerManagementService( CreationClassName=\"TALVO_PowerManagementService\""       \
     " Name=\"PowerStateManagement_system\" SystemCreationClassName=\"TALVO_ComputerSystem\""                           \
@@ -140,7 +140,7 @@ static CMPIStatus oneComputerSystem(const CMPIBroker* broker, const CMPIContext*
     return CMReturnObjectPath(result, system);
 }
 
-/* Asks a provider for the names of its instances; the text is the request's. */
+/* The names of a provider's instances as text, which belongs to the current request. */
 static const char* instanceNames(const struct Providers* providers, int provider, const CMPIBroker* broker) {
     CMPIInstanceMI* mi = providers->instances[provider];
     CMPIResult* result = newResult(broker);
@@ -233,12 +233,12 @@ static void boundLazily(void) {
     useWith(RTLD_LAZY | RTLD_LOCAL);
 }
 
-/* With every symbol bound at once, a missing one would be an error here. */
+/* RTLD_NOW binds every symbol at once, so a missing symbol would be an error here. */
 static void boundEagerly(void) {
     useWith(RTLD_NOW | RTLD_LOCAL);
 }
 
-/* Another library, loaded before, has all the names: each library keeps to its own. */
+/* A library that was loaded before has functions of the same names. The provider library must call its own ones. */
 static void besideNamesakes(void) {
     void* namesakes = dlopen(namesakesFile, RTLD_NOW | RTLD_GLOBAL);
     EXPECT_LOADED(namesakes != NULL);
@@ -256,13 +256,13 @@ static void unloadedAfterIdleTime(void) {
         struct Providers providers = load(RTLD_NOW | RTLD_LOCAL, broker);
         expectService(&providers, broker);
         cleanUp(&providers, terminating);
-        /* A request that was on its way while the object manager cleaned up is still answered. */
+        /* A provider still answers a request that arrives after its cleanup. */
         expectService(&providers, broker);
         unload(&providers);
     }
 }
 
-/* Mappings of files: memory itself is the allocator's affair. */
+/* The number of files that are mapped; other mappings depend on the allocator. */
 static size_t mappings(void) {
     FILE* maps = fopen("/proc/self/maps", "r");
     EXPECT(maps != NULL);
@@ -296,7 +296,7 @@ static void loadedAThousandTimes(void) {
     EXPECT(mappings() == mapped);
 }
 
-/* The records are the library's own, whoever asks; the operations use the broker of the last call. */
+/* A factory returns the same record for every broker, and the operations use the broker of its last call. */
 static void createdForTwoObjectManagers(void) {
     const CMPIBroker* brokers[] = {newBroker(knownTables, NULL, NULL), newBroker(knownTables, oneComputerSystem, NULL)};
     struct Providers first = load(RTLD_NOW | RTLD_LOCAL, brokers[0]);
@@ -345,8 +345,8 @@ static void createdBySeveralThreads(void) {
 
 static struct Providers askedAgain;
 
-/* Answers the up-call with the library's own services, after it has asked a second provider of the library as well,
-   whose up-call is the same again. */
+/* Serves the up-call with the library's own services, after it has called a second provider of the library, whose
+   up-call it serves, too. */
 static CMPIStatus servicesOfTheLibrary(const CMPIBroker* broker, const CMPIContext* context, const CMPIObjectPath* path,
                                        CMPIResult* result) {
     static int depth;
@@ -376,7 +376,7 @@ static void servedByALaterObjectManager(void) {
     const CMPIBroker* known = newBroker(knownTables, oneComputerSystem, NULL);
     const CMPIBroker* later = newBroker(longerTables, oneComputerSystem, NULL);
     struct Providers providers = load(RTLD_NOW | RTLD_LOCAL, known);
-    free(everything(&providers, known)); /* from here on the machine is rebooting */
+    free(everything(&providers, known)); /* this reboots the simulated machine */
     char* expected = everything(&providers, known);
     callFactories(&providers, later);
     char* text = everything(&providers, later);

@@ -31,13 +31,13 @@ struct Agent {
     void reset();
 
     std::vector<Node> nodes;
-    /** What `setProperty` returns. The nodes above are not changed. */
+    /** The result of `setProperty`, which does not change the nodes above. */
     bool acceptsWrites = true;
     std::string systemName = "managed.example.org";
     unsigned int language = 7;
-    /** Texts by resource id; an id that is not here is its own text. */
+    /** Texts by resource id; an id without an entry is its own text. */
     std::map<std::wstring, std::wstring> texts;
-    /** Decides what `isObjPathsEqual` returns; without it, false. */
+    /** Decides what `isObjPathsEqual` returns; if it is empty, that returns false. */
     std::function<bool(const CMPIObjectPath*, const CMPIObjectPath*, bool)> pathsEqual;
     Faults faults;
 

@@ -14,18 +14,18 @@
 
 namespace OrvTest {
 
-/** How a call goes wrong. */
+/** The way in which a call goes wrong. */
 struct Fault {
     enum class Object { usual, null, withoutHandle };
 
-    /** What the call returns, if it returns an object. */
+    /** The object that the call returns, if it returns one. */
     Object object = Object::usual;
     /** The code and message that the call reports instead of CMPI_RC_OK. */
     std::optional<CMPIrc> status = {};
     CMPIString* message = nullptr;
     /** Whether the call leaves the caller's status as it is. */
     bool leavesStatus = false;
-    /** Called first. If it throws, the call does nothing else. */
+    /** Called before the call does anything else. If it throws, the call ends with this exception. */
     std::function<void()> action = {};
 };
 
@@ -50,16 +50,16 @@ Fault throws(Exception exception) {
     return {.action = [exception] { throw exception; }};
 }
 
-/** The faults of one party; may be asked from several threads at once. */
+/** The faults of the broker or of the agent. Several threads may use it at once. */
 class Faults {
 public:
-    /** Makes the `occurrence`th call of that name from now on (1 is the next one) go wrong. */
+    /** Makes the `occurrence`th of the following calls of the function `call` go wrong, counted from 1. */
     void at(const std::string& call, unsigned int occurrence, Fault fault);
 
-    /** Makes every call of that name go wrong, unless `at` says otherwise. */
+    /** Makes every call of the function `call` go wrong, except those for which `at` gives another fault. */
     void always(const std::string& call, Fault fault);
 
-    /** Each call asks once for its fault. @return the fault. Throws what the fault's action throws. */
+    /** The fault of this call. Each call asks for it once. @throws what the fault's action throws. */
     Fault next(const std::string& call);
 
     void clear();

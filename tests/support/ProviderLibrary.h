@@ -19,15 +19,16 @@ public:
     /** The library's file. */
     static const std::string file;
 
-    /** Throws std::runtime_error with the loader's reason. */
+    /** @throws std::runtime_error with the loader's reason. */
     ProviderLibrary();
     ~ProviderLibrary();
     ProviderLibrary(const ProviderLibrary&) = delete;
     ProviderLibrary& operator=(const ProviderLibrary&) = delete;
 
     /*
-     * What the factory of a provider returns, e.g. instanceMI("PowerManagementServiceProvider", broker). Throws
-     * std::runtime_error where the library exports no such factory. `status` is handed to the factory as it is.
+     * These call the factory of a provider, for example instanceMI("PowerManagementServiceProvider", broker), with
+     * `broker` and `status`, and return its result. They throw std::runtime_error if the library exports no such
+     * factory.
      */
     CMPIInstanceMI* instanceMI(const std::string& provider, const CMPIBroker& broker, CMPIStatus* status = nullptr);
     CMPIMethodMI* methodMI(const std::string& provider, const CMPIBroker& broker, CMPIStatus* status = nullptr);

@@ -17,7 +17,7 @@ bool sameName(const std::string& left, const std::string& right) {
     return strcasecmp(left.c_str(), right.c_str()) == 0;
 }
 
-/** What the broker knows about an object: which broker made it, and its name. */
+/** The facts that the broker keeps about an object: the broker that made it, and its name. */
 struct Named {
     RecordingBroker* broker;
     std::string name;
@@ -113,7 +113,7 @@ Result& self(const CMPIResult* object) {
     return static_cast<Result&>(const_cast<CMPIResult&>(*object));
 }
 
-/** CMPI passes brokers as const pointers; here, each one is a RecordingBroker. */
+/** The broker to which a slot's argument points. CMPI passes brokers as const pointers. */
 RecordingBroker& self(const CMPIBroker* broker) {
     return static_cast<RecordingBroker&>(const_cast<CMPIBroker&>(*broker));
 }
@@ -334,7 +334,7 @@ private:
 
 } // namespace
 
-/** The objects of one broker. Deques, since nothing may move. */
+/** The objects of one broker. They are in deques, since pointers to them must stay valid. */
 struct RecordingBroker::Objects {
     RecordingBroker* broker;
     std::string name;
@@ -348,7 +348,7 @@ struct RecordingBroker::Objects {
     std::deque<Context> contexts = {};
     std::deque<Result> results = {};
 
-    /** Gives an object its name and handle, and puts it where it stays. */
+    /** Gives an object its name and handle, and stores it in its deque. */
     template <typename Object, typename Table>
     Object* keep(std::deque<Object>& objects, const Table& table, const std::string& objectName, Object object = {}) {
         Object& kept = objects.emplace_back(std::move(object));
@@ -371,7 +371,7 @@ struct RecordingBroker::Objects {
 
 namespace {
 
-/* What every kind of object has */
+/* Functions of every kind of object */
 
 template <typename Object>
 CMPIStatus releaseObject(Object* object) {

@@ -1,6 +1,6 @@
 /**
  * A CMPI broker for tests: it does what an object manager does, records every call with its arguments in the
- * transcript, and fails where a test tells it to.
+ * transcript, and lets those calls fail for which a test injects a fault.
  *
  * The name of an object that a provider makes has its kind and number ("path#1", "instance#2"); a test names the
  * objects that it makes; the name of an object that belongs to another one begins with its owner ("path.Name",
@@ -29,7 +29,7 @@ public:
     /** `name` stands before the calls on this broker in the transcript. */
     explicit RecordingBroker(const std::string& name = "broker");
 
-    /** Destroys every object that it made. */
+    /** Destroys every object that the broker made. */
     ~RecordingBroker();
     RecordingBroker(const RecordingBroker&) = delete;
     RecordingBroker& operator=(const RecordingBroker&) = delete;
@@ -37,14 +37,14 @@ public:
     /** The faults, by the name of the slot in the function table, e.g. "newObjectPath". */
     Faults faults;
 
-    /** The results of up-calls, by class name. Those for other classes are empty. */
+    /** The results of up-calls, by class name. Up-calls for other classes have empty results. */
     std::map<std::string, std::vector<CMPIObjectPath*>> instanceNames;
     std::map<std::string, std::vector<CMPIInstance*>> instances;
 
-    /** The key properties of classes, as a schema has them; setting one on an instance also sets it in its path. */
+    /** The key properties of classes, as in a schema. If one is set on an instance, the path gets the key, too. */
     std::map<std::string, std::vector<std::string>> keyProperties;
 
-    /** What a provider has returned to a result. */
+    /** The objects and values that a provider has returned to a result. */
     struct Returned {
         std::vector<const CMPIInstance*> instances;
         std::vector<const CMPIObjectPath*> paths;
@@ -53,8 +53,8 @@ public:
     };
 
     /*
-     * Objects for the test itself, not recorded. They live as long as the broker. To get an object that holds nothing,
-     * set its handle to null.
+     * These make objects for the test itself, and are not recorded. The objects live as long as the broker. To get an
+     * object that holds nothing, set its handle to null.
      */
 
     CMPIContext* context(const std::string& name);
@@ -66,14 +66,14 @@ public:
                          const std::vector<std::pair<std::string, std::string>>& keys = {});
     CMPIInstance* instance(const std::string& name, const CMPIObjectPath* path);
 
-    /** The newest path of that name in the transcript, whoever made it. Throws std::out_of_range if there is none. */
+    /** The newest path with this name in the transcript. @throws std::out_of_range if there is none. */
     CMPIObjectPath* pathCalled(const std::string& name);
 
     CMPIString* string(const std::string& name, const std::string& text);
     CMPIDateTime* dateTime(const std::string& name);
     CMPIArgs* args(const std::string& name);
 
-    /** Sets a key or an argument to exactly this, whatever it is. */
+    /** Sets a key or an argument to `data`, even if its type or state is wrong. */
     static void setKey(CMPIObjectPath* path, const std::string& key, const CMPIData& data);
     static void setArg(CMPIArgs* args, const std::string& argument, const CMPIData& data);
 

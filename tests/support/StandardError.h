@@ -1,5 +1,5 @@
 /**
- * Captures what the process writes to standard error while this object exists.
+ * Captures the text that the process writes to standard error.
  */
 #ifndef SUPPORT_STANDARDERROR_H
 #define SUPPORT_STANDARDERROR_H
@@ -13,6 +13,7 @@
 
 namespace OrvTest {
 
+/** While this object exists, standard error is a temporary file. */
 class StandardError {
 public:
     StandardError() : _file(std::tmpfile(), &std::fclose), _saved(dup(STDERR_FILENO)) {
@@ -28,7 +29,7 @@ public:
     StandardError(const StandardError&) = delete;
     StandardError& operator=(const StandardError&) = delete;
 
-    /** Everything written so far. */
+    /** The text that was written so far. */
     std::string text() const {
         std::cerr.flush();
         std::fflush(stderr);

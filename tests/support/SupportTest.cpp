@@ -1,6 +1,6 @@
 /**
- * Tests what the other tests rely on: the transcript hides nothing that matters, and the broker behaves like that of an
- * object manager.
+ * Tests what the other tests rely on: the transcript hides nothing that matters, and the broker behaves like the broker
+ * of an object manager.
  */
 #include "RecordingBroker.h"
 #include "Transcript.h"
@@ -24,7 +24,7 @@ protected:
 
     void write(LogRecord record) { transcript.record(std::move(record)); }
 
-    /** A record, and the one that makes a pair with it. */
+    /** A log record, and the trace record that makes a pair with it. */
     static LogRecord logRecord(const std::string& text, int line = 17) {
         return {LogRecord::Kind::log, 6000, "Category", "function", "src/A.cpp", line, text, true};
     }

@@ -28,7 +28,7 @@ struct LogRecord {
     std::string file;
     int line;
     std::string text;
-    /** Whether the three unnamed arguments were null, 0 and 0. */
+    /** Whether the three arguments of the log call that have no member here were null, 0 and 0. */
     bool usualArguments;
 
     bool operator==(const LogRecord&) const = default;
@@ -49,23 +49,23 @@ public:
     void record(LogRecord record);
 
     /**
-     * The calls in order, one line each, made comparable:
+     * The calls in order, one line each, in a form that a test can compare:
      * - a log record and the equal trace record after it are one line "log+trace LEVEL CATEGORY FUNCTION FILE: TEXT";
      *   records that do not come in such pairs stay lines of their own and keep their line numbers;
-     * - where the line number in a pair's text is the record's own, it reads "<line>" and FILE has none. Marks of
-     *   Trace.h report from lines of their own: FILE keeps its line there, and the caller's line in the text is
-     * "<line>";
-     * - an address in a text is "&NAME" where it belongs to a named object, else "<address>".
+     * - if the line number in a pair's text is that of the record, the text has "<line>" instead of it, and FILE has
+     *   none. The mark functions of Trace.h log from another line than the caller's: FILE keeps its line number then,
+     *   and the caller's line number in the text is "<line>";
+     * - an address in a text is "&NAME" if it belongs to a named object, else "<address>".
      */
     Lines calls() const;
 
     /** Calls and readings in order, without any line folded or replaced. */
     Lines everything() const;
 
-    /** Forgets lines and numbers, not the names of objects, and ends a pause. */
+    /** Forgets the lines, and the numbers that `nextName` gave, but not the names of objects. Ends a pause. */
     void clear();
 
-    /** Keeps no line and no name until the next `clear`, for tests with very many calls that check only results. */
+    /** Keeps no line and no name until the next `clear`, since a transcript of millions of calls would be too large. */
     void pause();
 
     /** The name for the next object of a kind: "path#1", "path#2", ... */
@@ -75,7 +75,7 @@ public:
     void name(const void* address, const std::string& name);
     void forget(const void* address);
 
-    /** The object's name, "null" or "<address>". */
+    /** The name of the object at an address; "null" for a null pointer, "<address>" for any other address. */
     std::string nameOf(const void* address) const;
 
 private:

@@ -23,7 +23,7 @@ CallRecord reboot() {
             ""};
 }
 
-TEST(CallRecordTest, SaysWhoCalledWhatWithWhatAndWhatBecameOfIt) {
+TEST(CallRecordTest, SaysWhoCalledWhichMethodWithWhichArgumentsAndOutcome) {
     CallRecord record = reboot();
     EXPECT_EQ(messageOf(record),
               "192.0.2.7 alice: Test_Service.Restart(State=5) of root/cimv2:Test_Service.Name=\"s\": accepted");
@@ -33,7 +33,7 @@ TEST(CallRecordTest, SaysWhoCalledWhatWithWhatAndWhatBecameOfIt) {
                                  "root/cimv2:Test_Service.Name=\"s\": refused: it is Sunday");
 }
 
-TEST(CallRecordTest, NamesARequestThatIsNoCallByItsOperation) {
+TEST(CallRecordTest, NamesTheOperationOfARequestThatIsNoMethodCall) {
     CallRecord record = reboot();
     record.user.clear();
     record.target = "root/cimv2";
@@ -42,7 +42,7 @@ TEST(CallRecordTest, NamesARequestThatIsNoCallByItsOperation) {
     EXPECT_EQ(messageOf(record), "192.0.2.7 somebody without a log-in: Restart(State=5) of root/cimv2: denied");
 }
 
-TEST(CallRecordTest, IsALineOfTheLogWithItsTimeWhereThereIsNoJournal) {
+TEST(CallRecordTest, IsALineOfTheLogWithItsTimeIfThereIsNoJournal) {
     std::vector<std::string> lines;
     makeRecorder([&](const std::string& line) { lines.push_back(line); })(reboot());
     EXPECT_THAT(lines, ElementsAre("2001-09-09T01:46:40Z " + messageOf(reboot())));

@@ -15,16 +15,16 @@ TEST(PrintableTest, LeavesNothingThatBreaksALogOrATerminal) {
         {std::string("\0", 1), "\\x00"},
         {"\xc2\x9b"
          "31m",
-         "\\xc2\\x9b31m"}, // U+009B begins a sequence as ESC [ does
+         "\\xc2\\x9b31m"}, // U+009B begins a control sequence, as ESC [ does
         {"\x9b"
          "31m",
-         "\\x9b31m"}, // in no UTF-8
+         "\\x9b31m"}, // not valid in UTF-8
         {"\xe2\x80\xae"
          "x",
-         "\\xe2\\x80\\xaex"},                // U+202E turns the direction
-        {"\xc0\x8a", "\\xc0\\x8a"},          // a line feed in too many bytes
-        {"\xed\xa0\x80", "\\xed\\xa0\\x80"}, // half of a pair of UTF-16
-        {"\xe2\x82", "\\xe2\\x82"},          // cut off
+         "\\xe2\\x80\\xaex"},                // U+202E reverses the direction of text
+        {"\xc0\x8a", "\\xc0\\x8a"},          // a line feed, encoded in too many bytes
+        {"\xed\xa0\x80", "\\xed\\xa0\\x80"}, // half of a surrogate pair
+        {"\xe2\x82", "\\xe2\\x82"},          // an incomplete character
     };
     for (const auto& [text, expected] : cases) {
         EXPECT_EQ(printable(text), expected);

@@ -11,7 +11,7 @@ struct DateTimeCase {
     const char* text;
     std::uint64_t microseconds;
     bool interval;
-    /** How the value is written again: in UTC, and without asterisks. */
+    /** The text that the value has when it is written again: in UTC, and without asterisks. */
     const char* written;
 };
 
@@ -76,7 +76,7 @@ TEST_F(DateTimeObjectTest, IsMadeFromMicroseconds) {
     EXPECT_EQ(CMPI_RC_ERR_INVALID_PARAMETER, status.rc);
 }
 
-TEST_F(DateTimeObjectTest, WithoutATextIsNow) {
+TEST_F(DateTimeObjectTest, IsNowIfItIsMadeWithoutAText) {
     const auto now = static_cast<CMPIUint64>(time(nullptr)) * 1'000'000;
     const CMPIUint64 made = CMGetBinaryFormat(CMNewDateTime(mb, nullptr), nullptr);
     EXPECT_THAT(made, testing::AllOf(testing::Ge(now), testing::Lt(now + 60'000'000)));

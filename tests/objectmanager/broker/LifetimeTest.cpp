@@ -1,4 +1,4 @@
-/* When objects end, and what happens to those who do not care. */
+/* Tests when objects end, and what happens to providers that use them afterwards. */
 #include "RequestTest.h"
 #include "broker/Objects.h"
 #include "broker/Result.h"
@@ -34,7 +34,7 @@ TEST_F(LifetimeTest, UsingAReleasedObjectIsAMisuse) {
     EXPECT_EQ("used a CMPIInstance after it was released", request.misuse());
 }
 
-TEST_F(LifetimeTest, TheFirstMisuseIsTold) {
+TEST_F(LifetimeTest, TheFirstMisuseIsReported) {
     CMPIString* string = CMNewString(mb, "text", nullptr);
     CMRelease(string);
     CMRelease(string);
@@ -81,13 +81,13 @@ TEST_F(LifetimeTest, MemoryOfReleasedObjectsIsUsedAgain) {
     for (int i = 0; i < 1000; ++i) {
         makeAndRelease();
     }
-    // What stays of an object is its shell: three of them in each turn.
+    // The shell of a released object stays until the request ends. Each turn leaves three shells.
     EXPECT_LE(Arena::usage().chunksInUse,
               before.chunksInUse + 1 + std::size_t{1000} * 3 * sizeof(ObjectHeader) / Arena::chunkBytes);
     EXPECT_EQ(before.largeBlocks, Arena::usage().largeBlocks);
 }
 
-TEST_F(LifetimeTest, AMarkReleasesWhatWasMadeSince) {
+TEST_F(LifetimeTest, AMarkReleasesTheObjectsMadeSinceThen) {
     const CMPIString* before = CMNewString(mb, "before", nullptr);
     const CMPIGcStat* mark = CMMark(mb, &status);
     ASSERT_EQ(CMPI_RC_OK, status.rc);

@@ -1,4 +1,4 @@
-/* What paths, instances, arguments, contexts, arrays and errors keep. */
+/* Tests what paths, instances, arguments, contexts, arrays and errors keep of the data that they are given. */
 #include "RequestTest.h"
 
 #include <array>
@@ -145,7 +145,7 @@ TEST_F(InstanceTest, AMissingPropertyIsNoSuchProperty) {
     EXPECT_EQ(CMPI_RC_ERR_NO_SUCH_PROPERTY, status.rc);
 }
 
-TEST_F(InstanceTest, AFilterKeepsKeysAndWhatItLists) {
+TEST_F(InstanceTest, AFilterKeepsKeysAndListedProperties) {
     std::array<const char*, 2> properties = {"size", nullptr};
     std::array<const char*, 3> keys = {"Name", "System", nullptr};
     CMSetPropertyFilter(instance, properties.data(), keys.data());
@@ -170,17 +170,17 @@ TEST_F(InstanceTest, WithoutAListThereIsNoFilter) {
     EXPECT_THAT(propertyNames(), testing::ElementsAre("Name", "Vendor"));
 }
 
-TEST_F(InstanceTest, ItsPathTakesMissingKeysFromTheProperties) {
+TEST_F(InstanceTest, APathWithoutKeysTakesThemFromTheProperties) {
     setProperties({"Name", "Size", "System"});
     EXPECT_THAT(pathKeys(), testing::ElementsAre(testing::Pair("System", "System"), testing::Pair("Name", "Name")));
 }
 
-TEST_F(InstanceTest, ItsPathHasNoKeysWhileOneIsMissing) {
+TEST_F(InstanceTest, APathStaysWithoutKeysIfAKeyPropertyIsNotSet) {
     setProperties({"Name", "Size"});
     EXPECT_THAT(pathKeys(), testing::IsEmpty());
 }
 
-TEST_F(InstanceTest, OfAnUnknownClassTakesTheKeysThatTheFilterNames) {
+TEST_F(InstanceTest, APathOfAnUnknownClassTakesTheKeysOfTheFilter) {
     instance = CMNewInstance(mb, CMNewObjectPath(mb, "root/cimv2", "Test_Unknown", nullptr), nullptr);
     std::array<const char*, 2> keys = {"Id", nullptr};
     CMSetPropertyFilter(instance, nullptr, keys.data());
@@ -188,7 +188,7 @@ TEST_F(InstanceTest, OfAnUnknownClassTakesTheKeysThatTheFilterNames) {
     EXPECT_THAT(pathKeys(), testing::ElementsAre(testing::Pair("Id", "Id")));
 }
 
-TEST_F(InstanceTest, ItsPathKeepsTheKeysThatItHas) {
+TEST_F(InstanceTest, APathWithKeysKeepsThem) {
     CMPIObjectPath* path = newPath();
     CMAddKey(path, "Name", "given", CMPI_chars);
     EXPECT_EQ(CMPI_RC_OK, CMSetObjectPath(instance, path).rc);
@@ -196,7 +196,7 @@ TEST_F(InstanceTest, ItsPathKeepsTheKeysThatItHas) {
     EXPECT_THAT(pathKeys(), testing::ElementsAre(testing::Pair("Name", "given")));
 }
 
-TEST_F(InstanceTest, ItsPathIsACopy) {
+TEST_F(InstanceTest, ThePathIsACopy) {
     CMSetNameSpace(CMGetObjectPath(instance, nullptr), "root/elsewhere");
     EXPECT_EQ("root/cimv2", text(CMGetNameSpace(CMGetObjectPath(instance, nullptr), nullptr)));
 }
@@ -264,7 +264,7 @@ TEST_F(ArrayTest, RefusesElementsOfAnotherTypeAndPositionsBeyondItsEnd) {
     EXPECT_EQ(CMPI_RC_ERR_NO_SUCH_PROPERTY, status.rc);
 }
 
-TEST_F(ArrayTest, TakesTextsAsTheTypeThatItWasMadeForOnly) {
+TEST_F(ArrayTest, TakesTextsOnlyWithTheTypeThatItWasMadeFor) {
     CMPIValue value = {};
     value.string = CMNewString(mb, "text", nullptr);
     const CMPIArray* strings = CMNewArray(mb, 1, CMPI_string, nullptr);
@@ -311,7 +311,7 @@ protected:
     }
 };
 
-TEST_F(ErrorTest, KeepsWhatItWasMadeOf) {
+TEST_F(ErrorTest, KeepsTheValuesThatItWasMadeWith) {
     EXPECT_EQ("owner", text(error->ft->getOwningEntity(error, nullptr)));
     EXPECT_EQ("ID1", text(error->ft->getMessageID(error, nullptr)));
     EXPECT_EQ("the disk is full", text(error->ft->getMessage(error, nullptr)));
@@ -321,7 +321,7 @@ TEST_F(ErrorTest, KeepsWhatItWasMadeOf) {
     EXPECT_EQ(CMPI_RC_OK, status.rc);
 }
 
-TEST_F(ErrorTest, KeepsWhatIsSet) {
+TEST_F(ErrorTest, KeepsTheValuesThatAreSet) {
     error->ft->setErrorType(error, HardwareErrorType);
     error->ft->setErrorSourceFormat(error, CIMErrorSrcFormatCIMObjectPath);
     error->ft->setOtherErrorType(error, "other");

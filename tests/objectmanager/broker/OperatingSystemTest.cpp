@@ -58,7 +58,7 @@ TEST_F(OperatingSystemTest, SleepsAtLeastAsLongAsTold) {
     EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::milliseconds(20));
 }
 
-TEST_F(OperatingSystemTest, OnceIsOnce) {
+TEST_F(OperatingSystemTest, AFunctionRunsOnlyOnce) {
     static int calls = 0;
     int once = 0;
     EXPECT_EQ(0, os->threadOnce(&once, [] { ++calls; }));

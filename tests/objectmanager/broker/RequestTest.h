@@ -1,4 +1,4 @@
-/** What tests of the broker share: a broker, and a request that is current while the test runs. */
+/** The fixture of the broker's tests: a broker, and a request that is the current one while a test runs. */
 #ifndef TESTS_OBJECTMANAGER_BROKER_REQUESTTEST_H
 #define TESTS_OBJECTMANAGER_BROKER_REQUESTTEST_H
 
@@ -14,7 +14,7 @@
 
 namespace ObjectManager {
 
-/** Knows one class with two keys and its superclass. */
+/** Information about one class, which has two keys and the superclass CIM_Disk. */
 class OneClass final : public ClassInformation {
 public:
     bool isA(std::string_view className, std::string_view superClassName) const override {

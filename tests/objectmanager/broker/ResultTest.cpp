@@ -42,7 +42,7 @@ TEST_F(ResultTest, CollectsInstancesWithWholePaths) {
     EXPECT_EQ(unsignedValue(CMPI_uint16, 5), returned.properties[0].value);
 }
 
-TEST_F(ResultTest, WhatIsDoneToAnInstanceAfterwardsChangesNothing) {
+TEST_F(ResultTest, DoesNotChangeWithAReturnedInstance) {
     std::array<const char*, 2> properties = {"Size", nullptr};
     CMPIInstance* instance = newInstance();
     CMSetProperty(instance, "Size", "small", CMPI_chars);
@@ -94,7 +94,7 @@ TEST_F(ResultTest, CollectsValuesAndErrors) {
     EXPECT_STREQ("no", result.errors().at(0).what());
 }
 
-TEST_F(ResultTest, TakesNothingOnceItIsClosed) {
+TEST_F(ResultTest, RefusesEverythingOnceItIsClosed) {
     EXPECT_EQ(CMPI_RC_OK, CMReturnDone(handle).rc);
     EXPECT_TRUE(result.closed());
     EXPECT_EQ(CMPI_RC_ERR_FAILED, CMReturnObjectPath(handle, newPath()).rc);
@@ -126,7 +126,7 @@ TEST_F(ResultTest, RefusesReleasedObjects) {
     EXPECT_EQ("used a CMPIInstance after it was released", request.misuse());
 }
 
-TEST_F(ResultTest, KeepsWhatItHasWhenTheProviderReleasesIt) {
+TEST_F(ResultTest, KeepsAnObjectThatTheProviderReleases) {
     CMReturnObjectPath(handle, newPath());
     EXPECT_EQ(CMPI_RC_OK, CMRelease(const_cast<CMPIResult*>(handle)).rc);
     EXPECT_EQ(CMPI_RC_ERR_INVALID_HANDLE, CMReturnDone(handle).rc);

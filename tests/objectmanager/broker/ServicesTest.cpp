@@ -1,4 +1,4 @@
-/* Messages, types and texts of objects, memory. */
+/* Tests messages, the types and texts of objects, and memory for providers. */
 #include "RequestTest.h"
 #include "broker/Objects.h"
 #include "broker/Result.h"
@@ -94,7 +94,7 @@ TEST_F(KindsTest, AReleasedObjectHasNoText) {
 
 class MemoryTest : public RequestTest {};
 
-TEST_F(MemoryTest, BlocksKeepWhatIsWritten) {
+TEST_F(MemoryTest, BlocksKeepTheirBytes) {
     const CMPIBrokerMemFT* memory = mb->mft;
     char* text = memory->cmpiStrDup(mb, "text");
     EXPECT_STREQ("text", text);

@@ -1,4 +1,4 @@
-/* Every slot of every table: that it is there, and what it says to arguments that are null or unsupported. */
+/* Tests that no slot is null, and what each slot reports for arguments that are null or not supported. */
 #include "RequestTest.h"
 #include "broker/Objects.h"
 #include "broker/Result.h"
@@ -11,7 +11,7 @@ namespace {
 
 class SlotsTest : public RequestTest {
 protected:
-    /** The slots of a table are all pointers, from its first function on. */
+    /** The function pointers of a table. `first` is the first of them; the others follow up to the table's end. */
     template <typename Table, typename Function>
     static std::vector<const void*> slots(const Table* table, const Function* first) {
         const auto* begin = reinterpret_cast<const char*>(first);
@@ -288,7 +288,7 @@ TEST_F(SlotsTest, NullNamesAndTextsAreInvalidParameters) {
     EXPECT_EQ(nullptr, mb->xft->resolveFileName(nullptr));
 }
 
-TEST_F(SlotsTest, TheStatusNeedNotBeWanted) {
+TEST_F(SlotsTest, StatusPointersMayBeNull) {
     EXPECT_EQ(nullptr, CMNewObjectPath(mb, nullptr, nullptr, nullptr));
     EXPECT_EQ(nullptr, CMNewInstance(mb, nullptr, nullptr));
     EXPECT_EQ(nullptr, CMNewSelectExp(mb, "a", "b", nullptr, nullptr));
@@ -308,7 +308,7 @@ TEST_F(SlotsTest, ObjectsOfAnotherBrokerAreInvalidHandles) {
     EXPECT_EQ(CMPI_RC_ERR_INVALID_HANDLE, status.rc);
 }
 
-TEST_F(SlotsTest, WhatIsNotSupportedSaysSo) {
+TEST_F(SlotsTest, UnsupportedSlotsReportThat) {
     const auto expectUnsupported = [&](const char* slot, const CMPIStatus& found) {
         EXPECT_EQ(CMPI_RC_ERR_NOT_SUPPORTED, found.rc) << slot;
     };

@@ -13,7 +13,7 @@ constexpr int requests = 50'000;
 constexpr int requests = 1'000'000;
 #endif
 
-/** A small request with everything in it that allocates. */
+/** Serves a small request, in which every kind of allocation occurs. */
 void serveOne(const Broker& broker) {
     const CMPIBroker* mb = broker.handle();
     Request request(broker);

@@ -106,7 +106,7 @@ TEST_F(UpCallsTest, AnEnumerationMayBeEmpty) {
     EXPECT_FALSE(CMHasNext(found, nullptr));
 }
 
-TEST_F(UpCallsTest, OneInstanceIsGot) {
+TEST_F(UpCallsTest, GettingAnInstanceReturnsIt) {
     EXPECT_CALL(operations, getInstance(_, disk("a"), Optional(ElementsAre("Size"))))
         .WillOnce(Return(Instance{disk("a"), {}}));
     const CMPIInstance* instance = CBGetInstance(mb, context, path, properties.data(), &status);
@@ -135,7 +135,7 @@ TEST_F(UpCallsTest, QueriesAreExecuted) {
     EXPECT_EQ(CMPI_RC_OK, status.rc);
 }
 
-TEST_F(UpCallsTest, MethodsGiveAValueAndArguments) {
+TEST_F(UpCallsTest, MethodsReturnAValueAndArguments) {
     const MethodResult result{unsignedValue(CMPI_uint32, 4), {{"Job", stringValue("started")}}};
     EXPECT_CALL(operations, invokeMethod(_, disk("a"), "Format", ElementsAre(Field(&NamedValue::name, "Quick"))))
         .WillOnce(Return(result));
@@ -167,7 +167,7 @@ auto isFilter(const std::string& associationClass, const std::string& resultClas
                  Field(&AssociationFilter::resultRole, resultRole));
 }
 
-TEST_F(UpCallsTest, WhatIsAssociatedComesAsOneEnumeration) {
+TEST_F(UpCallsTest, AssociatedObjectsComeAsOneEnumeration) {
     EXPECT_CALL(operations, associators(_, disk("a"), isFilter("A", "C", "R", "S"), Optional(ElementsAre("Size"))))
         .WillOnce(Return(
             std::vector<Associated<Instance>>{{"A", {{disk("x"), {}}, {disk("y"), {}}}}, {"B", {{disk("x"), {}}}}}));
@@ -223,7 +223,7 @@ TEST_F(UpCallsTest, NeedAContextAndAPath) {
     EXPECT_EQ(CMPI_RC_ERR_INVALID_HANDLE, status.rc);
 }
 
-TEST_F(UpCallsTest, EndWhereTheyNestTooDeeply) {
+TEST_F(UpCallsTest, FailIfTheyNestTooDeeply) {
     unsigned int depth = 0;
     const auto askAgain = [&] {
         ++depth;
@@ -243,7 +243,7 @@ TEST_F(UpCallsTest, EndWhereTheyNestTooDeeply) {
 
 class AttachTest : public UpCallsTest {
 protected:
-    /** Runs `body` in a thread that is attached with a context which was prepared for it. */
+    /** Runs `body` in a thread that is attached with a context that prepareAttachThread made. */
     void inAttachedThread(const std::function<void(const CMPIContext*)>& body) {
         CMPIContext* prepared = CBPrepareAttachThread(mb, context);
         ASSERT_NE(nullptr, prepared);
@@ -274,7 +274,7 @@ TEST_F(AttachTest, AThreadIsAttachedOnce) {
     EXPECT_EQ(nullptr, CBPrepareAttachThread(mb, nullptr));
 }
 
-TEST_F(AttachTest, WhatAnAttachedThreadDoesWrongIsLogged) {
+TEST_F(AttachTest, MisuseInAnAttachedThreadIsLogged) {
     std::vector<std::string> messages;
     broker.setMessageSink([&](const BrokerMessage& message) { messages.push_back(message.text); });
     inAttachedThread([&](const CMPIContext*) {

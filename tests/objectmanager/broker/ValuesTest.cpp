@@ -1,4 +1,4 @@
-/* Values of every type, on their way into CMPI objects and back. */
+/* Tests that values of every type are the same after they were stored in CMPI objects. */
 #include "RequestTest.h"
 
 #include <functional>
@@ -18,7 +18,7 @@ class ValuesTest : public RequestTest, public testing::WithParamInterface<Value>
 protected:
     CMPIArgs* args = CMNewArgs(mb, nullptr);
 
-    /** What getArg gives, put into other arguments under the same type. */
+    /** The argument that getArg returns, after it was added to other arguments with the same type. */
     Value passedOn(const CMPIArgs* from) {
         const CMPIData data = CMGetArg(from, "Value", &status);
         EXPECT_EQ(CMPI_RC_OK, status.rc);
@@ -76,8 +76,8 @@ TEST_F(GivenValuesTest, CharsAreTheTextItselfAndReadBackAsString) {
     EXPECT_EQ(CMPI_RC_OK, status.rc);
 }
 
-TEST_F(GivenValuesTest, NoMoreIsReadThanTheTypeTakes) {
-    const auto number = std::make_unique<CMPIUint16>(CMPIUint16{7}); // its end is guarded by the sanitizer
+TEST_F(GivenValuesTest, NoMoreBytesAreReadThanTheTypeHas) {
+    const auto number = std::make_unique<CMPIUint16>(CMPIUint16{7}); // a sanitizer would report a read beyond its end
     CMAddKey(path, "Number", number.get(), CMPI_uint16);
     const auto truth = std::make_unique<CMPIBoolean>(CMPIBoolean{1});
     CMAddKey(path, "Truth", truth.get(), CMPI_boolean);
@@ -113,7 +113,7 @@ TEST_F(GivenValuesTest, ObjectsAreCopied) {
     EXPECT_EQ("before", text(CMGetKey(CMGetKey(path, "Disk", nullptr).value.ref, "Name", nullptr)));
 }
 
-TEST_F(GivenValuesTest, WhatIsReadIsAnObjectOfItsOwn) {
+TEST_F(GivenValuesTest, AnObjectThatIsReadIsACopy) {
     CMAddKey(path, "Name", "a", CMPI_chars);
     CMPIString* name = CMGetKey(path, "Name", nullptr).value.string;
     EXPECT_EQ(CMPI_RC_OK, CMRelease(name).rc);

@@ -16,7 +16,7 @@ using testing::Field;
 using testing::IsEmpty;
 using testing::Optional;
 
-/** Superclasses stand behind their subclasses here: the order does not matter. */
+/** Superclasses are declared after their subclasses here, since the order must not matter. */
 constexpr const char* family = R"(
     class Child : Parent {
         [Override("Name"), Description("more")] string Name;

@@ -1,6 +1,6 @@
 /*
  * Compares the shipped part of the common model with DMTF's own CIM schema, of which no copy is kept here: the
- * environment variable ORV_DMTF_SCHEMA names a folder with one (its .mof files may lie in folders below). Where it is
+ * environment variable ORV_DMTF_SCHEMA names a folder with one (its .mof files may lie in folders below). If it is
  * not set, these tests are skipped.
  */
 #include "classes/Catalogue.h"
@@ -23,7 +23,7 @@
 namespace ObjectManager {
 namespace {
 
-/** The folder of the shipped schema with DMTF's classes in it, as one would make it for `orvcim --schema`. */
+/** A folder with the shipped schema and DMTF's classes, as a user would make it for `orvcim --schema`. */
 class SchemaWithDmtfs {
 public:
     explicit SchemaWithDmtfs(const std::filesystem::path& dmtf) {

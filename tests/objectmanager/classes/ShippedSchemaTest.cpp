@@ -174,7 +174,7 @@ TEST_F(ShippedSchemaTest, GivesTheCapabilitiesTheirKeyAndTheirCodes) {
     EXPECT_THAT(meaningOf("PowerChangeCapabilities", 8), Optional(std::string("Graceful Shutdown Supported")));
 }
 
-/** This lets the served classes be loaded beside the whole common model, whatever else that declares. */
+/** If this test passes, the served classes can be loaded together with the whole common model of any version. */
 TEST_F(ShippedSchemaTest, HasTheServedClassesOverrideNothingButToNarrowReferences) {
     for (const Class* served : _catalogue.all()) {
         if (!served->name.starts_with("TALVO_")) {

@@ -1,4 +1,4 @@
-/* Walks over associations, from a host to its disks and its tape. */
+/* Tests walks over associations, from a host to its disks and its tape. */
 #include "TestProviders.h"
 
 #include "classes/Catalogue.h"
@@ -102,7 +102,7 @@ TEST_F(AssociationsTest, LeadToEveryObjectOncePerAssociationInTheOrderOfRegistra
                 ElementsAre("Test_BootsFrom a", "Test_HasDisk b", "Test_HasDisk a"));
 }
 
-TEST_F(AssociationsTest, AreFollowedOnlyWhereTheyCanReferToTheSource) {
+TEST_F(AssociationsTest, AreFollowedOnlyIfTheyCanReferToTheSource) {
     // If the provider of Test_Between were called, it would throw.
     EXPECT_THAT(names(serving({"Test_Between", "Test_BootsFrom"})), ElementsAre("Test_BootsFrom a"));
     EXPECT_THAT(dispatcher->associatorNames(invocation, path("Test_Tape", "t"), {}), IsEmpty());
@@ -120,7 +120,7 @@ void PrintTo(const Restriction& restriction, std::ostream* out) {
 
 class RestrictionTest : public AssociationsTest, public testing::WithParamInterface<Restriction> {};
 
-TEST_P(RestrictionTest, HoldsThoughTheProviderDoesNotLookAtIt) {
+TEST_P(RestrictionTest, HoldsEvenIfTheProviderIgnoresIt) {
     EXPECT_EQ(GetParam().found, names(serving({"Test_Links", "Test_BootsFrom"}), GetParam().filter));
 }
 
@@ -146,7 +146,7 @@ INSTANTIATE_TEST_SUITE_P(ByRole, RestrictionTest,
                                          Restriction{{"Test_BootsFrom", "", "Host", "Disk"}, {"Test_BootsFrom a"}},
                                          Restriction{{"", "", "Host", "Host"}, {}}));
 
-TEST_F(AssociationsTest, AreAskedForTheirOwnClassAndToldTheFilter) {
+TEST_F(AssociationsTest, GetTheirOwnClassAndTheFilter) {
     const auto shown = [&](const AssociationFilter& filter) {
         const auto found = serving({"Test_ShowsFilter"}).associators(invocation, host, filter, std::nullopt);
         return std::get<std::string>(find(found.at(0).objects.at(0).properties, "Vendor")->value.content);
@@ -163,7 +163,7 @@ TEST_F(AssociationsTest, GiveTheSourceInTheSpellingOfItsDeclaration) {
     EXPECT_EQ("Test_Host", source->className);
 }
 
-TEST_F(AssociationsTest, GiveThePropertiesThatAreWantedAndTheKeys) {
+TEST_F(AssociationsTest, GiveTheWantedPropertiesAndTheKeys) {
     const std::vector<std::string> wanted = {"since", "SIZE"};
     const auto namesOf = [](const Instance& instance) {
         std::vector<std::string> names;
@@ -180,7 +180,7 @@ TEST_F(AssociationsTest, GiveThePropertiesThatAreWantedAndTheKeys) {
                 ElementsAre("Host", "Disk"));
 }
 
-TEST_F(AssociationsTest, AreGivenThemselvesAsReferences) {
+TEST_F(AssociationsTest, AreReturnedAsReferences) {
     Dispatcher& served = serving({"Test_HasDisk", "Test_BootsFrom"});
     const auto all =
         ElementsAre(reference("Test_HasDisk", "b"), reference("Test_HasDisk", "a"), reference("Test_BootsFrom", "a"));
@@ -203,12 +203,12 @@ TEST_F(AssociationsTest, FailWithTheProviderThatFailsAndItsReasons) {
     EXPECT_THAT(names(served, {"Test_BootsFrom", "", "", ""}), ElementsAre("Test_BootsFrom a"));
 }
 
-TEST_F(AssociationsTest, AskOthersThroughTheObjectManager) {
+TEST_F(AssociationsTest, ReachOtherProvidersThroughTheObjectManager) {
     EXPECT_THAT(names(serving({"Test_AsksAnother", "Test_HasDisk"}), {"Test_AsksAnother", "", "", ""}),
                 ElementsAre("Test_AsksAnother b", "Test_AsksAnother a"));
 }
 
-TEST_F(AssociationsTest, FailWhereTheOthersDo) {
+TEST_F(AssociationsTest, FailIfAnUpCallFails) {
     Dispatcher& served = serving({"Test_AsksNobody", "Test_AsksForItself"});
     EXPECT_THAT(errorOf([&] {
                     served.associatorNames(invocation, host, {"Test_AsksNobody", "", "", ""});
@@ -222,7 +222,7 @@ TEST_F(AssociationsTest, FailWhereTheOthersDo) {
     EXPECT_THAT(endless.what(), testing::EndsWith("nest deeper than 16 levels: does a provider ask for itself?"));
 }
 
-TEST_F(AssociationsTest, RefuseWhatIsNotDeclaredOrServed) {
+TEST_F(AssociationsTest, RefuseClassesAndInstancesThatDoNotExist) {
     Dispatcher& served = serving({"Test_BootsFrom"});
     const auto failure = [&](const ObjectPath& source, const AssociationFilter& filter) {
         return errorOf([&] { served.associatorNames(invocation, source, filter); });
@@ -282,7 +282,7 @@ TEST(DuplicatesTest, AreEqualPathsHoweverTheyAreWritten) {
     EXPECT_THAT(paths, ElementsAre(first, other, link));
 }
 
-TEST(DuplicatesTest, AreNotToldWithoutKeys) {
+TEST(DuplicatesTest, AreNeverPathsWithoutKeys) {
     const Instance unnamed{{"", "root/cimv2", "Test_Disk", {}}, {}};
     std::vector<Instance> instances = {unnamed, unnamed};
     dropDuplicates(instances);

@@ -101,7 +101,7 @@ TEST_F(DispatcherTest, GivesInstancesOneByOne) {
     EXPECT_THAT(paths, ElementsAre(disk("a"), disk("b")));
 }
 
-TEST_F(DispatcherTest, GivesNothingOfAnOperationThatFails) {
+TEST_F(DispatcherTest, GivesNoObjectsOfAnOperationThatFails) {
     EXPECT_STREQ("TestProvider released a CMPIInstance twice",
                  errorOf([&] {
                      dispatcher.enumerateInstances(invocation, path("Test_ReleasesTwice"), std::nullopt,
@@ -140,7 +140,7 @@ TEST_F(DispatcherTest, InvokesMethods) {
     EXPECT_EQ(stringValue("Format"), result.outArguments[2].value);
 }
 
-TEST_F(DispatcherTest, CallsMethodsForClientsOfInstancesThatAreThere) {
+TEST_F(DispatcherTest, CallsMethodsForClientsOnlyOfInstancesThatExist) {
     const auto call = [&](const ObjectPath& target) { dispatcher.callMethod(invocation, target, "Format", {}); };
     call(disk("b"));
     call({"host", "ROOT/cimv2", "TEST_DISK", {{"NAME", stringValue("b")}}});
@@ -153,7 +153,7 @@ TEST_F(DispatcherTest, CallsMethodsForClientsOfInstancesThatAreThere) {
                 isError(CMPI_RC_ERR_ACCESS_DENIED, "not for you"));
 }
 
-TEST_F(DispatcherTest, CallsMethodsForClientsWithReferencesToInstancesThatAreThere) {
+TEST_F(DispatcherTest, CallsMethodsForClientsOnlyWithReferencesToInstancesThatExist) {
     const auto call = [&](const Value& argument) {
         return dispatcher.callMethod(invocation, disk("a"), "Format", {{"Disk", argument}}).result.returnValue;
     };
@@ -189,7 +189,7 @@ TEST_F(DispatcherTest, GivesTheProviderAContext) {
     EXPECT_EQ(stringValue("root"), entries[2].value);
 }
 
-TEST_F(DispatcherTest, RefusesWhatNobodyServes) {
+TEST_F(DispatcherTest, RefusesClassesNamespacesAndMethodsThatNobodyServes) {
     EXPECT_EQ(CMPI_RC_ERR_INVALID_CLASS, enumerationFailure("Test_Tape").code);
     const ObjectPath elsewhere{"", "root/elsewhere", "Test_Disk", {}};
     EXPECT_EQ(CMPI_RC_ERR_INVALID_NAMESPACE,
@@ -249,7 +249,7 @@ TEST_F(DispatcherTest, GettingAnInstanceThatIsNotReturnedIsNotFound) {
                 isError(CMPI_RC_ERR_FAILED, "TestProvider returned 2 instances, expected one"));
 }
 
-TEST_F(DispatcherTest, ARequestHasSoManyObjectsAndBytesAtMost) {
+TEST_F(DispatcherTest, LimitsTheObjectsAndBytesOfARequest) {
     const auto getMany = [&] { dispatcher.enumerateInstances(invocation, path("Test_ReturnsMany"), std::nullopt); };
     dispatcher.broker().setLimits({.objects = 10'000});
     getMany();
@@ -263,7 +263,7 @@ TEST_F(DispatcherTest, ARequestHasSoManyObjectsAndBytesAtMost) {
                         "TestProvider needed more than 1000000 bytes, which one request may have at most"));
 }
 
-/** Counts, and lets an operation take no more than so many bytes. */
+/** Counts the bytes that an operation takes, and refuses more than `limit`. */
 class Meter final : public MemoryMeter {
 public:
     explicit Meter(std::size_t limit = SIZE_MAX) : _limit(limit) {}
@@ -296,7 +296,7 @@ TEST_F(DispatcherTest, TheMemoryOfAnOperationIsMeasured) {
     EXPECT_EQ(0U, meter.now);
 }
 
-TEST_F(DispatcherTest, TheMemoryOfWhatProvidersAskForIsMeasuredWithThatOfTheOperation) {
+TEST_F(DispatcherTest, TheMemoryOfUpCallsIsMeasuredWithThatOfTheOperation) {
     Meter alone;
     invocation.meter = &alone;
     dispatcher.enumerateInstances(invocation, path("Test_Disk"), std::nullopt);
@@ -326,13 +326,13 @@ TEST_F(DispatcherTest, TheOtherInstanceOperationsHaveToCloseTheirResult) {
     EXPECT_THAT(failureOf([&] { dispatcher.execQuery(invocation, open, "", ""); }), leftOpen);
 }
 
-TEST_F(DispatcherTest, CreatingGivesOnePath) {
+TEST_F(DispatcherTest, CreatingReturnsOnePath) {
     const Instance instance{path("Test_ClosesEmpty"), {}};
     EXPECT_THAT(failureOf([&] { dispatcher.createInstance(invocation, path("Test_ClosesEmpty"), instance); }),
                 isError(CMPI_RC_ERR_FAILED, "TestProvider returned 0 object paths, expected one"));
 }
 
-TEST_F(DispatcherTest, AMethodThatGivesNothingAndStaysOpenIsRefused) {
+TEST_F(DispatcherTest, AMethodThatReturnsNothingAndStaysOpenIsRefused) {
     const CimError error = methodFailure("Test_LeavesOpen");
     EXPECT_THAT(error, isError(CMPI_RC_ERR_FAILED, "Format was refused"));
     EXPECT_TRUE(error.refused);
@@ -340,7 +340,7 @@ TEST_F(DispatcherTest, AMethodThatGivesNothingAndStaysOpenIsRefused) {
     EXPECT_FALSE(methodFailure("Test_Fails").refused);
 }
 
-TEST_F(DispatcherTest, AMethodThatGivesNothingAndClosesFails) {
+TEST_F(DispatcherTest, AMethodThatReturnsNothingAndClosesFails) {
     const CimError error = methodFailure("Test_ClosesEmpty");
     EXPECT_THAT(error, isError(CMPI_RC_ERR_FAILED, "TestProvider returned 0 values, expected one"));
     EXPECT_FALSE(error.refused);

@@ -143,7 +143,7 @@ TEST_F(LogTapTest, CountsNeitherTheMachineNorAnAcceptedRequestAsAFailure) {
     EXPECT_THAT(tap.failuresSince(0), ElementsAre("refused", "failure"));
 }
 
-TEST_F(LogTapTest, KeepsTheNewestRecordsOfAThreadThatDoesNotTakeThemAndWhatIsToldOfThePowerRequest) {
+TEST_F(LogTapTest, KeepsTheNewestRecordsOfAThreadAndAllRecordsAboutAPowerRequest) {
     LogTap tap;
     tap.attach(library);
     log("accepted", 10000, OrvLog::POWER_REQUEST_ACCEPTED_RECORD);

@@ -32,7 +32,7 @@ TEST_F(ProvidersTest, AProviderIsMadeOnce) {
     EXPECT_STREQ("methodTestProvider", providers.methodProvider(testRegistration("Test_Disk")).ft->miName);
 }
 
-TEST_F(ProvidersTest, CleanupIsCalledAtTheEndAndItsFailureTold) {
+TEST_F(ProvidersTest, CleanupIsCalledAtTheEndAndItsFailureIsLogged) {
     {
         Providers providers(broker, {testProviders});
         providers.instanceProvider(testRegistration("Test_Disk"));
@@ -51,7 +51,7 @@ TEST_F(ProvidersTest, AllKindsOfAProviderAreMadeBeforeItsFirstOperation) {
     EXPECT_THAT(messages, Contains("TestProvider_Create_MethodMI: cleanup threw an exception: no cleaning today"));
 }
 
-TEST_F(ProvidersTest, CheckTellsWhatIsThere) {
+TEST_F(ProvidersTest, CheckReportsTheLibraryAndItsFactories) {
     Providers providers(broker, {"/nonexistent", testProviders});
     const ProviderReport report = providers.check(testRegistration("Test_Disk"));
     EXPECT_TRUE(report.usable());
@@ -65,7 +65,7 @@ TEST_F(ProvidersTest, CheckTellsWhatIsThere) {
     EXPECT_EQ("TestProvider_Create_MethodMI", report.factories[1].factory);
 }
 
-TEST_F(ProvidersTest, CheckTellsWhatIsWrong) {
+TEST_F(ProvidersTest, CheckReportsTheProblemOfAFactory) {
     Providers providers(broker, {testProviders});
     const std::vector<std::pair<const char*, std::string>> cases = {
         {"ReturnsNull", "returned no provider, code 0"},
@@ -101,7 +101,7 @@ TEST_F(ProvidersTest, AMissingFactoryIsNamed) {
     EXPECT_FALSE(providers.check(association).usable());
 }
 
-TEST_F(ProvidersTest, KindsThatAreNotServedAreToldSo) {
+TEST_F(ProvidersTest, CheckReportsKindsThatAreNotServed) {
     Providers providers(broker, {testProviders});
     Registration indications = testRegistration("Test_Disk");
     indications.indication = true;
@@ -143,7 +143,7 @@ TEST_F(LibrariesTest, ThatAreMissingAreNamedWithTheFoldersThatWereSearched) {
               report.problem);
 }
 
-TEST_F(LibrariesTest, ThatDoNotLoadAreToldSoInOneLine) {
+TEST_F(LibrariesTest, ThatDoNotLoadAreReportedInOneLine) {
     std::ofstream(folder / "libdisks.so") << "this is no library";
     Providers providers(broker, {folder});
     const CimError error = errorOf([&] { providers.instanceProvider(at("disks")); });
@@ -153,7 +153,7 @@ TEST_F(LibrariesTest, ThatDoNotLoadAreToldSoInOneLine) {
                                testing::HasSubstr(folder / "libdisks.so"), testing::Not(testing::HasSubstr("\n"))));
 }
 
-TEST_F(LibrariesTest, AreTriedAgainOnceTheyAreThere) {
+TEST_F(LibrariesTest, AreTriedAgainOnceTheyExist) {
     Providers providers(broker, {folder});
     EXPECT_FALSE(providers.check(at("disks")).usable());
     std::filesystem::create_symlink(testProviders / "liborvtestprovider.so", folder / "libdisks.so");

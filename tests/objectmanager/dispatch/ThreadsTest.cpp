@@ -1,4 +1,4 @@
-/* One dispatcher, many threads. */
+/* Tests that many threads can use one dispatcher at once. */
 #include "TestProviders.h"
 
 #include <thread>

@@ -1,4 +1,4 @@
-/* Providers that cannot be used. The name of each tells why. */
+/* Providers that cannot be used. The name of each one tells the reason. */
 #include "cmpimacs.h"
 
 #include <stdexcept>

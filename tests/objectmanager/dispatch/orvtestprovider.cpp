@@ -57,13 +57,13 @@ const OrvLog::Observer1* observer = nullptr;
 
 } // namespace
 
-/* As the agent's log library does it. */
+/* This function is the one by which the object manager listens to the agent's log library. */
 
 void orvLogObserve1(const OrvLog::Observer1* given) {
     observer = given;
 }
 
-/** Logs a record; tests call it, too. */
+/** Logs a record. Tests call this function, too. */
 extern "C" void TestProvider_log(int kind, int level, const char* text) {
     constexpr std::string_view category = "Test.Disk";
     const OrvLog::ObservedRecord1 record{kind, level, category.data(), category.size(), text, std::strlen(text)};
@@ -201,7 +201,7 @@ const std::map<std::string, Behaviour> behaviours = {
      }},
 };
 
-/** Does what the path's class asks for. @return false if the class is Test_Disk. */
+/** Behaves in the way that the path's class tells. @return false if the class has no particular behaviour. */
 bool behave(const Call& call, CMPIStatus& status) {
     const auto found = behaviours.find(CMGetCharPtr(CMGetClassName(call.path, nullptr)));
     if (found != behaviours.end()) {
@@ -228,7 +228,7 @@ CMPIStatus Test_EnumInstanceNames(CMPIInstanceMI*, const CMPIContext* context, c
     return status;
 }
 
-/** Where a test needs a large answer, there are so many disks beside the usual two. */
+/** The number of disks beside the usual two, for tests that need a large answer. */
 int moreDisks() {
     const char* const count = std::getenv("TEST_MORE_DISKS");
     return count == nullptr ? 0 : std::atoi(count);
@@ -253,7 +253,7 @@ CMPIStatus Test_EnumInstances(CMPIInstanceMI*, const CMPIContext* context, const
     return status;
 }
 
-/** Never returns. Writes a byte to the file that TEST_HANGS names, so that a test knows. */
+/** Never returns. Writes a byte to the file that TEST_HANGS names, which tells a test that the provider hangs. */
 void hang() {
     if (const char* const file = std::getenv("TEST_HANGS")) {
         std::ofstream(file, std::ios::app) << '.';
@@ -348,7 +348,7 @@ CMPIStatus Test_InvokeMethod(CMPIMethodMI*, const CMPIContext* context, const CM
     return status;
 }
 
-/* Associations: none of the operations looks at the filter or closes its result, as providers may. */
+/* Associations: none of the operations applies the filter or closes its result; association providers need not. */
 
 /** An association operation, and its arguments. */
 struct Walk {
@@ -369,7 +369,7 @@ void give(const Walk& walk, const CMPIInstance* instance) {
     }
 }
 
-/** Returns a disk of the host, or the association between both. */
+/** Returns a disk of the host or, for references, the association between the host and the disk. */
 void giveDisk(const Walk& walk, const char* name) {
     if (!walk.references) {
         give(walk, disk(walk.call, name));

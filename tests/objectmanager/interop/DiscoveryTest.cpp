@@ -1,5 +1,5 @@
 /*
- * What a client that knows nothing but the object manager's address finds out, through the shipped registrations and
+ * Tests what a client that knows only the object manager's address can find out, with the shipped registrations and
  * providers.
  */
 #include "interop/OwnProviders.h"
@@ -64,7 +64,7 @@ protected:
         start();
     }
 
-    /** The object manager with the shipped registrations but for some classes. */
+    /** Starts an object manager with the shipped registrations, except those of the classes in `without`. */
     void start(const std::vector<std::string>& without = {}) {
         std::vector<Registration> registrations = readRegistrations(std::filesystem::path(TEST_SCHEMA));
         std::erase_if(registrations, [&](const Registration& registration) {
@@ -172,7 +172,7 @@ TEST_F(Discovery, TellsWhoTheObjectManagerIsAndOnWhichMachineItRuns) {
     EXPECT_EQ(text(manager, "Description"), "orvcim, the object manager of power management, version 1.2.3");
 }
 
-TEST_F(Discovery, NamesTheHostWhereNobodyServesTheComputerSystem) {
+TEST_F(Discovery, NamesTheHostIfNobodyServesTheComputerSystem) {
     start({"TALVO_ComputerSystem"});
     const ObjectPath manager = names(managerClass).at(0);
     EXPECT_EQ(key(manager, "SystemCreationClassName"), "CIM_ComputerSystem");
@@ -224,7 +224,7 @@ TEST_F(Discovery, TellsHowItIsReachedOnceItIs) {
     EXPECT_THAT(associated(mechanisms.front().path), ElementsAre(manager));
 }
 
-TEST_F(Discovery, TellsThatNobodyHasToLogInWhereThatIsSo) {
+TEST_F(Discovery, TellsIfNobodyHasToLogIn) {
     providers->answerOn({"http://127.0.0.1:5988", false});
     const Value none = arrayValue(CMPI_uint16, {unsignedValue(CMPI_uint16, 2)});
     EXPECT_EQ(value(instances(mechanismClass).at(0), "AuthenticationMechanismsSupported"), none);
@@ -318,7 +318,7 @@ TEST_F(Discovery, LeadsFromNothingElseToTheProfile) {
     EXPECT_THAT(associated(profile("Profile Registration"), {"CIM_ElementConformsToProfile", "", "", ""}), IsEmpty());
 }
 
-TEST_F(Discovery, SaysThatNothingConformsWhereNoServiceIsServed) {
+TEST_F(Discovery, SaysThatNothingConformsIfNoServiceIsServed) {
     start({serviceClass});
     EXPECT_THAT(instances("TALVO_ElementConformsToProfile"), IsEmpty());
     EXPECT_THAT(associated(profile("Power State Management"), {"CIM_ElementConformsToProfile", "", "", ""}), IsEmpty());

@@ -34,7 +34,7 @@ void operator delete(void* memory, std::size_t) noexcept {
 namespace ObjectManager {
 namespace {
 
-/** Test_Service is a service of power management, and nothing else is anything. */
+/** Test_Service is derived from the class of power management services; no other class has a superclass. */
 class Classes final : public ClassInformation {
 public:
     bool isA(std::string_view className, std::string_view superClassName) const override {
@@ -46,7 +46,7 @@ public:
     std::span<const ReferenceEnd> references(std::string_view /*className*/) const override { return {}; }
 };
 
-/** Tells which systems are associated with a service, and does nothing else. */
+/** Returns the systems that are associated with a service; every other operation throws. */
 class Systems final : public Operations {
 public:
     std::vector<ObjectPath> systems;
@@ -109,14 +109,14 @@ protected:
         return {{"PowerState", unsignedValue(CMPI_uint16, 5)}, {"ManagedElement", std::move(element)}};
     }
 
-    /** Has the agent log a record. */
+    /** Lets the agent log a record. */
     void say(OrvLog::RecordKind kind, const char* text) const {
         reinterpret_cast<void (*)(int, const char*)>(dlsym(agent, "TestAgent_say"))(kind, text);
     }
 
     std::string principal() const { return reinterpret_cast<const char* (*)()>(dlsym(agent, "TestAgent_principal"))(); }
 
-    /** Calls the method; `provider` is what it does. */
+    /** Calls the method; `provider` takes the place of the provider's method. */
     MethodOutcome request(const std::vector<NamedValue>& given, const std::function<void()>& provider,
                           std::uint64_t answer = 0) {
         return rule.call({invocation, target, requestPowerStateChangeMethod, given}, operations, [&] {
@@ -130,7 +130,7 @@ protected:
         return request(arguments(referenceValue(system("machine"))), provider, answer);
     }
 
-    /** Expects that the provider is not even called. */
+    /** Expects that the rule refuses the call before it calls the provider. */
     void expectRefused(const std::vector<NamedValue>& given, const std::string& message) {
         EXPECT_THAT(errorOf([&] { request(given, [] {}); }), isError(CMPI_RC_ERR_INVALID_PARAMETER, message));
         EXPECT_EQ(calls, 0);
@@ -189,7 +189,7 @@ TEST_F(PowerRequests, AreNotMadeOfTheServiceOfANodeThatTakesNone) {
                   "node blade1 takes all power requests");
 }
 
-TEST_F(PowerRequests, SucceedWhereTheAgentSaysSo) {
+TEST_F(PowerRequests, SucceedIfTheAgentAcceptsThem) {
     attach();
     const MethodOutcome outcome = request([&] { say(OrvLog::POWER_REQUEST_ACCEPTED_RECORD, "the machine reboots"); });
     EXPECT_EQ(outcome.remark, "the machine reboots");
@@ -197,7 +197,7 @@ TEST_F(PowerRequests, SucceedWhereTheAgentSaysSo) {
     EXPECT_EQ(outcome.result.returnValue, unsignedValue(CMPI_uint32, 0));
 }
 
-TEST_F(PowerRequests, SucceedAlsoWhereNoMemoryIsLeftForTheAgentsWords) {
+TEST_F(PowerRequests, SucceedEvenIfThereIsNoMemoryForTheAgentsRecord) {
     attach();
     const MethodOutcome outcome = request([&] {
         memoryIsShort = true;
@@ -216,7 +216,7 @@ TEST_F(PowerRequests, SucceedAlsoWhereNoMemoryIsLeftForTheAgentsWords) {
     EXPECT_THAT(refused, isError(CMPI_RC_ERR_FAILED, "Power request refused: memory was too short for more"));
 }
 
-TEST_F(PowerRequests, FailWhereTheAgentRefusesThoughTheProviderReturnsZero) {
+TEST_F(PowerRequests, FailIfTheAgentRefusesThemThoughTheProviderReturnsZero) {
     attach();
     const CimError error =
         errorOf([&] { request([&] { say(OrvLog::POWER_REQUEST_REFUSED_RECORD, "the machine is busy"); }); });
@@ -224,7 +224,7 @@ TEST_F(PowerRequests, FailWhereTheAgentRefusesThoughTheProviderReturnsZero) {
     EXPECT_TRUE(error.refused);
 }
 
-TEST_F(PowerRequests, FailWhereTheAgentSaidNothingOfThisVeryCall) {
+TEST_F(PowerRequests, FailIfTheAgentLoggedNothingDuringThisCall) {
     attach();
     say(OrvLog::POWER_REQUEST_ACCEPTED_RECORD, "another call, before");
     const CimError error = errorOf([&] { request([&] { say(OrvLog::ORDINARY_RECORD, "accepted"); }); });
@@ -233,14 +233,14 @@ TEST_F(PowerRequests, FailWhereTheAgentSaidNothingOfThisVeryCall) {
     EXPECT_TRUE(error.refused);
 }
 
-TEST_F(PowerRequests, HaveTheProvidersAnswerWhereItTellsOfAFailure) {
+TEST_F(PowerRequests, HaveTheProvidersAnswerIfItReportsAFailure) {
     attach();
     const MethodOutcome outcome = request([] {}, 4);
     EXPECT_EQ(outcome.result.returnValue, unsignedValue(CMPI_uint32, 4));
     EXPECT_EQ(outcome.remark, "");
 }
 
-TEST_F(PowerRequests, HaveAnUnknownOutcomeWhereTheAgentCannotBeHeard) {
+TEST_F(PowerRequests, HaveAnUnknownOutcomeIfTheAgentCannotBeObserved) {
     const MethodOutcome outcome = request([] {});
     EXPECT_FALSE(outcome.isKnown);
     EXPECT_EQ(outcome.remark, "the outcome is not known beyond the return value: the agent cannot be observed");
@@ -260,7 +260,7 @@ TEST_F(PowerRequests, ThatFailAfterTheyWereAcceptedSayThatTheyWere) {
     EXPECT_THAT(without, isError(CMPI_RC_ERR_FAILED, "Provider threw an exception"));
 }
 
-TEST_F(PowerRequests, TellTheAgentForWhomTheyAreWhileTheyAreMade) {
+TEST_F(PowerRequests, TellTheAgentTheirUserWhileTheyAreMade) {
     attach();
     const auto seen = [&](const Invocation& whose) {
         std::string whom;

@@ -1,4 +1,4 @@
-/* An agent without a machine: it says what a test has it say, and keeps what it is told. */
+/* An agent without a machine: it logs the records that a test gives it, and keeps the user that it is told. */
 #include "Norv/Machine.h"
 #include "OrvLog/Observer.h"
 
@@ -45,7 +45,7 @@ int orvInstrumentationCancelRequest1() {
     return 0;
 }
 
-/** On whose behalf the thread acts. */
+/** The user on whose behalf the agent was last told to act. */
 extern "C" const char* TestAgent_principal() {
     return principal.c_str();
 }

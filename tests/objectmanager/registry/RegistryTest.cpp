@@ -33,7 +33,7 @@ TEST_F(RegistryTest, FindsTheProviderOfEachKind) {
     EXPECT_EQ("Holds", registry.find("root/interop", "Test_Holds", ProviderKind::association).provider);
 }
 
-TEST_F(RegistryTest, HasWhatIsInOneNamespaceOfDiscoveryInTheOtherOneToo) {
+TEST_F(RegistryTest, ServesTheClassesOfOneNamespaceOfDiscoveryInTheOtherOneToo) {
     EXPECT_EQ("Holds", registry.find("interop", "Test_Holds", ProviderKind::association).provider);
     EXPECT_THAT(registry.nameSpaces(), testing::ElementsAre("interop", "root/cimv2", "root/interop"));
 

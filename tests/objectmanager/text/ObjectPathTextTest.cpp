@@ -50,7 +50,7 @@ TEST_F(ObjectPathTextTest, NamesAClass) {
     EXPECT_THAT(path.keys, IsEmpty());
 }
 
-TEST_F(ObjectPathTextTest, HasTheDefaultNamespaceWhereItNamesNone) {
+TEST_F(ObjectPathTextTest, HasTheDefaultNamespaceIfItNamesNone) {
     EXPECT_EQ(parse("Thing").nameSpace, "root/default");
     EXPECT_EQ(parse("Thing.Name=\"a:b\"").nameSpace, "root/default");
     EXPECT_EQ(parse("/root/cimv2:Thing").nameSpace, "root/cimv2");

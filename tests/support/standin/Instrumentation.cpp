@@ -11,7 +11,7 @@ using OrvTest::Transcript;
 
 namespace {
 
-/** The library's own form of a path is not the text that people see. */
+/** The library's internal form of a path differs from the text that people see. */
 const std::string pathPrefix = "node/";
 
 std::string shown(const std::vector<unsigned int>& values) {
@@ -32,7 +32,7 @@ std::string shown(const std::string& value) {
     return '"' + value + '"';
 }
 
-/** Names a call to the faults; one that throws is still in the transcript. */
+/** Asks for the fault of a call. If the fault throws, the call is recorded here, since it does not return then. */
 void called(const std::string& call, const std::string& arguments) {
     try {
         Agent::instance().faults.next(call);
@@ -117,7 +117,7 @@ std::string Instrumentation::getPathToNode() {
     return path;
 }
 
-// The library that this stands for has no static members.
+// The real library has no static members.
 // NOLINTBEGIN(readability-convert-member-functions-to-static)
 
 std::string Instrumentation::convertPathToString(const std::string& path) {

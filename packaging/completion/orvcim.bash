@@ -9,6 +9,10 @@ _orvcim_listed() {
     inside && /^  [^ ]/ { count = split($1, words, ","); for (i = 1; i <= count; i++) { sub("[={].*", "", words[i]); print words[i] } }'
 }
 
+_orvcim_formats() {
+  orvcim --help 2>/dev/null | awk '$1 == "--format" { gsub(/\([^)]*\)|,| or /, " "); for (i = 3; i <= NF; i++) print $i }'
+}
+
 _orvcim() {
   local current=${COMP_WORDS[COMP_CWORD]} commands=() found word
   COMPREPLY=()
@@ -20,7 +24,7 @@ _orvcim() {
   done
   case ${COMP_WORDS[COMP_CWORD - 1]} in
   --format)
-    found='table json mof'
+    found=$(_orvcim_formats)
     ;;
   --schema | --provider-path | --tls-cert | --tls-key | --pam-folder)
     mapfile -t COMPREPLY < <(compgen -f -- "$current")

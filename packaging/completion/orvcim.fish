@@ -12,6 +12,10 @@ function __orvcim_listed --argument-names part
         }'
 end
 
+function __orvcim_formats
+    orvcim --help 2>/dev/null | awk '$1 == "--format" { gsub(/\([^)]*\)|,| or /, " "); for (i = 3; i <= NF; i++) print $i }'
+end
+
 # The commands that the line has so far; what stands between them are options and arguments.
 function __orvcim_commands
     set --local commands
@@ -39,4 +43,7 @@ complete --command orvcim --no-files --arguments '(__orvcim_words)'
 for option in schema provider-path tls-cert tls-key pam-folder
     complete --command orvcim --long-option $option --require-parameter --force-files
 end
-complete --command orvcim --long-option format --exclusive --arguments 'table json mof'
+for option in read-group power-group
+    complete --command orvcim --long-option $option --exclusive --arguments '(__fish_complete_groups)'
+end
+complete --command orvcim --long-option format --exclusive --arguments '(__orvcim_formats)'

@@ -5,11 +5,14 @@
 #include "server/HttpMessage.h"
 #include "server/Turns.h"
 
+#include <gnutls/crypto.h>
+
 #include <array>
 #include <atomic>
 #include <chrono>
 #include <functional>
 #include <map>
+#include <memory>
 #include <mutex>
 #include <optional>
 #include <string>
@@ -81,9 +84,15 @@ private:
         Clock::time_point used;
     };
 
+    struct HmacFree {
+        void operator()(hmac_hd_st* hmac) const { gnutls_hmac_deinit(hmac, nullptr); }
+    };
+    using Hmac = std::unique_ptr<hmac_hd_st, HmacFree>;
+
     Digest digestOf(const Credentials& given) const;
 
-    Digest _secret{};
+    /** An HMAC with a random key and without text. Each digest begins with a copy, which is cheaper than the key. */
+    Hmac _keyed;
     std::mutex _mutex;
     std::map<Digest, Entry> _entries;
 };

@@ -9,7 +9,7 @@ target_compile_options(orv_options INTERFACE
   # GCC 12 sees overlapping copies where there are none, in the concatenation of strings.
   $<$<COMPILE_LANG_AND_ID:CXX,GNU>:-Wno-restrict>
   # Of several files that are compiled as one, each has names of its own.
-  $<$<AND:$<BOOL:${CMAKE_UNITY_BUILD}>,$<COMPILE_LANG_AND_ID:CXX,GNU>>:-Wno-shadow;-Wno-subobject-linkage>
+  $<$<AND:$<BOOL:$<TARGET_PROPERTY:UNITY_BUILD>>,$<COMPILE_LANG_AND_ID:CXX,GNU>>:-Wno-shadow;-Wno-subobject-linkage>
   $<$<BOOL:${ORV_WERROR}>:-Werror>
   # Source names in log records are relative to the project, wherever it is built.
   "-fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=")
@@ -70,11 +70,15 @@ add_library(orv_test_options INTERFACE)
 target_compile_options(orv_test_options INTERFACE -O0 -g1 -U_FORTIFY_SOURCE
   $<$<NOT:$<EQUAL:${position},-1>>:-fno-sanitize=null,alignment,vptr>)
 
-# orv_add_test(NAME [THREADS] SOURCES... LIBRARIES... [EXCEPT PATTERN]): adds a GoogleTest program that ctest runs.
-# EXCEPT leaves out the tests whose names match PATTERN; another test has to run them. With THREADS, the program is one
-# of those that run under ThreadSanitizer: the target threaded_tests builds them, the label threads selects them.
+# orv_add_test(NAME [THREADS] SOURCES... [SEQUENTIAL...] LIBRARIES... [EXCEPT PATTERN]): adds a GoogleTest program that
+# ctest runs. EXCEPT leaves out the tests whose names match PATTERN; another test has to run them. With THREADS, the
+# program is one of those that run under ThreadSanitizer: the target threaded_tests builds them, the label threads
+# selects them. SEQUENTIAL are sources with tests that use one thread only, which builds with ThreadSanitizer leave out.
 function(orv_add_test name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "THREADS" "EXCEPT" "SOURCES;LIBRARIES")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "THREADS" "EXCEPT" "SOURCES;SEQUENTIAL;LIBRARIES")
+  if(NOT ORV_SANITIZE STREQUAL "thread")
+    list(APPEND arg_SOURCES ${arg_SEQUENTIAL})
+  endif()
   add_executable(${name} ${arg_SOURCES})
   target_link_libraries(${name} PRIVATE
     orv_options orv_test_options ${arg_LIBRARIES} GTest::gmock GTest::gtest_main)

@@ -67,7 +67,7 @@ public:
     const EnumerationLimits& limits() const { return _limits; }
 
     /**
-     * Throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED if the enumerations of one user may not have so many
+     * Throws CimError with the code CIM_ERR_SERVER_LIMITS_EXCEEDED if the enumerations of one user may not have `bytes`
      * bytes.
      */
     void requireRoom(std::size_t bytes) const;

@@ -31,7 +31,7 @@ public:
     /** Sends a piece of the document. The reply's status and headers go with the first piece. */
     void send(std::string_view piece);
 
-    /** Waits until so many bytes of text can be held in memory, beside the objects that providers returned. */
+    /** Waits until `bytes` of text can be held in memory, beside the objects that providers returned. */
     void holdText(std::size_t bytes);
 
     void take(std::size_t bytes) override;

@@ -38,7 +38,7 @@ public:
         Share& operator=(const Share&) = delete;
         ~Share() { _memory.giveBack(*this); }
 
-        /** Waits until the answer has `size` bytes; returns at once if it has so many already. @throws std::bad_alloc
+        /** Waits until the answer has `size` bytes; returns at once if it already has them. @throws std::bad_alloc
          */
         void grow(std::size_t size);
 

@@ -82,7 +82,7 @@ bool RecentLogIns::isKnown(const Credentials& given, Clock::time_point now) {
 void RecentLogIns::remember(const Credentials& given, const Caller& caller, Clock::time_point now) {
     const Digest digest = digestOf(given);
     const std::lock_guard lock(_mutex);
-    if (_entries.size() >= capacity && _entries.count(digest) == 0) {
+    if (_entries.size() >= capacity && !_entries.contains(digest)) {
         _entries.erase(std::min_element(_entries.begin(), _entries.end(), [](const auto& left, const auto& right) {
             return left.second.used < right.second.used;
         }));

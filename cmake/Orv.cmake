@@ -27,10 +27,11 @@ function(orv_small target)
     PROPERTIES COMPILE_OPTIONS "$<$<NOT:$<CONFIG:Debug>>:-Os>")
 endfunction()
 
-# orv_shared_library(TARGET sources...): adds a library lib<TARGET>.so.1 that exports only the symbols that the version
-# script <TARGET>.map of its folder names.
+# orv_shared_library(TARGET [NOT_INSTALLED] sources...): adds a library lib<TARGET>.so.1 that exports only the symbols
+# that the version script <TARGET>.map of its folder names.
 function(orv_shared_library target)
-  add_library(${target} SHARED ${ARGN})
+  cmake_parse_arguments(PARSE_ARGV 1 arg "NOT_INSTALLED" "" "")
+  add_library(${target} SHARED ${arg_UNPARSED_ARGUMENTS})
   set(map "${CMAKE_CURRENT_SOURCE_DIR}/${target}.map")
   set_target_properties(${target} PROPERTIES
     VERSION ${PROJECT_VERSION} SOVERSION 1
@@ -38,7 +39,9 @@ function(orv_shared_library target)
     LINK_DEPENDS "${map}")
   target_link_options(${target} PRIVATE "-Wl,--version-script=${map}")
   target_link_libraries(${target} PRIVATE orv_options)
-  install(TARGETS ${target} LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}" NAMELINK_SKIP)
+  if(NOT arg_NOT_INSTALLED)
+    install(TARGETS ${target} LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}" NAMELINK_SKIP)
+  endif()
 endfunction()
 
 # orv_provider_library(TARGET sources...): adds a shared library, and a link to it in the folder where object managers

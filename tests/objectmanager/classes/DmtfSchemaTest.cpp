@@ -14,12 +14,13 @@
 
 #include <algorithm>
 #include <array>
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <memory>
+#include <sstream>
 #include <string>
 #include <string_view>
+#include <variant>
 #include <vector>
 
 namespace ObjectManager {
@@ -59,11 +60,12 @@ constexpr std::array shippedVersion = {2, 41, 0};
 std::array<int, 3> versionOf(const Catalogue& schema) {
     std::array<int, 3> highest{};
     for (const Class* declared : schema.all()) {
-        std::array<int, 3> version{};
         const NamedValue* const qualifier = find(declared->qualifiers, "Version");
-        if (qualifier != nullptr && declared->name.starts_with("CIM_") &&
-            std::sscanf(mofLiteral(qualifier->value).c_str(), "\"%d.%d.%d", &version[0], &version[1], &version[2]) ==
-                3) {
+        if (qualifier != nullptr && declared->name.starts_with("CIM_")) {
+            std::istringstream text(std::get<std::string>(qualifier->value.content));
+            std::array<int, 3> version{};
+            char dot = '.';
+            text >> version[0] >> dot >> version[1] >> dot >> version[2];
             highest = std::max(highest, version);
         }
     }

@@ -257,19 +257,32 @@ private:
     Folder _folder;
 };
 
+/** A certificate of this machine. */
+class Certificate {
+public:
+    Certificate() {
+        runCommand({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:prime256v1", "-nodes",
+                    "-days", "1", "-subj", "/CN=localhost", "-keyout", _key, "-out", _certificate});
+    }
+
+    /** The options of a server that uses TLS. */
+    std::vector<std::string> options() const { return {"--tls-cert=" + _certificate, "--tls-key=" + _key}; }
+
+private:
+    Folder _folder;
+    std::string _key = _folder / "key.pem";
+    std::string _certificate = _folder / "certificate.pem";
+};
+
 /** Measures what log-ins and TLS cost, with three servers of one node. */
 void measureProtection(double seconds, const std::regex& filter) {
     const Machine machine(1);
-    const Folder folder;
-    const std::string key = folder / "key.pem";
-    const std::string certificate = folder / "certificate.pem";
-    runCommand({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:prime256v1", "-nodes",
-                "-days", "1", "-subj", "/CN=localhost", "-keyout", key, "-out", certificate});
     const User user;
+    const Certificate certificate;
 
     const ServerProcess plain(serve);
     const ServerProcess authenticating(serve + user.options());
-    const ServerProcess encrypting(serve + std::vector<std::string>{"--tls-cert=" + certificate, "--tls-key=" + key});
+    const ServerProcess encrypting(serve + certificate.options());
     for (const Request& request : requests()) {
         const std::string text = request.text();
         const std::string textWithLogIn = request.text(User::header);
@@ -368,50 +381,59 @@ void serveConstant(const std::filesystem::path& file) {
     sigwait(&end, &signal);
 }
 
+/** A server whose instructions are counted, and how its client asks. */
+struct Counted {
+    /** Stands before the names of the requests. */
+    std::string label;
+    unsigned int nodes = 1;
+    std::vector<std::string> options{};
+    /** More headers of each request. */
+    std::string_view headers{};
+    Transport transport = Transport::plain;
+};
+
 /**
  * Leaves a dump of callgrind's for each kind of request: instructions of so many requests as its name says.
- *
- * @param label stands before the names of the requests.
- * @param headers more headers of each request.
  */
-void countRequests(const std::filesystem::path& folder, const std::string& label, unsigned int nodes,
-                   const std::vector<std::string>& options, std::string_view headers, const std::regex& filter) {
+void countRequests(const std::filesystem::path& folder, const Counted& counted, const std::regex& filter) {
     constexpr unsigned int warmUp = 5;
-    constexpr unsigned int counted = 20;
-    const Machine machine(nodes);
-    const std::string dumps = label + '.' + std::to_string(nodes);
+    constexpr unsigned int requestsOfADump = 20;
+    const Machine machine(counted.nodes);
+    const std::string dumps = counted.label + '.' + std::to_string(counted.nodes);
     const ServerProcess server(
         std::vector<std::string>{"valgrind", "--tool=callgrind", "--callgrind-out-file=" + (folder / dumps).string()} +
-        serve + options);
+        serve + counted.options);
     const auto tell = [process = "--pid=" + std::to_string(server.process())](std::vector<std::string> command) {
         command.insert(command.begin(), {"vgdb", process});
         runCommand(command);
     };
-    Client client(server.port());
+    Client client(server.port(), counted.transport);
     for (const Request& request : requests()) {
-        const std::string name = label + '/' + request.name + '/' + std::to_string(nodes);
+        const std::string name = counted.label + '/' + request.name + '/' + std::to_string(counted.nodes);
         if (!std::regex_search(name, filter)) {
             continue;
         }
-        const std::string text = request.text(headers);
+        const std::string text = request.text(counted.headers);
         for (unsigned int i = 0; i < warmUp; ++i) {
             client.answerTo(text);
-            request.check(client.body(), nodes);
+            request.check(client.body(), counted.nodes);
         }
         tell({"zero"});
-        for (unsigned int i = 0; i < counted; ++i) {
+        for (unsigned int i = 0; i < requestsOfADump; ++i) {
             client.answerTo(text);
         }
-        tell({"dump", std::to_string(counted) + '*' + name});
+        tell({"dump", std::to_string(requestsOfADump) + '*' + name});
     }
 }
 
 void countInstructions(const std::filesystem::path& folder, const std::regex& filter) {
     for (const unsigned int nodes : {1U, 100U}) {
-        countRequests(folder, "server", nodes, {}, "", filter);
+        countRequests(folder, {.label = "server", .nodes = nodes}, filter);
     }
     const User user;
-    countRequests(folder, "log-ins", 1, user.options(), User::header, filter);
+    countRequests(folder, {.label = "log-ins", .options = user.options(), .headers = User::header}, filter);
+    const Certificate certificate;
+    countRequests(folder, {.label = "TLS", .options = certificate.options(), .transport = Transport::tls}, filter);
 }
 
 } // namespace
